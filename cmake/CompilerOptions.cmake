@@ -1,0 +1,48 @@
+# One place for the flags of the whole tree. Every target of ours links korvel_options; nothing of
+# it is exported to consumers except what korvel_boost_assert carries.
+set(CMAKE_CXX_STANDARD 17)
+set(CMAKE_CXX_STANDARD_REQUIRED ON)
+set(CMAKE_CXX_EXTENSIONS OFF)
+set(CMAKE_C_STANDARD 11)
+set(CMAKE_POSITION_INDEPENDENT_CODE ON)
+set(CMAKE_CXX_VISIBILITY_PRESET hidden)
+set(CMAKE_C_VISIBILITY_PRESET hidden)
+set(CMAKE_VISIBILITY_INLINES_HIDDEN ON)
+set(CMAKE_EXPORT_COMPILE_COMMANDS ON)
+
+find_program(CCACHE_PROGRAM ccache)
+if(CCACHE_PROGRAM)
+    set(CMAKE_C_COMPILER_LAUNCHER ${CCACHE_PROGRAM})
+    set(CMAKE_CXX_COMPILER_LAUNCHER ${CCACHE_PROGRAM})
+endif()
+
+add_library(korvel_options INTERFACE)
+target_compile_options(korvel_options INTERFACE
+    -Wall -Wextra -Wpedantic -Wshadow -Wformat=2 -Wnull-dereference -Wcast-align
+    -Werror
+    -fstack-protector-strong
+    # Source paths in assertions and logs are relative to the project, wherever it was built.
+    -fmacro-prefix-map=${CMAKE_SOURCE_DIR}/=)
+target_compile_options(korvel_options INTERFACE $<$<COMPILE_LANGUAGE:CXX>:-Wnon-virtual-dtor -Wno-overloaded-virtual>)
+# GCC 12 reports false positives of this kind inside the standard library once it optimises or
+# instruments.
+if(CMAKE_CXX_COMPILER_ID STREQUAL "GNU")
+    target_compile_options(korvel_options INTERFACE -Wno-null-dereference)
+endif()
+target_compile_options(korvel_options INTERFACE
+    $<$<AND:$<NOT:$<CONFIG:Debug>>,$<STREQUAL:${TALVOX_SANITIZERS},>>:-U_FORTIFY_SOURCE -D_FORTIFY_SOURCE=2>)
+
+if(TALVOX_SANITIZERS)
+    target_compile_options(korvel_options INTERFACE
+        -fsanitize=${TALVOX_SANITIZERS} -fno-omit-frame-pointer -fno-sanitize-recover=all -O1)
+    target_link_options(korvel_options INTERFACE -fsanitize=${TALVOX_SANITIZERS})
+endif()
+if(TALVOX_COVERAGE)
+    target_compile_options(korvel_options INTERFACE --coverage)
+    target_link_options(korvel_options INTERFACE --coverage)
+endif()
+
+# A null Boost shared pointer must report "px != 0" in every translation unit that dereferences
+# one, ours or a consumer's.
+add_library(korvel_boost_assert INTERFACE)
+target_compile_definitions(korvel_boost_assert INTERFACE BOOST_ENABLE_ASSERT_HANDLER)
