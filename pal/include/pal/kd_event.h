@@ -1,0 +1,104 @@
+/**
+ * @file
+ * The event thread, the event lock, events, timers and background work.
+ *
+ * One thread, started on first use, delivers everything that happens asynchronously: timers,
+ * posted functions and the completions of background work. Every delivery runs under one recursive
+ * lock, the event lock. Code that is called by the application takes the same lock for the length
+ * of the call; so all that runs under it is serialised, and whoever holds it may cancel a timer, a
+ * posted function or background work and be sure that its callback does not run any more.
+ *
+ * A callback may do: start, cancel and free timers (its own included), post, queue work, call any
+ * function of this layer. It must not block, and must not let an exception escape.
+ */
+#ifndef KORVEL_PAL_KD_EVENT_H
+#define KORVEL_PAL_KD_EVENT_H
+
+#include "pal/kd_types.h"
+
+KD_EXTERN_C_BEGIN
+
+/** Event types. */
+#define KD_EVENT_TIMER 42
+
+/** Timer types of `kdSetTimer`. */
+#define KD_TIMER_ONESHOT 61
+#define KD_TIMER_PERIODIC_AVERAGE 62 /**< keeps the average period: a late tick is caught up */
+#define KD_TIMER_PERIODIC_MINIMUM 63 /**< at least one period between two ticks */
+
+typedef struct KDTimer KDTimer;
+
+/** What a callback is told. Valid during the callback only. */
+typedef struct KDEvent {
+    KDust timestamp; /**< the clock at delivery; for a timer, its due time */
+    KDint type;      /**< an event type */
+    void* userptr;   /**< the user pointer given when the event's source was made */
+    KDTimer* timer;  /**< the timer that fired; null for other events */
+} KDEvent;
+
+typedef void(KDCallbackFunc)(const KDEvent* event);
+
+/**
+ * Routes events of type `eventtype` that carry `eventuserptr` to `func`, replacing an earlier
+ * registration for the same pair. With a null `func` the registration is removed.
+ * @return 0, or -1 when the type is not known.
+ */
+KD_API KDint kdInstallCallback(KDCallbackFunc* func, KDint eventtype, void* eventuserptr);
+
+/**
+ * Starts a timer whose `KD_EVENT_TIMER` events carry `eventuserptr`.
+ * @param intervalNs  time to the first and between further events in nanoseconds; values below 1
+ *                    count as 1
+ * @param periodic    one of the `KD_TIMER_` types
+ * @return the timer, to be given back with `kdCancelTimer` also after a one-shot has fired; null
+ *         when the type is not known.
+ */
+KD_API KDTimer* kdSetTimer(KDint64 intervalNs, KDint periodic, void* eventuserptr);
+
+/**
+ * Ends and frees a timer. Under the event lock, none of its events is delivered afterwards.
+ * @return 0, or -1 when `timer` is null or is not a live timer (nothing is touched then).
+ */
+KD_API KDint kdCancelTimer(KDTimer* timer);
+
+/** Takes the event lock; the same thread may take it repeatedly. */
+KD_API void kdEventLockKOR(void);
+
+/** Releases the event lock once. */
+KD_API void kdEventUnlockKOR(void);
+
+/** 1 when the calling thread holds the event lock, else 0. */
+KD_API KDint kdHoldsEventLockKOR(void);
+
+/**
+ * Runs `func(user)` on the event thread under the event lock, after everything posted before.
+ * Never blocks. Functions still waiting when the process ends are dropped.
+ */
+KD_API void kdPostKOR(void (*func)(void* user), void* user);
+
+/**
+ * Returns once everything that was posted before the call has run. Must not be called with the
+ * event lock held or from the event thread (-1 is returned at once then, 0 otherwise).
+ */
+KD_API KDint kdDrainEventsKOR(void);
+
+/** Background work in flight; see `kdQueueWorkKOR`. */
+typedef struct KDWork KDWork;
+
+/**
+ * Runs `work(user)` on a worker thread without any lock, then `done(user)` on the event thread
+ * under the event lock. `work` may block; at most four pieces of work run at a time.
+ * @return a handle that is valid until `done` has been called or the work has been cancelled.
+ */
+KD_API KDWork* kdQueueWorkKOR(void (*work)(void* user), void (*done)(void* user), void* user);
+
+/**
+ * Under the event lock: guarantees that `done` is not called any more. The function `work` may be
+ * running and then runs to its end; `release(user)` is called on the event thread, under the event
+ * lock, once neither function can run any more, so that the owner can free `user`.
+ */
+KD_API void kdCancelWorkKOR(KDWork* work, void (*release)(void* user));
+
+KD_EXTERN_C_END
+
+#endif
