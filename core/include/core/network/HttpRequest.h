@@ -1,0 +1,115 @@
+/**
+ * @file
+ * One HTTP request and the builder of multipart bodies.
+ */
+#pragma once
+
+#include <boost/shared_ptr.hpp>
+#include <string>
+#include <utility>
+#include <vector>
+
+#include "core/Export.h"
+#include "core/network/NetworkTaskWriter.h"
+
+namespace Network {
+
+/** What is to be sent in one attempt. Built by a task, then not changed. */
+class KORVEL_CORE_API HttpRequest {
+  public:
+    /**
+     * Builds bodies of type multipart/form-data, byte for byte: each field is
+     * `--BOUNDARY CRLF headers CRLF CRLF value CRLF`, the end is `--BOUNDARY-- CRLF`. In names, a
+     * double quote, CR and LF are written as %22, %0D and %0A, so that none can leave its place.
+     */
+    class KORVEL_CORE_API MultipartBuilder {
+      public:
+        static boost::shared_ptr<MultipartBuilder> create(const std::string& boundary);
+
+        const std::string& getBoundary() const { return boundary; }
+
+        /**
+         * Appends a whole field to the encoded content; the arguments are those of `startField`.
+         */
+        void addField(const std::string& name, const std::string& value, bool asFile,
+                      bool base64, const std::string& contentType);
+
+        /**
+         * The text that opens a field; the content is not changed.
+         * @param asFile      adds a file name equal to the field's name
+         * @param base64      announces `Content-Transfer-Encoding: base64`; the value is then
+         *                    expected to be encoded already
+         * @param contentType adds a `Content-Type` line unless empty
+         */
+        std::string startField(const std::string& name, bool asFile, bool base64,
+                               const std::string& contentType) const;
+
+        /** The text that ends a field. */
+        std::string endField() const;
+
+        /** The text that ends the whole body. */
+        std::string endEncodedContent() const;
+
+        /** All fields added so far and the end of the body. */
+        std::string getEncodedContent() const;
+
+      private:
+        explicit MultipartBuilder(std::string boundaryText);
+
+        std::string boundary;
+        std::string content;
+    };
+
+    /**
+     * @param url       used as it stands. A URL with control characters or blanks, or of another
+     *                  scheme than http and https, makes the attempt fail without being sent.
+     * @param method    "GET" or "POST"
+     * @param timeoutMs bounds each wait for the peer, on the platform clock: for the connection,
+     *                  for taking bytes that are ready, and for the answer after the last of them.
+     *                  The time in which a streamed body is still being written does not count.
+     * @param followRedirects follow 3xx answers; never done for a request with a body
+     */
+    static boost::shared_ptr<HttpRequest> create(const std::string& url, const std::string& method,
+                                                 int timeoutMs, bool followRedirects);
+
+    /** True: the body is what `setWriter` gives, sent with chunked transfer coding. */
+    void setChunked(bool value) { chunked = value; }
+    bool isChunked() const { return chunked; }
+
+    /** The body's source for a chunked request. */
+    void setWriter(const boost::shared_ptr<NetworkTaskWriter>& source) { writer = source; }
+    const boost::shared_ptr<NetworkTaskWriter>& getWriter() const { return writer; }
+
+    void setBoundary(const std::string& text) { boundary = text; }
+
+    /** Adds the header `Content-Type: multipart/form-data; boundary=...` with the set boundary. */
+    void addBoundaryHeader();
+
+    /** Sets boundary, boundary header and the whole body. */
+    void setBody(const std::string& boundaryText, std::string content);
+
+    /** Adds a header; one with a control character in it is refused and logged. */
+    void addHeader(const std::string& name, const std::string& value);
+
+    const std::string& getUrl() const { return url; }
+    const std::string& getMethod() const { return method; }
+    int getTimeoutMs() const { return timeoutMs; }
+    bool getFollowRedirects() const { return followRedirects; }
+    const std::string& getBody() const { return body; }
+    const std::vector<std::pair<std::string, std::string>>& getHeaders() const { return headers; }
+
+  private:
+    HttpRequest(std::string urlText, std::string methodText, int timeout, bool redirects);
+
+    std::string url;
+    std::string method;
+    int timeoutMs;
+    bool followRedirects;
+    bool chunked = false;
+    boost::shared_ptr<NetworkTaskWriter> writer;
+    std::string boundary;
+    std::string body;
+    std::vector<std::pair<std::string, std::string>> headers;
+};
+
+}  // namespace Network

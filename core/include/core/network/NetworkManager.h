@@ -1,0 +1,56 @@
+/**
+ * @file
+ * Reachability and the owner of the network thread.
+ */
+#pragma once
+
+#include <boost/scoped_ptr.hpp>
+#include <boost/shared_ptr.hpp>
+#include <string>
+
+#include "core/Export.h"
+#include "core/util/Singleton.h"
+
+namespace Network {
+
+class Transport;
+
+/** The process's view of the network. */
+class KORVEL_CORE_API NetworkManager : public Util::Singleton<NetworkManager> {
+  public:
+    /** Reachability: 0 and 1 are fixed; every other value is a connection that is metered. */
+    enum Reachability { UNREACHABLE = 0, WIFI = 1, METERED = 2 };
+
+    static NetworkManager& getInstance();
+
+    /** Ends all transfers and the network thread; bounded, whatever the peers do. */
+    ~NetworkManager() override;
+
+    /**
+     * How the network can be reached now: the embedder's word if there is one, else what the
+     * system says. A host that has only its loopback interface counts as 1. Any thread; never
+     * waits for the network.
+     */
+    int getReachability() const;
+
+    /** Sets the embedder's word; -1 takes it back. Any thread. */
+    void overrideReachability(int value);
+
+    /**
+     * PEM file with the certificate authorities to trust instead of the system's; empty for the
+     * system's. Concerns connections opened afterwards. Any thread.
+     */
+    void setCertificateFile(const std::string& path);
+
+    /** The transport under the holders; for the library's own use. */
+    Transport& getTransport();
+
+  private:
+    friend class Util::Singleton<NetworkManager>;
+    NetworkManager();
+
+    class Impl;
+    boost::scoped_ptr<Impl> impl;
+};
+
+}  // namespace Network

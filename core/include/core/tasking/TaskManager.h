@@ -1,0 +1,42 @@
+/**
+ * @file
+ * The shared worker pool.
+ */
+#pragma once
+
+#include <boost/scoped_ptr.hpp>
+#include <boost/shared_ptr.hpp>
+
+#include "core/Export.h"
+#include "core/tasking/Task.h"
+#include "core/util/Singleton.h"
+
+namespace Tasking {
+
+/** Runs tasks on the platform layer's workers. All operations take the event lock. */
+class KORVEL_CORE_API TaskManager : public Util::Singleton<TaskManager> {
+  public:
+    static TaskManager& getInstance();
+    ~TaskManager() override;
+
+    /**
+     * Queues a task; it is kept alive until it has completed or its cancellation has taken effect.
+     * @param priority reserved; pass 0
+     */
+    void addTask(const boost::shared_ptr<Task>& task, int priority);
+
+    /**
+     * Guarantees that the task's `onTaskCompleted` is not called any more; never waits for the
+     * work, which may still be running. Does nothing for a task that is not queued or running.
+     */
+    void cancelTask(const boost::shared_ptr<Task>& task);
+
+  private:
+    friend class Util::Singleton<TaskManager>;
+    TaskManager();
+
+    class Impl;
+    boost::scoped_ptr<Impl> impl;
+};
+
+}  // namespace Tasking

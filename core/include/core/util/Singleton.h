@@ -1,0 +1,73 @@
+/**
+ * @file
+ * Process-wide singletons with an ordered end.
+ */
+#pragma once
+
+#include <atomic>
+
+#include "core/Export.h"
+#include "core/util/EventLock.h"
+
+namespace Util {
+
+/** What the storage owns: anything that can be deleted. */
+class KORVEL_CORE_API SingletonBase {
+  public:
+    virtual ~SingletonBase();
+
+  protected:
+    SingletonBase() = default;
+    SingletonBase(const SingletonBase&) = delete;
+    SingletonBase& operator=(const SingletonBase&) = delete;
+};
+
+/**
+ * Owns every singleton and deletes them in the reverse order of their making when the process ends
+ * or the library is unloaded, before the platform layer stops its threads.
+ */
+class KORVEL_CORE_API SingletonStorage {
+  public:
+    /** Takes ownership. Any thread. */
+    static void addSingleton(SingletonBase* singleton);
+
+    /**
+     * Deletes all singletons now, under the event lock; each is made anew at its next use. For
+     * tests and for embedders that unload the library.
+     */
+    static void destroyAll();
+};
+
+/**
+ * Base of a singleton class `T`, which derives from `Singleton<T>` and has a default constructor
+ * that `Singleton<T>` may call. Classes that are used across library boundaries offer a
+ * `getInstance` of their own that is not inline, so that there is one instance per process.
+ */
+template <typename T>
+class Singleton : public SingletonBase {
+  public:
+    /** The instance, made under the event lock on first use. Any thread. */
+    static T& instance() {
+        T* existing = pointer.load(std::memory_order_acquire);
+        if (existing != nullptr) {
+            return *existing;
+        }
+        EventLock lock;
+        if (pointer.load(std::memory_order_relaxed) == nullptr) {
+            T* made = new T();
+            pointer.store(made, std::memory_order_release);
+            SingletonStorage::addSingleton(made);
+        }
+        return *pointer.load(std::memory_order_relaxed);
+    }
+
+    ~Singleton() override { pointer.store(nullptr, std::memory_order_release); }
+
+  protected:
+    Singleton() = default;
+
+  private:
+    static inline std::atomic<T*> pointer{nullptr};
+};
+
+}  // namespace Util

@@ -1,0 +1,48 @@
+/**
+ * @file
+ * Guarded XML parsing.
+ */
+#pragma once
+
+#include <cstddef>
+#include <string>
+#include <vector>
+
+#include "core/Export.h"
+
+class TiXmlDocument;
+
+namespace Util {
+
+/**
+ * Parses XML from sources that are not trusted with TinyXML, which by itself reads past its buffer
+ * on truncated UTF-8 and overflows the stack on deep nesting. Stateless; any thread.
+ */
+class KORVEL_CORE_API XmlUtils {
+  public:
+    /** Largest accepted text in bytes (1 MiB). */
+    static constexpr std::size_t MAX_SIZE_BYTES = 1024 * 1024;
+    /** Deepest accepted nesting of elements. */
+    static constexpr unsigned MAX_DEPTH = 64;
+
+    /**
+     * Tells what in `xml` must not be handed to the parser: a text beyond `MAX_SIZE_BYTES`, bytes
+     * that are not UTF-8 (an embedded zero byte counts), nesting beyond `MAX_DEPTH`.
+     * @return an empty text when the parser may have it, else the reason in plain words
+     */
+    static std::string findHazard(const std::string& xml);
+
+    /**
+     * Checks and parses a text. Zero bytes at its end are not part of it.
+     * @param bytes          the text
+     * @param keepWhiteSpace keep runs of white space in texts as they stand; otherwise they are
+     *                       condensed to one blank
+     * @param[out] document  the parsed document; what it holds after a failure is not specified
+     * @return true when the whole text was parsed without an error; otherwise a line with the
+     *         reason was logged
+     */
+    static bool load(const std::vector<unsigned char>& bytes, bool keepWhiteSpace,
+                     TiXmlDocument& document);
+};
+
+}  // namespace Util
