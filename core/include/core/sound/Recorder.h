@@ -8,10 +8,10 @@
 #include <boost/shared_ptr.hpp>
 #include <boost/weak_ptr.hpp>
 #include <functional>
-#include <list>
 
 #include "core/Export.h"
 #include "core/sound/SoundDataBuffer.h"
+#include "core/util/ListenerList.h"
 
 namespace Sound {
 
@@ -101,7 +101,7 @@ class KORVEL_CORE_API Recorder : public boost::enable_shared_from_this<Recorder>
     void notifyError();
 
   private:
-    std::list<boost::weak_ptr<RecorderListener>> listeners;
+    Util::ListenerList<RecorderListener> listeners;
     int sampleRate = 16000;
     int bufferLengthMs = 100;
     Mode mode = MODE_VOICE_RECOGNITION;
