@@ -29,13 +29,15 @@ target_compile_options(korvel_options INTERFACE $<$<COMPILE_LANGUAGE:CXX>:-Wnon-
 if(CMAKE_CXX_COMPILER_ID STREQUAL "GNU")
     target_compile_options(korvel_options INTERFACE -Wno-null-dereference)
 endif()
-target_compile_options(korvel_options INTERFACE
-    $<$<AND:$<NOT:$<CONFIG:Debug>>,$<STREQUAL:${TALVOX_SANITIZERS},>>:-U_FORTIFY_SOURCE -D_FORTIFY_SOURCE=2>)
 
 if(TALVOX_SANITIZERS)
     target_compile_options(korvel_options INTERFACE
         -fsanitize=${TALVOX_SANITIZERS} -fno-omit-frame-pointer -fno-sanitize-recover=all -O1)
     target_link_options(korvel_options INTERFACE -fsanitize=${TALVOX_SANITIZERS})
+else()
+    # Needs the optimiser, and hides errors from the sanitizers.
+    target_compile_options(korvel_options INTERFACE
+        $<$<NOT:$<CONFIG:Debug>>:-U_FORTIFY_SOURCE> $<$<NOT:$<CONFIG:Debug>>:-D_FORTIFY_SOURCE=2>)
 endif()
 if(TALVOX_COVERAGE)
     target_compile_options(korvel_options INTERFACE --coverage)
