@@ -1,0 +1,32 @@
+# Install rules and the CMake package, so that find_package(KorvelTalvox) works from an install
+# tree. All headers go below one directory of our own.
+include(CMakePackageConfigHelpers)
+
+set(korvel_headers ${CMAKE_INSTALL_INCLUDEDIR}/KorvelTalvox)
+set(korvel_package ${CMAKE_INSTALL_LIBDIR}/cmake/KorvelTalvox)
+
+set_target_properties(KorvelPAL KorvelCore KorvelLibs KorvelTalvox PROPERTIES
+    INSTALL_RPATH "$ORIGIN")
+install(TARGETS KorvelPAL KorvelCore KorvelLibs KorvelTalvox korvel_boost_assert
+        EXPORT KorvelTalvoxTargets
+        LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR})
+install(DIRECTORY pal/include/ core/include/ libs/include/ DESTINATION ${korvel_headers})
+install(DIRECTORY talvox util DESTINATION ${korvel_headers}
+        FILES_MATCHING PATTERN "*.h" PATTERN "impl" EXCLUDE)
+install(EXPORT KorvelTalvoxTargets NAMESPACE KorvelTalvox:: DESTINATION ${korvel_package})
+
+configure_package_config_file(cmake/KorvelTalvoxConfig.cmake.in
+    ${CMAKE_BINARY_DIR}/KorvelTalvoxConfig.cmake
+    INSTALL_DESTINATION ${korvel_package})
+write_basic_package_version_file(${CMAKE_BINARY_DIR}/KorvelTalvoxConfigVersion.cmake
+    COMPATIBILITY SameMajorVersion)
+install(FILES ${CMAKE_BINARY_DIR}/KorvelTalvoxConfig.cmake
+              ${CMAKE_BINARY_DIR}/KorvelTalvoxConfigVersion.cmake
+        DESTINATION ${korvel_package})
+install(FILES LICENSE README.md DESTINATION ${CMAKE_INSTALL_DATADIR}/doc/korveltalvox)
+
+if(TALVOX_BUILD_TOOLS)
+    set_target_properties(talvox talvox-gateway PROPERTIES
+        INSTALL_RPATH "$ORIGIN/../${CMAKE_INSTALL_LIBDIR}")
+    install(TARGETS talvox talvox-gateway RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR})
+endif()
