@@ -1,0 +1,30 @@
+# Installs the build into a staging directory, builds the consumer project against it and runs its
+# programs. The example is taken out of the README, so that what stands there compiles.
+file(REMOVE_RECURSE ${WORK_DIR})
+file(MAKE_DIRECTORY ${WORK_DIR})
+
+function(run)
+    execute_process(COMMAND ${ARGV} RESULT_VARIABLE status)
+    if(NOT status EQUAL 0)
+        list(JOIN ARGV " " command)
+        message(FATAL_ERROR "failed (${status}): ${command}")
+    endif()
+endfunction()
+
+file(READ ${SOURCE_DIR}/README.md readme)
+string(REGEX MATCH "```cpp\n([^`]*)```" block "${readme}")
+if(NOT block)
+    message(FATAL_ERROR "README.md has no C++ example")
+endif()
+file(WRITE ${WORK_DIR}/example.cpp "${CMAKE_MATCH_1}")
+
+run(${CMAKE_COMMAND} --install ${BUILD_DIR} --prefix ${WORK_DIR}/install)
+run(${CMAKE_COMMAND} -S ${SOURCE_DIR}/tests/package/consumer -B ${WORK_DIR}/build -G Ninja
+    -DCMAKE_PREFIX_PATH=${WORK_DIR}/install
+    -DCMAKE_BUILD_TYPE=Debug
+    -DCMAKE_CXX_COMPILER=${CXX_COMPILER}
+    -DCMAKE_CXX_FLAGS=${CXX_FLAGS}
+    -DREADME_EXAMPLE=${WORK_DIR}/example.cpp
+    -DAPI_TESTS=${SOURCE_DIR}/tests/api)
+run(${CMAKE_COMMAND} --build ${WORK_DIR}/build)
+run(${WORK_DIR}/build/api_tests)
