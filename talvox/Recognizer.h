@@ -1,0 +1,71 @@
+/**
+ * @file
+ * Base of every recognizer.
+ */
+#pragma once
+
+#include <boost/enable_shared_from_this.hpp>
+#include <boost/shared_ptr.hpp>
+#include <boost/weak_ptr.hpp>
+#include <string>
+
+#include "core/util/ListenerList.h"
+#include "talvox/Export.h"
+#include "talvox/RecognitionResult.h"
+#include "talvox/RecognizerListener.h"
+#include "talvox/Settings.h"
+#include "talvox/SpeechError.h"
+
+namespace Talvox {
+
+class Talvox;
+
+/**
+ * One recognition. Made by `Talvox::createRecognizer` and owned by shared pointer; may be started
+ * once. `start`, `stop` and `cancel` may be called from any thread and from inside a listener; they
+ * take the event lock and never wait for the network or a device.
+ */
+class TALVOX_API Recognizer : public boost::enable_shared_from_this<Recognizer> {
+  public:
+    Recognizer(const Recognizer&) = delete;
+    Recognizer& operator=(const Recognizer&) = delete;
+    virtual ~Recognizer();
+
+    /** Begins. A failure is reported to the listeners, possibly before this returns. */
+    virtual void start() = 0;
+    /** Ends recording; the recognition goes on to its results. */
+    virtual void stop() = 0;
+    /** Gives up; the listeners hear `ErrorCanceled` unless it is over already. */
+    virtual void cancel() = 0;
+
+    /** Adds a listener, held weakly, called after those added before. Takes the event lock. */
+    void addListener(const boost::weak_ptr<RecognizerListener>& listener);
+
+    /** The validated settings of this recognition; never change. */
+    const boost::shared_ptr<const Settings>& getSettings() const { return settings; }
+    /** The facade that made this recognizer. */
+    const Talvox* getEngine() const { return engine; }
+
+  protected:
+    /** @param facade not owned; must outlive the recognizer */
+    Recognizer(const Talvox* facade, boost::shared_ptr<const Settings> recognizerSettings);
+
+    /**
+     * Reports the error to all live listeners. Changes no state of the recognizer; both this and
+     * `callOnResults` keep it alive until the last listener has been called.
+     */
+    void callOnError(SpeechError error);
+
+    /** Judges the results by the engine's thresholds and hands them to all live listeners. */
+    void callOnResults(const boost::shared_ptr<const RecognitionResults>& results,
+                       const std::string& requestId);
+
+    /** For the events of derived classes; see `Util::ListenerList`. */
+    Util::ListenerList<RecognizerListener> listeners;
+
+  private:
+    boost::shared_ptr<const Settings> settings;
+    const Talvox* engine;
+};
+
+}  // namespace Talvox
