@@ -1,0 +1,112 @@
+#include <cstdio>
+#include <mutex>
+#include <string>
+#include <vector>
+
+#include "pal/kd_log.h"
+
+namespace {
+
+constexpr std::size_t SHORT_MESSAGE = 512;
+
+struct LogSink {
+    std::mutex mutex;
+    KDLogSinkFuncKOR* func = nullptr;
+    void* user = nullptr;
+};
+
+thread_local bool insideSink = false;
+
+// Never destroyed: threads may outlive the static objects of the process.
+LogSink& logSink() {
+    static LogSink* const sink = new LogSink;
+    return *sink;
+}
+
+class InsideSink {
+  public:
+    InsideSink() { insideSink = true; }
+    ~InsideSink() { insideSink = false; }
+    InsideSink(const InsideSink&) = delete;
+    InsideSink& operator=(const InsideSink&) = delete;
+};
+
+void writeToStandardError(const char* message) {
+    std::string line(message);
+    line += '\n';
+    std::fwrite(line.data(), 1, line.size(), stderr);
+}
+
+}  // namespace
+
+void kdLogMessage(const char* string) {
+    const char* const message = string != nullptr ? string : "";
+    if (insideSink) {
+        writeToStandardError(message);  // a sink that logs must not call itself
+        return;
+    }
+    LogSink& sink = logSink();
+    const std::lock_guard<std::mutex> lock(sink.mutex);
+    if (sink.func == nullptr) {
+        writeToStandardError(message);
+        return;
+    }
+    const InsideSink inside;
+    sink.func(message, sink.user);
+}
+
+void kdLogFormatMessage(const char* format, ...) {
+    va_list args;
+    va_start(args, format);
+    kdLogFormatMessageVargs(format, args);
+    va_end(args);
+}
+
+void kdLogFormatMessageVargs(const char* format, va_list args) {
+    if (format == nullptr) {
+        kdLogMessage(nullptr);
+        return;
+    }
+    char buffer[SHORT_MESSAGE];
+    va_list again;
+    va_copy(again, args);
+    const int length = std::vsnprintf(buffer, sizeof buffer, format, args);
+    if (length < 0) {
+        kdLogMessage(format);  // cannot be formatted; better than nothing
+    } else if (static_cast<std::size_t>(length) < sizeof buffer) {
+        kdLogMessage(buffer);
+    } else {
+        std::vector<char> longBuffer(static_cast<std::size_t>(length) + 1);
+        std::vsnprintf(longBuffer.data(), longBuffer.size(), format, again);
+        kdLogMessage(longBuffer.data());
+    }
+    va_end(again);
+}
+
+void kdSetLogSinkKOR(KDLogSinkFuncKOR* func, void* user) {
+    LogSink& sink = logSink();
+    // The thread that is inside the sink holds the mutex already.
+    const std::unique_lock<std::mutex> lock =
+        insideSink ? std::unique_lock<std::mutex>() : std::unique_lock<std::mutex>(sink.mutex);
+    sink.func = func;
+    sink.user = user;
+}
+
+KDint kdSprintf_s(char* buf, KDsize bufsize, const char* format, ...) {
+    if (buf == nullptr || bufsize == 0) {
+        return -1;
+    }
+    buf[0] = '\0';
+    if (format == nullptr) {
+        return -1;
+    }
+    va_list args;
+    va_start(args, format);
+    const int length = std::vsnprintf(buf, bufsize, format, args);
+    va_end(args);
+    if (length < 0) {
+        buf[0] = '\0';
+        return -1;
+    }
+    return static_cast<KDsize>(length) < bufsize ? length : static_cast<KDint>(bufsize - 1);
+}

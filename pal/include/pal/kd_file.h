@@ -18,7 +18,11 @@ KD_EXTERN_C_BEGIN
 
 typedef struct KDFile KDFile;
 
-typedef enum KDfileSeekOrigin { KD_SEEK_SET = 0, KD_SEEK_CUR = 1, KD_SEEK_END = 2 } KDfileSeekOrigin;
+typedef enum KDfileSeekOrigin {
+    KD_SEEK_SET = 0,
+    KD_SEEK_CUR = 1,
+    KD_SEEK_END = 2
+} KDfileSeekOrigin;
 
 /**
  * Opens a file; `mode` as for C's `fopen`.

@@ -1,0 +1,55 @@
+#include "event_lock.h"
+
+#include <mutex>
+
+#include "pal/kd_assert.h"
+
+namespace {
+
+thread_local int levelsHeld = 0;
+
+// Never destroyed: threads may outlive the static objects of the process.
+std::mutex& eventMutex() {
+    static std::mutex* const mutex = new std::mutex;
+    return *mutex;
+}
+
+}  // namespace
+
+void kdEventLockKOR(void) {
+    if (levelsHeld == 0) {
+        eventMutex().lock();
+    }
+    ++levelsHeld;
+}
+
+void kdEventUnlockKOR(void) {
+    if (!KOR_ASSERT(levelsHeld > 0)) {
+        return;
+    }
+    if (--levelsHeld == 0) {
+        eventMutex().unlock();
+    }
+}
+
+KDint kdHoldsEventLockKOR(void) {
+    return levelsHeld > 0 ? 1 : 0;
+}
+
+namespace korvel_pal {
+
+EventLockRelease::EventLockRelease() : levels(levelsHeld) {
+    if (levels > 0) {
+        levelsHeld = 0;
+        eventMutex().unlock();
+    }
+}
+
+EventLockRelease::~EventLockRelease() {
+    if (levels > 0) {
+        eventMutex().lock();
+        levelsHeld = levels;
+    }
+}
+
+}  // namespace korvel_pal

@@ -1,0 +1,195 @@
+#include "event_loop.h"
+
+#include <pthread.h>
+#include <signal.h>
+
+#include <chrono>
+
+#include "event_lock.h"
+#include "pal/kd_assert.h"
+#include "pal/kd_log.h"
+#include "timer_table.h"
+#include "work_queue.h"
+
+namespace korvel_pal {
+
+namespace {
+
+constexpr std::chrono::seconds STOP_LIMIT{2};
+constexpr std::int64_t NS_PER_MS = 1000000;
+
+// Signals belong to the application's threads: the event thread and the workers, which inherit
+// its mask, must not be the ones that a handler interrupts.
+class AllSignalsBlocked {
+  public:
+    AllSignalsBlocked() {
+        sigset_t all;
+        sigfillset(&all);
+        pthread_sigmask(SIG_SETMASK, &all, &before);
+    }
+    ~AllSignalsBlocked() { pthread_sigmask(SIG_SETMASK, &before, nullptr); }
+    AllSignalsBlocked(const AllSignalsBlocked&) = delete;
+    AllSignalsBlocked& operator=(const AllSignalsBlocked&) = delete;
+
+  private:
+    sigset_t before{};
+};
+
+struct StopAtExit {
+    StopAtExit() = default;
+    ~StopAtExit() { EventLoop::instance().stop(); }
+    StopAtExit(const StopAtExit&) = delete;
+    StopAtExit& operator=(const StopAtExit&) = delete;
+};
+
+// Made when the library is loaded, hence destroyed after all that depends on the library.
+const StopAtExit stopAtExit;
+
+}  // namespace
+
+EventLoop& EventLoop::instance() {
+    static EventLoop* const eventLoop = new EventLoop;
+    return *eventLoop;
+}
+
+void EventLoop::post(void (*func)(void*), void* user) {
+    const std::lock_guard<std::mutex> lock(mutex);
+    if (isStopping() || !start()) {
+        return;
+    }
+    pending.push_back({func, user});
+    ++postedCount;
+    uv_async_send(&async);
+}
+
+void EventLoop::wake() {
+    const std::lock_guard<std::mutex> lock(mutex);
+    if (!isStopping() && start()) {
+        uv_async_send(&async);
+    }
+}
+
+bool EventLoop::drain() {
+    std::unique_lock<std::mutex> lock(mutex);
+    const std::uint64_t wanted = postedCount;
+    changed.wait(lock, [this, wanted] { return handledCount >= wanted || isStopping(); });
+    return handledCount >= wanted;
+}
+
+void EventLoop::stop() {
+    {
+        const std::lock_guard<std::mutex> lock(mutex);
+        if (stopping.exchange(true) || !started) {
+            return;
+        }
+        uv_async_send(&async);
+        changed.notify_all();
+    }
+    if (thread.get_id() == std::this_thread::get_id()) {
+        return;  // a callback ends the process
+    }
+    // Whoever ends the process with the lock held must not make the event thread wait for it.
+    const EventLockRelease release;
+    std::unique_lock<std::mutex> lock(mutex);
+    const bool ended = changed.wait_for(lock, STOP_LIMIT, [this] { return finished; });
+    lock.unlock();
+    if (ended) {
+        thread.join();
+    } else {
+        thread.detach();
+        kdLogMessage("PAL: the event thread is blocked and was left behind");
+    }
+}
+
+bool EventLoop::start() {
+    if (started) {
+        return true;
+    }
+    const AllSignalsBlocked blocked;
+    if (!KOR_ASSERT(uv_loop_init(&loop) == 0)) {
+        return false;
+    }
+    if (!KOR_ASSERT(uv_async_init(&loop, &async, &EventLoop::onWake) == 0)) {
+        return false;
+    }
+    uv_timer_init(&loop, &timer);
+    async.data = this;
+    timer.data = this;
+    thread = std::thread(&EventLoop::run, this);
+    started = true;
+    return true;
+}
+
+void EventLoop::run() {
+    uv_run(&loop, UV_RUN_DEFAULT);
+    uv_loop_close(&loop);
+    const std::lock_guard<std::mutex> lock(mutex);
+    finished = true;
+    changed.notify_all();
+}
+
+void EventLoop::onWake(uv_async_t* handle) {
+    EventLoop& self = *static_cast<EventLoop*>(handle->data);
+    self.runPosts();
+    if (self.isStopping()) {
+        self.closeHandles();
+    } else {
+        self.armTimer();
+    }
+}
+
+void EventLoop::onTimer(uv_timer_t* handle) {
+    TimerTable::instance().fireDue();
+    static_cast<EventLoop*>(handle->data)->armTimer();
+}
+
+// One swap for each wake-up, so that posts which post again cannot starve the timers.
+void EventLoop::runPosts() {
+    {
+        const std::lock_guard<std::mutex> lock(mutex);
+        current.swap(pending);
+    }
+    for (const Post& post : current) {
+        const EventLockGuard lock;
+        if (isStopping()) {
+            return;
+        }
+        post.func(post.user);
+    }
+    const std::lock_guard<std::mutex> lock(mutex);
+    handledCount += current.size();
+    current.clear();
+    changed.notify_all();
+}
+
+void EventLoop::armTimer() {
+    const std::int64_t waitNs = TimerTable::instance().timeToNext();
+    if (waitNs == TimerTable::NEVER) {
+        uv_timer_stop(&timer);
+        return;
+    }
+    const std::int64_t waitMs = waitNs / NS_PER_MS + (waitNs % NS_PER_MS != 0 ? 1 : 0);
+    uv_update_time(&loop);
+    uv_timer_start(&timer, &EventLoop::onTimer, static_cast<std::uint64_t>(waitMs), 0);
+}
+
+void EventLoop::closeHandles() {
+    WorkQueue::instance().cancelSubmitted();
+    uv_close(reinterpret_cast<uv_handle_t*>(&timer), nullptr);
+    uv_close(reinterpret_cast<uv_handle_t*>(&async), nullptr);
+}
+
+}  // namespace korvel_pal
+
+void kdPostKOR(void (*func)(void* user), void* user) {
+    if (KOR_ASSERT(func)) {
+        korvel_pal::EventLoop::instance().post(func, user);
+    }
+}
+
+KDint kdDrainEventsKOR(void) {
+    if (kdHoldsEventLockKOR() != 0) {
+        return -1;
+    }
+    return korvel_pal::EventLoop::instance().drain() ? 0 : -1;
+}

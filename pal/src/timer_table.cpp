@@ -1,0 +1,159 @@
+#include "timer_table.h"
+
+#include <algorithm>
+
+#include "callback_table.h"
+#include "clock.h"
+#include "event_lock.h"
+#include "event_loop.h"
+
+namespace korvel_pal {
+
+namespace {
+
+// So many events at most between two looks at the event loop's other work: a timer that can never
+// catch up must not shut out the rest.
+constexpr int BATCH = 64;
+
+bool isTimerType(KDint type) {
+    return type == KD_TIMER_ONESHOT || type == KD_TIMER_PERIODIC_AVERAGE ||
+           type == KD_TIMER_PERIODIC_MINIMUM;
+}
+
+}  // namespace
+
+TimerTable& TimerTable::instance() {
+    static TimerTable* const table = new TimerTable;
+    return *table;
+}
+
+KDTimer* TimerTable::start(std::int64_t intervalNs, KDint type, void* userptr) {
+    KDTimer* handle = nullptr;
+    bool isNext = false;
+    {
+        const std::lock_guard<std::mutex> lock(mutex);
+        const std::int64_t interval = std::max<std::int64_t>(intervalNs, 1);
+        handle = timers.add({0, startedCount++, interval, type, userptr, false});
+        enqueue(handle, *timers.find(handle), addTime(Clock::now(), interval));
+        isNext = queue.begin()->second == handle && !Clock::isManual();
+    }
+    if (isNext) {
+        EventLoop::instance().wake();
+    }
+    return handle;
+}
+
+bool TimerTable::cancel(KDTimer* handle) {
+    const std::lock_guard<std::mutex> lock(mutex);
+    const Timer* const timer = timers.find(handle);
+    if (timer == nullptr) {
+        return false;
+    }
+    if (timer->waiting) {
+        queue.erase({timer->due, timer->order});
+    }
+    timers.remove(handle);
+    return true;
+}
+
+std::int64_t TimerTable::timeToNext() {
+    const std::lock_guard<std::mutex> lock(mutex);
+    if (queue.empty() || Clock::isManual()) {
+        return NEVER;
+    }
+    return std::max<std::int64_t>(queue.begin()->first.first - Clock::now(), 0);
+}
+
+void TimerTable::fireDue() {
+    const std::int64_t now = Clock::now();
+    for (int fired = 0; fired < BATCH; ++fired) {
+        const EventLockGuard lock;
+        KDEvent event{};
+        if (EventLoop::instance().isStopping() || !takeDue(now, false, event)) {
+            return;
+        }
+        CallbackTable::instance().deliver(event);
+    }
+}
+
+void TimerTable::useManualClock(std::int64_t now) {
+    switchClock([now] { Clock::useManual(now); });
+}
+
+void TimerTable::useRealClock() {
+    switchClock([] { Clock::useReal(); });
+    EventLoop::instance().wake();
+}
+
+void TimerTable::advanceManualClock(std::int64_t nanoseconds) {
+    const EventLockGuard lock;
+    if (!Clock::isManual()) {
+        return;
+    }
+    const std::int64_t end = addTime(Clock::now(), std::max<std::int64_t>(nanoseconds, 0));
+    KDEvent event{};
+    while (takeDue(end, true, event)) {
+        CallbackTable::instance().deliver(event);
+    }
+    // A callback may have moved the clock further, or chosen the real one.
+    if (Clock::isManual() && Clock::now() < end) {
+        Clock::useManual(end);
+    }
+}
+
+void TimerTable::enqueue(KDTimer* handle, Timer& timer, std::int64_t due) {
+    timer.due = due;
+    timer.waiting = true;
+    queue.emplace(std::make_pair(due, timer.order), handle);
+}
+
+// Takes the next timer that is due up to `limit` and puts it back at its next time if it is
+// periodic; moves the hand-driven clock to its due time.
+bool TimerTable::takeDue(std::int64_t limit, bool manual, KDEvent& event) {
+    const std::lock_guard<std::mutex> lock(mutex);
+    if (queue.empty() || Clock::isManual() != manual || queue.begin()->first.first > limit) {
+        return false;
+    }
+    KDTimer* const handle = queue.begin()->second;
+    queue.erase(queue.begin());
+    Timer& timer = *timers.find(handle);
+    timer.waiting = false;
+    event = {timer.due, KD_EVENT_TIMER, timer.userptr, handle};
+    if (manual && Clock::now() < timer.due) {
+        Clock::useManual(timer.due);
+    }
+    if (timer.type == KD_TIMER_PERIODIC_AVERAGE) {
+        enqueue(handle, timer, addTime(timer.due, timer.intervalNs));
+    } else if (timer.type == KD_TIMER_PERIODIC_MINIMUM) {
+        enqueue(handle, timer, addTime(Clock::now(), timer.intervalNs));
+    }
+    return true;
+}
+
+template <typename SwitchClock>
+void TimerTable::switchClock(SwitchClock change) {
+    const EventLockGuard eventLock;
+    const std::lock_guard<std::mutex> lock(mutex);
+    const std::int64_t before = Clock::now();
+    change();
+    const std::int64_t now = Clock::now();
+    Queue waiting;
+    waiting.swap(queue);
+    for (const auto& entry : waiting) {
+        const std::int64_t left = std::max<std::int64_t>(entry.first.first - before, 0);
+        enqueue(entry.second, *timers.find(entry.second), addTime(now, left));
+    }
+}
+
+}  // namespace korvel_pal
+
+KDTimer* kdSetTimer(KDint64 intervalNs, KDint periodic, void* eventuserptr) {
+    if (!korvel_pal::isTimerType(periodic)) {
+        return nullptr;
+    }
+    return korvel_pal::TimerTable::instance().start(intervalNs, periodic, eventuserptr);
+}
+
+KDint kdCancelTimer(KDTimer* timer) {
+    return korvel_pal::TimerTable::instance().cancel(timer) ? 0 : -1;
+}

@@ -1,0 +1,60 @@
+#pragma once
+
+#include <cstdint>
+#include <map>
+#include <mutex>
+#include <utility>
+
+#include "handle_table.h"
+#include "pal/kd_event.h"
+
+namespace korvel_pal {
+
+/**
+ * All timers, in the order in which they become due. On the real clock the event loop fires them,
+ * on the hand-driven one whoever moves it. Never destroyed, like the event loop.
+ */
+class TimerTable {
+  public:
+    static constexpr std::int64_t NEVER = -1;
+
+    static TimerTable& instance();
+
+    KDTimer* start(std::int64_t intervalNs, KDint type, void* userptr);
+    bool cancel(KDTimer* handle);
+
+    /** Nanoseconds until the event loop has to call `fireDue`, or `NEVER`. */
+    std::int64_t timeToNext();
+
+    /** Fires what is due on the real clock. */
+    void fireDue();
+
+    void useManualClock(std::int64_t now);
+    void useRealClock();
+    void advanceManualClock(std::int64_t nanoseconds);
+
+  private:
+    struct Timer {
+        std::int64_t due;
+        std::uint64_t order;
+        std::int64_t intervalNs;
+        KDint type;
+        void* userptr;
+        bool waiting;
+    };
+    using Queue = std::map<std::pair<std::int64_t, std::uint64_t>, KDTimer*>;
+
+    TimerTable() = default;
+
+    void enqueue(KDTimer* handle, Timer& timer, std::int64_t due);
+    bool takeDue(std::int64_t limit, bool manual, KDEvent& event);
+    template <typename SwitchClock>
+    void switchClock(SwitchClock change);
+
+    std::mutex mutex;
+    HandleTable<KDTimer, Timer> timers;
+    Queue queue;
+    std::uint64_t startedCount = 0;
+};
+
+}  // namespace korvel_pal
