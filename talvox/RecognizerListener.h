@@ -39,7 +39,7 @@ class TALVOX_API RecognizerListener {
     virtual void onRecordingDone(Recognizer* recognizer) = 0;
     /** A buffer of recorded sound. */
     virtual void onBufferReceived(Recognizer* recognizer, const Sound::SoundDataBuffer& buffer) = 0;
-    /** A new sound level, 0 to 1. */
+    /** A new sound level in decibels. */
     virtual void onPowerChanged(Recognizer* recognizer, float power) = 0;
     /** The end: hypotheses. Each listener gets an object of its own. */
     virtual void onResults(Recognizer* recognizer, boost::shared_ptr<Recognition> recognition) = 0;
