@@ -1,0 +1,71 @@
+#include "core/util/Timer.h"
+
+#include <boost/enable_shared_from_this.hpp>
+#include <boost/make_shared.hpp>
+#include <utility>
+
+#include "core/util/EventLock.h"
+#include "pal/kd_assert.h"
+#include "pal/kd_event.h"
+
+namespace Util {
+
+struct Timer::State : boost::enable_shared_from_this<Timer::State> {
+    explicit State(std::function<void()> function) : callback(std::move(function)) {}
+
+    void cancel() {
+        if (handle != nullptr) {
+            kdCancelTimer(handle);
+            handle = nullptr;
+        }
+    }
+
+    static void onTimer(const KDEvent* event) {
+        // The function may destroy the timer.
+        const boost::shared_ptr<State> self =
+            static_cast<State*>(event->userptr)->shared_from_this();
+        if (self->type == KD_TIMER_ONESHOT) {
+            self->cancel();
+        }
+        self->callback();
+    }
+
+    const std::function<void()> callback;
+    KDTimer* handle = nullptr;
+    int type = KD_TIMER_ONESHOT;
+};
+
+Timer::Timer(std::function<void()> callback)
+    : state(boost::make_shared<State>(std::move(callback))) {
+    KOR_ASSERT(state->callback);
+    kdInstallCallback(&State::onTimer, KD_EVENT_TIMER, state.get());
+}
+
+Timer::~Timer() {
+    const EventLock lock;
+    state->cancel();
+    kdInstallCallback(nullptr, KD_EVENT_TIMER, state.get());
+}
+
+void Timer::start(int type, int64_t periodNs) {
+    const EventLock lock;
+    if (!KOR_ASSERT(state->callback)) {
+        return;
+    }
+    state->cancel();
+    state->type = type;
+    state->handle = kdSetTimer(periodNs, type, state.get());
+    KOR_ASSERT(state->handle);
+}
+
+void Timer::cancel() {
+    const EventLock lock;
+    state->cancel();
+}
+
+bool Timer::isRunning() const {
+    const EventLock lock;
+    return state->handle != nullptr;
+}
+
+}  // namespace Util

@@ -23,17 +23,21 @@ class KORVEL_CORE_API SingletonBase {
 };
 
 /**
- * Owns every singleton and deletes them in the reverse order of their making when the process ends
- * or the library is unloaded, before the platform layer stops its threads.
+ * Owns every singleton. When the process ends or a library is unloaded, the singletons of a library
+ * are deleted in the reverse order of their making, under the event lock, before the library's
+ * static objects go and before the platform layer stops its threads.
  */
 class KORVEL_CORE_API SingletonStorage {
   public:
     /** Takes ownership. Any thread. */
     static void addSingleton(SingletonBase* singleton);
 
+    /** Deletes one singleton under the event lock; does nothing when it is null or gone already. */
+    static void destroySingleton(SingletonBase* singleton);
+
     /**
-     * Deletes all singletons now, under the event lock; each is made anew at its next use. For
-     * tests and for embedders that unload the library.
+     * Deletes all singletons now, the newest first, under the event lock; each is made anew at its
+     * next use. For tests and for embedders that unload the library.
      */
     static void destroyAll();
 };
@@ -52,11 +56,12 @@ class Singleton : public SingletonBase {
         if (existing != nullptr) {
             return *existing;
         }
-        EventLock lock;
+        const EventLock lock;
         if (pointer.load(std::memory_order_relaxed) == nullptr) {
             T* made = new T();
             pointer.store(made, std::memory_order_release);
             SingletonStorage::addSingleton(made);
+            static const EndOfLibrary endOfLibrary;
         }
         return *pointer.load(std::memory_order_relaxed);
     }
@@ -67,6 +72,17 @@ class Singleton : public SingletonBase {
     Singleton() = default;
 
   private:
+    /** Made with the first instance, so it is destroyed before all that existed by then. */
+    struct EndOfLibrary {
+        EndOfLibrary() = default;
+        ~EndOfLibrary() {
+            const EventLock lock;
+            SingletonStorage::destroySingleton(pointer.load(std::memory_order_relaxed));
+        }
+        EndOfLibrary(const EndOfLibrary&) = delete;
+        EndOfLibrary& operator=(const EndOfLibrary&) = delete;
+    };
+
     static inline std::atomic<T*> pointer{nullptr};
 };
 
