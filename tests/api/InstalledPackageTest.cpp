@@ -10,6 +10,7 @@
 #include "core/sound/FileRecorder.h"
 #include "libs/webrtc_vad.h"
 #include "pal/kd.h"
+#include "talvox/RecognizerListenerAdapter.h"
 #include "talvox/Talvox.h"
 #include "util/WavOutputStream.h"
 
@@ -18,15 +19,13 @@ using ::testing::HasSubstr;
 
 namespace {
 
-class EventLog : public Talvox::RecognizerListener {
+class EventLog : public Talvox::RecognizerListenerAdapter {
   public:
     std::vector<std::string> events;
 
     void onRecordingBegin(Talvox::Recognizer*) override { events.emplace_back("recordingBegin"); }
     void onSpeakingBegin(Talvox::Recognizer*) override { events.emplace_back("speakingBegin"); }
     void onRecordingDone(Talvox::Recognizer*) override { events.emplace_back("recordingDone"); }
-    void onBufferReceived(Talvox::Recognizer*, const Sound::SoundDataBuffer&) override {}
-    void onPowerChanged(Talvox::Recognizer*, float) override {}
     void onResults(Talvox::Recognizer*, boost::shared_ptr<Talvox::Recognition>) override {
         events.emplace_back("results");
     }
