@@ -1,0 +1,203 @@
+#include "CommandLine.h"
+
+#include <CLI/CLI.hpp>
+#include <string>
+
+#include "ExitStatus.h"
+#include "SettingsCommand.h"
+#include "SoundInput.h"
+#include "UsageError.h"
+#include "VadCommand.h"
+#include "talvox/Settings.h"
+#include "talvox/Talvox.h"
+
+#ifndef TALVOX_BUILD_ID
+#define TALVOX_BUILD_ID "unknown"
+#endif
+
+namespace Cli {
+
+namespace {
+
+using Talvox::Settings;
+
+const char* const RATE_HELP =
+    "Sample rate in Hz of the recognition, and of raw sound on standard input";
+
+/** What the arguments are read into. */
+struct Arguments {
+    RecognizeOptions recognize;
+    VadOptions vad;
+    SettingsOptions settings;
+};
+
+/** Adds an option that stands for one setting. */
+CLI::Option* addSetting(CLI::App& command, SettingsOptions& settings, const std::string& key,
+                        const std::string& name, const std::string& help) {
+    return command.add_option_function<std::string>(
+        name,
+        [&settings, key](const std::string& text) {
+            settings.explicitValues.emplace_back(key, text);
+        },
+        help);
+}
+
+CLI::Option* addRate(CLI::App& command, SettingsOptions& settings) {
+    return addSetting(command, settings, Settings::SKS_SAMPLE_RATE, "--rate", RATE_HELP)
+        ->type_name("HZ")
+        ->check(CLI::Range(8000, 44100).description(""));
+}
+
+CLI::Option* addVad(CLI::App& command, SettingsOptions& settings) {
+    return addSetting(command, settings, Settings::SKS_VAD_SETTINGS, "--vad",
+                      "Parameters of the speech detector, such as \"activityon=0.6;framems=20\"")
+        ->type_name("TEXT");
+}
+
+void addSettingsSources(CLI::App& command, SettingsOptions& settings) {
+    command
+        .add_option(
+            "--settings", settings.file,
+            "Configuration document whose element " + Settings::XML_PATH_DFLT + " holds settings")
+        ->type_name("FILE.xml");
+    command
+        .add_option("--set", settings.assignments,
+                    "Any setting by its key, typed as the settings are; may be repeated")
+        ->type_name("KEY=VALUE")
+        ->allow_extra_args(false);
+}
+
+void addRequestOptions(CLI::App& command, SettingsOptions& settings) {
+    addSetting(command, settings, Settings::SKS_URL, "--url",
+               "Address of the gateway [http://127.0.0.1:8090]")
+        ->type_name("URL");
+    addSetting(command, settings, Settings::SKS_UUID, "--uuid",
+               "Identifier of this installation, 32 characters [random]")
+        ->type_name("TEXT");
+    addSetting(command, settings, Settings::RS_LANGUAGE, "--lang", "Language [en-US]")
+        ->type_name("TEXT");
+    addSetting(command, settings, Settings::RS_MODEL, "--model", "Recognition model [general]")
+        ->type_name("TEXT")
+        ->check(CLI::IsMember({Settings::MODEL_GENERAL, Settings::MODEL_MAPS,
+                               Settings::MODEL_MAPSKVRI, Settings::MODEL_IRONLADY}));
+    addSetting(command, settings, Settings::RS_SESSION_ID, "--session-id",
+               "The application's session identifier")
+        ->type_name("TEXT");
+    command.add_flag_function(
+        "--streaming,!--no-streaming",
+        [&settings](int64_t count) {
+            settings.explicitValues.emplace_back(Settings::SKS_STREAMING,
+                                                 count > 0 ? "true" : "false");
+        },
+        "Send the sound while it is recorded, or in one piece afterwards [in one piece]");
+    addSetting(command, settings, Settings::SKS_SOUND_FORMAT, "--format",
+               "Format in which the sound is sent [pcm_if_wifi]")
+        ->check(CLI::IsMember({Settings::SOUND_FORMAT_PCM, Settings::SOUND_FORMAT_PCM_IF_WIFI,
+                               Settings::SOUND_FORMAT_SPEEX}));
+    addSetting(command, settings, Settings::SKS_SPEEX_QUALITY, "--quality",
+               "Speex quality, 0 to 10 [8]")
+        ->type_name("N")
+        ->check(CLI::Range(0, 10).description(""));
+}
+
+CLI::App* addRecognize(CLI::App& app, RecognizeOptions& options) {
+    CLI::App* command = app.add_subcommand("recognize", "Recognise what is said");
+    CLI::Option_group* source = command->add_option_group("Sound", "one of");
+    source
+        ->add_option("--file", options.file,
+                     "Sound file to play, at its own pace; \"-\" reads raw 16-bit "
+                     "little-endian mono sound from standard input, at most a minute")
+        ->type_name("FILE");
+    source->add_flag("--mic", options.microphone, "Record from the default input device");
+    source->require_option(1);
+    command
+        ->add_option(
+            "--lead-in", options.leadInMs,
+            "Silence before the file, in milliseconds [" + std::to_string(LEAD_IN_MS_DFLT) + "]")
+        ->type_name("MS")
+        ->check(CLI::Range(0, LEAD_IN_MS_MAX).description(""));
+    addRequestOptions(*command, options.settings);
+    addVad(*command, options.settings);
+    addRate(*command, options.settings);
+    addSettingsSources(*command, options.settings);
+    addSetting(*command, options.settings, Settings::SKS_VERBOSE_LEVEL, "--verbosity",
+               "How much the engine logs to standard error, 0 (nothing) to 10 [0]")
+        ->type_name("N")
+        ->check(CLI::Range(0, 10).description(""));
+    command
+        ->add_option("--dump", options.dumpDirectory,
+                     "Directory in which the session leaves what it heard, as in.wav")
+        ->type_name("DIR");
+    command->add_flag("--json", options.json, "Print every event as one JSON object a line");
+    command->footer(
+        "Settings are applied in this order: defaults, --settings, --set, the other options.\n"
+        "Ctrl-C cancels; a second Ctrl-C leaves at once.\n"
+        "Exit status: 0 results were delivered, 1 the recognition ended in an error,\n"
+        "2 wrong usage or unreadable input.");
+    return command;
+}
+
+CLI::App* addVadCommand(CLI::App& app, VadOptions& options) {
+    CLI::App* command = app.add_subcommand("vad", "Show what the speech detector decides");
+    command
+        ->add_option("--file", options.file,
+                     "Sound file; \"-\" reads raw 16-bit little-endian mono sound from standard "
+                     "input")
+        ->type_name("FILE")
+        ->required();
+    addVad(*command, options.settings);
+    addRate(*command, options.settings);
+    command->add_flag("--json", options.json,
+                      "Print every buffer and every segment as one JSON object a line");
+    return command;
+}
+
+CLI::App* addSettingsCommand(CLI::App& app, SettingsOptions& options) {
+    CLI::App* command =
+        app.add_subcommand("settings", "Show the settings that would result, as XML");
+    addSettingsSources(*command, options);
+    command->footer(
+        "The engine's own defaults, then --settings, then --set; printed as validation leaves\n"
+        "them. Each of its repairs is told on standard error.");
+    return command;
+}
+
+int fail(std::ostream& err, const std::string& reason) {
+    err << "talvox: " << reason.substr(0, reason.find('\n')) << std::endl;
+    return EXIT_USAGE;
+}
+
+}  // namespace
+
+int runTool(int argc, const char* const* argv, Console& console, LogOutput& log) {
+    Arguments arguments;
+    arguments.recognize.settings.defaults = recognizeDefaults();
+    CLI::App app("Speech recognition from the command line", "talvox");
+    app.set_version_flag("--version",
+                         "talvox " + Talvox::Talvox::VERSION + " (build " TALVOX_BUILD_ID ")");
+    app.require_subcommand(1);
+    const CLI::App* recognize = addRecognize(app, arguments.recognize);
+    const CLI::App* vad = addVadCommand(app, arguments.vad);
+    addSettingsCommand(app, arguments.settings);
+    try {
+        app.parse(argc, argv);
+        if (recognize->parsed()) {
+            return runRecognize(arguments.recognize, console, log);
+        }
+        if (vad->parsed()) {
+            return runVad(arguments.vad, console, log);
+        }
+        return runSettings(arguments.settings, console.out, log);
+    } catch (const CLI::ParseError& error) {
+        if (error.get_exit_code() == 0) {
+            return app.exit(error, console.out, console.err);
+        }
+        return fail(console.err, error.what());
+    } catch (const UsageError& error) {
+        return fail(console.err, error.what());
+    } catch (const std::bad_alloc&) {
+        return fail(console.err, "out of memory");
+    }
+}
+
+}  // namespace Cli

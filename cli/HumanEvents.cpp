@@ -1,0 +1,99 @@
+#include "HumanEvents.h"
+
+#include <algorithm>
+
+#include "JsonEvents.h"
+#include "LevelBar.h"
+#include "Text.h"
+#include "talvox/SpeechError.h"
+
+namespace Cli {
+
+namespace {
+
+const int BAR_WIDTH = 30;
+const std::size_t TEXT_COLUMN_MIN = 10;
+
+std::string confidenceText(float confidence) {
+    return confidence == Talvox::RecognitionResult::UNKNOWN_CONFIDENCE
+               ? "unknown"
+               : fixed(static_cast<double>(confidence), 0, 3);
+}
+
+}  // namespace
+
+void HumanEvents::print(const SessionEvent& event) {
+    switch (event.kind) {
+        case SessionEvent::RECORDING_BEGIN:
+            printLine(event.ms, "recording, speak now");
+            break;
+        case SessionEvent::SPEAKING_BEGIN:
+            printLine(event.ms, "speech begins");
+            break;
+        case SessionEvent::POWER:
+            printLevel(event);
+            break;
+        case SessionEvent::RECORDING_DONE:
+            recordingDoneMs = event.ms;
+            printLine(event.ms, "recording done, waiting for the answer");
+            break;
+        case SessionEvent::RESULTS:
+            printResults(event);
+            break;
+        case SessionEvent::FAILURE:
+            printLine(event.ms, std::string("error: ") +
+                                    Talvox::SpeechError(event.errorCode).getErrorString());
+            break;
+    }
+    out.flush();
+}
+
+void HumanEvents::printLine(int64_t ms, const std::string& text) {
+    clearBar();
+    out << timeColumn(ms) << text << '\n';
+}
+
+void HumanEvents::printLevel(const SessionEvent& event) {
+    const std::string bar = "[" + levelBar(event.levelDb, BAR_WIDTH) + "] " +
+                            fixed(static_cast<double>(event.levelDb), 5, 1) + " dB";
+    if (!terminal) {
+        printLine(event.ms, bar);
+        return;
+    }
+    out << '\r' << timeColumn(event.ms) << bar << "\x1b[K";
+    barShown = true;
+}
+
+void HumanEvents::clearBar() {
+    if (barShown) {
+        out << "\r\x1b[K";
+        barShown = false;
+    }
+}
+
+void HumanEvents::printResults(const SessionEvent& event) {
+    const Talvox::Recognition& recognition = *event.recognition;
+    printLine(event.ms, recordingDoneMs < 0
+                            ? "answer"
+                            : "answer, " + std::to_string(event.ms - recordingDoneMs) +
+                                  " ms after the end of speech");
+    out << '\n';
+    std::size_t columns = TEXT_COLUMN_MIN;
+    for (const Talvox::RecognitionResult& result : *recognition.getResults()) {
+        columns = std::max(columns, characterCount(printable(result.getText())));
+    }
+    out << "  #  " << padded("hypothesis", columns) << "  confidence\n";
+    int number = 0;
+    for (const Talvox::RecognitionResult& result : *recognition.getResults()) {
+        out << fixed(++number, 3, 0) << "  " << padded(printable(result.getText()), columns) << "  "
+            << confidenceText(result.getConfidence()) << '\n';
+    }
+    if (recognition.getResults()->empty()) {
+        out << "  -  " << padded("(none)", columns) << "  -\n";
+    }
+    out << '\n'
+        << "verdict: " << outcomeName(recognition.getOutcome()) << '\n'
+        << "request: " << printable(recognition.getRequestId()) << '\n';
+}
+
+}  // namespace Cli

@@ -1,0 +1,136 @@
+#include "RecognizeCommand.h"
+
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <boost/make_shared.hpp>
+#include <cerrno>
+#include <cstring>
+#include <memory>
+#include <random>
+
+#include "ExitStatus.h"
+#include "HumanEvents.h"
+#include "Interrupts.h"
+#include "JsonEvents.h"
+#include "Session.h"
+#include "SoundInput.h"
+#include "Text.h"
+#include "UsageError.h"
+#include "core/sound/FileRecorder.h"
+#include "core/sound/Recorder.h"
+#include "pal/kd_file.h"
+#include "talvox/Settings.h"
+#include "talvox/SpeechError.h"
+
+namespace Cli {
+
+namespace {
+
+const char* const URL_DFLT = "http://127.0.0.1:8090";
+const char* const LANGUAGE_DFLT = "en-US";
+const int UUID_LENGTH = 32;
+// The root below which a session dumps its sound.
+const char* const DUMP_ROOT = "/removable";
+// A session takes 20 s of sound; standard input may be a pipe that never ends.
+const int STANDARD_INPUT_MAX_SECONDS = 60;
+
+std::string makeUuid() {
+    static const char DIGITS[] = "0123456789abcdef";
+    std::random_device random;
+    std::uniform_int_distribution<int> digit(0, 15);
+    std::string uuid;
+    for (int index = 0; index < UUID_LENGTH; ++index) {
+        uuid += DIGITS[digit(random)];
+    }
+    return uuid;
+}
+
+void mountDump(const std::string& directory) {
+    struct stat status = {};
+    if (stat(directory.c_str(), &status) != 0 || access(directory.c_str(), W_OK | X_OK) != 0) {
+        throw UsageError("cannot write to " + directory + ": " + std::strerror(errno));
+    }
+    if (!S_ISDIR(status.st_mode)) {
+        throw UsageError("cannot write to " + directory + ": it is not a directory");
+    }
+    kdMountKOR(DUMP_ROOT, directory.c_str());
+}
+
+/** Makes the engine hear the file in place of a device. */
+void installPlayer(const RecognizeOptions& options, int sampleRateHz, std::istream& input) {
+    std::vector<int16_t> samples =
+        loadSound(options.file, input, sampleRateHz, STANDARD_INPUT_MAX_SECONDS);
+    samples.insert(
+        samples.begin(),
+        static_cast<std::size_t>(sampleRateHz) * static_cast<std::size_t>(options.leadInMs) / 1000,
+        0);
+    Sound::Recorder::setFactory(
+        [samples] { return boost::make_shared<Sound::FileRecorder>(samples); });
+}
+
+/** What a user can do about an error; empty where the name says it all. */
+std::string hint(int errorCode, const RecognizeOptions& options, const Talvox::Settings& settings) {
+    switch (errorCode) {
+        case Talvox::SpeechError::ErrorNetwork:
+            return "is a gateway running at " + settings.getUrl() + "?";
+        case Talvox::SpeechError::ErrorAudio:
+            return options.microphone ? "is there a microphone, and a sound server for it?" : "";
+        case Talvox::SpeechError::ErrorNoVoice:
+            return "no speech was heard; \"talvox vad\" shows what the detector decides";
+        case Talvox::SpeechError::ErrorNotAvailable:
+            return "the settings \"asr\" and \"asrpolicy\" leave no way to recognise";
+        default:
+            return "";
+    }
+}
+
+std::unique_ptr<EventPrinter> makePrinter(const RecognizeOptions& options, Console& console) {
+    if (options.json) {
+        return std::make_unique<JsonEvents>(console.out);
+    }
+    return std::make_unique<HumanEvents>(console.out, console.outIsTerminal);
+}
+
+void reportError(int errorCode, const RecognizeOptions& options, const Talvox::Settings& settings,
+                 std::ostream& err) {
+    err << "talvox: recognition ended with " << Talvox::SpeechError(errorCode).getErrorString();
+    const std::string advice = hint(errorCode, options, settings);
+    if (!advice.empty()) {
+        err << " (" << printable(advice) << ')';
+    }
+    err << std::endl;
+}
+
+}  // namespace
+
+std::vector<SettingsOptions::Assignment> recognizeDefaults() {
+    return {{Talvox::Settings::SKS_URL, URL_DFLT},
+            {Talvox::Settings::SKS_UUID, makeUuid()},
+            {Talvox::Settings::RS_LANGUAGE, LANGUAGE_DFLT}};
+}
+
+int runRecognize(const RecognizeOptions& options, Console& console, LogOutput& log) {
+    // What is wrong in a settings document is the user's to know in any case.
+    log.show(true);
+    const boost::shared_ptr<Talvox::Settings> settings = buildSettings(options.settings);
+    log.show(settings->getInt(Talvox::Settings::SKS_VERBOSE_LEVEL) > 0);
+    if (!options.dumpDirectory.empty()) {
+        mountDump(options.dumpDirectory);
+    }
+    if (!options.microphone) {
+        installPlayer(options, settings->getSampleRate(), console.in);
+    }
+
+    const std::unique_ptr<EventPrinter> printer = makePrinter(options, console);
+    Session session(settings);
+    const Interrupts interrupts([&session] { session.interrupt(); });
+    const SessionEvent last = session.run(*printer);
+    if (last.kind == SessionEvent::RESULTS) {
+        return EXIT_OK;
+    }
+    reportError(last.errorCode, options, *settings, console.err);
+    return EXIT_ENDED_IN_ERROR;
+}
+
+}  // namespace Cli

@@ -1,0 +1,44 @@
+#pragma once
+
+#include <istream>
+#include <ostream>
+#include <string>
+
+#include "LogOutput.h"
+#include "SettingsOptions.h"
+
+namespace Cli {
+
+/** Silence that is played before a file, so that the detector learns a quiet background. */
+const int LEAD_IN_MS_DFLT = 300;
+const int LEAD_IN_MS_MAX = 4000;
+
+/** What `talvox recognize` was asked for. */
+struct RecognizeOptions {
+    SettingsOptions settings;
+    std::string file;        /**< path or `STANDARD_INPUT`; not used with `microphone` */
+    bool microphone = false; /**< record from the default input device */
+    int leadInMs = LEAD_IN_MS_DFLT;
+    std::string dumpDirectory; /**< where the session's WAV dump goes; empty for none */
+    bool json = false;
+};
+
+/** The tool's defaults, over the engine's: a gateway on this machine, a fresh uuid, English. */
+std::vector<SettingsOptions::Assignment> recognizeDefaults();
+
+/** Standard streams, and whether the output is a terminal. */
+struct Console {
+    std::istream& in;
+    std::ostream& out;
+    std::ostream& err;
+    bool outIsTerminal;
+};
+
+/**
+ * `talvox recognize`: one recognition; Ctrl-C cancels it.
+ * @return the exit status
+ * @throws UsageError
+ */
+int runRecognize(const RecognizeOptions& options, Console& console, LogOutput& log);
+
+}  // namespace Cli

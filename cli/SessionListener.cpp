@@ -1,0 +1,53 @@
+#include "SessionListener.h"
+
+#include <utility>
+
+#include "pal/kd_time.h"
+
+namespace Cli {
+
+SessionListener::SessionListener(boost::shared_ptr<EventQueue> events)
+    : queue(std::move(events)), startTime(kdGetTimeUST()) {}
+
+SessionEvent SessionListener::make(SessionEvent::Kind kind) const {
+    SessionEvent event;
+    event.kind = kind;
+    event.ms = (kdGetTimeUST() - startTime) / 1000000;
+    return event;
+}
+
+void SessionListener::onRecordingBegin(Talvox::Recognizer* /*recognizer*/) {
+    queue->put(make(SessionEvent::RECORDING_BEGIN));
+}
+
+void SessionListener::onSpeakingBegin(Talvox::Recognizer* /*recognizer*/) {
+    queue->put(make(SessionEvent::SPEAKING_BEGIN));
+}
+
+void SessionListener::onRecordingDone(Talvox::Recognizer* /*recognizer*/) {
+    queue->put(make(SessionEvent::RECORDING_DONE));
+}
+
+void SessionListener::onBufferReceived(Talvox::Recognizer* /*recognizer*/,
+                                       const Sound::SoundDataBuffer& /*buffer*/) {}
+
+void SessionListener::onPowerChanged(Talvox::Recognizer* /*recognizer*/, float power) {
+    SessionEvent event = make(SessionEvent::POWER);
+    event.levelDb = power;
+    queue->put(event);
+}
+
+void SessionListener::onResults(Talvox::Recognizer* /*recognizer*/,
+                                boost::shared_ptr<Talvox::Recognition> recognition) {
+    SessionEvent event = make(SessionEvent::RESULTS);
+    event.recognition = std::move(recognition);
+    queue->put(event);
+}
+
+void SessionListener::onError(Talvox::Recognizer* /*recognizer*/, Talvox::SpeechError error) {
+    SessionEvent event = make(SessionEvent::FAILURE);
+    event.errorCode = error.getCode();
+    queue->put(event);
+}
+
+}  // namespace Cli

@@ -1,0 +1,36 @@
+#pragma once
+
+#include <boost/shared_ptr.hpp>
+#include <string>
+#include <utility>
+#include <vector>
+
+#include "talvox/Settings.h"
+
+namespace Cli {
+
+/** Where the settings of a run come from, in the order in which the sources are applied. */
+struct SettingsOptions {
+    using Assignment = std::pair<std::string, std::string>; /**< key, text of the value */
+
+    std::vector<Assignment> defaults;       /**< the tool's own, over the engine's */
+    std::string file;                       /**< configuration document; empty for none */
+    std::vector<std::string> assignments;   /**< key=value */
+    std::vector<Assignment> explicitValues; /**< options that name one setting each */
+};
+
+/**
+ * Stores a value given as text, in the value syntax of a configuration document, under the type
+ * that the key has. Any spelling of the key is accepted that normalises to it.
+ * @throws UsageError when there is no such setting, or the text is not wholly a value of its type
+ */
+void assign(Talvox::Settings& settings, const std::string& key, const std::string& text);
+
+/**
+ * The settings that all sources together make. The document at `file` is applied as the engine
+ * applies a configuration document: what is wrong in it is logged and skipped.
+ * @throws UsageError when the file cannot be read or an assignment is wrong
+ */
+boost::shared_ptr<Talvox::Settings> buildSettings(const SettingsOptions& options);
+
+}  // namespace Cli

@@ -1,0 +1,32 @@
+#include "SoundInput.h"
+
+#include "AudioFile.h"
+#include "Resampler.h"
+#include "UsageError.h"
+
+namespace Cli {
+
+namespace {
+
+const int RATE_MIN_HZ = 8000;
+const int RATE_MAX_HZ = 44100;
+
+}  // namespace
+
+const char* const STANDARD_INPUT = "-";
+
+std::vector<int16_t> loadSound(const std::string& path, std::istream& input, int sampleRateHz,
+                               int maxSeconds) {
+    if (sampleRateHz < RATE_MIN_HZ || sampleRateHz > RATE_MAX_HZ) {
+        throw UsageError("the sample rate " + std::to_string(sampleRateHz) +
+                         " is not in the range 8000 to 44100");
+    }
+    if (path != STANDARD_INPUT) {
+        return toSamples(readAudioFile(path), sampleRateHz);
+    }
+    const std::size_t maxSamples =
+        static_cast<std::size_t>(sampleRateHz) * static_cast<std::size_t>(maxSeconds);
+    return toSamples(readRawAudio(input, sampleRateHz, maxSamples), sampleRateHz);
+}
+
+}  // namespace Cli

@@ -1,0 +1,22 @@
+#pragma once
+
+#include <cstdint>
+#include <istream>
+#include <string>
+#include <vector>
+
+namespace Cli {
+
+/** The name that stands for raw sound on standard input. */
+extern const char* const STANDARD_INPUT;
+
+/**
+ * The sound of a file, or raw sound from `input` when `path` is `STANDARD_INPUT`, as 16-bit mono
+ * samples at the engine's rate.
+ * @param maxSeconds the most to take from standard input
+ * @throws UsageError when there is no sound to be had or the rate is out of the engine's range
+ */
+std::vector<int16_t> loadSound(const std::string& path, std::istream& input, int sampleRateHz,
+                               int maxSeconds);
+
+}  // namespace Cli

@@ -1,0 +1,26 @@
+#pragma once
+
+#include <string>
+
+#include "LogOutput.h"
+#include "RecognizeCommand.h"
+#include "SettingsOptions.h"
+
+namespace Cli {
+
+/** What `talvox vad` was asked for. */
+struct VadOptions {
+    SettingsOptions settings;
+    std::string file; /**< path or `STANDARD_INPUT` */
+    bool json = false;
+};
+
+/**
+ * `talvox vad`: runs the detector over the sound as a session would, and prints what it decides
+ * for every buffer, then the segments of speech.
+ * @return the exit status
+ * @throws UsageError
+ */
+int runVad(const VadOptions& options, Console& console, LogOutput& log);
+
+}  // namespace Cli
