@@ -1,0 +1,450 @@
+#include "support/ScriptedHttpServer.h"
+
+#include <arpa/inet.h>
+#include <netinet/in.h>
+#include <netinet/tcp.h>
+#include <strings.h>
+#include <sys/socket.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <cstdlib>
+#include <stdexcept>
+
+namespace TestSupport {
+
+namespace {
+
+int openLoopbackSocket(unsigned short& port) {
+    const int descriptor = ::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0);
+    sockaddr_in address{};
+    address.sin_family = AF_INET;
+    address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
+    socklen_t length = sizeof(address);
+    auto* generic = reinterpret_cast<sockaddr*>(&address);
+    if (descriptor < 0 || ::bind(descriptor, generic, length) != 0 ||
+        ::getsockname(descriptor, generic, &length) != 0) {
+        throw std::runtime_error("no loopback socket for the test server");
+    }
+    port = ntohs(address.sin_port);
+    return descriptor;
+}
+
+std::string loopbackUrl(unsigned short port) {
+    return "http://127.0.0.1:" + std::to_string(port);
+}
+
+std::string trim(const std::string& text) {
+    const std::size_t first = text.find_first_not_of(" \t");
+    const std::size_t last = text.find_last_not_of(" \t\r\n");
+    return first == std::string::npos ? std::string() : text.substr(first, last - first + 1);
+}
+
+}  // namespace
+
+Answer Answer::status(int code, const Headers& headers, const std::string& body) {
+    std::string text = "HTTP/1.1 " + std::to_string(code) + " Scripted\r\n";
+    for (const auto& header : headers) {
+        text += header.first + ": " + header.second + "\r\n";
+    }
+    text += "Content-Length: " + std::to_string(body.size()) + "\r\n\r\n" + body;
+    return raw(text);
+}
+
+Answer Answer::raw(const std::string& bytes) {
+    Answer answer;
+    answer.pieces.push_back(bytes);
+    return answer;
+}
+
+Answer Answer::never() {
+    return Answer();
+}
+
+Answer Answer::closing() {
+    return Answer().thenClose();
+}
+
+Answer Answer::resetAfter(std::size_t bodyBytes) {
+    return Answer().afterBodyBytes(bodyBytes).thenReset();
+}
+
+Answer Answer::onHead() const {
+    return afterBodyBytes(0);
+}
+
+Answer Answer::afterBodyBytes(std::size_t count) const {
+    Answer copy = *this;
+    copy.actAfter = count;
+    return copy;
+}
+
+Answer Answer::notReading() const {
+    Answer copy = *this;
+    copy.pauseReading = true;
+    return copy;
+}
+
+Answer Answer::thenClose() const {
+    Answer copy = *this;
+    copy.end = End::CLOSE;
+    return copy;
+}
+
+Answer Answer::thenReset() const {
+    Answer copy = *this;
+    copy.end = End::RESET;
+    return copy;
+}
+
+Answer Answer::held() const {
+    Answer copy = *this;
+    copy.needsRelease = true;
+    return copy;
+}
+
+Answer Answer::inPieces(std::size_t size) const {
+    Answer copy = *this;
+    copy.needsRelease = true;
+    copy.pieces.clear();
+    for (const std::string& piece : pieces) {
+        for (std::size_t offset = 0; offset < piece.size(); offset += size) {
+            copy.pieces.push_back(piece.substr(offset, size));
+        }
+    }
+    return copy;
+}
+
+std::string ScriptedHttpServer::Request::line() const {
+    return head.substr(0, head.find("\r\n"));
+}
+
+std::optional<std::string> ScriptedHttpServer::Request::header(const std::string& name) const {
+    std::size_t start = head.find("\r\n");
+    while (start != std::string::npos && start + 2 < head.size()) {
+        start += 2;
+        const std::size_t end = head.find("\r\n", start);
+        const std::string field = head.substr(start, end - start);
+        const std::size_t colon = field.find(':');
+        if (colon == name.size() && ::strncasecmp(field.c_str(), name.c_str(), colon) == 0) {
+            return trim(field.substr(colon + 1));
+        }
+        start = end;
+    }
+    return std::nullopt;
+}
+
+/** One connection: cuts the stream into requests and plays the answers. Its own thread only. */
+class ScriptedHttpServer::Connection {
+  public:
+    Connection(ScriptedHttpServer& owner, std::size_t number, int descriptor)
+        : server(owner), index(number), socket(descriptor) {}
+
+    void run() {
+        while (serveOne()) {
+        }
+    }
+
+  private:
+    bool serveOne() {
+        std::string head;
+        if (!readUntil("\r\n\r\n", head)) {
+            return false;
+        }
+        Request request;
+        request.head = head;
+        body.clear();
+        chunkSizes.clear();
+        acted = false;
+        open = true;
+        requestIndex = server.addRequest(index, head, answer);
+        if (answer.pauseReading && !server.waitForRelease()) {
+            return false;
+        }
+        actIfDue(false);
+        if (open) {
+            const std::string coding = request.header("Transfer-Encoding").value_or("");
+            const std::string length = request.header("Content-Length").value_or("0");
+            const bool whole = coding == "chunked"
+                                   ? readChunks()
+                                   : readBody(std::strtoul(length.c_str(), nullptr, 10));
+            if (open && whole) {
+                server.updateRequest(requestIndex, body, chunkSizes, true);
+                actIfDue(true);
+            }
+            open = open && whole;
+        }
+        return open;
+    }
+
+    bool readChunks() {
+        std::string line;
+        while (open && readUntil("\r\n", line)) {
+            const std::size_t size = std::strtoul(line.c_str(), nullptr, 16);
+            if (size == 0) {
+                return readUntil("\r\n", line);
+            }
+            chunkSizes.push_back(size);
+            if (!readBody(size) || !readUntil("\r\n", line)) {
+                return false;
+            }
+        }
+        return false;
+    }
+
+    bool readBody(std::size_t size) {
+        while (open && size > 0) {
+            if (buffer.empty() && !receive()) {
+                return false;
+            }
+            const std::size_t part = std::min(size, buffer.size());
+            body.append(buffer, 0, part);
+            buffer.erase(0, part);
+            size -= part;
+            server.updateRequest(requestIndex, body, chunkSizes, false);
+            actIfDue(false);
+        }
+        return open;
+    }
+
+    bool readUntil(const std::string& mark, std::string& text) {
+        std::size_t found = buffer.find(mark);
+        while (found == std::string::npos) {
+            if (!receive()) {
+                return false;
+            }
+            found = buffer.find(mark);
+        }
+        text = buffer.substr(0, found + mark.size());
+        buffer.erase(0, found + mark.size());
+        return true;
+    }
+
+    bool receive() {
+        char bytes[16384];
+        const ssize_t count = ::recv(socket, bytes, sizeof(bytes), 0);
+        if (count > 0) {
+            buffer.append(bytes, static_cast<std::size_t>(count));
+        }
+        return count > 0;
+    }
+
+    void actIfDue(bool complete) {
+        const bool due =
+            complete || (answer.actAfter != Answer::WHOLE_BODY && body.size() >= answer.actAfter);
+        if (acted || !due) {
+            return;
+        }
+        acted = true;
+        for (const std::string& piece : answer.pieces) {
+            if ((answer.needsRelease && !server.waitForRelease()) || !send(piece)) {
+                open = false;
+                return;
+            }
+        }
+        finish();
+    }
+
+    bool send(const std::string& bytes) {
+        std::size_t sent = 0;
+        while (sent < bytes.size()) {
+            const ssize_t count =
+                ::send(socket, bytes.data() + sent, bytes.size() - sent, MSG_NOSIGNAL);
+            if (count <= 0) {
+                return false;
+            }
+            sent += static_cast<std::size_t>(count);
+        }
+        return true;
+    }
+
+    void finish() {
+        if (answer.end == Answer::End::RESET) {
+            const linger abort{1, 0};
+            ::setsockopt(socket, SOL_SOCKET, SO_LINGER, &abort, sizeof(abort));
+            open = false;
+        } else if (answer.end == Answer::End::CLOSE) {
+            ::shutdown(socket, SHUT_WR);
+            // Unread bytes would turn the close into a reset.
+            while (receive()) {
+                buffer.clear();
+            }
+            open = false;
+        }
+    }
+
+    ScriptedHttpServer& server;
+    const std::size_t index;
+    const int socket;
+    std::string buffer;
+    Answer answer;
+    std::size_t requestIndex = 0;
+    std::string body;
+    std::vector<std::size_t> chunkSizes;
+    bool acted = false;
+    bool open = true;
+};
+
+ScriptedHttpServer::ScriptedHttpServer() : defaultAnswer(Answer::status(200)) {
+    listener = openLoopbackSocket(port);
+    if (::listen(listener, 64) != 0) {
+        throw std::runtime_error("the test server cannot listen");
+    }
+    acceptor = std::thread([this] { acceptLoop(); });
+}
+
+ScriptedHttpServer::~ScriptedHttpServer() {
+    {
+        const std::lock_guard<std::mutex> lock(mutex);
+        stopping = true;
+        ::shutdown(listener, SHUT_RDWR);
+        for (const auto& entry : openSockets) {
+            ::shutdown(entry.second, SHUT_RDWR);
+        }
+        changed.notify_all();
+    }
+    acceptor.join();
+    for (std::thread& worker : workers) {
+        worker.join();
+    }
+    ::close(listener);
+}
+
+std::string ScriptedHttpServer::getUrl() const {
+    return loopbackUrl(port);
+}
+
+void ScriptedHttpServer::script(const std::vector<Answer>& more) {
+    const std::lock_guard<std::mutex> lock(mutex);
+    answers.insert(answers.end(), more.begin(), more.end());
+}
+
+void ScriptedHttpServer::setDefaultAnswer(const Answer& answer) {
+    const std::lock_guard<std::mutex> lock(mutex);
+    defaultAnswer = answer;
+}
+
+void ScriptedHttpServer::release(std::size_t count) {
+    const std::lock_guard<std::mutex> lock(mutex);
+    released += count;
+    changed.notify_all();
+}
+
+std::size_t ScriptedHttpServer::getRequestCount() const {
+    const std::lock_guard<std::mutex> lock(mutex);
+    return requests.size();
+}
+
+ScriptedHttpServer::Request ScriptedHttpServer::getRequest(std::size_t index) const {
+    const std::lock_guard<std::mutex> lock(mutex);
+    return index < requests.size() ? requests[index] : Request();
+}
+
+std::size_t ScriptedHttpServer::getConnectionCount() const {
+    const std::lock_guard<std::mutex> lock(mutex);
+    return accepted;
+}
+
+template <typename Condition>
+bool ScriptedHttpServer::waitUntil(std::chrono::milliseconds timeout, Condition condition) const {
+    std::unique_lock<std::mutex> lock(mutex);
+    return changed.wait_for(lock, timeout, condition);
+}
+
+bool ScriptedHttpServer::waitForRequest(std::size_t count,
+                                        std::chrono::milliseconds timeout) const {
+    return waitUntil(timeout, [this, count] {
+        return static_cast<std::size_t>(
+                   std::count_if(requests.begin(), requests.end(),
+                                 [](const Request& request) { return request.complete; })) >= count;
+    });
+}
+
+bool ScriptedHttpServer::waitForHead(std::size_t count, std::chrono::milliseconds timeout) const {
+    return waitUntil(timeout, [this, count] { return requests.size() >= count; });
+}
+
+bool ScriptedHttpServer::waitForBody(std::size_t index, std::size_t bytes,
+                                     std::chrono::milliseconds timeout) const {
+    return waitUntil(timeout, [this, index, bytes] {
+        return index < requests.size() && requests[index].body.size() >= bytes;
+    });
+}
+
+bool ScriptedHttpServer::waitForClosed(std::size_t count, std::chrono::milliseconds timeout) const {
+    return waitUntil(timeout, [this, count] { return ended >= count; });
+}
+
+void ScriptedHttpServer::acceptLoop() {
+    for (;;) {
+        const int socket = ::accept4(listener, nullptr, nullptr, SOCK_CLOEXEC);
+        const std::lock_guard<std::mutex> lock(mutex);
+        if (socket < 0 || stopping) {
+            if (socket >= 0) {
+                ::close(socket);
+            }
+            return;
+        }
+        const int on = 1;
+        ::setsockopt(socket, IPPROTO_TCP, TCP_NODELAY, &on, sizeof(on));
+        const std::size_t index = accepted++;
+        openSockets[index] = socket;
+        workers.emplace_back([this, index, socket] { serve(index, socket); });
+        changed.notify_all();
+    }
+}
+
+void ScriptedHttpServer::serve(std::size_t index, int socket) {
+    Connection(*this, index, socket).run();
+    const std::lock_guard<std::mutex> lock(mutex);
+    openSockets.erase(index);
+    ::close(socket);
+    ++ended;
+    changed.notify_all();
+}
+
+std::size_t ScriptedHttpServer::addRequest(std::size_t connection, const std::string& head,
+                                           Answer& answer) {
+    const std::lock_guard<std::mutex> lock(mutex);
+    answer = answers.empty() ? defaultAnswer : answers.front();
+    if (!answers.empty()) {
+        answers.pop_front();
+    }
+    Request request;
+    request.connection = connection;
+    request.head = head;
+    requests.push_back(request);
+    changed.notify_all();
+    return requests.size() - 1;
+}
+
+void ScriptedHttpServer::updateRequest(std::size_t index, const std::string& body,
+                                       const std::vector<std::size_t>& chunkSizes, bool complete) {
+    const std::lock_guard<std::mutex> lock(mutex);
+    requests[index].body = body;
+    requests[index].chunkSizes = chunkSizes;
+    requests[index].complete = complete;
+    changed.notify_all();
+}
+
+bool ScriptedHttpServer::waitForRelease() {
+    std::unique_lock<std::mutex> lock(mutex);
+    changed.wait(lock, [this] { return stopping || released > 0; });
+    if (stopping) {
+        return false;
+    }
+    --released;
+    return true;
+}
+
+RefusingPort::RefusingPort() : socket(openLoopbackSocket(port)) {}
+
+RefusingPort::~RefusingPort() {
+    ::close(socket);
+}
+
+std::string RefusingPort::getUrl() const {
+    return loopbackUrl(port);
+}
+
+}  // namespace TestSupport
