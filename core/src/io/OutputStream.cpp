@@ -1,0 +1,7 @@
+#include "core/io/OutputStream.h"
+
+namespace IO {
+
+OutputStream::~OutputStream() = default;
+
+}  // namespace IO

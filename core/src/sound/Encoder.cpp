@@ -1,0 +1,7 @@
+#include "core/sound/Encoder.h"
+
+namespace Sound {
+
+Encoder::~Encoder() = default;
+
+}  // namespace Sound
