@@ -1,0 +1,326 @@
+#include "talvox/impl/KorvelRecognizer.h"
+
+#include <boost/make_shared.hpp>
+#include <utility>
+
+#include "core/network/NetworkManager.h"
+#include "core/util/EventLock.h"
+#include "pal/kd.h"
+#include "talvox/Log.h"
+#include "talvox/Talvox.h"
+
+namespace Talvox {
+
+namespace {
+
+const int LOG_LEVEL = 2;
+const int BUFFER_LENGTH_MS = 100;
+const char* const DUMP_PATH = "/removable/in.wav";
+
+const int64_t NS_PER_MS = 1000 * 1000;
+const int64_t NO_VOICE_LIMIT_NS = 5000 * NS_PER_MS;
+const unsigned SOUND_LIMIT_MS = 20000;
+
+/** A recorder that neither delivers nor reports for so long has failed. */
+const int64_t NO_SOUND_LIMIT_NS = 10000 * NS_PER_MS;
+
+unsigned getDurationMs(const Sound::SoundDataBuffer& buffer) {
+    const int sampleRate = buffer.getInfo().getSampleRate();
+    const int64_t samples = buffer.getSampleCount();
+    return sampleRate > 0 && samples > 0 ? static_cast<unsigned>(samples * 1000 / sampleRate) : 0;
+}
+
+}  // namespace
+
+KorvelRecognizer::KorvelRecognizer(const Talvox* facade,
+                                   boost::shared_ptr<const Settings> recognizerSettings)
+    : Recognizer(facade, std::move(recognizerSettings)) {}
+
+KorvelRecognizer::~KorvelRecognizer() {
+    const Util::EventLock lock;
+    getEngine()->unregisterRecognizer(this);
+    watchdog.reset();
+    stopRecorder();
+    dropProtocol();
+    wavDump.reset();
+}
+
+const std::vector<std::string>& KorvelRecognizer::getAvailableLanguages() {
+    static const std::vector<std::string> LANGUAGES = {"ru-RU", "tr-TR", "uk-UA"};
+    return LANGUAGES;
+}
+
+void KorvelRecognizer::start() {
+    const Util::EventLock lock;
+    const boost::shared_ptr<Recognizer> self = shared_from_this();
+    if (isOver()) {
+        kdLogFormatMessage("KorvelRecognizer: the session is over, start is ignored");
+        return;
+    }
+    if (!getEngine()->registerRecognizer(this)) {
+        stopWithError(SpeechError(SpeechError::ErrorBusy));
+        return;
+    }
+    const boost::shared_ptr<const Settings> engineSettings = getEngine()->getTalvoxSettings();
+    if (!statusIsReasonable(*engineSettings)) {
+        stopWithError(SpeechError(SpeechError::ErrorNetwork));
+        return;
+    }
+    chooseSessionMode(*engineSettings);
+    if (!startRecorder(engineSettings->getSampleRate())) {
+        return;
+    }
+    const Sound::SoundDataInfo format(Sound::SoundDataInfo::NONE, 1,
+                                      engineSettings->getSampleRate(), 2);
+    powerEstimator.setMode(sessionMode);
+    startProtocol(engineSettings->getBoolean(Settings::SKS_STREAMING));
+    startDetector(engineSettings->getString(Settings::SKS_VAD_SETTINGS), format);
+    startTime = kdGetTimeUST();
+    leadingNoiseDone = false;
+    recordedMs = 0;
+    startDump(format);
+    startWatchdog();
+}
+
+bool KorvelRecognizer::statusIsReasonable(const Settings& engineSettings) {
+    const int reachability = Network::NetworkManager::getInstance().getReachability();
+    if (reachability != Network::NetworkManager::UNREACHABLE && !engineSettings.getUuid().empty() &&
+        !engineSettings.getUrl().empty()) {
+        return true;
+    }
+    kdLogFormatMessage("KorvelRecognizer: uuid %s, url %s, reachability %d; failing",
+                       engineSettings.getUuid().c_str(), engineSettings.getUrl().c_str(),
+                       reachability);
+    return false;
+}
+
+void KorvelRecognizer::chooseSessionMode(const Settings& engineSettings) {
+    const std::string& mode = engineSettings.getString(Settings::SKS_SESSION_MODE);
+    if (mode == Settings::SESSION_MODE_GENERAL) {
+        sessionMode = Sound::Recorder::MODE_GENERAL;
+    } else if (mode == Settings::SESSION_MODE_VOICE_RECOGNITION) {
+        sessionMode = Sound::Recorder::MODE_VOICE_RECOGNITION;
+    } else {
+        kdLogFormatMessage("KorvelRecognizer: unknown session mode %s", mode.c_str());
+    }
+}
+
+bool KorvelRecognizer::startRecorder(int sampleRateHz) {
+    recorder = Sound::Recorder::createRecorder();
+    recorder->setMode(sessionMode);
+    recorder->addListener(boost::static_pointer_cast<KorvelRecognizer>(shared_from_this()));
+    recorder->setBufferLength(BUFFER_LENGTH_MS);
+    recorder->setSampleRate(sampleRateHz);
+    if (!recorder->init()) {
+        recorder.reset();
+        recorderRefused = true;
+        getEngine()->unregisterRecognizer(this);
+        callOnError(SpeechError(SpeechError::ErrorAudio));
+        return false;
+    }
+    // Starting may report an error at once, which ends the session.
+    const boost::shared_ptr<Sound::Recorder> starting = recorder;
+    starting->startRecording();
+    return recorder != nullptr;
+}
+
+void KorvelRecognizer::startProtocol(bool streaming) {
+    protocol = RecognizeProtocol::create(this, streaming ? "chunked" : "simple");
+    protocol->addListener(boost::static_pointer_cast<KorvelRecognizer>(shared_from_this()));
+}
+
+void KorvelRecognizer::startDetector(const std::string& parameters,
+                                     const Sound::SoundDataInfo& format) {
+    vad = VoiceActivityDetector::create(parameters);
+    vad->setSoundDataInfo(format);
+    vad->setSessionMode(sessionMode);
+    vad->start();
+    leadingNoiseMs = static_cast<unsigned>(vad->getLeadingNoiseMS());
+}
+
+void KorvelRecognizer::startDump(const Sound::SoundDataInfo& format) {
+    wavDump = boost::make_shared<Util::WavOutputStream>();
+    if (!wavDump->init(DUMP_PATH, format)) {
+        wavDump.reset();
+    }
+}
+
+void KorvelRecognizer::startWatchdog() {
+    lastBufferTime = startTime;
+    watchdog = boost::make_shared<Util::Timer>([this] {
+        if (recorder && kdGetTimeUST() - lastBufferTime >= NO_SOUND_LIMIT_NS) {
+            kdLogFormatMessage("KorvelRecognizer: the recorder delivers nothing");
+            onRecorderError(recorder.get());
+        }
+    });
+    watchdog->start(KD_TIMER_PERIODIC_AVERAGE, NO_SOUND_LIMIT_NS);
+}
+
+void KorvelRecognizer::onRecorderDataReceived(
+    Sound::Recorder* /*source*/, boost::shared_ptr<const Sound::SoundDataBuffer> buffer) {
+    const boost::shared_ptr<Recognizer> self = shared_from_this();
+    if (!isListening()) {
+        return;
+    }
+    lastBufferTime = kdGetTimeUST();
+    if (wavDump) {
+        wavDump->write(buffer->getData().data(), static_cast<int>(buffer->getData().size()));
+    }
+    recordedMs += getDurationMs(*buffer);
+    protocol->handle(buffer);
+    if (!leadingNoiseDone) {
+        learnLeadingNoise(*buffer);
+        return;
+    }
+    powerEstimator.updatePower(*buffer);
+    reportSound(*buffer);
+    // A listener may have ended listening or the whole session.
+    if (isListening()) {
+        detectVoice(*buffer);
+    }
+}
+
+template <typename Call>
+void KorvelRecognizer::announce(Call call) {
+    listeners.notify([this, &call](RecognizerListener& listener) {
+        if (!isOver()) {
+            call(listener);
+        }
+    });
+}
+
+void KorvelRecognizer::learnLeadingNoise(const Sound::SoundDataBuffer& buffer) {
+    powerEstimator.learnNoise(buffer);
+    vad->processNoise(buffer);
+    if ((kdGetTimeUST() - startTime) / NS_PER_MS > static_cast<int64_t>(leadingNoiseMs)) {
+        leadingNoiseDone = true;
+        announce([this](RecognizerListener& listener) { listener.onRecordingBegin(this); });
+    }
+}
+
+void KorvelRecognizer::reportSound(const Sound::SoundDataBuffer& buffer) {
+    listeners.notify([this, &buffer](RecognizerListener& listener) {
+        if (isListening()) {
+            listener.onBufferReceived(this, buffer);
+        }
+    });
+    listeners.notify([this](RecognizerListener& listener) {
+        if (isListening()) {
+            listener.onPowerChanged(this, powerEstimator.getLevel());
+        }
+    });
+}
+
+void KorvelRecognizer::detectVoice(const Sound::SoundDataBuffer& buffer) {
+    const bool wasSpeech = vad->isSpeech();
+    vad->process(buffer);
+    const bool isSpeech = vad->isSpeech();
+    if ((wasSpeech && !isSpeech) || recordedMs > SOUND_LIMIT_MS) {
+        stop();
+    } else if (!isSpeech) {
+        if (kdGetTimeUST() - startTime >= NO_VOICE_LIMIT_NS) {
+            onProtocolError(SpeechError(SpeechError::ErrorNoVoice));
+        }
+    } else if (!wasSpeech) {
+        onProtocolVoiceBegin();
+    }
+}
+
+void KorvelRecognizer::stop() {
+    const Util::EventLock lock;
+    const boost::shared_ptr<Recognizer> self = shared_from_this();
+    stopRecorder();
+    if (protocol) {
+        const boost::shared_ptr<RecognizeProtocol> sending = protocol;
+        sending->sendRequest();
+    }
+}
+
+void KorvelRecognizer::cancel() {
+    const Util::EventLock lock;
+    stopWithError(SpeechError(SpeechError::ErrorCanceled));
+}
+
+void KorvelRecognizer::stopRecorder() {
+    if (recorder) {
+        recorder->stopRecording();
+        recorder.reset();
+    }
+}
+
+void KorvelRecognizer::stopListening() {
+    wavDump.reset();
+    watchdog.reset();
+    listeningStoppedTime = kdGetTimeUST();
+    stopRecorder();
+}
+
+void KorvelRecognizer::dropProtocol() {
+    if (protocol) {
+        protocol->abandon();
+        protocol.reset();
+    }
+}
+
+void KorvelRecognizer::stopWithError(SpeechError error) {
+    const boost::shared_ptr<Recognizer> self = shared_from_this();
+    if (recorder) {
+        stopListening();
+    }
+    dropProtocol();
+    if (!isOver()) {
+        errorReported = true;
+        getEngine()->unregisterRecognizer(this);
+        callOnError(error);
+    }
+}
+
+void KorvelRecognizer::onRecorderError(Sound::Recorder* /*source*/) {
+    stopWithError(SpeechError(SpeechError::ErrorAudio));
+}
+
+void KorvelRecognizer::onProtocolVoiceBegin() {
+    const boost::shared_ptr<Recognizer> self = shared_from_this();
+    announce([this](RecognizerListener& listener) { listener.onSpeakingBegin(this); });
+}
+
+void KorvelRecognizer::onProtocolVoiceCaptured() {
+    const boost::shared_ptr<Recognizer> self = shared_from_this();
+    if (!isOver()) {
+        stopListening();
+        announce([this](RecognizerListener& listener) { listener.onRecordingDone(this); });
+    }
+}
+
+void KorvelRecognizer::onProtocolResults(boost::shared_ptr<const RecognitionResults> results,
+                                         const std::string& requestId) {
+    const boost::shared_ptr<Recognizer> self = shared_from_this();
+    if (isOver()) {
+        return;
+    }
+    // The service may answer a streamed request before the user has finished.
+    if (recorder) {
+        stopListening();
+    }
+    tvLogFormatMessage(LOG_LEVEL, "Request %s finished in %d msec", requestId.c_str(),
+                       static_cast<int>((kdGetTimeUST() - listeningStoppedTime) / NS_PER_MS));
+    dropProtocol();
+    resultsReported = true;
+    getEngine()->unregisterRecognizer(this);
+    callOnResults(results, requestId);
+}
+
+void KorvelRecognizer::onProtocolError(SpeechError error) {
+    const boost::shared_ptr<Recognizer> self = shared_from_this();
+    if (isOver()) {
+        return;
+    }
+    if (listeningStoppedTime != 0) {
+        tvLogFormatMessage(LOG_LEVEL, "Request failed in %d msec",
+                           static_cast<int>((kdGetTimeUST() - listeningStoppedTime) / NS_PER_MS));
+    }
+    stopListening();
+    stopWithError(error);
+}
+
+}  // namespace Talvox

@@ -1,0 +1,134 @@
+#include "talvox/impl/ParallelEncoder.h"
+
+#include <array>
+#include <boost/make_shared.hpp>
+#include <utility>
+#include <vector>
+
+#include "core/tasking/TaskManager.h"
+#include "core/util/EventLock.h"
+#include "pal/kd.h"
+#include "talvox/Log.h"
+
+namespace Talvox {
+
+namespace {
+
+const int LOG_LEVEL = 2;
+const int TAKE_ALL = -1;
+
+using TimeText = std::array<char, 10>;
+
+/** The local time of day, for the log. */
+TimeText timeOfDay() {
+    const KDtime now = kdTime(nullptr);
+    KDTm local = {};
+    kdLocaltime_r(&now, &local);
+    TimeText text = {};
+    kdSprintf_s(text.data(), text.size(), "%02d:%02d:%02d", local.tm_hour, local.tm_min,
+                local.tm_sec);
+    return text;
+}
+
+/** @param position tells in the log where in the stream the bytes stand */
+void writeOutput(RecognizeRequest& request, const Sound::SoundDataBuffer* output,
+                 const char* position) {
+    if (output == nullptr || output->getData().empty()) {
+        return;
+    }
+    const std::vector<unsigned char>& bytes = output->getData();
+    tvLogFormatMessage(LOG_LEVEL, "ParallelEncoder writes %s%d bytes at %s", position,
+                       static_cast<int>(bytes.size()), timeOfDay().data());
+    request.write(bytes.data(), static_cast<unsigned>(bytes.size()));
+}
+
+}  // namespace
+
+ParallelEncoder::ParallelEncoder(boost::shared_ptr<Sound::Encoder> target,
+                                 boost::shared_ptr<RecognizeRequest> destination)
+    : encoder(std::move(target)), request(std::move(destination)) {}
+
+ParallelEncoder::ParallelEncoder(boost::shared_ptr<Sound::Encoder> target, Callback whenClosed)
+    : encoder(std::move(target)), callback(std::move(whenClosed)) {}
+
+ParallelEncoder::~ParallelEncoder() {
+    const Util::EventLock lock;
+    cancel();
+}
+
+void ParallelEncoder::write(const boost::shared_ptr<const Sound::SoundDataBuffer>& buffer) {
+    queue.push_back(buffer);
+    wroteAny = true;
+    taskQueueStep();
+}
+
+void ParallelEncoder::closeWrite() {
+    closed = true;
+    taskQueueStep();
+}
+
+void ParallelEncoder::cancel() {
+    if (currentTask) {
+        Tasking::TaskManager::getInstance().cancelTask(currentTask);
+    }
+}
+
+void ParallelEncoder::taskDone() {
+    if (request) {
+        if (Sound::Encoder* const source = encoder.operator->()) {
+            writeOutput(*request, source->takeOutput(TAKE_ALL).get(), "");
+        }
+    }
+    currentTask.reset();
+    taskQueueStep();
+}
+
+void ParallelEncoder::taskQueueStep() {
+    if (currentTask) {
+        return;
+    }
+    if (!queue.empty()) {
+        startNextTask();
+    } else if (closed) {
+        finishStream();
+    }
+}
+
+void ParallelEncoder::startNextTask() {
+    currentTask = boost::make_shared<ParallelEncoderTask>(this, encoder, queue.front());
+    queue.pop_front();
+    Tasking::TaskManager::getInstance().addTask(currentTask, 0);
+}
+
+void ParallelEncoder::finishStream() {
+    boost::shared_ptr<Sound::SoundDataBuffer> output;
+    if (Sound::Encoder* const source = encoder.operator->()) {
+        source->finish();
+        output = source->takeOutput(TAKE_ALL);
+    }
+    if (request) {
+        writeOutput(*request, output.get(), "the last ");
+        request->close(true);
+    } else {
+        callBack(output);
+    }
+    tvLogFormatMessage(LOG_LEVEL, "ParallelEncoder closes");
+}
+
+void ParallelEncoder::callBack(const boost::shared_ptr<Sound::SoundDataBuffer>& output) {
+    if (!KOR_ASSERT_AT(callback, "writer || callback", "talvox/impl/ParallelEncoder", 120)) {
+        return;
+    }
+    int size = 0;
+    if (Sound::SoundDataBuffer* const stream = output.operator->()) {
+        if (!wroteAny) {
+            stream->getData().clear();
+        }
+        size = static_cast<int>(stream->getData().size());
+    }
+    tvLogFormatMessage(LOG_LEVEL, "ParallelEncoder calls back with %d bytes", size);
+    const Callback target = callback;
+    target(output);
+}
+
+}  // namespace Talvox

@@ -1,0 +1,132 @@
+#include "talvox/impl/RecognizeProtocol.h"
+
+#include <boost/make_shared.hpp>
+
+#include "core/network/NetworkManager.h"
+#include "pal/kd.h"
+#include "talvox/Talvox.h"
+#include "talvox/impl/ChunkedRecognizeProtocol.h"
+#include "talvox/impl/SimpleRecognizeProtocol.h"
+
+namespace Talvox {
+
+namespace {
+
+const int RETRY_DELAY_MS = 2000;
+const int RETRY_ATTEMPTS = 2;
+const int64_t ANSWER_TIMEOUT_NS = 20LL * 1000 * 1000 * 1000;
+
+}  // namespace
+
+RecognizeProtocol::RecognizeProtocol(const Recognizer& recognizer)
+    : engineSettings(recognizer.getEngine()->getTalvoxSettings()) {}
+
+RecognizeProtocol::~RecognizeProtocol() = default;
+
+boost::shared_ptr<RecognizeProtocol> RecognizeProtocol::create(const Recognizer* recognizer,
+                                                               const std::string& type) {
+    if (type == "chunked") {
+        return boost::make_shared<ChunkedRecognizeProtocol>(recognizer);
+    }
+    if (type != "simple") {
+        kdLogFormatMessage("RecognizeProtocol: unknown type %s", type.c_str());
+    }
+    return boost::make_shared<SimpleRecognizeProtocol>(recognizer);
+}
+
+void RecognizeProtocol::addListener(const boost::weak_ptr<RecognizeProtocolListener>& listener) {
+    listeners.add(listener);
+}
+
+void RecognizeProtocol::abandon() {
+    abandoned = true;
+}
+
+void RecognizeProtocol::notifyError(SpeechError error) {
+    listeners.notify(
+        [&error](RecognizeProtocolListener& listener) { listener.onProtocolError(error); });
+}
+
+bool RecognizeProtocol::announceVoiceCaptured() {
+    if (abandoned || announcing) {
+        return false;
+    }
+    announcing = true;
+    listeners.notify(
+        [](RecognizeProtocolListener& listener) { listener.onProtocolVoiceCaptured(); });
+    announcing = false;
+    return !abandoned;
+}
+
+bool RecognizeProtocol::choosesSpeex() const {
+    const std::string& format = engineSettings->getString(Settings::SKS_SOUND_FORMAT);
+    if (format == Settings::SOUND_FORMAT_SPEEX) {
+        return true;
+    }
+    return format == Settings::SOUND_FORMAT_PCM_IF_WIFI &&
+           Network::NetworkManager::getInstance().getReachability() !=
+               Network::NetworkManager::WIFI;
+}
+
+int RecognizeProtocol::getSpeexQuality() const {
+    return engineSettings->getInt(Settings::SKS_SPEEX_QUALITY);
+}
+
+boost::shared_ptr<RecognizeRequest> RecognizeProtocol::makeRequest(
+    const Recognizer& recognizer, Network::NetworkTaskHolder& holder) {
+    auto request = boost::make_shared<RecognizeRequest>(*engineSettings, *recognizer.getSettings());
+    const boost::weak_ptr<RecognizeProtocol> weakSelf = shared_from_this();
+    request->callback = [weakSelf, &holder](
+                            const boost::shared_ptr<const RecognitionResults>& results,
+                            const std::string& requestId) {
+        // The holder is the protocol's own and lives as long.
+        if (const boost::shared_ptr<RecognizeProtocol> self = weakSelf.lock()) {
+            self->onNetworkRequestFinished(holder, results, requestId);
+        }
+    };
+    return request;
+}
+
+void RecognizeProtocol::submit(Network::NetworkTaskHolder& holder,
+                               const boost::shared_ptr<RecognizeRequest>& request) {
+    holder.submit(request, boost::make_shared<Network::NetworkTaskBasicRetryPolicy>(
+                               RETRY_DELAY_MS, RETRY_ATTEMPTS, false));
+}
+
+boost::shared_ptr<Util::Timer> RecognizeProtocol::startAnswerTimer(
+    Network::NetworkTaskHolder& holder) {
+    // The timer belongs to the protocol, so its function never runs after the protocol's end.
+    auto timer =
+        boost::make_shared<Util::Timer>([this, &holder] { onNetworkRequestTimeout(holder); });
+    timer->start(KD_TIMER_ONESHOT, ANSWER_TIMEOUT_NS);
+    return timer;
+}
+
+void RecognizeProtocol::onNetworkRequestFinished(
+    Network::NetworkTaskHolder& holder, const boost::shared_ptr<const RecognitionResults>& results,
+    const std::string& requestId) {
+    if (abandoned) {
+        return;
+    }
+    const boost::shared_ptr<RecognizeProtocol> self = shared_from_this();
+    holder.onFinished();
+    if (!results) {
+        notifyError(SpeechError(SpeechError::ErrorNetwork));
+        return;
+    }
+    listeners.notify([&results, &requestId](RecognizeProtocolListener& listener) {
+        listener.onProtocolResults(results, requestId);
+    });
+}
+
+void RecognizeProtocol::onNetworkRequestTimeout(Network::NetworkTaskHolder& holder) {
+    if (abandoned) {
+        return;
+    }
+    const boost::shared_ptr<RecognizeProtocol> self = shared_from_this();
+    kdLogFormatMessage("Recognition request timeout");
+    holder.cancel();
+    notifyError(SpeechError(SpeechError::ErrorNetwork));
+}
+
+}  // namespace Talvox

@@ -1,0 +1,198 @@
+#include "talvox/impl/RecognizeRequest.h"
+
+#include <boost/make_shared.hpp>
+#include <optional>
+
+#include "pal/kd.h"
+#include "talvox/Log.h"
+#include "talvox/impl/RequestFormat.h"
+#include "talvox/impl/ResultDocument.h"
+
+namespace Talvox {
+
+namespace {
+
+const char* const SOURCE = "talvox/impl/RecognizeRequest";
+const char* const BOUNDARY = "1BEF0A57BE110FD467A";
+const char* const RESULTS_HEADER = "x-asrgw-recognition-results";
+const char* const REQUEST_ID_HEADER = "x-kvrequestid";
+
+const int LOG_LEVEL = 2;
+const int TIMEOUT_MS = 30000;
+const int PRIORITY_UPLOAD = 1;
+const int PRIORITY_RECOGNITION = 3;
+
+Sound::SoundDataInfo getSentFormat(const Settings& engineSettings) {
+    const bool speex =
+        engineSettings.getString(Settings::SKS_SOUND_FORMAT) == Settings::SOUND_FORMAT_SPEEX;
+    return {speex ? Sound::SoundDataInfo::SPEEX : Sound::SoundDataInfo::NONE, 1,
+            engineSettings.getSampleRate(), 2};
+}
+
+}  // namespace
+
+RecognizeRequest::RecognizeRequest(const Settings& engine, const Settings& recognizer)
+    : RecognizeRequest(boost::make_shared<const Settings>(engine),
+                       boost::make_shared<const Settings>(recognizer)) {}
+
+RecognizeRequest::RecognizeRequest(boost::shared_ptr<const Settings> engine,
+                                   boost::shared_ptr<const Settings> recognizer)
+    : engineSettings(*engine),
+      recognizerSettings(*recognizer),
+      contentType(makeContentType(getSentFormat(*engine))),
+      multipart(Network::HttpRequest::MultipartBuilder::create(BOUNDARY)),
+      callback([](const boost::shared_ptr<const RecognitionResults>&, const std::string&) {}),
+      engineCopy(std::move(engine)),
+      recognizerCopy(std::move(recognizer)) {}
+
+RecognizeRequest::~RecognizeRequest() = default;
+
+int RecognizeRequest::getPriority() {
+    return results ? PRIORITY_UPLOAD : PRIORITY_RECOGNITION;
+}
+
+bool RecognizeRequest::isReadyToPerform() const {
+    KOR_ASSERT_AT(!engineSettings.getUuid().empty(), "talvoxSettings.getUuid() != \"\"", SOURCE,
+                  52);
+    KOR_ASSERT_AT(!engineSettings.getUrl().empty(), "talvoxSettings.getUrl() != \"\"", SOURCE, 53);
+    return true;
+}
+
+boost::shared_ptr<Network::HttpRequest> RecognizeRequest::issueRequest() const {
+    const std::string url =
+        makeRequestUrl(engineSettings, recognizerSettings, chunked, contentType);
+    boost::shared_ptr<Network::HttpRequest> http =
+        Network::HttpRequest::create(url, "POST", TIMEOUT_MS, false);
+    http->setChunked(chunked);
+    if (chunked) {
+        fillChunked(*http);
+    } else {
+        fillWhole(*http);
+    }
+    return http;
+}
+
+void RecognizeRequest::fillChunked(Network::HttpRequest& http) const {
+    http.setBoundary(multipart->getBoundary());
+    kdLogFormatMessage("Chunked request: %s", http.getUrl().c_str());
+    http.addBoundaryHeader();
+    http.setWriter(writer);
+}
+
+void RecognizeRequest::fillWhole(Network::HttpRequest& http) const {
+    kdLogFormatMessage("Non-chunked request: %s", http.getUrl().c_str());
+    const boost::shared_ptr<Network::HttpRequest::MultipartBuilder> builder =
+        Network::HttpRequest::MultipartBuilder::create(multipart->getBoundary());
+    KOR_ASSERT_AT(!engineSettings.getUuid().empty(), "!talvoxSettings.getUuid().empty()", SOURCE,
+                  168);
+    for (const Field& field : makeFields()) {
+        builder->addField(field.first, field.second, false, false, "");
+    }
+    addTranscripts(*builder);
+    addSound(*builder);
+    http.setBody(builder->getBoundary(), builder->getEncodedContent());
+}
+
+std::vector<RecognizeRequest::Field> RecognizeRequest::makeFields() const {
+    KOR_ASSERT_AT(!recognizerSettings.getLanguage().empty(),
+                  "!recognizerSettings.getLanguage().empty()", SOURCE, 170);
+    KOR_ASSERT_AT(!recognizerSettings.getModel().empty(), "!recognizerSettings.getModel().empty()",
+                  SOURCE, 172);
+    return {{"uuid", engineSettings.getUuid()},
+            {"lang", recognizerSettings.getLanguage()},
+            {"topic", recognizerSettings.getModel()},
+            {"myll", formatLocation(recognizerSettings.getLatLon(Settings::RS_MY_LL))},
+            {"centerll", formatLocation(recognizerSettings.getLatLon(Settings::RS_CENTER_LL))}};
+}
+
+void RecognizeRequest::addTranscripts(Network::HttpRequest::MultipartBuilder& builder) const {
+    if (!results) {
+        return;
+    }
+    const std::string transcripts = makeTranscripts(*results, {source, defaultLanguage, topic});
+    tvLogFormatMessage(LOG_LEVEL, "resultsXml: %s", transcripts.c_str());
+    builder.addField("transcripts", transcripts, false, false, "");
+}
+
+void RecognizeRequest::addSound(Network::HttpRequest::MultipartBuilder& builder) const {
+    if (!sound || sound->getData().empty()) {
+        return;
+    }
+    const std::vector<unsigned char>& bytes = sound->getData();
+    builder.addField("Content-Type", contentType, false, false, "");
+    builder.addField("audio", std::string(bytes.begin(), bytes.end()), false, false, contentType);
+    kdLogFormatMessage("request data size %d", static_cast<int>(bytes.size()));
+}
+
+void RecognizeRequest::writeBodyStart() {
+    KOR_ASSERT_AT(!engineSettings.getUuid().empty(), "!talvoxSettings.getUuid().empty()", SOURCE,
+                  63);
+    for (const Field& field : makeFields()) {
+        writeText(makeField(field.first, field.second));
+    }
+    writeText(makeField("Content-Type", contentType));
+    writeText(multipart->startField("audio", false, false, contentType));
+}
+
+void RecognizeRequest::write(const void* data, unsigned size) {
+    const boost::shared_ptr<Network::NetworkTaskWriter> current = writer;
+    if (Network::NetworkTaskWriter* const target = current.operator->()) {
+        target->write(data, size);
+    }
+}
+
+void RecognizeRequest::close(bool finished) {
+    if (closed) {
+        return;
+    }
+    closed = true;
+    writeText(multipart->endField());
+    if (!finished) {
+        tvLogFormatMessage(LOG_LEVEL, "Writing cancel field to request");
+        writeText(makeField("canceled", "true"));
+    }
+    writeText(multipart->endEncodedContent());
+    if (Network::NetworkTaskWriter* const target = writer.operator->()) {
+        target->close();
+    }
+}
+
+std::string RecognizeRequest::makeField(const std::string& name, const std::string& value) const {
+    return multipart->startField(name, false, false, "") + value + multipart->endField();
+}
+
+void RecognizeRequest::writeText(const std::string& text) {
+    write(text.data(), static_cast<unsigned>(text.size()));
+}
+
+void RecognizeRequest::onResponseRecieved(boost::shared_ptr<Network::HttpResponse> response) {
+    if (const std::optional<std::string> header = response->getHeader(RESULTS_HEADER)) {
+        const boost::shared_ptr<RecognitionResults> received = parseResultHeader(*header);
+        if (!received) {
+            return;
+        }
+        resultsReceived = true;
+        results = received;
+    }
+    if (const std::optional<std::string> identifier = response->getHeader(REQUEST_ID_HEADER)) {
+        requestId = *identifier;
+    }
+}
+
+void RecognizeRequest::onBytesReceived(const std::vector<unsigned char>& /*bytes*/) {
+    KOR_ASSERT_AT(!partsHandler, "false && \"Not implemented\"", SOURCE, 294);
+}
+
+void RecognizeRequest::onFinished(int code) {
+    if (partsHandler) {
+        return;
+    }
+    kdLogFormatMessage("RecognizeRequest::onFinished: res code %d", code);
+    // The callback may drop the request.
+    const Callback target = callback;
+    const boost::shared_ptr<const RecognitionResults> outcome = results;
+    const std::string identifier = requestId;
+    target(outcome, identifier);
+}
+
+}  // namespace Talvox

@@ -1,0 +1,101 @@
+/**
+ * @file
+ * The recognizer that uses the cloud service.
+ */
+#pragma once
+
+#include <boost/shared_ptr.hpp>
+#include <cstdint>
+#include <string>
+#include <vector>
+
+#include "core/sound/Recorder.h"
+#include "core/util/Timer.h"
+#include "talvox/Recognizer.h"
+#include "talvox/impl/RecognizeProtocol.h"
+#include "talvox/impl/RecognizeProtocolListener.h"
+#include "talvox/impl/VoiceActivityDetector.h"
+#include "talvox/impl/VoicePowerEstimator.h"
+#include "util/WavOutputStream.h"
+
+namespace Talvox {
+
+/**
+ * One recognition session: records, learns the noise, finds the speech, feeds every buffer to a
+ * protocol and reports to the application's listeners what happens, up to exactly one end (results
+ * or one error).
+ *
+ * `start`, `stop`, `cancel` and the destructor take the event lock and may be called on any thread;
+ * everything else is called under that lock. Listeners may call any of them, start another
+ * recognizer and drop their last reference to this one from inside any event.
+ */
+class KorvelRecognizer : public Recognizer,
+                         public Sound::RecorderListener,
+                         public RecognizeProtocolListener {
+  public:
+    KorvelRecognizer(const Talvox* facade, boost::shared_ptr<const Settings> recognizerSettings);
+    ~KorvelRecognizer() override;
+
+    /** Begins the session, once; an object whose session is over only logs the call. */
+    void start() override;
+    /** Ends listening; what was heard is recognised. Does nothing outside a session. */
+    void stop() override;
+    void cancel() override;
+
+    void onRecorderDataReceived(Sound::Recorder* source,
+                                boost::shared_ptr<const Sound::SoundDataBuffer> buffer) override;
+    void onRecorderError(Sound::Recorder* source) override;
+
+    void onProtocolError(SpeechError error) override;
+    void onProtocolVoiceBegin() override;
+    void onProtocolVoiceCaptured() override;
+    void onProtocolResults(boost::shared_ptr<const RecognitionResults> results,
+                           const std::string& requestId) override;
+
+    /** The languages of the service; the same list at every call. */
+    static const std::vector<std::string>& getAvailableLanguages();
+
+  private:
+    static bool statusIsReasonable(const Settings& engineSettings);
+    void chooseSessionMode(const Settings& engineSettings);
+    /** @return false when the session is over because there is no recording */
+    bool startRecorder(int sampleRateHz);
+    void startProtocol(bool streaming);
+    void startDetector(const std::string& parameters, const Sound::SoundDataInfo& format);
+    void startDump(const Sound::SoundDataInfo& format);
+    void startWatchdog();
+
+    /** Calls every listener, until one of them ends the session. */
+    template <typename Call>
+    void announce(Call call);
+    bool isOver() const { return resultsReported || errorReported || recorderRefused; }
+    bool isListening() const { return recorder && protocol; }
+    void learnLeadingNoise(const Sound::SoundDataBuffer& buffer);
+    void reportSound(const Sound::SoundDataBuffer& buffer);
+    void detectVoice(const Sound::SoundDataBuffer& buffer);
+
+    void stopRecorder();
+    void stopListening();
+    void dropProtocol();
+    void stopWithError(SpeechError error);
+
+    Sound::Recorder::Mode sessionMode = Sound::Recorder::MODE_VOICE_RECOGNITION;
+    boost::shared_ptr<Sound::Recorder> recorder;
+    boost::shared_ptr<RecognizeProtocol> protocol;
+    boost::shared_ptr<VoiceActivityDetector> vad;
+    VoicePowerEstimator powerEstimator;
+    int64_t startTime = 0;
+    int64_t listeningStoppedTime = 0;
+    bool leadingNoiseDone = false;
+    bool resultsReported = false;
+    bool errorReported = false;
+    unsigned leadingNoiseMs = 0;
+    unsigned recordedMs = 0;
+    boost::shared_ptr<Util::WavOutputStream> wavDump;
+
+    bool recorderRefused = false;
+    int64_t lastBufferTime = 0;
+    boost::shared_ptr<Util::Timer> watchdog;
+};
+
+}  // namespace Talvox

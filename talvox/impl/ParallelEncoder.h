@@ -1,0 +1,73 @@
+/**
+ * @file
+ * Encodes sound off the event thread, in order.
+ */
+#pragma once
+
+#include <boost/shared_ptr.hpp>
+#include <deque>
+#include <functional>
+
+#include "core/sound/Encoder.h"
+#include "core/sound/SoundDataBuffer.h"
+#include "talvox/impl/ParallelEncoderTask.h"
+#include "talvox/impl/RecognizeRequest.h"
+
+namespace Talvox {
+
+/**
+ * Encodes buffers on the task workers, one at a time and in the order in which they were written,
+ * and hands the encoded bytes on: piece by piece into an open request (writer mode), or in one
+ * piece to a callback once the stream is closed (callback mode).
+ *
+ * Used under the event lock only; no operation waits for a worker.
+ */
+class ParallelEncoder {
+  public:
+    using Callback = std::function<void(boost::shared_ptr<const Sound::SoundDataBuffer>)>;
+
+    /** Writer mode: the encoded bytes go to the request, which is closed at the end. */
+    ParallelEncoder(boost::shared_ptr<Sound::Encoder> target,
+                    boost::shared_ptr<RecognizeRequest> destination);
+
+    /**
+     * Callback mode.
+     * @param whenClosed gets the whole encoded stream, without any bytes when no sound was ever
+     *                   written; may destroy the parallel encoder
+     */
+    ParallelEncoder(boost::shared_ptr<Sound::Encoder> target, Callback whenClosed);
+
+    ParallelEncoder(const ParallelEncoder&) = delete;
+    ParallelEncoder& operator=(const ParallelEncoder&) = delete;
+
+    /** Cancels the task in flight. */
+    ~ParallelEncoder();
+
+    /** Queues a buffer. */
+    void write(const boost::shared_ptr<const Sound::SoundDataBuffer>& buffer);
+
+    /** No buffer follows; the output is handed on once all buffers are encoded. */
+    void closeWrite();
+
+    /** Gives up the task in flight; what is left is to drop the parallel encoder. */
+    void cancel();
+
+    /** The task in flight has encoded its buffer; for the task. */
+    void taskDone();
+
+  private:
+    void taskQueueStep();
+    void startNextTask();
+    void finishStream();
+    void callBack(const boost::shared_ptr<Sound::SoundDataBuffer>& output);
+
+    boost::shared_ptr<Sound::Encoder> encoder;
+    bool wroteAny = false;
+    Callback callback;
+    boost::shared_ptr<RecognizeRequest> request;
+    std::deque<boost::shared_ptr<const Sound::SoundDataBuffer>> queue;
+    boost::shared_ptr<ParallelEncoderTask> currentTask;
+    bool closed = false;
+};
+
+}  // namespace Talvox

@@ -1,0 +1,92 @@
+#include "talvox/impl/RequestFormat.h"
+
+#include <array>
+#include <iomanip>
+#include <locale>
+#include <sstream>
+
+#include "pal/kd.h"
+
+namespace Talvox {
+
+namespace {
+
+const char* const SOURCE = "talvox/impl/RecognizeRequest";
+
+const std::string WHOLE_PATH = "/asrgw";
+const std::string CHUNKED_PATH = "/asrgw_chunked";
+
+bool endsWith(const std::string& text, const std::string& ending) {
+    return text.size() >= ending.size() &&
+           text.compare(text.size() - ending.size(), ending.size(), ending) == 0;
+}
+
+/** The service's address without the path of whole requests, which settings may carry. */
+std::string getBase(const std::string& url) {
+    return endsWith(url, WHOLE_PATH) ? url.substr(0, url.size() - WHOLE_PATH.size()) : url;
+}
+
+}  // namespace
+
+std::string makeContentType(const Sound::SoundDataInfo& aInfo) {
+    if (aInfo.getCodec() == Sound::SoundDataInfo::SPEEX) {
+        return "audio/x-speex";
+    }
+    KOR_ASSERT_AT(aInfo.getCodec() == Sound::SoundDataInfo::NONE,
+                  "aInfo.getCodec() == Sound::SoundDataInfo::NONE", SOURCE, 317);
+    KOR_ASSERT_AT(aInfo.getChannelCount() == 1, "aInfo.getChannelCount() == 1", SOURCE, 318);
+    KOR_ASSERT_AT(aInfo.getSampleSize() == 2, "aInfo.getSampleSize() == 2", SOURCE, 319);
+    std::array<char, 64> text = {};
+    kdSprintf_s(text.data(), text.size(), "audio/x-pcm;bit=16;rate=%i", aInfo.getSampleRate());
+    return text.data();
+}
+
+std::string makeRequestUrl(const Settings& talvoxSettings, const Settings& recognizerSettings,
+                           bool chunked, const std::string& contentType) {
+    std::string url = getBase(talvoxSettings.getUrl());
+    if (chunked) {
+        KOR_ASSERT_AT(!talvoxSettings.getUuid().empty(), "!talvoxSettings.getUuid().empty()",
+                      SOURCE, 137);
+        url += CHUNKED_PATH + "?uuid=" + talvoxSettings.getUuid() +
+               "&action=verbose&Content-Type=" + contentType;
+    } else {
+        url += WHOLE_PATH + "?uuid=" + talvoxSettings.getUuid();
+    }
+    if (!recognizerSettings.getSessionId().empty()) {
+        url += "&sessionId=" + recognizerSettings.getSessionId();
+    }
+    return url;
+}
+
+std::string formatLocation(const Util::Bundle::LatLon& location) {
+    std::ostringstream text;
+    text.imbue(std::locale::classic());
+    text << std::fixed << std::setprecision(6) << static_cast<double>(location.lat) << ','
+         << static_cast<double>(location.lon);
+    return text.str();
+}
+
+std::string makeTranscripts(const RecognitionResults& results, const TranscriptsOrigin& origin) {
+    std::ostringstream xml;
+    xml.imbue(std::locale::classic());
+    xml << "<?xml version=\"1.0\" encoding=\"utf-8\"?>\n";
+    xml << "<Transcripts source=\"" << origin.source << '"';
+    if (!origin.defaultLanguage.empty()) {
+        xml << " default_language=\"" << origin.defaultLanguage << '"';
+    }
+    if (!origin.topic.empty()) {
+        xml << " topic=\"" << origin.topic << '"';
+    }
+    xml << ">\n";
+    for (const RecognitionResult& result : results) {
+        xml << "  <Transcript";
+        if (result.getConfidence() >= 0.0F) {
+            xml << " confidence=\"" << static_cast<double>(result.getConfidence()) << '"';
+        }
+        xml << '>' << result.getText() << "</Transcript>\n";
+    }
+    xml << "</Transcripts>\n";
+    return xml.str();
+}
+
+}  // namespace Talvox
