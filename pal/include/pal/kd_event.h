@@ -5,11 +5,15 @@
  * One thread, started on first use, delivers everything that happens asynchronously: timers,
  * posted functions and the completions of background work. Every delivery runs under one recursive
  * lock, the event lock. Code that is called by the application takes the same lock for the length
- * of the call; so all that runs under it is serialised, and whoever holds it may cancel a timer, a
- * posted function or background work and be sure that its callback does not run any more.
+ * of the call; so all that runs under it is serialised, and whoever holds it may cancel a timer or
+ * background work and be sure that its callback does not run any more.
  *
  * A callback may do: start, cancel and free timers (its own included), post, queue work, call any
  * function of this layer. It must not block, and must not let an exception escape.
+ *
+ * When the process ends or the library is unloaded, the event thread is stopped: a callback that
+ * runs is waited for (two seconds at most), then nothing is delivered any more. Calls that come
+ * later are harmless and have no effect beyond the handles that they return.
  */
 #ifndef KORVEL_PAL_KD_EVENT_H
 #define KORVEL_PAL_KD_EVENT_H
@@ -64,7 +68,7 @@ KD_API KDint kdCancelTimer(KDTimer* timer);
 /** Takes the event lock; the same thread may take it repeatedly. */
 KD_API void kdEventLockKOR(void);
 
-/** Releases the event lock once. */
+/** Releases the event lock once. Asserts, and does nothing, when the thread does not hold it. */
 KD_API void kdEventUnlockKOR(void);
 
 /** 1 when the calling thread holds the event lock, else 0. */
@@ -72,13 +76,15 @@ KD_API KDint kdHoldsEventLockKOR(void);
 
 /**
  * Runs `func(user)` on the event thread under the event lock, after everything posted before.
- * Never blocks. Functions still waiting when the process ends are dropped.
+ * Never blocks. Functions still waiting when the process ends are dropped. Asserts when `func` is
+ * null.
  */
 KD_API void kdPostKOR(void (*func)(void* user), void* user);
 
 /**
  * Returns once everything that was posted before the call has run. Must not be called with the
- * event lock held or from the event thread (-1 is returned at once then, 0 otherwise).
+ * event lock held, hence not from a callback.
+ * @return 0, or -1 at once when the lock is held or the event thread has been stopped.
  */
 KD_API KDint kdDrainEventsKOR(void);
 
@@ -86,16 +92,20 @@ KD_API KDint kdDrainEventsKOR(void);
 typedef struct KDWork KDWork;
 
 /**
- * Runs `work(user)` on a worker thread without any lock, then `done(user)` on the event thread
- * under the event lock. `work` may block; at most four pieces of work run at a time.
- * @return a handle that is valid until `done` has been called or the work has been cancelled.
+ * Runs `work(user)` on a worker thread without any lock, then `done(user)` (unless null) on the
+ * event thread under the event lock. Work begins in the order of queueing; the number of workers,
+ * four unless the environment sets UV_THREADPOOL_SIZE, bounds how much of it runs at a time.
+ * `work` may block, but must come to an end: the process cannot end before.
+ * @return a handle that is valid until `done` is called or the work has been cancelled; null when
+ *         `work` is null, which asserts.
  */
 KD_API KDWork* kdQueueWorkKOR(void (*work)(void* user), void (*done)(void* user), void* user);
 
 /**
  * Under the event lock: guarantees that `done` is not called any more. The function `work` may be
  * running and then runs to its end; `release(user)` is called on the event thread, under the event
- * lock, once neither function can run any more, so that the owner can free `user`.
+ * lock, once neither function can run any more, so that the owner can free `user`. Null as
+ * `release` is accepted. Does nothing (`release` is not called) when the handle is not valid.
  */
 KD_API void kdCancelWorkKOR(KDWork* work, void (*release)(void* user));
 

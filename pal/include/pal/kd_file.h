@@ -7,7 +7,7 @@
  * embedder mounts it. All other paths are those of the operating system.
  *
  * A handle that is null, stale or closed already makes every call fail with its error value; no
- * freed memory is touched. One file must not be used by two threads at once.
+ * freed memory is touched. Calls of several threads on one file are taken one after the other.
  */
 #ifndef KORVEL_PAL_KD_FILE_H
 #define KORVEL_PAL_KD_FILE_H

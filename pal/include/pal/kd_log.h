@@ -23,12 +23,16 @@ KD_API void kdLogFormatMessageVargs(const char* format, va_list args)
 
 /**
  * Receives every log message. `message` ends with a zero byte, has no line feed added and is valid
- * during the call only. Called on the logging thread, one message at a time; it must not log, and
- * may only block as long as the application accepts that its callers block.
+ * during the call only. Called on the logging thread, one message at a time; it must not log (what
+ * it logs all the same goes to standard error), and may only block as long as the application
+ * accepts that its callers block.
  */
 typedef void(KDLogSinkFuncKOR)(const char* message, void* user);
 
-/** Replaces the log sink; null restores the default, which writes lines to standard error. */
+/**
+ * Replaces the log sink; null restores the default, which writes lines to standard error. Once this
+ * has returned, the former sink is not called any more.
+ */
 KD_API void kdSetLogSinkKOR(KDLogSinkFuncKOR* sink, void* user);
 
 /**

@@ -40,8 +40,7 @@ class ListenerList {
     /** Calls `call(Listener&)` for each live listener. */
     template <typename Call>
     void notify(Call call) {
-        entries.remove_if(
-            [](const boost::weak_ptr<Listener>& entry) { return entry.expired(); });
+        entries.remove_if([](const boost::weak_ptr<Listener>& entry) { return entry.expired(); });
         const std::list<boost::weak_ptr<Listener>> snapshot(entries);
         for (const boost::weak_ptr<Listener>& entry : snapshot) {
             if (const boost::shared_ptr<Listener> listener = entry.lock()) {
