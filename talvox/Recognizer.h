@@ -42,13 +42,13 @@ class TALVOX_API Recognizer : public boost::enable_shared_from_this<Recognizer> 
     void addListener(const boost::weak_ptr<RecognizerListener>& listener);
 
     /** The validated settings of this recognition; never change. */
-    const boost::shared_ptr<const Settings>& getSettings() const { return settings; }
+    const boost::shared_ptr<const Settings>& getSettings() const { return validatedSettings; }
     /** The facade that made this recognizer. */
     const Talvox* getEngine() const { return engine; }
 
   protected:
     /** @param facade not owned; must outlive the recognizer */
-    Recognizer(const Talvox* facade, boost::shared_ptr<const Settings> recognizerSettings);
+    Recognizer(const Talvox* facade, boost::shared_ptr<const Settings> settings);
 
     /**
      * Reports the error to all live listeners. Changes no state of the recognizer; both this and
@@ -64,7 +64,7 @@ class TALVOX_API Recognizer : public boost::enable_shared_from_this<Recognizer> 
     Util::ListenerList<RecognizerListener> listeners;
 
   private:
-    boost::shared_ptr<const Settings> settings;
+    boost::shared_ptr<const Settings> validatedSettings;
     const Talvox* engine;
 };
 

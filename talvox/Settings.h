@@ -5,6 +5,7 @@
 #pragma once
 
 #include <boost/shared_ptr.hpp>
+#include <initializer_list>
 #include <string>
 
 #include "talvox/Export.h"
@@ -140,6 +141,10 @@ class TALVOX_API Settings : public Util::Bundle {
     void validateConfidences();
     void validateNumbers();
     void validateRecognizerTexts();
+
+    using TextList = std::initializer_list<const std::string*>;
+    void repairText(const std::string& key, const TextList& admissible,
+                    const std::string& replacement, const char* complaint, const char* settingTo);
 };
 
 }  // namespace Talvox

@@ -31,7 +31,7 @@ namespace Talvox {
 class TALVOX_API Talvox : public Util::Singleton<Talvox> {
   public:
     /** What serves a recognition; the numbers are fixed. */
-    enum RecognitionMechanism {
+    enum RecognitionMechanism : int {
         MechanismKorvel = 0,   /**< the cloud service */
         MechanismPlatform = 1, /**< the platform's own recogniser */
         MechanismDummy = 2     /**< none is available */
@@ -112,6 +112,8 @@ class TALVOX_API Talvox : public Util::Singleton<Talvox> {
     Talvox();
 
     static bool isPlatformSupported();
+    static void logMechanism(RecognitionMechanism mechanism, const Settings& settings,
+                             bool platformSupported);
     boost::shared_ptr<Recognizer> makeRecognizer(
         RecognitionMechanism mechanism, const boost::shared_ptr<const Settings>& settings) const;
 

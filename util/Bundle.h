@@ -49,6 +49,11 @@ class TALVOX_API Bundle {
         std::string text;
         /** Shared with whoever else holds it, never copied along with the element. */
         boost::shared_ptr<const Bundle> bundle;
+
+        /** The scalar as each of its three types; safe whatever it holds. */
+        bool asBoolean() const;
+        int asInt() const;
+        float asFloat() const;
     };
 
     /**
@@ -131,6 +136,8 @@ class TALVOX_API Bundle {
     void updateFromXml(const std::string& xml, const std::string& path, const ElemSpec* spec);
 
   private:
+    static const ElemSpec* findRow(const ElemSpec* spec, const std::string& key);
+
     const Elem& getTyped(const std::string& key, ElemType type, const char* condition) const;
     void updateElement(const TiXmlElement& element, const ElemSpec* spec);
     void updateSubBundle(const TiXmlElement& element, const std::string& key,

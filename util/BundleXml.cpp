@@ -1,0 +1,206 @@
+#include <boost/make_shared.hpp>
+#include <sstream>
+#include <vector>
+
+#include "core/util/XmlUtils.h"
+#include "pal/kd_log.h"
+#include "tinyxml.h"
+#include "util/Ascii.h"
+#include "util/Bundle.h"
+#include "util/NumberText.h"
+
+namespace Util {
+
+namespace {
+
+const char* const UPDATE_FROM_XML = "updateFromXml";
+const char* const TO_XML_STRING = "toXmlString";
+
+std::vector<std::string> splitPath(const std::string& path) {
+    std::vector<std::string> pieces;
+    std::istringstream stream(path);
+    for (std::string piece; std::getline(stream, piece, '/');) {
+        if (!piece.empty()) {
+            pieces.push_back(piece);
+        }
+    }
+    return pieces;
+}
+
+/** The node that the path leads to, or null. */
+const TiXmlNode* findNode(const TiXmlNode& start, const std::string& path) {
+    const TiXmlNode* node = &start;
+    for (const std::string& piece : splitPath(path)) {
+        node = node->FirstChildElement(piece.c_str());
+        if (node == nullptr) {
+            return nullptr;
+        }
+    }
+    return node;
+}
+
+std::string bodyOf(const TiXmlElement& element) {
+    const TiXmlNode* child = element.FirstChild();
+    if (child == nullptr) {
+        kdLogFormatMessage("%s: no body", element.Value());
+        return std::string();
+    }
+    return child->Value();
+}
+
+bool isFalseText(const std::string& text) {
+    std::string lower;
+    for (const char c : text) {
+        lower += toLowerAscii(c);
+    }
+    return lower.empty() || lower == "0" || lower == "false" || lower == "no";
+}
+
+/** Takes the number, after a line in the log where it is not what the text says. */
+template <typename Number>
+Number accept(const NumberText::Reading<Number>& reading, const std::string& key,
+              const std::string& text) {
+    if (reading.status == NumberText::OUT_OF_RANGE) {
+        kdLogFormatMessage("%s: value of %s out of range: %.64s, taking the nearest",
+                           UPDATE_FROM_XML, key.c_str(), text.c_str());
+    } else if (reading.status == NumberText::NOT_A_NUMBER && !text.empty()) {
+        kdLogFormatMessage("%s: value of %s not a number: %.64s, taking 0", UPDATE_FROM_XML,
+                           key.c_str(), text.c_str());
+    }
+    return reading.value;
+}
+
+Bundle::LatLon readLatLon(const std::string& key, const std::string& text) {
+    Bundle::LatLon latLon;
+    const NumberText::Reading<float> lat = NumberText::readFloat(text);
+    latLon.lat = accept(lat, key, text);
+    if (lat.status != NumberText::NOT_A_NUMBER) {
+        NumberText::Reading<float> lon;
+        if (lat.end < text.size() && text[lat.end] == ',') {
+            lon = NumberText::readFloat(text, lat.end + 1);
+        }
+        latLon.lon = accept(lon, key, text);
+    }
+    return latLon;
+}
+
+/** The text of a scalar element; false for a type that has none. */
+bool writeScalar(const Bundle::Elem& elem, std::string& text) {
+    switch (elem.type) {
+        case Bundle::BOOLEAN:
+            text = elem.asBoolean() ? "true" : "false";
+            return true;
+        case Bundle::INT:
+            text = std::to_string(elem.asInt());
+            return true;
+        case Bundle::FLOAT:
+            text = NumberText::writeFloat(elem.asFloat());
+            return true;
+        case Bundle::LATLON:
+            text = NumberText::writeFloat(elem.latLon.lat) + "," +
+                   NumberText::writeFloat(elem.latLon.lon);
+            return true;
+        case Bundle::STRING:
+            text = elem.text;
+            return true;
+        default:
+            return false;
+    }
+}
+
+}  // namespace
+
+std::string Bundle::toXmlString(const std::string& name) const {
+    std::string xml = "<" + name + ">\n";
+    for (const auto& [key, elem] : rep) {
+        std::string text;
+        if (elem.type == BUNDLE) {
+            xml += elem.bundle ? elem.bundle->toXmlString(key) : Bundle().toXmlString(key);
+        } else if (writeScalar(elem, text)) {
+            xml.append("<").append(key).append(">").append(text);
+            xml.append("</").append(key).append(">\n");
+        } else {
+            kdLogFormatMessage("%s: unknown element type for %s: %d; ignoring", TO_XML_STRING,
+                               key.c_str(), elem.type);
+        }
+    }
+    return xml + "</" + name + ">\n";
+}
+
+void Bundle::updateFromXml(const std::string& xml, const std::string& path, const ElemSpec* spec) {
+    const std::string hazard = XmlUtils::findHazard(xml);
+    if (!hazard.empty()) {
+        kdLogFormatMessage("Bundle::updateFromXml parse error: %s", hazard.c_str());
+        return;
+    }
+    TiXmlDocument document;
+    document.Parse(xml.c_str(), nullptr, TIXML_ENCODING_UTF8);
+    if (document.Error()) {
+        kdLogFormatMessage("Bundle::updateFromXml parse error: %s", document.ErrorDesc());
+    }
+    updateFromXml(document, path, spec);
+}
+
+void Bundle::updateFromXml(const TiXmlNode& node, const std::string& path, const ElemSpec* spec) {
+    const TiXmlNode* parent = findNode(node, path);
+    if (parent == nullptr) {
+        kdLogFormatMessage("%s: path %s does not exist", UPDATE_FROM_XML, path.c_str());
+        return;
+    }
+    for (const TiXmlElement* element = parent->FirstChildElement(); element != nullptr;
+         element = element->NextSiblingElement()) {
+        updateElement(*element, spec);
+    }
+}
+
+void Bundle::updateElement(const TiXmlElement& element, const ElemSpec* spec) {
+    const std::string text = bodyOf(element);
+    const std::string key = normalizeKey(element.Value());
+    const ElemSpec* row = findRow(spec, key);
+    if (row == nullptr) {
+        kdLogFormatMessage("%s: unknown element name %s, ignoring", UPDATE_FROM_XML, key.c_str());
+        return;
+    }
+    switch (row->type) {
+        case BOOLEAN:
+            putBoolean(key, !isFalseText(text));
+            break;
+        case INT:
+            putInt(key, accept(NumberText::readInt(text), key, text));
+            break;
+        case FLOAT:
+            putFloat(key, accept(NumberText::readFloat(text), key, text));
+            break;
+        case LATLON:
+            putLatLon(key, readLatLon(key, text));
+            break;
+        case STRING:
+            putString(key, text);
+            break;
+        case BUNDLE:
+            updateSubBundle(element, key, row->subSpec);
+            break;
+        default:
+            kdLogFormatMessage("%s: unknown element type for %s: %d; ignoring", UPDATE_FROM_XML,
+                               key.c_str(), row->type);
+    }
+}
+
+void Bundle::updateSubBundle(const TiXmlElement& element, const std::string& key,
+                             const ElemSpec* subSpec) {
+    boost::shared_ptr<Bundle> updated;
+    const auto old = rep.find(key);
+    if (old == rep.end()) {
+        updated = boost::make_shared<Bundle>();
+    } else if (old->second.type != BUNDLE) {
+        kdLogFormatMessage("%s: old value of %s not a bundle, ignoring update", UPDATE_FROM_XML,
+                           key.c_str());
+        return;
+    } else {
+        updated = old->second.bundle ? old->second.bundle->clone() : boost::make_shared<Bundle>();
+    }
+    updated->updateFromXml(element, "", subSpec);
+    putBundle(key, updated);
+}
+
+}  // namespace Util

@@ -35,10 +35,10 @@ class TALVOX_API WavOutputStream : public IO::OutputStream {
      * Creates the file (an existing one is replaced) and writes the header. A file of an earlier
      * call is closed first.
      * @param path  as for `kdFopen`
-     * @param info  format of the samples; its codec is not looked at, the file is always PCM
+     * @param format  format of the samples; its codec is not looked at, the file is always PCM
      * @return false when the file could not be made; the stream has no file then
      */
-    bool init(const std::string& path, const Sound::SoundDataInfo& info);
+    bool init(const std::string& path, const Sound::SoundDataInfo& format);
 
     /**
      * Appends sample bytes.
