@@ -15,7 +15,7 @@ namespace Sound {
 
 /**
  * Delivers the given samples, then silence without end, paced by the platform clock: one buffer
- * per buffer length.
+ * per buffer length. A recorder that was stopped and is started again goes on where it was.
  */
 class KORVEL_CORE_API FileRecorder : public Recorder {
   public:

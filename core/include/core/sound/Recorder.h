@@ -53,10 +53,11 @@ class KORVEL_CORE_API Recorder : public boost::enable_shared_from_this<Recorder>
     virtual ~Recorder();
 
     /**
-     * Prepares the device with the values set so far. Never waits for the device: what shows only
-     * later arrives as `onRecorderError`.
-     * @return false when it is clear that recording is not possible (an absurd rate or buffer
-     *         length, no sound server); the recorder is of no further use then.
+     * Prepares the device with the values set so far. Never waits for the device or its server:
+     * what only they can tell (no server, no microphone, refused) arrives as `onRecorderError`,
+     * after `startRecording` at the earliest.
+     * @return false when it is clear at once that recording is not possible (an absurd rate or
+     *         buffer length, no kind of recorder); the recorder is of no further use then.
      */
     virtual bool init() = 0;
 
@@ -64,8 +65,9 @@ class KORVEL_CORE_API Recorder : public boost::enable_shared_from_this<Recorder>
     virtual void startRecording();
 
     /**
-     * Ends recording at once: no listener is called afterwards. Never waits for the device. An
-     * override calls this base operation last.
+     * Ends recording at once: no listener is called afterwards, except that an error that is being
+     * reported reaches every listener. Never waits for the device. An override calls this base
+     * operation last.
      */
     virtual void stopRecording();
 
@@ -96,8 +98,13 @@ class KORVEL_CORE_API Recorder : public boost::enable_shared_from_this<Recorder>
     bool isRecording() const { return recording; }
 
   protected:
-    /** Calls every live listener, on a copy of the list; the recorder survives the calls. */
+    /**
+     * Calls every live listener, on a copy of the list, until one stops the recorder. The recorder
+     * survives the calls.
+     */
     void notifyData(const boost::shared_ptr<const SoundDataBuffer>& buffer);
+
+    /** Calls every live listener, on a copy of the list. The recorder survives the calls. */
     void notifyError();
 
   private:
@@ -106,6 +113,7 @@ class KORVEL_CORE_API Recorder : public boost::enable_shared_from_this<Recorder>
     int bufferLengthMs = 100;
     Mode mode = MODE_VOICE_RECOGNITION;
     bool recording = false;
+    unsigned stopCount = 0;
 };
 
 }  // namespace Sound

@@ -1,0 +1,82 @@
+#include "sound/AudioThreads.h"
+
+#include <pthread.h>
+#include <signal.h>
+
+#include <algorithm>
+#include <chrono>
+#include <condition_variable>
+#include <mutex>
+#include <system_error>
+#include <thread>
+#include <utility>
+#include <vector>
+
+namespace Sound {
+
+namespace {
+
+const std::chrono::seconds END_WAIT_MAX(1);
+
+struct Running {
+    std::mutex mutex;
+    std::condition_variable changed;
+    std::vector<boost::shared_ptr<PulseCapture>> captures;
+
+    void remove(const boost::shared_ptr<PulseCapture>& capture) {
+        captures.erase(std::remove(captures.begin(), captures.end(), capture), captures.end());
+    }
+};
+
+// Never destroyed: a thread that hangs in the client library may outlive everything else.
+Running& running() {
+    static auto* const instance = new Running;
+    return *instance;
+}
+
+void runCapture(const boost::shared_ptr<PulseCapture>& capture) {
+    capture->run();
+    std::unique_lock<std::mutex> lock(running().mutex);
+    running().remove(capture);
+    std::notify_all_at_thread_exit(running().changed, std::move(lock));
+}
+
+/** Keeps signals away from a thread that is started meanwhile: they are the application's. */
+class SignalsBlocked {
+  public:
+    SignalsBlocked() {
+        sigset_t all;
+        sigfillset(&all);
+        pthread_sigmask(SIG_SETMASK, &all, &before);
+    }
+    ~SignalsBlocked() { pthread_sigmask(SIG_SETMASK, &before, nullptr); }
+    SignalsBlocked(const SignalsBlocked&) = delete;
+    SignalsBlocked& operator=(const SignalsBlocked&) = delete;
+
+  private:
+    sigset_t before;
+};
+
+}  // namespace
+
+AudioThreads::~AudioThreads() {
+    std::unique_lock<std::mutex> lock(running().mutex);
+    for (const boost::shared_ptr<PulseCapture>& capture : running().captures) {
+        capture->end();
+    }
+    running().changed.wait_for(lock, END_WAIT_MAX, [] { return running().captures.empty(); });
+}
+
+bool AudioThreads::start(const boost::shared_ptr<PulseCapture>& capture) {
+    const SignalsBlocked signalsBlocked;
+    const std::lock_guard<std::mutex> lock(running().mutex);
+    try {
+        std::thread(&runCapture, capture).detach();
+    } catch (const std::system_error&) {
+        return false;
+    }
+    running().captures.push_back(capture);
+    return true;
+}
+
+}  // namespace Sound

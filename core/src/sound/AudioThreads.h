@@ -1,0 +1,21 @@
+#pragma once
+
+#include <boost/shared_ptr.hpp>
+
+#include "core/util/Singleton.h"
+#include "sound/PulseCapture.h"
+
+namespace Sound {
+
+/** Runs captures, each on a thread of its own that nobody has to wait for. */
+class AudioThreads : public Util::Singleton<AudioThreads> {
+  public:
+    /** Ends every capture that still runs and waits for their threads, but no longer than a
+     * second. */
+    ~AudioThreads() override;
+
+    /** @return false when there is no thread to be had */
+    bool start(const boost::shared_ptr<PulseCapture>& capture);
+};
+
+}  // namespace Sound

@@ -1,0 +1,69 @@
+#pragma once
+
+#include <boost/shared_ptr.hpp>
+#include <cstddef>
+#include <functional>
+#include <mutex>
+#include <string>
+#include <vector>
+
+#include "core/sound/SoundDataBuffer.h"
+#include "sound/RecorderFormat.h"
+
+namespace Sound {
+
+/**
+ * What a device's thread hands to the event thread: sound, cut into buffers of the asked length,
+ * and at most one failure, behind all sound that came before it.
+ */
+class CaptureQueue {
+  public:
+    /** The most buffers that wait; one more is a failure, because sound would be lost. */
+    static constexpr std::size_t BUFFERS_MAX = 64;
+
+    struct Batch {
+        std::vector<boost::shared_ptr<const SoundDataBuffer>> buffers;
+        bool failed = false;
+        std::string reason;
+    };
+
+    /**
+     * @param wake called on the device's thread, without a lock, when there is something to take
+     *             and it was not yet called since the last `take`
+     */
+    CaptureQueue(const RecorderFormat& format, std::function<void()> wake);
+    CaptureQueue(const CaptureQueue&) = delete;
+    CaptureQueue& operator=(const CaptureQueue&) = delete;
+
+    /**
+     * Appends sound. Device's thread.
+     * @param data whole 16-bit samples; null for silence
+     * @return false when it failed, now or before; no more sound is taken then
+     */
+    bool push(const unsigned char* data, std::size_t size);
+
+    /** Appends a failure; the first one counts. Device's thread, or before it has begun. */
+    void fail(const std::string& reason);
+
+    /** Moves out what has come so far. Event thread. */
+    Batch take();
+
+    /** Grows whenever sound comes; wraps around. Any thread. */
+    unsigned getArrivalCount() const;
+
+  private:
+    bool store(boost::shared_ptr<const SoundDataBuffer> buffer);
+    void callWake();
+
+    const RecorderFormat format;
+    const std::function<void()> wake;
+    std::vector<unsigned char> partial;  // of the device's thread
+
+    mutable std::mutex mutex;  // guards what follows
+    Batch waiting;
+    bool ended = false;
+    bool awake = false;
+    unsigned arrivals = 0;
+};
+
+}  // namespace Sound

@@ -1,0 +1,32 @@
+#pragma once
+
+#include <cstddef>
+
+#include "core/sound/SoundDataInfo.h"
+
+namespace Sound {
+
+/** The buffers that a recorder is asked for: 16-bit mono of a rate and a length. */
+class RecorderFormat {
+  public:
+    RecorderFormat(int sampleRateHz, int bufferLengthMs);
+
+    /** False where no device could deliver this: rates outside 1 to 384 kHz, buffers outside
+     * 1 ms to 10 s. Nothing else has a meaning then. */
+    bool isUsable() const;
+
+    /** Samples per buffer, rounded down. */
+    int getSampleCount() const;
+
+    /** Bytes per buffer. */
+    std::size_t getByteCount() const;
+
+    /** The format of each buffer. */
+    SoundDataInfo getInfo() const;
+
+  private:
+    int sampleRate;
+    int bufferLength;
+};
+
+}  // namespace Sound

@@ -1,0 +1,19 @@
+#include "sound/ZeroWatch.h"
+
+#include <algorithm>
+
+namespace Sound {
+
+bool ZeroWatch::isSuspicious(const SoundDataBuffer& buffer) {
+    const auto& bytes = buffer.getData();
+    const bool allZero =
+        std::all_of(bytes.begin(), bytes.end(), [](unsigned char byte) { return byte == 0; });
+    zeroSamples = allZero ? zeroSamples + buffer.getSampleCount() : 0;
+    if (reported || zeroSamples <= buffer.getInfo().getSampleRate()) {
+        return false;
+    }
+    reported = true;
+    return true;
+}
+
+}  // namespace Sound
