@@ -147,6 +147,7 @@ CLI::App* addVadCommand(CLI::App& app, VadOptions& options) {
         ->required();
     addVad(*command, options.settings);
     addRate(*command, options.settings);
+    addSettingsSources(*command, options.settings);
     command->add_flag("--json", options.json,
                       "Print every buffer and every segment as one JSON object a line");
     return command;

@@ -1,0 +1,21 @@
+#pragma once
+
+#include <ostream>
+
+#include "VadPrinter.h"
+
+namespace Cli {
+
+/** A table with one line for each buffer, then the list of segments. */
+class HumanVad : public VadPrinter {
+  public:
+    explicit HumanVad(std::ostream& output) : out(output) {}
+    void printBuffer(const Talvox::VadBufferAnalysis& buffer) override;
+    void printSegments(const std::vector<Talvox::VadSegment>& segments, bool lastIsOpen) override;
+
+  private:
+    std::ostream& out;
+    bool headerPrinted = false;
+};
+
+}  // namespace Cli
