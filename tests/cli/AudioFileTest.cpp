@@ -1,0 +1,179 @@
+#include "cli/AudioFile.h"
+
+#include <gmock/gmock.h>
+#include <sndfile.h>
+
+#include <sstream>
+
+#include "SoundFiles.h"
+#include "TempDirectory.h"
+#include "cli/UsageError.h"
+
+namespace {
+
+using Cli::AudioClip;
+using Cli::readAudioFile;
+using TestSupport::sine;
+using TestSupport::TempDirectory;
+using TestSupport::writeSoundFile;
+using ::testing::ElementsAre;
+using ::testing::Each;
+using ::testing::FloatNear;
+using ::testing::StartsWith;
+
+const int WAV = SF_FORMAT_WAV | SF_FORMAT_PCM_16;
+
+/** The message with which a path is refused; empty when it is not. */
+std::string refusal(const std::string& path) {
+    try {
+        readAudioFile(path);
+    } catch (const Cli::UsageError& error) {
+        return error.what();
+    }
+    return "";
+}
+
+TEST(AudioFile, Keeps16BitMonoSamplesAsTheyAre) {
+    const TempDirectory directory;
+    const std::string path = directory.path("a.wav");
+    ASSERT_TRUE(writeSoundFile(path, WAV, 16000, 1, {0, 1, -1, 32767, -32768, 12345}));
+    const AudioClip clip = readAudioFile(path);
+    EXPECT_EQ(clip.sampleRateHz, 16000);
+    EXPECT_THAT(clip.samples, ElementsAre(0, 1, -1, 32767, -32768, 12345));
+}
+
+TEST(AudioFile, MixesStereoDownToTheMean) {
+    const TempDirectory directory;
+    const std::string path = directory.path("stereo.wav");
+    ASSERT_TRUE(writeSoundFile(path, WAV, 44100, 2, {100, 300, -50, 50, 32767, 32767}));
+    const AudioClip clip = readAudioFile(path);
+    EXPECT_EQ(clip.sampleRateHz, 44100);
+    EXPECT_THAT(clip.samples, ElementsAre(200, 0, 32767));
+}
+
+TEST(AudioFile, MixesManyChannels) {
+    const TempDirectory directory;
+    const std::string path = directory.path("eight.wav");
+    ASSERT_TRUE(writeSoundFile(path, SF_FORMAT_WAVEX | SF_FORMAT_PCM_16, 48000, 8,
+                               {80, 0, 0, 0, 0, 0, 0, 0, 8, 8, 8, 8, 8, 8, 8, 8}));
+    EXPECT_THAT(readAudioFile(path).samples, ElementsAre(10, 8));
+}
+
+TEST(AudioFile, ReadsEightBitSound) {
+    const TempDirectory directory;
+    const std::string path = directory.path("eight-bit.wav");
+    ASSERT_TRUE(writeSoundFile(path, SF_FORMAT_WAV | SF_FORMAT_PCM_U8, 8000, 1,
+                               {0, 256 * 100, -256 * 100}));
+    const AudioClip clip = readAudioFile(path);
+    EXPECT_EQ(clip.sampleRateHz, 8000);
+    EXPECT_THAT(clip.samples, ElementsAre(FloatNear(0, 256), FloatNear(25600, 256),
+                                          FloatNear(-25600, 256)));
+}
+
+TEST(AudioFile, ReadsFloatSoundAndSilencesWhatIsNoNumber) {
+    const TempDirectory directory;
+    const std::string path = directory.path("float.wav");
+    SF_INFO info = {};
+    info.format = SF_FORMAT_WAV | SF_FORMAT_FLOAT;
+    info.samplerate = 22050;
+    info.channels = 1;
+    SNDFILE* file = sf_open(path.c_str(), SFM_WRITE, &info);
+    ASSERT_NE(file, nullptr);
+    const float samples[] = {0.5F, std::numeric_limits<float>::quiet_NaN(),
+                             std::numeric_limits<float>::infinity(), -0.25F};
+    ASSERT_EQ(sf_write_float(file, samples, 4), 4);
+    sf_close(file);
+    EXPECT_THAT(readAudioFile(path).samples, ElementsAre(16384, 0, 0, -8192));
+}
+
+TEST(AudioFile, ReadsOtherContainers) {
+    const TempDirectory directory;
+    const std::string aiff = directory.path("a.aiff");
+    ASSERT_TRUE(writeSoundFile(aiff, SF_FORMAT_AIFF | SF_FORMAT_PCM_24, 16000, 1, {1000, -1000}));
+    EXPECT_THAT(readAudioFile(aiff).samples, ElementsAre(1000, -1000));
+    const std::string flac = directory.path("a.flac");
+    ASSERT_TRUE(writeSoundFile(flac, SF_FORMAT_FLAC | SF_FORMAT_PCM_16, 11025, 1, sine(11025, 1)));
+    EXPECT_EQ(readAudioFile(flac).samples.size(), 11025U);
+}
+
+TEST(AudioFile, GivesTheSoundThatIsLeftOfATruncatedFile) {
+    const TempDirectory directory;
+    const std::string whole = directory.path("whole.wav");
+    ASSERT_TRUE(writeSoundFile(whole, WAV, 16000, 1, std::vector<int16_t>(1000, 7)));
+    const std::string bytes = TempDirectory::read(whole);
+    ASSERT_EQ(bytes.size(), 44U + 2000U);
+    const AudioClip clip = readAudioFile(directory.write("cut.wav", bytes.substr(0, 44 + 401)));
+    EXPECT_EQ(clip.samples.size(), 200U);
+    EXPECT_THAT(clip.samples, Each(7));
+}
+
+TEST(AudioFile, RefusesAFileThatIsCutInItsHeader) {
+    const TempDirectory directory;
+    const std::string whole = directory.path("whole.wav");
+    ASSERT_TRUE(writeSoundFile(whole, WAV, 16000, 1, std::vector<int16_t>(1000, 7)));
+    const std::string path =
+        directory.write("cut.wav", TempDirectory::read(whole).substr(0, 20));
+    EXPECT_THAT(refusal(path), StartsWith("cannot read " + path + ": "));
+}
+
+TEST(AudioFile, RefusesAFileWithoutSamples) {
+    const TempDirectory directory;
+    const std::string path = directory.path("silent.wav");
+    ASSERT_TRUE(writeSoundFile(path, WAV, 16000, 1, {}));
+    EXPECT_EQ(refusal(path), "cannot read " + path + ": it holds no sound");
+}
+
+TEST(AudioFile, RefusesAnEmptyFile) {
+    const TempDirectory directory;
+    const std::string path = directory.write("empty.wav", "");
+    EXPECT_EQ(refusal(path), "cannot read " + path + ": the file is empty");
+}
+
+TEST(AudioFile, RefusesWhatIsNotSound) {
+    const TempDirectory directory;
+    const std::string path = directory.write("letter.txt", "Dear Sir or Madam, this is no sound.");
+    EXPECT_EQ(refusal(path),
+              "cannot read " + path + ": File contains data in an unknown format");
+}
+
+TEST(AudioFile, RefusesAMissingFileAndADirectory) {
+    const TempDirectory directory;
+    const std::string missing = directory.path("nowhere.wav");
+    EXPECT_EQ(refusal(missing), "cannot read " + missing + ": No such file or directory");
+    EXPECT_EQ(refusal(directory.path()),
+              "cannot read " + directory.path() + ": it is a directory");
+}
+
+TEST(AudioFile, RefusesAnAbsurdSampleRate) {
+    const TempDirectory directory;
+    const std::string path = directory.path("slow.wav");
+    ASSERT_TRUE(writeSoundFile(path, WAV, 10, 1, {1, 2, 3}));
+    EXPECT_EQ(refusal(path), "cannot read " + path + ": its sample rate of 10 Hz is out of range");
+}
+
+TEST(RawAudio, ReadsSignedLittleEndianSamples) {
+    std::istringstream in(std::string("\x01\x00\xFF\xFF\x00\x80\xFF\x7F", 8));
+    const AudioClip clip = Cli::readRawAudio(in, 8000, 100);
+    EXPECT_EQ(clip.sampleRateHz, 8000);
+    EXPECT_THAT(clip.samples, ElementsAre(1, -1, -32768, 32767));
+}
+
+TEST(RawAudio, DropsAnOddByteAtTheEnd) {
+    std::istringstream in(std::string("\x01\x00\x02", 3));
+    EXPECT_THAT(Cli::readRawAudio(in, 8000, 100).samples, ElementsAre(1));
+}
+
+TEST(RawAudio, TakesNoMoreThanAskedFor) {
+    std::istringstream in(std::string(1000, '\1'));
+    EXPECT_EQ(Cli::readRawAudio(in, 8000, 7).samples.size(), 7U);
+    EXPECT_EQ(in.tellg(), std::istringstream::pos_type(14));
+}
+
+TEST(RawAudio, RefusesAnEmptyStream) {
+    std::istringstream in("");
+    EXPECT_THROW(Cli::readRawAudio(in, 8000, 100), Cli::UsageError);
+    std::istringstream oneByte("x");
+    EXPECT_THROW(Cli::readRawAudio(oneByte, 8000, 100), Cli::UsageError);
+}
+
+}  // namespace
