@@ -13,13 +13,13 @@ namespace {
 
 using Cli::AudioClip;
 using Cli::readAudioFile;
+using ::testing::Each;
+using ::testing::ElementsAre;
+using ::testing::FloatNear;
+using ::testing::StartsWith;
 using TestSupport::sine;
 using TestSupport::TempDirectory;
 using TestSupport::writeSoundFile;
-using ::testing::ElementsAre;
-using ::testing::Each;
-using ::testing::FloatNear;
-using ::testing::StartsWith;
 
 const int WAV = SF_FORMAT_WAV | SF_FORMAT_PCM_16;
 
@@ -66,8 +66,8 @@ TEST(AudioFile, ReadsEightBitSound) {
                                {0, 256 * 100, -256 * 100}));
     const AudioClip clip = readAudioFile(path);
     EXPECT_EQ(clip.sampleRateHz, 8000);
-    EXPECT_THAT(clip.samples, ElementsAre(FloatNear(0, 256), FloatNear(25600, 256),
-                                          FloatNear(-25600, 256)));
+    EXPECT_THAT(clip.samples,
+                ElementsAre(FloatNear(0, 256), FloatNear(25600, 256), FloatNear(-25600, 256)));
 }
 
 TEST(AudioFile, ReadsFloatSoundAndSilencesWhatIsNoNumber) {
@@ -111,8 +111,7 @@ TEST(AudioFile, RefusesAFileThatIsCutInItsHeader) {
     const TempDirectory directory;
     const std::string whole = directory.path("whole.wav");
     ASSERT_TRUE(writeSoundFile(whole, WAV, 16000, 1, std::vector<int16_t>(1000, 7)));
-    const std::string path =
-        directory.write("cut.wav", TempDirectory::read(whole).substr(0, 20));
+    const std::string path = directory.write("cut.wav", TempDirectory::read(whole).substr(0, 20));
     EXPECT_THAT(refusal(path), StartsWith("cannot read " + path + ": "));
 }
 
@@ -132,16 +131,14 @@ TEST(AudioFile, RefusesAnEmptyFile) {
 TEST(AudioFile, RefusesWhatIsNotSound) {
     const TempDirectory directory;
     const std::string path = directory.write("letter.txt", "Dear Sir or Madam, this is no sound.");
-    EXPECT_EQ(refusal(path),
-              "cannot read " + path + ": File contains data in an unknown format");
+    EXPECT_EQ(refusal(path), "cannot read " + path + ": File contains data in an unknown format");
 }
 
 TEST(AudioFile, RefusesAMissingFileAndADirectory) {
     const TempDirectory directory;
     const std::string missing = directory.path("nowhere.wav");
     EXPECT_EQ(refusal(missing), "cannot read " + missing + ": No such file or directory");
-    EXPECT_EQ(refusal(directory.path()),
-              "cannot read " + directory.path() + ": it is a directory");
+    EXPECT_EQ(refusal(directory.path()), "cannot read " + directory.path() + ": it is a directory");
 }
 
 TEST(AudioFile, RefusesAnAbsurdSampleRate) {

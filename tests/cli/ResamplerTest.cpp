@@ -45,8 +45,8 @@ TEST(Resampler, GivesExactlyTheLengthOfTheSound) {
     for (const int from : {8000, 11025, 16000, 22050, 32000, 44100, 48000, 44101, 96000}) {
         for (const std::size_t length : {1, 2, 159, 160, 12345}) {
             const std::vector<int16_t> samples(length, 100);
-            const auto expected = static_cast<std::size_t>(
-                std::lround(static_cast<double>(length) * 16000 / from));
+            const auto expected =
+                static_cast<std::size_t>(std::lround(static_cast<double>(length) * 16000 / from));
             EXPECT_EQ(toSamples(clipOf(samples, from), 16000).size(), expected)
                 << length << " samples at " << from << " Hz";
         }

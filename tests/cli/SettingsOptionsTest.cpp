@@ -81,8 +81,7 @@ TEST(Assign, RefusesUnknownKeys) {
 }
 
 TEST(Assign, RefusesWhatIsNotWhollyAValueOfTheType) {
-    EXPECT_EQ(refusal("samplerate", "fast"),
-              "setting \"samplerate\": \"fast\" is not an integer");
+    EXPECT_EQ(refusal("samplerate", "fast"), "setting \"samplerate\": \"fast\" is not an integer");
     for (const char* text : {"", "16k", "1.5", "0x", "9999999999", "-2147483649", "1 2"}) {
         EXPECT_NE(refusal("samplerate", text), "") << text;
     }
@@ -103,8 +102,8 @@ TEST(BuildSettings, AppliesItsSourcesInOrder) {
     const LogCapture log;
     SettingsOptions options;
     options.defaults = {{"url", "default"}, {"uuid", "default"}, {"model", "d"}, {"vad", "d"}};
-    options.file = directory.write(
-        "settings.xml", document("<uuid>file</uuid><model>file</model><vad>file</vad>"));
+    options.file = directory.write("settings.xml",
+                                   document("<uuid>file</uuid><model>file</model><vad>file</vad>"));
     options.assignments = {"model=set", "vad=set", "vad=set again=1"};
     options.explicitValues = {{"vad", "explicit"}};
     const boost::shared_ptr<Settings> settings = buildSettings(options);

@@ -31,8 +31,8 @@ std::vector<int16_t> sine(int sampleRateHz, double seconds, double frequencyHz, 
     std::vector<int16_t> samples(static_cast<std::size_t>(std::lround(sampleRateHz * seconds)));
     for (std::size_t index = 0; index < samples.size(); ++index) {
         const double time = static_cast<double>(index) / sampleRateHz;
-        samples[index] = static_cast<int16_t>(
-            std::lround(amplitude * std::sin(TWO_PI * frequencyHz * time)));
+        samples[index] =
+            static_cast<int16_t>(std::lround(amplitude * std::sin(TWO_PI * frequencyHz * time)));
     }
     return samples;
 }

@@ -83,8 +83,7 @@ ToolProcess::ToolProcess(const std::string& program, const std::vector<std::stri
     std::transform(words.begin(), words.end(), std::back_inserter(argv),
                    [](std::string& word) { return word.data(); });
     argv.push_back(nullptr);
-    const int error =
-        posix_spawn(&pid, program.c_str(), &actions, nullptr, argv.data(), environ);
+    const int error = posix_spawn(&pid, program.c_str(), &actions, nullptr, argv.data(), environ);
     posix_spawn_file_actions_destroy(&actions);
     close(inPipe.read);
     close(outPipe.write);

@@ -1,0 +1,84 @@
+#include <gtest/gtest.h>
+
+#include <limits>
+#include <sstream>
+
+#include "cli/HumanVad.h"
+#include "cli/JsonVad.h"
+
+namespace {
+
+using Talvox::VadBufferAnalysis;
+using Talvox::VadSegment;
+
+VadBufferAnalysis noise() {
+    VadBufferAnalysis buffer;
+    buffer.startMs = 0;
+    buffer.endMs = 100;
+    buffer.learningNoise = true;
+    buffer.level = 4.5F;
+    return buffer;
+}
+
+VadBufferAnalysis speech() {
+    VadBufferAnalysis buffer;
+    buffer.startMs = 200;
+    buffer.endMs = 300;
+    buffer.decisions = {true, false, true};
+    buffer.activity = 0.6F;
+    buffer.level = 22.5F;
+    buffer.isSpeech = true;
+    return buffer;
+}
+
+std::string printed(Cli::VadPrinter& printer, const std::ostringstream& out,
+                    const std::vector<VadBufferAnalysis>& buffers,
+                    const std::vector<VadSegment>& segments, bool lastIsOpen) {
+    for (const VadBufferAnalysis& buffer : buffers) {
+        printer.printBuffer(buffer);
+    }
+    printer.printSegments(segments, lastIsOpen);
+    return out.str();
+}
+
+TEST(JsonVad, PrintsBuffersAndSegmentsAsObjects) {
+    std::ostringstream out;
+    Cli::JsonVad printer(out);
+    EXPECT_EQ(printed(printer, out, {noise(), speech()}, {{300, 900}, {1200, 1500}}, true),
+              "{\"event\":\"buffer\",\"startMs\":0,\"endMs\":100,\"learningNoise\":true,"
+              "\"level\":4.5,\"frames\":\"\",\"activity\":0.0,\"speech\":false}\n"
+              "{\"event\":\"buffer\",\"startMs\":200,\"endMs\":300,\"learningNoise\":false,"
+              "\"level\":22.5,\"frames\":\"101\",\"activity\":0.6,\"speech\":true}\n"
+              "{\"event\":\"segment\",\"startMs\":300,\"endMs\":900,\"ended\":true}\n"
+              "{\"event\":\"segment\",\"startMs\":1200,\"endMs\":1500,\"ended\":false}\n");
+}
+
+TEST(JsonVad, PrintsAnActivityThatIsNoNumberAsNull) {
+    VadBufferAnalysis buffer = speech();
+    buffer.activity = std::numeric_limits<float>::quiet_NaN();
+    std::ostringstream out;
+    Cli::JsonVad(out).printBuffer(buffer);
+    EXPECT_NE(out.str().find("\"activity\":null"), std::string::npos);
+}
+
+TEST(HumanVad, PrintsATableAndTheSegments) {
+    std::ostringstream out;
+    Cli::HumanVad printer(out);
+    EXPECT_EQ(printed(printer, out, {noise(), speech()}, {{300, 900}, {1200, 1500}}, true),
+              "    from  level                            activity  state   frames (1 speech, 0 "
+              "none)\n"
+              "     0 ms  [##------------------]   4.5 dB       -  noise   \n"
+              "   200 ms  [##########----------]  22.5 dB   0.600  speech  101\n"
+              "\n"
+              "segments of speech:\n"
+              "   300 ms  to   900 ms  (600 ms)\n"
+              "  1200 ms  to  1500 ms  (300 ms), not ended with the sound\n");
+}
+
+TEST(HumanVad, SaysSoWhenThereWasNoSpeech) {
+    std::ostringstream out;
+    Cli::HumanVad printer(out);
+    EXPECT_EQ(printed(printer, out, {}, {}, false), "\nsegments of speech: none\n");
+}
+
+}  // namespace
