@@ -1,1 +1,92 @@
-int main() { return 0; }
+#include <CLI/CLI.hpp>
+#include <csignal>
+#include <cstdio>
+
+#include "gateway/Server.h"
+#include "pal/kd_log.h"
+
+namespace {
+
+constexpr const char* DESCRIPTION =
+    "Development gateway: recognises what the speech kit sends, with a small English model.\n"
+    "A tool for developers, made for the loopback interface: it has no encryption, no\n"
+    "authentication and no defence against overload. Do not offer it to a network.";
+
+constexpr const char* VERSION = "talvox-gateway 133 (" TALVOX_BUILD_ID ")";
+
+bool isLoopback(const std::string& host) {
+    return host == "localhost" || host == "::1" || host.compare(0, 4, "127.") == 0;
+}
+
+void declareOptions(CLI::App& app, Gateway::ServerOptions& options) {
+    app.set_version_flag("--version", VERSION);
+    app.add_option("--host", options.host, "Address to listen on")->capture_default_str();
+    app.add_option("--port", options.port, "Port to listen on; 0 picks a free one")
+        ->capture_default_str();
+    app.add_option("--model-dir", options.model.acousticDir, "Folder of the acoustic model")
+        ->capture_default_str();
+    app.add_option("--lm", options.model.languageModel, "Language model")->capture_default_str();
+    app.add_option("--dict", options.model.dictionary, "Pronouncing dictionary")
+        ->capture_default_str();
+    app.add_option("--lang", options.model.language,
+                   "Language of the model; requests in others get no results")
+        ->capture_default_str();
+    app.add_option("--decoders", options.decoders,
+                   "Requests recognised at once (about 100 MB each); others wait")
+        ->check(CLI::Range(1, 64))
+        ->capture_default_str();
+    app.add_option("--max-body", options.maxBodyBytes,
+                   "Longest request body in bytes; longer ones get status 413")
+        ->check(CLI::PositiveNumber)
+        ->capture_default_str();
+    app.add_flag("--verbose", options.verbose, "Log each piece of a request as it arrives");
+}
+
+/** Blocks the signals that end the process, for this thread and those that it starts. */
+sigset_t blockEndSignals() {
+    std::signal(SIGPIPE, SIG_IGN);
+    sigset_t signals;
+    sigemptyset(&signals);
+    sigaddset(&signals, SIGINT);
+    sigaddset(&signals, SIGTERM);
+    pthread_sigmask(SIG_BLOCK, &signals, nullptr);
+    return signals;
+}
+
+int run(const Gateway::ServerOptions& options) {
+    const sigset_t signals = blockEndSignals();
+    Gateway::Server server(options);
+    const std::string problem = server.start();
+    if (!problem.empty()) {
+        std::fprintf(stderr, "talvox-gateway: %s\n", problem.c_str());
+        return 1;
+    }
+    kdLogFormatMessage("development gateway, for the loopback interface only");
+    if (!isLoopback(options.host)) {
+        kdLogFormatMessage(
+            "WARNING: %s is not a loopback address; anybody who reaches it can use "
+            "this gateway",
+            options.host.c_str());
+    }
+    std::printf("talvox-gateway listening on %s\n", server.getUrl().c_str());
+    std::fflush(stdout);
+    int signal = 0;
+    sigwait(&signals, &signal);
+    kdLogFormatMessage("stopping");
+    server.stop();
+    return 0;
+}
+
+}  // namespace
+
+int main(int argc, char** argv) {
+    CLI::App app(DESCRIPTION, "talvox-gateway");
+    Gateway::ServerOptions options;
+    declareOptions(app, options);
+    try {
+        app.parse(argc, argv);
+    } catch (const CLI::ParseError& error) {
+        return app.exit(error) == 0 ? 0 : 2;
+    }
+    return run(options);
+}

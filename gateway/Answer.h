@@ -1,0 +1,24 @@
+#pragma once
+
+#include <string>
+#include <utility>
+#include <vector>
+
+namespace Gateway {
+
+/** An HTTP answer, ready to be sent. */
+struct Answer {
+    unsigned status = 200;
+    std::vector<std::pair<std::string, std::string>> headers;
+    /** Plain text; the reason where the request was refused. */
+    std::string body;
+
+    static Answer refuse(unsigned status, const std::string& reason) {
+        Answer answer;
+        answer.status = status;
+        answer.body = reason + "\n";
+        return answer;
+    }
+};
+
+}  // namespace Gateway

@@ -1,0 +1,129 @@
+#include "gateway/HttpExchange.h"
+
+#include <microhttpd.h>
+
+#include <cstdlib>
+
+#include "gateway/LogText.h"
+#include "pal/kd_log.h"
+
+namespace Gateway {
+
+namespace {
+
+std::string toText(const char* text) {
+    return text == nullptr ? std::string() : text;
+}
+
+bool isRecognitionPath(const std::string& path) {
+    return path == "/asrgw" || path == "/asrgw_chunked";
+}
+
+}  // namespace
+
+HttpExchange::HttpExchange(Server& exchangeServer, MHD_Connection* httpConnection, const char* path,
+                           const char* method)
+    : server(exchangeServer), connection(httpConnection) {
+    head.path = toText(path);
+    head.method = toText(method);
+    head.uuid = readArgument("uuid");
+    head.sessionId = readArgument("sessionId");
+    head.soundType = readArgument("Content-Type");
+    head.contentType = readHeader("Content-Type");
+}
+
+bool HttpExchange::onHead() {
+    const Answer answer = judgeHead();
+    if (request) {
+        if (server.getOptions().verbose) {
+            log(0, "begins");
+        }
+        return true;
+    }
+    log(answer.status, "uuid=" + toLogText(head.uuid) +
+                           " refused: " + toLogText(answer.body.substr(0, answer.body.find('\n'))));
+    return send(answer);
+}
+
+Answer HttpExchange::judgeHead() {
+    if (!isRecognitionPath(head.path)) {
+        return Answer::refuse(404, "there is nothing here but /asrgw and /asrgw_chunked");
+    }
+    if (head.method != "POST") {
+        Answer answer = Answer::refuse(405, "recognition requests are POST requests");
+        answer.headers.emplace_back("Allow", "POST");
+        return answer;
+    }
+    std::string boundary;
+    const std::string reason = RecognitionRequest::checkHead(head, boundary);
+    if (!reason.empty()) {
+        return Answer::refuse(400, reason);
+    }
+    const std::size_t limit = server.getOptions().maxBodyBytes;
+    const std::string length = readHeader("Content-Length");
+    if (!length.empty() && std::strtoull(length.c_str(), nullptr, 10) > limit) {
+        return Answer::refuse(413, "the body is longer than " + std::to_string(limit) + " bytes");
+    }
+    request = std::make_unique<RecognitionRequest>(head, boundary, server.getPool(), limit);
+    return Answer();
+}
+
+bool HttpExchange::onBody(const char* data, std::size_t size) {
+    // The rest of a body whose head was refused.
+    if (!request) {
+        return true;
+    }
+    if (server.getOptions().verbose) {
+        log(0, "sends " + std::to_string(size) + " bytes");
+    }
+    return request->write(data, size);
+}
+
+bool HttpExchange::onEnd() {
+    if (!request || answered) {
+        return true;
+    }
+    const Answer answer = request->finish();
+    log(answer.status, request->describe());
+    return send(answer);
+}
+
+void HttpExchange::onCompleted() {
+    if (request && !answered) {
+        log(0, "went away: " + request->describe());
+    }
+}
+
+bool HttpExchange::send(const Answer& answer) {
+    MHD_Response* response = MHD_create_response_from_buffer(
+        answer.body.size(), const_cast<char*>(answer.body.data()), MHD_RESPMEM_MUST_COPY);
+    if (response == nullptr) {
+        return false;
+    }
+    answered = true;
+    bool sendable =
+        MHD_add_response_header(response, "Content-Type", "text/plain; charset=utf-8") == MHD_YES;
+    for (const auto& header : answer.headers) {
+        sendable = MHD_add_response_header(response, header.first.c_str(), header.second.c_str()) ==
+                       MHD_YES &&
+                   sendable;
+    }
+    sendable = sendable && MHD_queue_response(connection, answer.status, response) == MHD_YES;
+    MHD_destroy_response(response);
+    return sendable;
+}
+
+void HttpExchange::log(unsigned status, const std::string& what) const {
+    kdLogFormatMessage("%s %s %s %s", toLogText(head.method).c_str(), toLogText(head.path).c_str(),
+                       status == 0 ? "..." : std::to_string(status).c_str(), what.c_str());
+}
+
+std::string HttpExchange::readHeader(const char* name) const {
+    return toText(MHD_lookup_connection_value(connection, MHD_HEADER_KIND, name));
+}
+
+std::string HttpExchange::readArgument(const char* name) const {
+    return toText(MHD_lookup_connection_value(connection, MHD_GET_ARGUMENT_KIND, name));
+}
+
+}  // namespace Gateway

@@ -1,0 +1,230 @@
+#include "gateway/RecognitionRequest.h"
+
+#include <cstdio>
+#include <random>
+
+#include "core/util/Base64Coder.h"
+#include "gateway/HeaderValue.h"
+#include "gateway/LogText.h"
+#include "gateway/ResultDocument.h"
+#include "pal/kd_time.h"
+
+namespace Gateway {
+
+namespace {
+
+/** 128 bits nobody can guess, so that no two requests share them. */
+std::string makeRequestId() {
+    std::random_device random;
+    std::string id;
+    for (int i = 0; i < 4; ++i) {
+        char part[16];
+        std::snprintf(part, sizeof(part), "%08x", static_cast<unsigned>(random()));
+        id += part;
+    }
+    return id;
+}
+
+bool isBoundary(const std::string& text) {
+    return !text.empty() && text.size() <= 70 &&
+           text.find_first_not_of(
+               "0123456789ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz"
+               "'()+_,-./:=? ") == std::string::npos &&
+           text.back() != ' ';
+}
+
+}  // namespace
+
+std::string RecognitionRequest::checkHead(const RequestHead& head, std::string& boundary) {
+    HeaderValue type;
+    if (!HeaderValue::parse(head.contentType, type) || type.value != "multipart/form-data") {
+        return "the request's content type is not multipart/form-data";
+    }
+    const std::string* named = type.find("boundary");
+    if (named == nullptr || !isBoundary(*named)) {
+        return "the request's content type names no valid boundary";
+    }
+    if (head.uuid.empty()) {
+        return "the query names no uuid";
+    }
+    boundary = *named;
+    return std::string();
+}
+
+RecognitionRequest::RecognitionRequest(const RequestHead& requestHead, const std::string& boundary,
+                                       DecoderPool& decoderPool, std::size_t maxBodyBytes)
+    : head(requestHead),
+      pool(decoderPool),
+      maxBytes(maxBodyBytes),
+      parser(boundary, *this),
+      requestId(makeRequestId()) {}
+
+bool RecognitionRequest::write(const char* data, std::size_t size) {
+    bodyBytes += size;
+    if (bodyBytes > maxBytes) {
+        refuse(413, "the body is longer than " + std::to_string(maxBytes) + " bytes");
+        return bodyBytes / 2 <= maxBytes;
+    }
+    if (refusedStatus == 0 && !parser.feed(data, size)) {
+        refuse(400, parser.getError());
+    }
+    return true;
+}
+
+Answer RecognitionRequest::finish() {
+    const KDust begin = kdGetTimeUST();
+    if (refusedStatus == 0 && !parser.finish()) {
+        refuse(400, parser.getError());
+    }
+    const std::string missing = findIncompleteness();
+    if (!missing.empty()) {
+        refuse(400, missing);
+    }
+    Answer answer;
+    if (refusedStatus == 0) {
+        answer = recognise();
+    }
+    if (refusedStatus != 0) {
+        answer = Answer::refuse(refusedStatus, refusedReason);
+    }
+    answer.headers.emplace_back("x-kvrequestid", requestId);
+    endUtterance();
+    answerMs = static_cast<uint64_t>((kdGetTimeUST() - begin) / 1000000);
+    return answer;
+}
+
+std::string RecognitionRequest::describe() const {
+    std::string text = "uuid=" + toLogText(head.uuid);
+    text += " session=" + toLogText(head.sessionId);
+    text += " lang=" + toLogText(fields.get("lang"));
+    text += " topic=" + toLogText(fields.get("topic"));
+    text += " type=" + toLogText(soundType.empty() ? head.soundType : soundType);
+    text += " bytes=" + std::to_string(bodyBytes) + " sound=" + std::to_string(soundBytes);
+    text += " utterance=" + std::to_string(utteranceMs) + "ms";
+    text += " decode=" + std::to_string(decodeMs) + "ms";
+    text += " answer=" + std::to_string(answerMs) + "ms";
+    text += " request=" + requestId;
+    if (fields.has("canceled")) {
+        text += " canceled";
+    }
+    if (fields.has("transcripts")) {
+        text += " transcripts=" + toLogText(fields.get("transcripts"));
+    }
+    if (soundDecoder && !soundDecoder->getRemark().empty()) {
+        text += " (" + soundDecoder->getRemark() + ")";
+    }
+    for (const Hypothesis& hypothesis : hypotheses) {
+        char confidence[16];
+        std::snprintf(confidence, sizeof(confidence), "%.2f", hypothesis.confidence);
+        text += std::string(" ") + confidence + ":\"" + hypothesis.text + "\"";
+    }
+    if (!refusedReason.empty()) {
+        text += " refused: " + toLogText(refusedReason);
+    }
+    return text;
+}
+
+std::string RecognitionRequest::onPartBegin(const MultipartPart& part) {
+    inSound = part.name == "audio";
+    return inSound ? beginSound(part) : fields.begin(part.name);
+}
+
+std::string RecognitionRequest::onPartData(const char* data, std::size_t size) {
+    if (!inSound) {
+        return fields.append(data, size);
+    }
+    soundBytes += size;
+    std::vector<int16_t> samples;
+    const std::string reason = soundDecoder->write(data, size, samples);
+    return reason.empty() ? takeSamples(samples) : reason;
+}
+
+std::string RecognitionRequest::onPartEnd() {
+    if (!inSound) {
+        return fields.end();
+    }
+    std::vector<int16_t> samples;
+    const std::string reason = soundDecoder->finish(samples);
+    return reason.empty() ? takeSamples(samples) : reason;
+}
+
+std::string RecognitionRequest::beginSound(const MultipartPart& part) {
+    if (hasSound) {
+        return "the field audio stands there twice";
+    }
+    hasSound = true;
+    const std::string missing = fields.findMissing();
+    if (!missing.empty()) {
+        return missing + " before the audio";
+    }
+    soundType = !part.contentType.empty()    ? part.contentType
+                : fields.has("Content-Type") ? fields.get("Content-Type")
+                                             : head.soundType;
+    AudioFormat format;
+    const std::string reason = AudioFormat::parse(soundType, format);
+    if (!reason.empty()) {
+        return reason;
+    }
+    soundDecoder = std::make_unique<SoundDecoder>(format, SpeechModel::RATE_HZ);
+    if (pool.getModel().speaks(fields.get("lang"))) {
+        utterance = std::make_unique<Utterance>(pool);
+    }
+    return std::string();
+}
+
+std::string RecognitionRequest::takeSamples(const std::vector<int16_t>& samples) {
+    if (utterance && !utterance->add(samples)) {
+        refuse(413,
+               "the sound is longer than " + std::to_string(Utterance::MAX_SECONDS) + " seconds");
+        return refusedReason;
+    }
+    return std::string();
+}
+
+void RecognitionRequest::refuse(unsigned status, const std::string& reason) {
+    if (refusedStatus == 0) {
+        refusedStatus = status;
+        refusedReason = reason;
+        endUtterance();
+    }
+}
+
+std::string RecognitionRequest::findIncompleteness() const {
+    if (fields.has("uuid") && fields.get("uuid") != head.uuid) {
+        return "the uuid of the query and that of the body differ";
+    }
+    return fields.findMissing();
+}
+
+Answer RecognitionRequest::recognise() {
+    Answer answer;
+    if (fields.has("canceled")) {
+        answer.body = "canceled\n";
+        return answer;
+    }
+    if (utterance) {
+        const Utterance::Status status = utterance->finish(hypotheses);
+        if (status == Utterance::Status::BUSY) {
+            refuse(503, "all recognisers are busy");
+        } else if (status == Utterance::Status::FAILED) {
+            refuse(500, "the recogniser failed");
+        }
+    }
+    const std::string document = makeResultDocument(hypotheses);
+    answer.headers.emplace_back(
+        "x-asrgw-recognition-results",
+        Util::Base64Coder::encode(std::vector<unsigned char>(document.begin(), document.end())));
+    answer.body = document + "\n";
+    return answer;
+}
+
+void RecognitionRequest::endUtterance() {
+    if (utterance) {
+        utteranceMs = utterance->getDurationMs();
+        decodeMs = utterance->getDecodeMs();
+        // Others may be waiting for the recogniser that it holds.
+        utterance.reset();
+    }
+}
+
+}  // namespace Gateway

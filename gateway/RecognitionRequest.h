@@ -1,0 +1,99 @@
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <memory>
+#include <string>
+#include <vector>
+
+#include "gateway/Answer.h"
+#include "gateway/DecoderPool.h"
+#include "gateway/MultipartParser.h"
+#include "gateway/RequestFields.h"
+#include "gateway/SoundDecoder.h"
+#include "gateway/Utterance.h"
+
+namespace Gateway {
+
+/** What a request says before its body. */
+struct RequestHead {
+    std::string method;
+    std::string path;
+    std::string uuid;
+    std::string sessionId;
+    /** The sound's content type from the query. */
+    std::string soundType;
+    /** The request's own Content-Type header. */
+    std::string contentType;
+};
+
+/**
+ * One recognition request from its head to its answer, whatever carries it.
+ *
+ * The body is taken in as it arrives; its sound is decoded and recognised at once. After a mistake
+ * the rest of the body is taken and ignored, since the answer can only be given after it.
+ */
+class RecognitionRequest : private MultipartListener {
+  public:
+    /**
+     * Judges a head.
+     * @param[out] boundary the boundary of the body that follows
+     * @return an empty text, or the reason for status 400
+     */
+    static std::string checkHead(const RequestHead& head, std::string& boundary);
+
+    /**
+     * @param requestHead  as `checkHead` accepted it
+     * @param boundary     from `checkHead`
+     * @param decoderPool  must outlive the request
+     * @param maxBodyBytes a longer body gives status 413
+     */
+    RecognitionRequest(const RequestHead& requestHead, const std::string& boundary,
+                       DecoderPool& decoderPool, std::size_t maxBodyBytes);
+
+    /** Takes more of the body. @return false when the client sends absurdly more than allowed */
+    bool write(const char* data, std::size_t size);
+
+    /** Ends the body, waits for the recogniser and gives the answer. Called once. */
+    Answer finish();
+
+    /** Everything about the request in one line, for the log. */
+    std::string describe() const;
+
+    /** The hypotheses of the answer. */
+    const std::vector<Hypothesis>& getHypotheses() const { return hypotheses; }
+
+  private:
+    std::string onPartBegin(const MultipartPart& part) override;
+    std::string onPartData(const char* data, std::size_t size) override;
+    std::string onPartEnd() override;
+
+    std::string beginSound(const MultipartPart& part);
+    std::string takeSamples(const std::vector<int16_t>& samples);
+    void refuse(unsigned status, const std::string& reason);
+    std::string findIncompleteness() const;
+    Answer recognise();
+    void endUtterance();
+
+    const RequestHead head;
+    DecoderPool& pool;
+    const std::size_t maxBytes;
+    MultipartParser parser;
+    RequestFields fields;
+    std::string soundType;
+    std::unique_ptr<SoundDecoder> soundDecoder;
+    std::unique_ptr<Utterance> utterance;
+    bool hasSound = false;
+    bool inSound = false;
+    std::size_t bodyBytes = 0;
+    std::size_t soundBytes = 0;
+    uint64_t utteranceMs = 0;
+    uint64_t decodeMs = 0;
+    uint64_t answerMs = 0;
+    unsigned refusedStatus = 0;
+    std::string refusedReason;
+    std::vector<Hypothesis> hypotheses;
+    std::string requestId;
+};
+
+}  // namespace Gateway

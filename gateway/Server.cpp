@@ -1,0 +1,126 @@
+#include "gateway/Server.h"
+
+#include <microhttpd.h>
+#include <netdb.h>
+#include <netinet/in.h>
+#include <sys/socket.h>
+
+#include <cerrno>
+#include <cstring>
+#include <new>
+
+#include "gateway/HttpExchange.h"
+#include "pal/kd_log.h"
+
+namespace Gateway {
+
+namespace {
+
+/** Room for a request's headers and for an answer's, of which the results may be 90 KB. */
+constexpr std::size_t CONNECTION_MEMORY_BYTES = 1024 * 1024;
+constexpr unsigned MAX_CONNECTIONS = 64;
+
+/** Called for the head, for each piece of the body, and for its end. */
+MHD_Result onRequest(void* user, MHD_Connection* connection, const char* url, const char* method,
+                     const char* /*version*/, const char* data, std::size_t* size, void** state) {
+    if (*state == nullptr) {
+        auto* begun =
+            new (std::nothrow) HttpExchange(*static_cast<Server*>(user), connection, url, method);
+        *state = begun;
+        return begun != nullptr && begun->onHead() ? MHD_YES : MHD_NO;
+    }
+    auto* exchange = static_cast<HttpExchange*>(*state);
+    if (*size == 0) {
+        return exchange->onEnd() ? MHD_YES : MHD_NO;
+    }
+    const std::size_t count = *size;
+    *size = 0;
+    return exchange->onBody(data, count) ? MHD_YES : MHD_NO;
+}
+
+void onCompleted(void* /*user*/, MHD_Connection* /*connection*/, void** state,
+                 MHD_RequestTerminationCode /*code*/) {
+    auto* exchange = static_cast<HttpExchange*>(*state);
+    if (exchange != nullptr) {
+        exchange->onCompleted();
+        delete exchange;
+        *state = nullptr;
+    }
+}
+
+/** The library's messages: of interest to who asked for everything. */
+__attribute__((format(printf, 2, 0))) void onLibraryMessage(void* user, const char* format,
+                                                            va_list arguments) {
+    if (static_cast<Server*>(user)->getOptions().verbose) {
+        kdLogFormatMessageVargs(format, arguments);
+    }
+}
+
+struct AddressList {
+    ~AddressList() {
+        if (first != nullptr) {
+            freeaddrinfo(first);
+        }
+    }
+    addrinfo* first = nullptr;
+};
+
+}  // namespace
+
+Server::Server(const ServerOptions& serverOptions)
+    : options(serverOptions), pool(options.model, options.decoders) {}
+
+Server::~Server() {
+    stop();
+}
+
+std::string Server::start() {
+    const std::string problem = options.model.findProblem();
+    if (!problem.empty()) {
+        return problem;
+    }
+    if (!pool.load()) {
+        return "the recogniser does not accept the model";
+    }
+    addrinfo hints{};
+    hints.ai_flags = AI_PASSIVE | AI_NUMERICSERV;
+    hints.ai_socktype = SOCK_STREAM;
+    AddressList address;
+    const int failure = getaddrinfo(options.host.c_str(), std::to_string(options.port).c_str(),
+                                    &hints, &address.first);
+    if (failure != 0) {
+        return "the address " + options.host + " is not known: " + gai_strerror(failure);
+    }
+    isIpv6 = address.first->ai_family == AF_INET6;
+    const unsigned flags = MHD_USE_THREAD_PER_CONNECTION | MHD_USE_INTERNAL_POLLING_THREAD |
+                           MHD_USE_POLL | MHD_USE_ERROR_LOG |
+                           (isIpv6 ? static_cast<unsigned>(MHD_USE_IPv6) : 0u);
+    daemon = MHD_start_daemon(
+        flags, options.port, nullptr, nullptr, &onRequest, this, MHD_OPTION_EXTERNAL_LOGGER,
+        &onLibraryMessage, this, MHD_OPTION_SOCK_ADDR, address.first->ai_addr,
+        MHD_OPTION_CONNECTION_MEMORY_LIMIT, CONNECTION_MEMORY_BYTES, MHD_OPTION_CONNECTION_LIMIT,
+        MAX_CONNECTIONS, MHD_OPTION_CONNECTION_TIMEOUT, options.idleSeconds,
+        MHD_OPTION_NOTIFY_COMPLETED, &onCompleted, nullptr, MHD_OPTION_END);
+    if (daemon == nullptr) {
+        return "cannot listen on " + options.host + " port " + std::to_string(options.port) + ": " +
+               std::strerror(errno);
+    }
+    const MHD_DaemonInfo* info = MHD_get_daemon_info(daemon, MHD_DAEMON_INFO_BIND_PORT);
+    port = info == nullptr ? options.port : info->port;
+    return std::string();
+}
+
+void Server::stop() {
+    pool.close();
+    if (daemon != nullptr) {
+        MHD_stop_daemon(daemon);
+        daemon = nullptr;
+    }
+}
+
+std::string Server::getUrl() const {
+    return "http://" + (isIpv6 ? "[" + options.host + "]" : options.host) + ":" +
+           std::to_string(port);
+}
+
+}  // namespace Gateway

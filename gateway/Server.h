@@ -1,0 +1,67 @@
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <memory>
+#include <string>
+
+#include "gateway/DecoderPool.h"
+#include "gateway/SpeechModel.h"
+
+struct MHD_Daemon;
+
+namespace Gateway {
+
+/** How the gateway is to run. */
+struct ServerOptions {
+    static constexpr std::size_t MAX_BODY_BYTES_DFLT = 16u * 1024 * 1024;
+
+    /** Address to listen on: numeric, or a name that the system knows. */
+    std::string host = "127.0.0.1";
+    /** Port, 0 for any that is free. */
+    uint16_t port = 8090;
+    std::size_t maxBodyBytes = MAX_BODY_BYTES_DFLT;
+    /** Requests that are recognised at the same time; further ones wait. */
+    std::size_t decoders = 2;
+    /** Seconds after which a client that says nothing is given up. */
+    unsigned idleSeconds = 30;
+    bool verbose = false;
+    SpeechModel model;
+};
+
+/**
+ * The HTTP face of the gateway: a thread per connection, each of which carries one request after
+ * the other into a `RecognitionRequest`. `start` and `stop` belong to one thread.
+ */
+class Server {
+  public:
+    explicit Server(const ServerOptions& serverOptions);
+    /** Stops. */
+    ~Server();
+    Server(const Server&) = delete;
+    Server& operator=(const Server&) = delete;
+
+    /** Loads the model and begins to listen. @return an empty text, or why that is impossible */
+    std::string start();
+
+    /** Ends all connections and waits for their threads; does nothing when stopped. */
+    void stop();
+
+    /** The port on which the server listens, 0 before `start`. */
+    uint16_t getPort() const { return port; }
+
+    /** `http://HOST:PORT` as a client of this machine can use it. */
+    std::string getUrl() const;
+
+    const ServerOptions& getOptions() const { return options; }
+    DecoderPool& getPool() { return pool; }
+
+  private:
+    const ServerOptions options;
+    DecoderPool pool;
+    MHD_Daemon* daemon = nullptr;
+    uint16_t port = 0;
+    bool isIpv6 = false;
+};
+
+}  // namespace Gateway

@@ -1,0 +1,50 @@
+#pragma once
+
+#include <cstddef>
+#include <cstdint>
+#include <memory>
+#include <string>
+#include <vector>
+
+#include "gateway/AudioFormat.h"
+#include "gateway/Resampler.h"
+#include "gateway/SpeexStreamDecoder.h"
+
+namespace Gateway {
+
+/** Turns the bytes of a client's sound, as they arrive, into samples of the recogniser's rate. */
+class SoundDecoder {
+  public:
+    SoundDecoder(const AudioFormat& soundFormat, unsigned outputRateHz);
+    ~SoundDecoder();
+    SoundDecoder(const SoundDecoder&) = delete;
+    SoundDecoder& operator=(const SoundDecoder&) = delete;
+
+    /**
+     * Appends to `output` what the bytes give.
+     * @return an empty text, or the reason why the sound cannot be decoded
+     */
+    std::string write(const char* data, std::size_t size, std::vector<int16_t>& output);
+
+    /** Tells that the sound is over, and appends what is left. @return as `write` */
+    std::string finish(std::vector<int16_t>& output);
+
+    /** Samples per second of the sound as it was sent; 0 while that is not known. */
+    unsigned getInputRateHz() const;
+
+    /** What was wrong with the sound without making it useless; empty where nothing was. */
+    std::string getRemark() const;
+
+  private:
+    void readPcm(const char* data, std::size_t size, std::vector<int16_t>& samples);
+
+    const AudioFormat format;
+    const unsigned outputRate;
+    std::unique_ptr<SpeexStreamDecoder> speex;
+    std::unique_ptr<Resampler> resampler;
+    bool hasBytes = false;
+    /** First byte of a sample that two calls share, -1 when there is none. */
+    int pending = -1;
+};
+
+}  // namespace Gateway

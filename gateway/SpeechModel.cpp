@@ -1,0 +1,71 @@
+#include "gateway/SpeechModel.h"
+
+#include <pocketsphinx.h>
+#include <sphinxbase/err.h>
+
+#include <fstream>
+
+#include "gateway/HeaderValue.h"
+#include "pal/kd_log.h"
+
+namespace Gateway {
+
+namespace {
+
+bool isReadable(const std::string& path) {
+    std::ifstream file(path);
+    return file.good() && file.peek() != std::ifstream::traits_type::eof();
+}
+
+/** Keeps the recogniser's own chatter off standard error, where the request log goes. */
+void silenceRecogniser() {
+    static const bool silenced = [] {
+        err_set_logfp(nullptr);
+        return true;
+    }();
+    static_cast<void>(silenced);
+}
+
+}  // namespace
+
+bool SpeechModel::speaks(const std::string& languageTag) const {
+    const std::string tag = toLowerAscii(languageTag);
+    const std::string prefix = toLowerAscii(language);
+    return tag.compare(0, prefix.size(), prefix) == 0 &&
+           (tag.size() == prefix.size() || tag[prefix.size()] == '-' || tag[prefix.size()] == '_');
+}
+
+std::string SpeechModel::findProblem() const {
+    for (const std::string& path :
+         {acousticDir + "/mdef", acousticDir + "/means", acousticDir + "/variances",
+          acousticDir + "/transition_matrices", languageModel, dictionary}) {
+        if (!isReadable(path)) {
+            return "cannot read the model's file " + path;
+        }
+    }
+    return std::string();
+}
+
+cmd_ln_s* SpeechModel::createConfiguration() const {
+    silenceRecogniser();
+    cmd_ln_t* configuration =
+        cmd_ln_init(nullptr, ps_args(), TRUE, "-hmm", acousticDir.c_str(), "-lm",
+                    languageModel.c_str(), "-dict", dictionary.c_str(), nullptr);
+    if (configuration == nullptr) {
+        return nullptr;
+    }
+    // The model's own parameters of the front end; the recogniser would read them too late for
+    // who only wants the front end.
+    const std::string parameters = acousticDir + "/feat.params";
+    if (isReadable(parameters)) {
+        cmd_ln_t* extended =
+            cmd_ln_parse_file_r(configuration, ps_args(), parameters.c_str(), FALSE);
+        if (extended == nullptr) {
+            kdLogFormatMessage("cannot read the model's file %s", parameters.c_str());
+        }
+        return extended;
+    }
+    return configuration;
+}
+
+}  // namespace Gateway
