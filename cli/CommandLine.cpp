@@ -129,6 +129,10 @@ CLI::App* addRecognize(CLI::App& app, RecognizeOptions& options) {
                      "Directory in which the session leaves what it heard, as in.wav")
         ->type_name("DIR");
     command->add_flag("--json", options.json, "Print every event as one JSON object a line");
+    command
+        ->add_option("--events", options.eventsFile,
+                     "File to which every event is written as with --json, whatever is printed")
+        ->type_name("FILE");
     command->footer(
         "Settings are applied in this order: defaults, --settings, --set, the other options.\n"
         "Ctrl-C cancels; a second Ctrl-C leaves at once.\n"

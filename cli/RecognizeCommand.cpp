@@ -6,6 +6,7 @@
 #include <boost/make_shared.hpp>
 #include <cerrno>
 #include <cstring>
+#include <fstream>
 #include <memory>
 #include <random>
 
@@ -13,6 +14,7 @@
 #include "HumanEvents.h"
 #include "Interrupts.h"
 #include "JsonEvents.h"
+#include "PrinterList.h"
 #include "Session.h"
 #include "SoundInput.h"
 #include "Text.h"
@@ -85,11 +87,20 @@ std::string hint(int errorCode, const RecognizeOptions& options, const Talvox::S
     }
 }
 
-std::unique_ptr<EventPrinter> makePrinter(const RecognizeOptions& options, Console& console) {
+void addPrinters(const RecognizeOptions& options, Console& console, std::ofstream& eventsFile,
+                 PrinterList& printers) {
     if (options.json) {
-        return std::make_unique<JsonEvents>(console.out);
+        printers.add(std::make_unique<JsonEvents>(console.out));
+    } else {
+        printers.add(std::make_unique<HumanEvents>(console.out, console.outIsTerminal));
     }
-    return std::make_unique<HumanEvents>(console.out, console.outIsTerminal);
+    if (!options.eventsFile.empty()) {
+        eventsFile.open(options.eventsFile);
+        if (!eventsFile) {
+            throw UsageError("cannot write to " + options.eventsFile + ": " + std::strerror(errno));
+        }
+        printers.add(std::make_unique<JsonEvents>(eventsFile));
+    }
 }
 
 void reportError(int errorCode, const RecognizeOptions& options, const Talvox::Settings& settings,
@@ -122,10 +133,12 @@ int runRecognize(const RecognizeOptions& options, Console& console, LogOutput& l
         installPlayer(options, settings->getSampleRate(), console.in);
     }
 
-    const std::unique_ptr<EventPrinter> printer = makePrinter(options, console);
+    std::ofstream eventsFile;
+    PrinterList printers;
+    addPrinters(options, console, eventsFile, printers);
     Session session(settings);
     const Interrupts interrupts([&session] { session.interrupt(); });
-    const SessionEvent last = session.run(*printer);
+    const SessionEvent last = session.run(printers);
     if (last.kind == SessionEvent::RESULTS) {
         return EXIT_OK;
     }

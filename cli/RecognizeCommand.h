@@ -20,6 +20,7 @@ struct RecognizeOptions {
     bool microphone = false; /**< record from the default input device */
     int leadInMs = LEAD_IN_MS_DFLT;
     std::string dumpDirectory; /**< where the session's WAV dump goes; empty for none */
+    std::string eventsFile;    /**< where the events go as JSON as well; empty for none */
     bool json = false;
 };
 
