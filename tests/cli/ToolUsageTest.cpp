@@ -1,0 +1,187 @@
+// The tool as the shell sees it: arguments, exit statuses, error lines.
+#include <gmock/gmock.h>
+#include <sndfile.h>
+
+#include <algorithm>
+
+#include "SoundFiles.h"
+#include "TempDirectory.h"
+#include "ToolProcess.h"
+
+namespace {
+
+using ::testing::EndsWith;
+using ::testing::HasSubstr;
+using ::testing::MatchesRegex;
+using ::testing::StartsWith;
+using TestSupport::runTalvox;
+using TestSupport::TempDirectory;
+using TestSupport::ToolResult;
+
+/** Status 2, one line of the tool on standard error, nothing on standard output. */
+void expectRefused(const std::vector<std::string>& arguments, const std::string& reason,
+                   const std::string& input = "") {
+    const ToolResult result = runTalvox(arguments, input);
+    EXPECT_EQ(result.status, 2);
+    EXPECT_EQ(result.out, "");
+    EXPECT_THAT(result.err, StartsWith("talvox: "));
+    EXPECT_THAT(result.err, HasSubstr(reason));
+    EXPECT_THAT(result.err, EndsWith("\n"));
+    EXPECT_EQ(std::count(result.err.begin(), result.err.end(), '\n'), 1) << result.err;
+}
+
+TEST(Tool, TellsItsVersion) {
+    const ToolResult result = runTalvox({"--version"});
+    EXPECT_EQ(result.status, 0);
+    EXPECT_THAT(result.out, MatchesRegex("talvox 133 \\(build [^)]+\\)\n"));
+    EXPECT_EQ(result.err, "");
+}
+
+TEST(Tool, HelpsWithEveryCommand) {
+    const ToolResult general = runTalvox({"--help"});
+    EXPECT_EQ(general.status, 0);
+    for (const char* command : {"recognize", "vad", "settings"}) {
+        EXPECT_THAT(general.out, HasSubstr(command));
+        const ToolResult result = runTalvox({command, "--help"});
+        EXPECT_EQ(result.status, 0);
+        EXPECT_THAT(result.out, HasSubstr("--set"));
+        EXPECT_EQ(result.err, "");
+    }
+    const ToolResult recognize = runTalvox({"recognize", "--help"});
+    for (const char* option :
+         {"--file",      "--mic",        "--url",       "--uuid",         "--lang",
+          "--model",     "--session-id", "--streaming", "--no-streaming", "--format",
+          "--quality",   "--vad",        "--rate",      "--settings",     "--set",
+          "--verbosity", "--dump",       "--json",      "--lead-in",      "en-US"}) {
+        EXPECT_THAT(recognize.out, HasSubstr(option));
+    }
+}
+
+TEST(Tool, RefusesWrongUsage) {
+    expectRefused({}, "subcommand");
+    expectRefused({"sing"}, "sing");
+    expectRefused({"recognize"}, "--file");
+    expectRefused({"recognize", "--mic", "--file", "a.wav"}, "--mic");
+    expectRefused({"recognize", "--file"}, "--file");
+    expectRefused({"recognize", "--mic", "--loudness", "11"}, "--loudness");
+    expectRefused({"recognize", "--mic", "--format", "mp3"}, "--format");
+    expectRefused({"recognize", "--mic", "--model", "poetry"}, "--model");
+    expectRefused({"recognize", "--mic", "--quality", "11"}, "--quality");
+    expectRefused({"recognize", "--mic", "--quality", "good"}, "--quality");
+    expectRefused({"recognize", "--mic", "--rate", "7999"}, "--rate");
+    expectRefused({"recognize", "--mic", "--verbosity", "11"}, "--verbosity");
+    expectRefused({"recognize", "--mic", "--lead-in", "-1"}, "--lead-in");
+    expectRefused({"vad"}, "--file");
+    expectRefused({"settings", "--file", "a.wav"}, "--file");
+}
+
+TEST(Tool, RefusesWrongSettings) {
+    expectRefused({"settings", "--set", "colour=red"}, "there is no setting \"colour\"");
+    expectRefused({"settings", "--set", "streaming"}, "--set streaming: expected key=value");
+    expectRefused({"settings", "--set", "samplerate=fast"},
+                  "setting \"samplerate\": \"fast\" is not an integer");
+    expectRefused({"recognize", "--mic", "--set", "upperconfidence=high"},
+                  "setting \"upperconfidence\": \"high\" is not a number");
+    expectRefused({"settings", "--settings", "/nowhere/at.all"},
+                  "cannot read /nowhere/at.all: No such file or directory");
+}
+
+TEST(Tool, RefusesBadSoundFiles) {
+    const TempDirectory directory;
+    const std::string silent = directory.path("silent.wav");
+    ASSERT_TRUE(
+        TestSupport::writeSoundFile(silent, SF_FORMAT_WAV | SF_FORMAT_PCM_16, 16000, 1, {}));
+    const std::string cut = directory.write("cut.wav", TempDirectory::read(silent).substr(0, 30));
+    for (const std::string command : {"recognize", "vad"}) {
+        expectRefused({command, "--file", directory.path("nowhere.wav")},
+                      "nowhere.wav: No such file or directory");
+        expectRefused({command, "--file", directory.path()}, "it is a directory");
+        expectRefused({command, "--file", directory.write("empty.wav", "")}, "the file is empty");
+        expectRefused({command, "--file", directory.write("letter.txt", "Dear Sir or Madam")},
+                      "unknown format");
+        expectRefused({command, "--file", silent}, "it holds no sound");
+        expectRefused({command, "--file", cut}, "cannot read " + cut);
+        expectRefused({command, "--file", "-"}, "standard input: it holds no sound");
+        expectRefused({command, "--file", "-", "--set", "samplerate=0"},
+                      "the sample rate 0 is not in the range 8000 to 44100", "some sound");
+    }
+}
+
+TEST(Tool, RefusesADumpDirectoryThatItCannotUse) {
+    const TempDirectory directory;
+    expectRefused({"recognize", "--mic", "--dump", directory.path("nowhere")},
+                  "nowhere: No such file or directory");
+    expectRefused({"recognize", "--mic", "--dump", directory.write("file", "x")},
+                  "file: it is not a directory");
+}
+
+TEST(Tool, SaysSoWhenItsOutputCannotBeWritten) {
+    TestSupport::ToolProcess process(
+        "/bin/sh", {"-c", std::string(TALVOX_BINARY) + " settings 2>/dev/null >/dev/full"});
+    EXPECT_EQ(process.wait().status, 1);
+}
+
+TEST(ToolSettings, PrintsDefaultsAndWhatValidationFindsInThem) {
+    const ToolResult result = runTalvox({"settings"});
+    EXPECT_EQ(result.status, 0);
+    EXPECT_EQ(result.out,
+              "<settings>\n"
+              "<asr>default</asr>\n"
+              "<asrpolicy>korvel_only</asrpolicy>\n"
+              "<centerll>0,0</centerll>\n"
+              "<eventslogging>disabled</eventslogging>\n"
+              "<language>ru-RU</language>\n"
+              "<logging>disabled</logging>\n"
+              "<lowerconfidence>0.4</lowerconfidence>\n"
+              "<model>general</model>\n"
+              "<myll>0,0</myll>\n"
+              "<samplerate>16000</samplerate>\n"
+              "<sessionid></sessionid>\n"
+              "<sessionmode>voice_recognition</sessionmode>\n"
+              "<soundformat>pcm_if_wifi</soundformat>\n"
+              "<speexquality>8</speexquality>\n"
+              "<streaming>false</streaming>\n"
+              "<upperconfidence>0.9</upperconfidence>\n"
+              "<url></url>\n"
+              "<uuid></uuid>\n"
+              "<vad></vad>\n"
+              "<verbosity>0</verbosity>\n"
+              "<winnerleadconfidence>0.2</winnerleadconfidence>\n"
+              "</settings>\n");
+    EXPECT_EQ(result.err,
+              "talvox: TalvoxSettings::validate: empty url\n"
+              "talvox: TalvoxSettings::validate: bad uuid \n");
+}
+
+TEST(ToolSettings, AppliesADocumentThenAssignmentsAndTellsEveryRepair) {
+    const TempDirectory directory;
+    const std::string file = directory.write(
+        "settings.xml",
+        "<startup><features><voice>"
+        "<url>http://127.0.0.1:8090</url><uuid>0123456789abcdef0123456789abcdef</uuid>"
+        "<Speex_Quality>20</Speex_Quality><colour>red</colour><model>maps</model>"
+        "</voice></features></startup>");
+    const ToolResult result = runTalvox({"settings", "--settings", file, "--set", "model=poetry",
+                                         "--set", "streaming=yes", "--set", "My_LL=55.75,37.5"});
+    EXPECT_EQ(result.status, 0);
+    EXPECT_THAT(result.out, HasSubstr("<speexquality>10</speexquality>\n"));
+    EXPECT_THAT(result.out, HasSubstr("<model>general</model>\n"));
+    EXPECT_THAT(result.out, HasSubstr("<streaming>true</streaming>\n"));
+    EXPECT_THAT(result.out, HasSubstr("<myll>55.75,37.5</myll>\n"));
+    EXPECT_EQ(result.err,
+              "talvox: updateFromXml: unknown element name colour, ignoring\n"
+              "talvox: TalvoxSettings::validate: bad speexQuality: 20, setting to default\n"
+              "talvox: RecognizerSettings::validate:: bad value for model: poetry, setting to "
+              "general\n");
+}
+
+TEST(ToolSettings, TellsWhenADocumentIsBroken) {
+    const TempDirectory directory;
+    const ToolResult result =
+        runTalvox({"settings", "--settings", directory.write("s.xml", "<startup>")});
+    EXPECT_EQ(result.status, 0);
+    EXPECT_THAT(result.err, HasSubstr("talvox: Bundle::updateFromXml parse error: "));
+    EXPECT_THAT(result.out, HasSubstr("<samplerate>16000</samplerate>\n"));
+}
+
+}  // namespace
