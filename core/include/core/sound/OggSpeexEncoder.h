@@ -24,7 +24,7 @@ namespace Sound {
 class KORVEL_CORE_API OggSpeexEncoder : public Encoder {
   public:
     /** Page fill in bytes where nothing else is asked for. */
-    static const int PAGE_FILL_BYTES_DFLT = 4096;
+    static constexpr int PAGE_FILL_BYTES_DFLT = 4096;
 
     /**
      * @param info          1 channel, 2 bytes a sample; the rate chooses the mode: below 12500 Hz
