@@ -11,6 +11,7 @@
 
 #include "support/BareVad.h"
 #include "support/TestSound.h"
+#include "vad/VadTestSupport.h"
 
 namespace {
 
@@ -83,7 +84,7 @@ class GoldenMatrix : public ::testing::TestWithParam<std::tuple<int, int, int>> 
 };
 
 TEST_P(GoldenMatrix, DecidesAsTheBareDetectorOnSpeechLikeSound) {
-    expectAsBare(TestSupport::makeSpeechLike(rate, 6000));
+    expectAsBare(TestSupport::speechLike(rate, 6000));
 }
 
 TEST_P(GoldenMatrix, DecidesAsTheBareDetectorOnNoise) {
@@ -129,7 +130,7 @@ class FineGrained : public ::testing::TestWithParam<StrictParams> {};
 TEST_P(FineGrained, ValuesOfAModeDecideAsThatMode) {
     const StrictParams& strict = GetParam();
     for (const int rate : {8000, 16000, 32000}) {
-        const Samples samples = TestSupport::makeSpeechLike(rate, 6000);
+        const Samples& samples = TestSupport::speechLike(rate, 6000);
         Vad vad(0);
         ASSERT_EQ(0, WebRtcVad_set_mode_fine_grained(vad.handle, &strict.params));
         const Decisions expected = decideBare(3, rate, strict.frameMs, samples);
@@ -140,14 +141,14 @@ TEST_P(FineGrained, ValuesOfAModeDecideAsThatMode) {
 
 TEST_P(FineGrained, ThresholdsBeyondReachSilenceFramesOfThisLength) {
     const WebRtc_ModeParams unreachable = {32767, 32767, 0, 0};
-    const Samples samples = TestSupport::makeSpeechLike(16000, 3000);
+    const Samples& samples = TestSupport::speechLike(16000, 3000);
     Vad vad(0);
     ASSERT_EQ(0, WebRtcVad_set_mode_fine_grained(vad.handle, &unreachable));
     EXPECT_THAT(decide(vad, 16000, GetParam().frameMs, samples), ::testing::Each(0));
 }
 
 TEST_P(FineGrained, IsReplacedByTheNextMode) {
-    const Samples samples = TestSupport::makeSpeechLike(16000, 3000);
+    const Samples& samples = TestSupport::speechLike(16000, 3000);
     Vad vad(0);
     ASSERT_EQ(0, WebRtcVad_set_mode_fine_grained(vad.handle, &GetParam().params));
     ASSERT_EQ(0, WebRtcVad_set_mode(vad.handle, 1));
@@ -163,28 +164,28 @@ INSTANTIATE_TEST_SUITE_P(FrameLengths, FineGrained,
 TEST(WebRtcVad, FineGrainedHangOverKeepsSpeechAliveForAsManyFrames) {
     Samples samples = TestSupport::makeSpeechLike(16000, 1400);
     samples.resize(samples.size() + 16000, 0);
-    std::vector<std::ptrdiff_t> speechFrames;
+    std::vector<std::ptrdiff_t> ends;
     for (const int16_t hangOver : {0, 5, 30}) {
         const WebRtc_ModeParams params = {94, 1100, hangOver, hangOver};
         Vad vad(0);
         ASSERT_EQ(0, WebRtcVad_set_mode_fine_grained(vad.handle, &params));
-        Decisions tail = decide(vad, 16000, 10, samples);
-        tail.erase(tail.begin(), tail.begin() + 140);
-        speechFrames.push_back(std::count(tail.begin(), tail.end(), 1));
+        const Decisions decisions = decide(vad, 16000, 10, samples);
+        const auto last = std::find(decisions.rbegin(), decisions.rend(), 1);
+        ASSERT_NE(decisions.rend(), last);
+        ends.push_back(decisions.rend() - last);
     }
-    EXPECT_EQ(5, speechFrames[1] - speechFrames[0]);
-    EXPECT_EQ(30, speechFrames[2] - speechFrames[0]);
+    EXPECT_EQ(5, ends[1] - ends[0]);
+    EXPECT_EQ(30, ends[2] - ends[0]);
 }
 
 TEST(WebRtcVad, ForcedNoiseAnswersNoise) {
     Vad vad(0);
     ASSERT_EQ(0, WebRtcVad_force_noise(vad.handle, 1));
-    EXPECT_THAT(decide(vad, 16000, 10, TestSupport::makeSpeechLike(16000, 2000)),
-                ::testing::Each(0));
+    EXPECT_THAT(decide(vad, 16000, 10, TestSupport::speechLike(16000, 2000)), ::testing::Each(0));
 }
 
 TEST(WebRtcVad, ForcedNoiseDoesNotDisturbLaterDecisions) {
-    const Samples samples = TestSupport::makeSpeechLike(16000, 6000);
+    const Samples& samples = TestSupport::speechLike(16000, 6000);
     const Decisions expected = decideBare(2, 16000, 10, samples);
     for (const std::size_t forcedFrames : {std::size_t{1}, std::size_t{50}, std::size_t{333}}) {
         const auto boundary = static_cast<std::ptrdiff_t>(forcedFrames * 160);
@@ -208,7 +209,7 @@ TEST(WebRtcVad, ForcedNoiseStillRefusesWhatIsNotSupported) {
 }
 
 TEST(WebRtcVad, InitForgetsModeForcedNoiseAndWhatWasLearnt) {
-    const Samples samples = TestSupport::makeSpeechLike(16000, 4000);
+    const Samples& samples = TestSupport::speechLike(16000, 4000);
     Vad vad(3);
     WebRtcVad_force_noise(vad.handle, 1);
     decide(vad, 16000, 10, samples);
@@ -217,7 +218,7 @@ TEST(WebRtcVad, InitForgetsModeForcedNoiseAndWhatWasLearnt) {
 }
 
 TEST(WebRtcVad, InstancesAreIndependent) {
-    const Samples samples = TestSupport::makeSpeechLike(16000, 2000);
+    const Samples& samples = TestSupport::speechLike(16000, 2000);
     const Samples other = TestSupport::makeSpeechLike(16000, 2000, 99);
     Vad vad(1);
     Vad neighbour(3);
@@ -244,7 +245,7 @@ TEST(WebRtcVad, RefusesUnsupportedRatesAndLengths) {
 }
 
 TEST(WebRtcVad, RefusesUnknownModesAndKeepsTheOneThatIsSet) {
-    const Samples samples = TestSupport::makeSpeechLike(16000, 3000);
+    const Samples& samples = TestSupport::speechLike(16000, 3000);
     Vad vad(3);
     for (const int16_t mode : {-1, 4, 32767, -32768}) {
         EXPECT_EQ(-1, WebRtcVad_set_mode(vad.handle, mode));
