@@ -73,7 +73,7 @@ bool EventLoop::drain() {
     std::unique_lock<std::mutex> lock(mutex);
     const std::uint64_t wanted = postedCount;
     changed.wait(lock, [this, wanted] { return handledCount >= wanted || isStopping(); });
-    return handledCount >= wanted;
+    return !isStopping();
 }
 
 void EventLoop::stop() {
@@ -134,13 +134,12 @@ void EventLoop::onWake(uv_async_t* handle) {
     if (self.isStopping()) {
         self.closeHandles();
     } else {
-        self.armTimer();
+        self.serveTimers();
     }
 }
 
 void EventLoop::onTimer(uv_timer_t* handle) {
-    TimerTable::instance().fireDue();
-    static_cast<EventLoop*>(handle->data)->armTimer();
+    static_cast<EventLoop*>(handle->data)->serveTimers();
 }
 
 // One swap for each wake-up, so that posts which post again cannot starve the timers.
@@ -162,10 +161,15 @@ void EventLoop::runPosts() {
     changed.notify_all();
 }
 
-void EventLoop::armTimer() {
+void EventLoop::serveTimers() {
+    TimerTable::instance().fireDue();
     const std::int64_t waitNs = TimerTable::instance().timeToNext();
+    uv_timer_stop(&timer);
     if (waitNs == TimerTable::NEVER) {
-        uv_timer_stop(&timer);
+        return;
+    }
+    if (waitNs == 0) {
+        uv_async_send(&async);  // libuv would go on with its timers for ever
         return;
     }
     const std::int64_t waitMs = waitNs / NS_PER_MS + (waitNs % NS_PER_MS != 0 ? 1 : 0);

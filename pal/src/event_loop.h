@@ -49,7 +49,7 @@ class EventLoop {
     bool start();
     void run();
     void runPosts();
-    void armTimer();
+    void serveTimers();
     void closeHandles();
     static void onWake(uv_async_t* handle);
     static void onTimer(uv_timer_t* handle);

@@ -1,7 +1,8 @@
 #include <cstdio>
+#include <memory>
 #include <mutex>
+#include <new>
 #include <string>
-#include <vector>
 
 #include "pal/kd_log.h"
 
@@ -76,9 +77,12 @@ void kdLogFormatMessageVargs(const char* format, va_list args) {
     } else if (static_cast<std::size_t>(length) < sizeof buffer) {
         kdLogMessage(buffer);
     } else {
-        std::vector<char> longBuffer(static_cast<std::size_t>(length) + 1);
-        std::vsnprintf(longBuffer.data(), longBuffer.size(), format, again);
-        kdLogMessage(longBuffer.data());
+        const std::size_t size = static_cast<std::size_t>(length) + 1;
+        const std::unique_ptr<char[]> longBuffer(new (std::nothrow) char[size]);
+        if (longBuffer != nullptr) {
+            std::vsnprintf(longBuffer.get(), size, format, again);
+        }
+        kdLogMessage(longBuffer != nullptr ? longBuffer.get() : buffer);
     }
     va_end(again);
 }

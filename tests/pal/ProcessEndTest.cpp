@@ -1,0 +1,147 @@
+#include <gtest/gtest.h>
+
+#include <cstdio>
+#include <cstdlib>
+#include <future>
+#include <thread>
+
+#include "pal/kd.h"
+
+namespace {
+
+constexpr KDint64 MS = 1000000;
+
+// Waits on a worker until the event thread is being stopped, then calls everything once more. The
+// process cannot end before.
+void callEverythingAfterTheStop(void* /*user*/) {
+    while (kdDrainEventsKOR() == 0) {
+        std::this_thread::yield();
+    }
+    kdPostKOR([](void*) { kdLogMessage("posted function ran after the stop"); }, nullptr);
+    KDTimer* const timer = kdSetTimer(1, KD_TIMER_PERIODIC_AVERAGE, nullptr);
+    const KDint cancelled = kdCancelTimer(timer);
+    KDWork* const work =
+        kdQueueWorkKOR([](void*) { kdLogMessage("work ran after the stop"); }, nullptr, nullptr);
+    kdCancelWorkKOR(work, [](void*) { kdLogMessage("released after the stop"); });
+    kdUseManualClockKOR(0);
+    kdAdvanceClockKOR(10);
+    kdUseRealClockKOR();
+    kdEventLockKOR();
+    kdEventUnlockKOR();
+    KDFile* const file = kdFopen("/dev/null", "rb");
+    const KDint closed = kdFclose(file);
+    kdLogFormatMessage("after the stop: drained %d cancelled %d closed %d", kdDrainEventsKOR(),
+                       cancelled, closed);
+}
+
+/** Each test ends a process of its own; the sanitizers check it to its last moment. */
+class ProcessEndDeathTest : public ::testing::Test {
+  protected:
+    void SetUp() override { GTEST_FLAG_SET(death_test_style, "threadsafe"); }
+
+    template <typename Function>
+    static void endProcess(Function before) {
+        before();
+        std::exit(0);
+    }
+};
+
+const ::testing::ExitedWithCode CLEANLY(0);
+
+void startEventThread() {
+    kdPostKOR([](void*) {}, nullptr);
+    kdDrainEventsKOR();
+}
+
+TEST_F(ProcessEndDeathTest, WithoutAnEventThread) {
+    EXPECT_EXIT(endProcess([] { kdGetTimeUST(); }), CLEANLY, "^$");
+}
+
+TEST_F(ProcessEndDeathTest, WithTimersAndPostsWaiting) {
+    EXPECT_EXIT(endProcess([] {
+                    startEventThread();
+                    kdSetTimer(1, KD_TIMER_PERIODIC_AVERAGE, nullptr);
+                    kdSetTimer(3600000 * MS, KD_TIMER_ONESHOT, nullptr);
+                    for (int i = 0; i < 1000; ++i) {
+                        kdPostKOR([](void*) {}, nullptr);
+                    }
+                }),
+                CLEANLY, "^$");
+}
+
+TEST_F(ProcessEndDeathTest, LaterCallsAreHarmless) {
+    EXPECT_EXIT(endProcess([] {
+                    kdQueueWorkKOR(
+                        &callEverythingAfterTheStop,
+                        [](void*) { kdLogMessage("completed after the stop"); }, nullptr);
+                    startEventThread();
+                }),
+                CLEANLY, "^after the stop: drained -1 cancelled 0 closed 0\n$");
+}
+
+TEST_F(ProcessEndDeathTest, WithTheEventLockHeld) {
+    EXPECT_EXIT(endProcess([] {
+                    startEventThread();
+                    kdEventLockKOR();
+                    kdEventLockKOR();
+                    kdPostKOR([](void*) { kdLogMessage("ran all the same"); }, nullptr);
+                }),
+                CLEANLY, "^$");
+}
+
+TEST_F(ProcessEndDeathTest, FromACallback) {
+    EXPECT_EXIT(
+        {
+            kdPostKOR([](void*) { std::exit(0); }, nullptr);
+            std::promise<void>().get_future().wait();
+        },
+        CLEANLY, "^$");
+}
+
+TEST_F(ProcessEndDeathTest, WhileOtherThreadsGoOnCalling) {
+    EXPECT_EXIT(endProcess([] {
+                    for (int i = 0; i < 3; ++i) {
+                        std::promise<void> begun;
+                        std::thread([&begun] {
+                            begun.set_value();
+                            for (;;) {
+                                kdPostKOR([](void*) {}, nullptr);
+                                kdCancelTimer(kdSetTimer(1, KD_TIMER_ONESHOT, nullptr));
+                                kdCancelWorkKOR(kdQueueWorkKOR([](void*) {}, nullptr, nullptr),
+                                                nullptr);
+                                kdDrainEventsKOR();
+                            }
+                        }).detach();
+                        begun.get_future().wait();
+                    }
+                    startEventThread();
+                }),
+                CLEANLY, "^$");
+}
+
+TEST_F(ProcessEndDeathTest, WithWorkQueuedAndRunning) {
+    EXPECT_EXIT(endProcess([] {
+                    for (int i = 0; i < 64; ++i) {
+                        kdQueueWorkKOR([](void* user) { free(user); },
+                                       [](void*) { kdHoldsEventLockKOR(); }, malloc(10));
+                    }
+                    startEventThread();
+                }),
+                CLEANLY, "^$");
+}
+
+TEST_F(ProcessEndDeathTest, DoesNotWaitForEverForABlockedCallback) {
+    EXPECT_EXIT(endProcess([] {
+                    static std::promise<void> begun;
+                    kdPostKOR(
+                        [](void*) {
+                            begun.set_value();
+                            std::promise<void>().get_future().wait();
+                        },
+                        nullptr);
+                    begun.get_future().wait();
+                }),
+                CLEANLY, "^PAL: the event thread is blocked and was left behind\n$");
+}
+
+}  // namespace
