@@ -1,0 +1,173 @@
+#include <gtest/gtest.h>
+
+#include <boost/make_shared.hpp>
+#include <cstddef>
+#include <vector>
+
+#include "sound/CaptureQueue.h"
+#include "sound/RecorderFormat.h"
+#include "sound/ZeroWatch.h"
+
+namespace {
+
+using Sound::CaptureQueue;
+using Sound::RecorderFormat;
+using Sound::SoundDataBuffer;
+using Bytes = std::vector<unsigned char>;
+
+/** 16 kHz, 10 ms: 160 samples, 320 bytes. */
+const RecorderFormat FORMAT(16000, 10);
+
+Bytes makeBytes(std::size_t count) {
+    Bytes bytes(count);
+    for (std::size_t i = 0; i < count; ++i) {
+        bytes[i] = static_cast<unsigned char>(i * 7 % 251 + 1);
+    }
+    return bytes;
+}
+
+class RecorderCaptureQueue : public ::testing::Test {
+  protected:
+    int wakes = 0;
+    CaptureQueue queue{FORMAT, [this] { ++wakes; }};
+};
+
+TEST_F(RecorderCaptureQueue, CutsPiecesOfAnyLengthIntoBuffersOfTheAskedOne) {
+    const Bytes sound = makeBytes(320 * 7 + 100);
+    for (std::size_t step : {2U, 322U, 640U, 1000U}) {
+        Bytes received;
+        std::size_t begin = 0;
+        CaptureQueue own(FORMAT, [] {});
+        while (begin < sound.size()) {
+            const std::size_t size = std::min(step, sound.size() - begin);
+            ASSERT_TRUE(own.push(sound.data() + begin, size));
+            begin += size;
+        }
+        for (const auto& buffer : own.take().buffers) {
+            EXPECT_EQ(buffer->getData().size(), 320U);
+            EXPECT_EQ(buffer->getInfo().getCodec(), Sound::SoundDataInfo::NONE);
+            EXPECT_EQ(buffer->getInfo().getChannelCount(), 1);
+            EXPECT_EQ(buffer->getInfo().getSampleRate(), 16000);
+            EXPECT_EQ(buffer->getInfo().getSampleSize(), 2);
+            EXPECT_EQ(buffer->getInfo().getSampleCount(), 160);
+            received.insert(received.end(), buffer->getData().begin(), buffer->getData().end());
+        }
+        EXPECT_EQ(received, Bytes(sound.begin(), sound.end() - 100)) << step;
+    }
+}
+
+TEST_F(RecorderCaptureQueue, HoleBecomesSilenceOfItsLength) {
+    const Bytes sound = makeBytes(200);
+    queue.push(sound.data(), 200);
+    queue.push(nullptr, 220);
+    queue.push(sound.data(), 200);
+    queue.push(nullptr, 20);
+    const CaptureQueue::Batch batch = queue.take();
+    ASSERT_EQ(batch.buffers.size(), 2U);
+    Bytes expected = sound;
+    expected.resize(420, 0);
+    expected.insert(expected.end(), sound.begin(), sound.end());
+    expected.resize(640, 0);
+    Bytes received = batch.buffers[0]->getData();
+    received.insert(received.end(), batch.buffers[1]->getData().begin(),
+                    batch.buffers[1]->getData().end());
+    EXPECT_EQ(received, expected);
+}
+
+TEST_F(RecorderCaptureQueue, WakesOncePerTake) {
+    const Bytes sound = makeBytes(320);
+    queue.push(sound.data(), 300);
+    EXPECT_EQ(wakes, 0);
+    queue.push(sound.data(), 20);
+    queue.push(sound.data(), 320);
+    EXPECT_EQ(wakes, 1);
+    EXPECT_EQ(queue.take().buffers.size(), 2U);
+    queue.push(sound.data(), 320);
+    EXPECT_EQ(wakes, 2);
+}
+
+TEST_F(RecorderCaptureQueue, FullQueueFailsBehindTheSoundThatWaits) {
+    const Bytes sound = makeBytes(320);
+    for (std::size_t i = 0; i < CaptureQueue::BUFFERS_MAX; ++i) {
+        ASSERT_TRUE(queue.push(sound.data(), sound.size()));
+    }
+    EXPECT_FALSE(queue.push(sound.data(), sound.size()));
+    EXPECT_FALSE(queue.push(sound.data(), 2));
+    const CaptureQueue::Batch batch = queue.take();
+    EXPECT_EQ(batch.buffers.size(), CaptureQueue::BUFFERS_MAX);
+    EXPECT_TRUE(batch.failed);
+    EXPECT_EQ(batch.reason, "recorded sound was not taken in time");
+    EXPECT_FALSE(queue.push(sound.data(), sound.size()));
+    EXPECT_FALSE(queue.take().failed);
+}
+
+TEST_F(RecorderCaptureQueue, QueueThatIsTakenInTimeNeverFills) {
+    const Bytes sound = makeBytes(320);
+    for (std::size_t i = 0; i < 3 * CaptureQueue::BUFFERS_MAX; ++i) {
+        ASSERT_TRUE(queue.push(sound.data(), sound.size()));
+        EXPECT_EQ(queue.take().buffers.size(), 1U);
+    }
+}
+
+TEST_F(RecorderCaptureQueue, FirstFailureCountsAndEndsTheSound) {
+    const Bytes sound = makeBytes(320);
+    queue.push(sound.data(), 320);
+    queue.fail("one");
+    queue.fail("two");
+    EXPECT_FALSE(queue.push(sound.data(), 320));
+    const CaptureQueue::Batch batch = queue.take();
+    EXPECT_EQ(batch.buffers.size(), 1U);
+    EXPECT_TRUE(batch.failed);
+    EXPECT_EQ(batch.reason, "one");
+}
+
+TEST_F(RecorderCaptureQueue, EveryPieceCountsAsAnArrival) {
+    const unsigned before = queue.getArrivalCount();
+    queue.push(nullptr, 2);
+    EXPECT_NE(queue.getArrivalCount(), before);
+}
+
+TEST(RecorderFormat, RefusesWhatNoDeviceDelivers) {
+    for (const int rate : {-16000, -1, 0, 999, 384001, 2147483647}) {
+        EXPECT_FALSE(RecorderFormat(rate, 100).isUsable()) << rate;
+    }
+    for (const int length : {-100, -1, 0, 10001, 2147483647}) {
+        EXPECT_FALSE(RecorderFormat(16000, length).isUsable()) << length;
+    }
+    EXPECT_TRUE(RecorderFormat(1000, 1).isUsable());
+    EXPECT_TRUE(RecorderFormat(384000, 10000).isUsable());
+}
+
+TEST(RecorderFormat, RoundsTheBufferDownToWholeSamples) {
+    EXPECT_EQ(RecorderFormat(11025, 100).getSampleCount(), 1102);
+    EXPECT_EQ(RecorderFormat(11025, 100).getByteCount(), 2204U);
+    EXPECT_EQ(RecorderFormat(384000, 10000).getSampleCount(), 3840000);
+    EXPECT_EQ(RecorderFormat(1000, 1).getSampleCount(), 1);
+}
+
+SoundDataBuffer makeBuffer(int sampleCount, unsigned char lastByte) {
+    Bytes bytes(static_cast<std::size_t>(sampleCount) * 2, 0);
+    bytes.back() = lastByte;
+    return {Sound::SoundDataInfo(Sound::SoundDataInfo::NONE, 1, 16000, 2, sampleCount),
+            std::move(bytes)};
+}
+
+TEST(RecorderZeroWatch, ReportsOnceWhenThereIsNothingButZerosForOverASecond) {
+    Sound::ZeroWatch watch;
+    for (int i = 0; i < 10; ++i) {
+        EXPECT_FALSE(watch.isSuspicious(makeBuffer(1600, 0)));
+    }
+    EXPECT_TRUE(watch.isSuspicious(makeBuffer(1600, 0)));
+    for (int i = 0; i < 30; ++i) {
+        EXPECT_FALSE(watch.isSuspicious(makeBuffer(1600, 0)));
+    }
+}
+
+TEST(RecorderZeroWatch, OneOtherByteBeginsTheSecondAnew) {
+    Sound::ZeroWatch watch;
+    for (int i = 0; i < 30; ++i) {
+        EXPECT_FALSE(watch.isSuspicious(makeBuffer(1600, i % 10 == 9 ? 1 : 0)));
+    }
+}
+
+}  // namespace
