@@ -1,5 +1,5 @@
-#include "talvox/EarlyInit.h"
 #include "talvox/Settings.h"
+#include "talvox/impl/EarlyInit.h"
 
 namespace Talvox {
 

@@ -1,7 +1,7 @@
 #include "talvox/SpeechError.h"
 
 #include "pal/kd_assert.h"
-#include "talvox/EarlyInit.h"
+#include "talvox/impl/EarlyInit.h"
 
 namespace Talvox {
 

@@ -8,7 +8,7 @@
 #include "pal/kd_assert.h"
 #include "pal/kd_log.h"
 #include "talvox/DummyRecognizer.h"
-#include "talvox/EarlyInit.h"
+#include "talvox/impl/EarlyInit.h"
 #include "talvox/impl/KorvelRecognizer.h"
 
 namespace Talvox {
@@ -157,8 +157,7 @@ boost::shared_ptr<Recognizer> Talvox::createRecognizer(
     if (copy->getInt(Settings::SKS_VERBOSE_LEVEL) > 0) {
         logSettings(isGiven ? *settings : *copy);
     }
-    const boost::shared_ptr<Recognizer> recognizer =
-        makeRecognizer(getRecognitionMechanism(*copy), copy);
+    boost::shared_ptr<Recognizer> recognizer = makeRecognizer(getRecognitionMechanism(*copy), copy);
     recognizer->addListener(listener);
     return recognizer;
 }

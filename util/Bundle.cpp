@@ -4,7 +4,7 @@
 #include <cstring>
 
 #include "pal/kd_assert.h"
-#include "util/Ascii.h"
+#include "util/impl/Ascii.h"
 
 namespace Util {
 
@@ -155,7 +155,7 @@ bool Bundle::hasKey(const std::string& key) const {
 }
 
 boost::shared_ptr<Bundle> Bundle::clone() const {
-    const boost::shared_ptr<Bundle> copy = boost::make_shared<Bundle>();
+    boost::shared_ptr<Bundle> copy = boost::make_shared<Bundle>();
     for (const auto& entry : rep) {
         copy->put(entry.first, entry.second);
     }

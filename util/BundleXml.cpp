@@ -5,9 +5,9 @@
 #include "core/util/XmlUtils.h"
 #include "pal/kd_log.h"
 #include "tinyxml.h"
-#include "util/Ascii.h"
 #include "util/Bundle.h"
-#include "util/NumberText.h"
+#include "util/impl/Ascii.h"
+#include "util/impl/NumberText.h"
 
 namespace Util {
 

@@ -2,7 +2,7 @@
 
 #include "pal/kd_assert.h"
 #include "pal/kd_log.h"
-#include "util/WavHeader.h"
+#include "util/impl/WavHeader.h"
 
 namespace Util {
 

@@ -12,7 +12,7 @@
 
 #include "support/AssertCapture.h"
 #include "support/LogCapture.h"
-#include "util/WavHeader.h"
+#include "util/impl/WavHeader.h"
 
 using ::testing::ElementsAre;
 using TestSupport::AssertCapture;

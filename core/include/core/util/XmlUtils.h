@@ -21,7 +21,7 @@ namespace Util {
 class KORVEL_CORE_API XmlUtils {
   public:
     /** Largest accepted text in bytes (1 MiB). */
-    static constexpr std::size_t MAX_SIZE_BYTES = 1024 * 1024;
+    static constexpr std::size_t MAX_SIZE_BYTES = std::size_t{1024} * 1024;
     /** Deepest accepted nesting of elements. */
     static constexpr unsigned MAX_DEPTH = 64;
 

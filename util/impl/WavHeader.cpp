@@ -1,4 +1,4 @@
-#include "util/WavHeader.h"
+#include "util/impl/WavHeader.h"
 
 #include <algorithm>
 #include <limits>

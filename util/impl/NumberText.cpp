@@ -1,4 +1,4 @@
-#include "util/NumberText.h"
+#include "util/impl/NumberText.h"
 
 #include <algorithm>
 #include <cerrno>
