@@ -6,6 +6,7 @@
 #include <sstream>
 
 #include "pal/kd.h"
+#include "util/NumberText.h"
 
 namespace Talvox {
 
@@ -67,26 +68,23 @@ std::string formatLocation(const Util::Bundle::LatLon& location) {
 }
 
 std::string makeTranscripts(const RecognitionResults& results, const TranscriptsOrigin& origin) {
-    std::ostringstream xml;
-    xml.imbue(std::locale::classic());
-    xml << "<?xml version=\"1.0\" encoding=\"utf-8\"?>\n";
-    xml << "<Transcripts source=\"" << origin.source << '"';
+    std::string xml = "<?xml version=\"1.0\" encoding=\"utf-8\"?>\n";
+    xml += "<Transcripts source=\"" + origin.source + '"';
     if (!origin.defaultLanguage.empty()) {
-        xml << " default_language=\"" << origin.defaultLanguage << '"';
+        xml += " default_language=\"" + origin.defaultLanguage + '"';
     }
     if (!origin.topic.empty()) {
-        xml << " topic=\"" << origin.topic << '"';
+        xml += " topic=\"" + origin.topic + '"';
     }
-    xml << ">\n";
+    xml += ">\n";
     for (const RecognitionResult& result : results) {
-        xml << "  <Transcript";
+        xml += "  <Transcript";
         if (result.getConfidence() >= 0.0F) {
-            xml << " confidence=\"" << static_cast<double>(result.getConfidence()) << '"';
+            xml += " confidence=\"" + Util::NumberText::writeFloat(result.getConfidence()) + '"';
         }
-        xml << '>' << result.getText() << "</Transcript>\n";
+        xml += '>' + result.getText() + "</Transcript>\n";
     }
-    xml << "</Transcripts>\n";
-    return xml.str();
+    return xml + "</Transcripts>\n";
 }
 
 }  // namespace Talvox

@@ -2,33 +2,22 @@
 
 #include <tinyxml.h>
 
-#include <algorithm>
 #include <boost/make_shared.hpp>
-#include <limits>
-#include <locale>
-#include <sstream>
 #include <vector>
 
 #include "core/util/Base64Coder.h"
 #include "core/util/XmlUtils.h"
 #include "pal/kd.h"
+#include "util/NumberText.h"
 
 namespace Talvox {
 
 namespace {
 
-/** The attribute as a number, with a point whatever the process's locale; 0 without a number. */
+/** 0 where there is no number. */
 float readConfidence(const TiXmlElement& variant) {
     const char* const text = variant.Attribute("confidence");
-    if (text == nullptr) {
-        return 0.0F;
-    }
-    std::istringstream stream(text);
-    stream.imbue(std::locale::classic());
-    double confidence = 0.0;
-    stream >> confidence;
-    const double limit = std::numeric_limits<float>::max();
-    return static_cast<float>(std::max(-limit, std::min(limit, confidence)));
+    return text == nullptr ? 0.0F : Util::NumberText::readFloat(text).value;
 }
 
 void readVariants(const TiXmlElement& root, RecognitionResults& results) {

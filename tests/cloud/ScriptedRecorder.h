@@ -1,0 +1,49 @@
+/**
+ * @file
+ * A recorder that a test plays by hand.
+ */
+#pragma once
+
+#include "core/sound/Recorder.h"
+#include "core/util/EventLock.h"
+
+namespace CloudTest {
+
+/** Delivers what the test hands it, as a recorder does: under the event lock, while it records. */
+class ScriptedRecorder : public Sound::Recorder {
+  public:
+    bool init() override {
+        initialised = true;
+        return works;
+    }
+    void startRecording() override {
+        if (failsAtStart) {
+            notifyError();
+        }
+        Sound::Recorder::startRecording();
+    }
+    void stopRecording() override {
+        ++stops;
+        Sound::Recorder::stopRecording();
+    }
+
+    /** Hands a buffer to the listeners unless recording has ended. */
+    void deliver(const boost::shared_ptr<const Sound::SoundDataBuffer>& buffer) {
+        const Util::EventLock lock;
+        if (isRecording()) {
+            notifyData(buffer);
+        }
+    }
+
+    void fail() {
+        const Util::EventLock lock;
+        notifyError();
+    }
+
+    bool works = true;
+    bool failsAtStart = false;
+    bool initialised = false;
+    int stops = 0;
+};
+
+}  // namespace CloudTest
