@@ -105,13 +105,10 @@ TEST(VadAnalysis, SegmentsFollowTheStateOfTheBuffers) {
 
 TEST(VadAnalysis, AnOpenSegmentEndsAtTheLastBuffer) {
     LogCapture log;
-    VadAnalyzer analyzer("analyzemsoff=20000", 16000);
-    const Samples samples = betweenPauses(speechLike(16000, 1500), 16000);
-    analyzeAll(analyzer, samples, 16000);
-    VadAnalyzer never("activityoff=-1", 16000);
-    analyzeAll(never, samples, 16000);
-    ASSERT_EQ(1U, never.segments().size());
-    EXPECT_EQ(4500, never.segments()[0].endMs);
+    VadAnalyzer analyzer("activityoff=-1", 16000);
+    analyzeAll(analyzer, betweenPauses(speechLike(16000, 1500), 16000), 16000);
+    ASSERT_EQ(1U, analyzer.segments().size());
+    EXPECT_EQ(4500, analyzer.segments()[0].endMs);
 }
 
 TEST(VadAnalysis, SilenceHasNoSegments) {
@@ -136,7 +133,7 @@ TEST(VadAnalysis, ShowsTheActivityThatIsComparedWithTheThreshold) {
         EXPECT_FLOAT_EQ(static_cast<float>(ones) / static_cast<float>(span), analysis.activity);
         wasSpeech = analysis.isSpeech;
     }
-    EXPECT_EQ(1U, std::min<std::size_t>(1, analyzer.segments().size()));
+    EXPECT_FALSE(analyzer.segments().empty());
 }
 
 TEST(VadAnalysis, ShowsTheLoneEngineToo) {

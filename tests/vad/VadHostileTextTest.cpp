@@ -39,34 +39,36 @@ bool run(const std::string& text, const SoundDataInfo& format, int bufferCount =
     return detector->isSpeech();
 }
 
-class FrameLengths : public ::testing::TestWithParam<const char*> {
-  protected:
-    const LogCapture log;
-};
+constexpr const char* ABSURD_FRAME_LENGTHS[] = {"0",
+                                                "-1",
+                                                "-10",
+                                                "abc",
+                                                "",
+                                                "101",
+                                                "1000000000",
+                                                "2147483647",
+                                                "-2147483648",
+                                                "134217",
+                                                "99999999999999999999"};
 
-TEST_P(FrameLengths, AreSurvivedAtEveryRate) {
-    const std::string value = GetParam();
-    for (const int rate : {8000, 11025, 16000, 32000, 44100, 48000, 81536, 1, 0, -1, 999,
-                           std::numeric_limits<int>::max(), std::numeric_limits<int>::min()}) {
-        for (const char* engine : {"buffered", "wrtc"}) {
-            run("framems=" + value + ";engine=" + engine, TestSupport::monoFormat(rate));
+TEST(VadHostileText, FrameLengthsThatDoNotFitTheBufferDecideNothing) {
+    const LogCapture log;
+    for (const std::string value : ABSURD_FRAME_LENGTHS) {
+        EXPECT_FALSE(run("framems=" + value, TestSupport::monoFormat(16000))) << value;
+        EXPECT_FALSE(run("engine=wrtc;framems=" + value, TestSupport::monoFormat(16000))) << value;
+    }
+}
+
+TEST(VadHostileText, AbsurdFrameLengthsAreSurvivedAtEveryRate) {
+    const LogCapture log;
+    const int most = std::numeric_limits<int>::max();
+    for (const int rate : {8000, 11025, 32000, 44100, 48000, 81536, 1, 0, -1, 999, most, -most}) {
+        for (const std::string value : ABSURD_FRAME_LENGTHS) {
+            run("framems=" + value, TestSupport::monoFormat(rate));
+            run("engine=wrtc;framems=" + value, TestSupport::monoFormat(rate));
         }
     }
 }
-
-TEST_P(FrameLengths, DecideNothingWhereAFrameDoesNotFitTheBuffer) {
-    const std::string value = GetParam();
-    if (value == "1" || value == "3" || value == "67108863") {
-        GTEST_SKIP() << "frames of this length fit, and count as speech";
-    }
-    EXPECT_FALSE(run("framems=" + value, TestSupport::monoFormat(16000)));
-    EXPECT_FALSE(run("engine=wrtc;framems=" + value, TestSupport::monoFormat(16000)));
-}
-
-INSTANTIATE_TEST_SUITE_P(Absurd, FrameLengths,
-                         ::testing::Values("0", "-1", "-10", "abc", "", "1", "3", "101",
-                                           "1000000000", "2147483647", "-2147483648", "134217",
-                                           "99999999999999999999"));
 
 TEST(VadHostileText, WrappedFrameLengthsReadNothingBeyondTheFrame) {
     const LogCapture log;
