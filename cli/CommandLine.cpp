@@ -8,12 +8,8 @@
 #include "SoundInput.h"
 #include "UsageError.h"
 #include "VadCommand.h"
+#include "Version.h"
 #include "talvox/Settings.h"
-#include "talvox/Talvox.h"
-
-#ifndef TALVOX_BUILD_ID
-#define TALVOX_BUILD_ID "unknown"
-#endif
 
 namespace Cli {
 
@@ -178,8 +174,7 @@ int runTool(int argc, const char* const* argv, Console& console, LogOutput& log)
     Arguments arguments;
     arguments.recognize.settings.defaults = recognizeDefaults();
     CLI::App app("Speech recognition from the command line", "talvox");
-    app.set_version_flag("--version",
-                         "talvox " + Talvox::Talvox::VERSION + " (build " TALVOX_BUILD_ID ")");
+    app.set_version_flag("--version", versionText());
     app.require_subcommand(1);
     const CLI::App* recognize = addRecognize(app, arguments.recognize);
     const CLI::App* vad = addVadCommand(app, arguments.vad);
