@@ -57,8 +57,8 @@ class TALVOX_API Bundle {
     };
 
     /**
-     * One row of a specification table, which is an array ended by a row with a null name. A null
-     * pointer in place of a table counts as a table without rows.
+     * One row of a table of the keys that a bundle holds, which is an array ended by a row with a
+     * null name. A null pointer in place of a table counts as a table without rows.
      */
     struct ElemSpec {
         const char* name;        /**< in normalised spelling */
