@@ -169,8 +169,8 @@ class RefusingPort {
     std::string getUrl() const;
 
   private:
-    int socket = -1;
     unsigned short port = 0;
+    int socket;
 };
 
 }  // namespace TestSupport

@@ -1,0 +1,46 @@
+#include "core/network/HttpResponse.h"
+
+#include <algorithm>
+
+namespace Network {
+
+namespace {
+
+// By hand: the C library's conversion depends on the locale.
+std::string toLower(std::string text) {
+    std::transform(text.begin(), text.end(), text.begin(), [](char c) {
+        return c >= 'A' && c <= 'Z' ? static_cast<char>(c - 'A' + 'a') : c;
+    });
+    return text;
+}
+
+std::string trim(const std::string& text) {
+    const char* const blanks = " \t\r\n";
+    const std::size_t first = text.find_first_not_of(blanks);
+    if (first == std::string::npos) {
+        return std::string();
+    }
+    return text.substr(first, text.find_last_not_of(blanks) - first + 1);
+}
+
+}  // namespace
+
+HttpResponse::HttpResponse(int statusCode) : status(statusCode) {}
+
+int HttpResponse::getStatus() const {
+    return status;
+}
+
+std::optional<std::string> HttpResponse::getHeader(const std::string& name) const {
+    const auto found = headers.find(toLower(name));
+    if (found == headers.end()) {
+        return std::nullopt;
+    }
+    return found->second;
+}
+
+void HttpResponse::addHeader(const std::string& name, const std::string& value) {
+    headers.emplace(toLower(name), trim(value));
+}
+
+}  // namespace Network

@@ -1,0 +1,46 @@
+#include "core/network/NetworkManager.h"
+
+#include <atomic>
+#include <boost/make_shared.hpp>
+
+#include "core/network/NetworkInterfaces.h"
+#include "network/Transport.h"
+
+namespace Network {
+
+class NetworkManager::Impl {
+  public:
+    static constexpr int NO_OVERRIDE = -1;
+
+    const boost::shared_ptr<Transport> transport = boost::make_shared<Transport>();
+    std::atomic<int> override{NO_OVERRIDE};
+};
+
+NetworkManager& NetworkManager::getInstance() {
+    return instance();
+}
+
+NetworkManager::NetworkManager() : impl(new Impl) {}
+
+NetworkManager::~NetworkManager() {
+    impl->transport->stop();
+}
+
+int NetworkManager::getReachability() const {
+    const int word = impl->override;
+    return word != Impl::NO_OVERRIDE ? word : judgeReachability(listNetworkInterfaces());
+}
+
+void NetworkManager::overrideReachability(int value) {
+    impl->override = value;
+}
+
+void NetworkManager::setCertificateFile(const std::string& path) {
+    impl->transport->setCertificateFile(path);
+}
+
+Transport& NetworkManager::getTransport() {
+    return *impl->transport;
+}
+
+}  // namespace Network

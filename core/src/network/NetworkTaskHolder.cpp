@@ -1,0 +1,61 @@
+#include "core/network/NetworkTaskHolder.h"
+
+#include <boost/make_shared.hpp>
+#include <utility>
+
+#include "core/network/NetworkManager.h"
+#include "core/util/EventLock.h"
+#include "network/Exchange.h"
+#include "network/Transport.h"
+#include "pal/kd_assert.h"
+#include "pal/kd_log.h"
+
+namespace Network {
+
+NetworkTaskHolder::NetworkTaskHolder() = default;
+
+NetworkTaskHolder::~NetworkTaskHolder() {
+    cancel();
+}
+
+void NetworkTaskHolder::submit(const boost::shared_ptr<NetworkTask>& task,
+                               const boost::shared_ptr<NetworkTaskRetryPolicy>& policy) {
+    const Util::EventLock lock;
+    if (!KOR_ASSERT(task)) {
+        return;
+    }
+    if (isWorking()) {
+        kdLogMessage("NetworkTaskHolder: a running task gives way to the next one");
+    }
+    Transport& transport = NetworkManager::getInstance().getTransport();
+    const auto next = boost::make_shared<Exchange>(transport.shared_from_this(), task, policy);
+    const boost::shared_ptr<Exchange> previous = std::move(exchange);
+    exchange = next;
+    next->start();
+    if (previous) {
+        previous->cancel();
+    }
+}
+
+void NetworkTaskHolder::submitNoRetries(const boost::shared_ptr<NetworkTask>& task) {
+    submit(task, nullptr);
+}
+
+void NetworkTaskHolder::cancel() {
+    const Util::EventLock lock;
+    // Forgotten first: the end of the task may come back to this holder.
+    if (const boost::shared_ptr<Exchange> ended = std::move(exchange)) {
+        ended->cancel();
+    }
+}
+
+bool NetworkTaskHolder::isWorking() const {
+    const Util::EventLock lock;
+    return exchange && exchange->isActive();
+}
+
+void NetworkTaskHolder::onFinished() {
+    cancel();
+}
+
+}  // namespace Network

@@ -1,0 +1,204 @@
+#include "network/Transport.h"
+
+#include <pthread.h>
+#include <signal.h>
+
+#include <algorithm>
+#include <utility>
+
+#include "network/Transfer.h"
+#include "pal/kd_assert.h"
+#include "pal/kd_event.h"
+
+namespace Network {
+
+namespace {
+
+// Nothing is polled for: the thread is woken by sockets, by libcurl's own timers and by commands.
+constexpr int LONGEST_SLEEP_MS = 60 * 60 * 1000;
+
+void initialiseCurl() {
+    static std::once_flag once;
+    // For the rest of the process: the application may use libcurl as well.
+    std::call_once(once, [] { curl_global_init(CURL_GLOBAL_DEFAULT); });
+}
+
+/** Releases the event lock for its own lifetime, however often it is held. */
+class EventLockLoan {
+  public:
+    EventLockLoan() {
+        while (kdHoldsEventLockKOR() != 0) {
+            kdEventUnlockKOR();
+            ++levels;
+        }
+    }
+    ~EventLockLoan() {
+        for (; levels > 0; --levels) {
+            kdEventLockKOR();
+        }
+    }
+    EventLockLoan(const EventLockLoan&) = delete;
+    EventLockLoan& operator=(const EventLockLoan&) = delete;
+
+  private:
+    int levels = 0;
+};
+
+}  // namespace
+
+Transport::Transport() {
+    initialiseCurl();
+    multi.reset(curl_multi_init());
+    KOR_ASSERT(multi != nullptr);
+}
+
+Transport::~Transport() = default;
+
+bool Transport::post(std::function<void()> command) {
+    const std::lock_guard<std::mutex> lock(mutex);
+    if (closed || !multi) {
+        return false;
+    }
+    launchThread();
+    commands.push_back(std::move(command));
+    if (commands.size() == 1) {
+        curl_multi_wakeup(multi.get());
+    }
+    return true;
+}
+
+void Transport::requestCheck(const boost::shared_ptr<Transfer>& transfer) {
+    const boost::shared_ptr<Transport> self = shared_from_this();
+    post([self, transfer] { self->check(transfer); });
+}
+
+void Transport::setCertificateFile(const std::string& path) {
+    const std::lock_guard<std::mutex> lock(mutex);
+    certificateFile = path;
+}
+
+void Transport::stop() {
+    stopping = true;
+    {
+        const std::lock_guard<std::mutex> lock(mutex);
+        if (!thread.joinable()) {
+            closed = true;
+            return;
+        }
+        curl_multi_wakeup(multi.get());
+    }
+    // A task's callback must not end the thread that it runs on.
+    if (!KOR_ASSERT(thread.get_id() != std::this_thread::get_id())) {
+        thread.detach();
+        return;
+    }
+    const EventLockLoan loan;
+    thread.join();
+}
+
+// Signals belong to the application's threads.
+void Transport::launchThread() {
+    if (thread.joinable()) {
+        return;
+    }
+    sigset_t all;
+    sigset_t before;
+    sigfillset(&all);
+    pthread_sigmask(SIG_SETMASK, &all, &before);
+    const boost::shared_ptr<Transport> self = shared_from_this();
+    thread = std::thread([self] { self->run(); });
+    pthread_sigmask(SIG_SETMASK, &before, nullptr);
+}
+
+void Transport::run() {
+    while (runCommands()) {
+        perform();
+        curl_multi_poll(multi.get(), nullptr, 0, LONGEST_SLEEP_MS, nullptr);
+    }
+    finishAll();
+    // Closes the connections that were kept.
+    multi.reset();
+}
+
+// The end comes when there is nothing left to run, so that each command that was accepted is run.
+bool Transport::runCommands() {
+    for (;;) {
+        std::vector<std::function<void()>> current;
+        {
+            const std::lock_guard<std::mutex> lock(mutex);
+            current.swap(commands);
+            if (current.empty()) {
+                closed = stopping;
+                return !closed;
+            }
+        }
+        for (const std::function<void()>& command : current) {
+            command();
+        }
+    }
+}
+
+void Transport::perform() {
+    int running = 0;
+    curl_multi_perform(multi.get(), &running);
+    int waiting = 0;
+    while (const CURLMsg* message = curl_multi_info_read(multi.get(), &waiting)) {
+        const auto entry = transfers.find(message->easy_handle);
+        if (message->msg == CURLMSG_DONE && entry != transfers.end()) {
+            finish(entry, message->data.result);
+        }
+    }
+}
+
+void Transport::start(const boost::shared_ptr<Transfer>& transfer) {
+    std::string certificates;
+    {
+        const std::lock_guard<std::mutex> lock(mutex);
+        certificates = certificateFile;
+    }
+    CURL* const easy = transfer->open(certificates);
+    const auto entry = transfers.emplace(easy, transfer).first;
+    if (easy == nullptr || curl_multi_add_handle(multi.get(), easy) != CURLM_OK) {
+        finish(entry, CURLE_FAILED_INIT);
+    }
+}
+
+void Transport::abandon(const boost::shared_ptr<Transfer>& transfer) {
+    const auto entry = find(transfer);
+    if (entry != transfers.end()) {
+        curl_multi_remove_handle(multi.get(), entry->first);
+        transfers.erase(entry);
+    }
+    transfer->abandon();
+}
+
+// What has arrived but was not looked at yet counts for the peer.
+void Transport::check(const boost::shared_ptr<Transfer>& transfer) {
+    perform();
+    const auto entry = find(transfer);
+    if (entry != transfers.end() && transfer->hasExpired()) {
+        finish(entry, CURLE_OPERATION_TIMEDOUT);
+    }
+}
+
+void Transport::finish(Transfers::iterator entry, CURLcode result) {
+    const boost::shared_ptr<Transfer> transfer = entry->second;
+    const int code = transfer->judge(result);
+    curl_multi_remove_handle(multi.get(), entry->first);
+    transfers.erase(entry);
+    transfer->end(code);
+}
+
+void Transport::finishAll() {
+    while (!transfers.empty()) {
+        finish(transfers.begin(), CURLE_ABORTED_BY_CALLBACK);
+    }
+}
+
+Transport::Transfers::iterator Transport::find(const boost::shared_ptr<Transfer>& transfer) {
+    return std::find_if(
+        transfers.begin(), transfers.end(),
+        [&transfer](const Transfers::value_type& entry) { return entry.second == transfer; });
+}
+
+}  // namespace Network

@@ -1,0 +1,63 @@
+#include "core/util/UrlCoder.h"
+
+namespace Util {
+
+namespace {
+
+const char* const HEX_DIGITS = "0123456789ABCDEF";
+
+// By hand: the C library's classes depend on the locale.
+bool isUnreserved(char c) {
+    return (c >= 'A' && c <= 'Z') || (c >= 'a' && c <= 'z') || (c >= '0' && c <= '9') || c == '-' ||
+           c == '_' || c == '.' || c == '~';
+}
+
+int hexValue(char c) {
+    if (c >= '0' && c <= '9') {
+        return c - '0';
+    }
+    if (c >= 'A' && c <= 'F') {
+        return c - 'A' + 10;
+    }
+    if (c >= 'a' && c <= 'f') {
+        return c - 'a' + 10;
+    }
+    return -1;
+}
+
+}  // namespace
+
+std::string UrlCoder::urlEncodeString(const std::string& text) {
+    std::string encoded;
+    encoded.reserve(text.size());
+    for (const char c : text) {
+        if (isUnreserved(c)) {
+            encoded += c;
+        } else {
+            const auto byte = static_cast<unsigned char>(c);
+            encoded += '%';
+            encoded += HEX_DIGITS[byte >> 4];
+            encoded += HEX_DIGITS[byte & 0x0F];
+        }
+    }
+    return encoded;
+}
+
+std::string UrlCoder::urlDecodeString(const std::string& text) {
+    std::string decoded;
+    decoded.reserve(text.size());
+    for (std::size_t i = 0; i < text.size(); ++i) {
+        const bool complete = text[i] == '%' && text.size() - i > 2;
+        const int high = complete ? hexValue(text[i + 1]) : -1;
+        const int low = complete ? hexValue(text[i + 2]) : -1;
+        if (high >= 0 && low >= 0) {
+            decoded += static_cast<char>(high * 16 + low);
+            i += 2;
+        } else {
+            decoded += text[i];
+        }
+    }
+    return decoded;
+}
+
+}  // namespace Util

@@ -31,8 +31,8 @@ class KORVEL_CORE_API HttpRequest {
         /**
          * Appends a whole field to the encoded content; the arguments are those of `startField`.
          */
-        void addField(const std::string& name, const std::string& value, bool asFile,
-                      bool base64, const std::string& contentType);
+        void addField(const std::string& name, const std::string& value, bool asFile, bool base64,
+                      const std::string& contentType);
 
         /**
          * The text that opens a field; the content is not changed.

@@ -12,6 +12,8 @@
 
 namespace Network {
 
+class Exchange;
+
 /**
  * Owns at most one running task. All operations take the event lock and none waits for the
  * network. After `cancel` or the destructor has returned, no operation of the task is called any
@@ -47,8 +49,7 @@ class KORVEL_CORE_API NetworkTaskHolder {
     void onFinished();
 
   private:
-    class Running;
-    boost::shared_ptr<Running> running;
+    boost::shared_ptr<Exchange> exchange;
 };
 
 }  // namespace Network

@@ -1,0 +1,59 @@
+#pragma once
+
+#include <boost/enable_shared_from_this.hpp>
+#include <boost/shared_ptr.hpp>
+#include <cstddef>
+#include <string>
+#include <vector>
+
+#include "core/network/NetworkTask.h"
+#include "core/network/NetworkTaskRetryPolicy.h"
+#include "core/util/Timer.h"
+#include "network/Transfer.h"
+
+namespace Network {
+
+class Transport;
+
+/**
+ * One submitted task with all its attempts. Everything in here is guarded by the event lock; calls
+ * that come from the network thread take it and then see whether anybody still wants to hear.
+ */
+class Exchange : public boost::enable_shared_from_this<Exchange>, public TransferListener {
+  public:
+    Exchange(boost::shared_ptr<Transport> transport, boost::shared_ptr<NetworkTask> task,
+             boost::shared_ptr<NetworkTaskRetryPolicy> policy);
+
+    /** Begins the first attempt. Under the event lock, as the next two. */
+    void start();
+
+    /** Releases the task and ends the transfer; no callback of the task runs any more. */
+    void cancel();
+
+    bool isActive() const { return active; }
+
+    void onTransferHead(const boost::shared_ptr<HttpResponse>& response) override;
+    bool onTransferBytes(const unsigned char* bytes, std::size_t size) override;
+    void onTransferEnd(int code) override;
+
+  private:
+    void postAttempt();
+    void attempt();
+    boost::shared_ptr<Transfer> makeTransfer();
+    bool prepareTask(const boost::shared_ptr<NetworkTask>& current);
+    bool collect(const unsigned char* bytes, std::size_t size);
+    void retryOrFinish(int code);
+    void finish(int code);
+    void deliverEnd(int code);
+
+    const boost::shared_ptr<Transport> transport;
+    boost::shared_ptr<NetworkTask> task;
+    boost::shared_ptr<NetworkTaskRetryPolicy> policy;
+    boost::shared_ptr<Transfer> transfer;
+    std::vector<unsigned char> collected;
+    Util::Timer retryTimer;
+    int attempts = 0;
+    bool active = true;
+};
+
+}  // namespace Network

@@ -1,0 +1,26 @@
+#pragma once
+
+#include <boost/shared_ptr.hpp>
+#include <string>
+#include <utility>
+#include <vector>
+
+#include "core/network/HttpResponse.h"
+
+namespace Network {
+
+/** Gathers the header lines of a response. */
+class ResponseHead {
+  public:
+    /** Takes the next line, with its end. @return true when it was the empty line */
+    bool addLine(const std::string& line);
+
+    bool has(const std::string& name) const;
+
+    boost::shared_ptr<HttpResponse> makeResponse(int status) const;
+
+  private:
+    std::vector<std::pair<std::string, std::string>> fields;
+};
+
+}  // namespace Network

@@ -1,0 +1,292 @@
+#include "network/Transfer.h"
+
+#include <sys/socket.h>
+
+#include <boost/weak_ptr.hpp>
+#include <limits>
+#include <utility>
+
+#include "core/network/NetworkTask.h"
+#include "network/Transport.h"
+#include "pal/kd_log.h"
+
+namespace Network {
+
+namespace {
+
+// The time-outs are ours, on the platform clock.
+constexpr long NO_CONNECT_LIMIT_MS = std::numeric_limits<int>::max();
+constexpr long MOST_REDIRECTS = 10;
+
+bool isSecure(const std::string& url) {
+    return url.size() > 4 && (url[4] == 's' || url[4] == 'S');
+}
+
+}  // namespace
+
+Transfer::Transfer(boost::shared_ptr<Transport> owner, boost::shared_ptr<HttpRequest> what,
+                   boost::shared_ptr<TransferListener> hearer)
+    : transport(std::move(owner)),
+      request(std::move(what)),
+      listener(std::move(hearer)),
+      watchdog(request->getTimeoutMs(),
+               [this] {
+                   if (const boost::shared_ptr<Transfer> self = weak_from_this().lock()) {
+                       transport->requestCheck(self);
+                   }
+               }),
+      body(request) {}
+
+CURL* Transfer::open(const std::string& certificateFile) {
+    easy.reset(curl_easy_init());
+    if (easy) {
+        setUpConnection(certificateFile);
+        setUpRequest();
+        setUpHeaders();
+    }
+    return easy.get();
+}
+
+void Transfer::setUpConnection(const std::string& certificateFile) {
+    CURL* const handle = easy.get();
+    curl_easy_setopt(handle, CURLOPT_NOSIGNAL, 1L);
+    // Otherwise the end of a transfer waits for a name server that does not answer.
+    curl_easy_setopt(handle, CURLOPT_QUICK_EXIT, 1L);
+    curl_easy_setopt(handle, CURLOPT_CONNECTTIMEOUT_MS, NO_CONNECT_LIMIT_MS);
+    // Settings come from the application only, never from the environment.
+    curl_easy_setopt(handle, CURLOPT_PROXY, "");
+    curl_easy_setopt(handle, CURLOPT_HTTP_VERSION, static_cast<long>(CURL_HTTP_VERSION_1_1));
+    if (!certificateFile.empty()) {
+        curl_easy_setopt(handle, CURLOPT_CAINFO, certificateFile.c_str());
+        curl_easy_setopt(handle, CURLOPT_CAPATH, nullptr);
+    }
+    curl_easy_setopt(handle, CURLOPT_ERRORBUFFER, errorText.data());
+    curl_easy_setopt(handle, CURLOPT_NOPROGRESS, 0L);
+    curl_easy_setopt(handle, CURLOPT_XFERINFOFUNCTION, &Transfer::onProgress);
+    curl_easy_setopt(handle, CURLOPT_XFERINFODATA, this);
+}
+
+void Transfer::setUpRequest() {
+    CURL* const handle = easy.get();
+    const std::string& url = request->getUrl();
+    curl_easy_setopt(handle, CURLOPT_URL, url.c_str());
+    curl_easy_setopt(handle, CURLOPT_PATH_AS_IS, 1L);
+    curl_easy_setopt(handle, CURLOPT_PROTOCOLS_STR, "http,https");
+    if (request->getMethod() == "POST") {
+        setUpBody();
+    } else if (request->getFollowRedirects()) {
+        curl_easy_setopt(handle, CURLOPT_FOLLOWLOCATION, 1L);
+        curl_easy_setopt(handle, CURLOPT_MAXREDIRS, MOST_REDIRECTS);
+        curl_easy_setopt(handle, CURLOPT_REDIR_PROTOCOLS_STR,
+                         isSecure(url) ? "https" : "http,https");
+    }
+    curl_easy_setopt(handle, CURLOPT_HEADERFUNCTION, &Transfer::onHeader);
+    curl_easy_setopt(handle, CURLOPT_HEADERDATA, this);
+    curl_easy_setopt(handle, CURLOPT_WRITEFUNCTION, &Transfer::onWrite);
+    curl_easy_setopt(handle, CURLOPT_WRITEDATA, this);
+}
+
+void Transfer::setUpBody() {
+    CURL* const handle = easy.get();
+    curl_easy_setopt(handle, CURLOPT_POST, 1L);
+    curl_easy_setopt(handle, CURLOPT_READFUNCTION, &Transfer::onRead);
+    curl_easy_setopt(handle, CURLOPT_READDATA, this);
+    curl_easy_setopt(handle, CURLOPT_SEEKFUNCTION, &Transfer::onSeek);
+    curl_easy_setopt(handle, CURLOPT_SEEKDATA, this);
+    if (request->isChunked()) {
+        const boost::weak_ptr<Transfer> weak(shared_from_this());
+        request->getWriter()->setWakeUp([weak] {
+            if (const boost::shared_ptr<Transfer> self = weak.lock()) {
+                self->wake();
+            }
+        });
+    } else {
+        curl_easy_setopt(handle, CURLOPT_POSTFIELDSIZE_LARGE,
+                         static_cast<curl_off_t>(request->getBody().size()));
+    }
+}
+
+void Transfer::setUpHeaders() {
+    bool hasContentType = false;
+    for (const auto& header : request->getHeaders()) {
+        // Without a value, a colon would tell libcurl to leave the header out.
+        addHeaderLine(header.second.empty() ? header.first + ";"
+                                            : header.first + ": " + header.second);
+        hasContentType = hasContentType || curl_strequal(header.first.c_str(), "Content-Type") != 0;
+    }
+    if (request->getMethod() == "POST") {
+        addHeaderLine("Expect:");  // none: waiting for its answer costs a second
+        if (request->isChunked()) {
+            addHeaderLine("Transfer-Encoding: chunked");
+        }
+        if (!hasContentType) {
+            addHeaderLine("Content-Type:");  // none, instead of libcurl's default
+        }
+    }
+    curl_easy_setopt(easy.get(), CURLOPT_HTTPHEADER, headerLines.get());
+}
+
+void Transfer::addHeaderLine(const std::string& line) {
+    curl_slist* const longer = curl_slist_append(headerLines.get(), line.c_str());
+    if (longer != nullptr) {
+        static_cast<void>(headerLines.release());
+        headerLines.reset(longer);
+    }
+}
+
+int Transfer::judge(CURLcode result) const {
+    const long status = getStatus();
+    if (headDelivered && (result == CURLE_OK || isAnswered())) {
+        return static_cast<int>(status);
+    }
+    kdLogFormatMessage("Network: a request failed: %s",
+                       errorText[0] != '\0' ? errorText.data() : curl_easy_strerror(result));
+    if (result == CURLE_OPERATION_TIMEDOUT) {
+        return NetworkTask::TIMED_OUT;
+    }
+    const bool neverSent = result == CURLE_URL_MALFORMAT && status == 0;
+    return neverSent ? NetworkTask::NO_REQUEST : NetworkTask::NO_RESPONSE;
+}
+
+long Transfer::getStatus() const {
+    long status = 0;
+    curl_easy_getinfo(easy.get(), CURLINFO_RESPONSE_CODE, &status);
+    return status;
+}
+
+// A peer that has answered may close the connection without listening to the end.
+bool Transfer::isAnswered() const {
+    curl_off_t expected = -1;
+    curl_easy_getinfo(easy.get(), CURLINFO_CONTENT_LENGTH_DOWNLOAD_T, &expected);
+    return expected >= 0 && receivedBytes >= expected;
+}
+
+void Transfer::end(int code) {
+    const boost::shared_ptr<TransferListener> hearer = listener;
+    abandon();
+    if (hearer) {
+        hearer->onTransferEnd(code);
+    }
+}
+
+void Transfer::abandon() {
+    if (listener && request->isChunked()) {
+        request->getWriter()->setWakeUp({});
+    }
+    watchdog.stop();
+    listener.reset();
+    easy.reset();
+}
+
+// Writes may come faster than the network thread wakes up: one command serves them all.
+void Transfer::wake() {
+    if (!wakeUpPosted.exchange(true)) {
+        const boost::shared_ptr<Transfer> self = shared_from_this();
+        transport->post([self] { self->resume(); });
+    }
+}
+
+void Transfer::resume() {
+    wakeUpPosted = false;
+    if (easy && paused) {
+        paused = false;
+        watchdog.progress();
+        curl_easy_pause(easy.get(), CURLPAUSE_CONT);
+    }
+}
+
+std::size_t Transfer::readBody(char* data, std::size_t size) {
+    std::size_t count = 0;
+    if (!headDelivered && hasPeerClosed()) {
+        return CURL_READFUNC_ABORT;
+    }
+    // Once the answer is there, nobody waits for the rest: an early end keeps the connection.
+    const bool cutShort = headDelivered && request->isChunked();
+    switch (cutShort ? RequestBody::State::END : body.read(data, size, count)) {
+        case RequestBody::State::NOTHING_YET:
+            paused = true;
+            watchdog.pause();
+            return CURL_READFUNC_PAUSE;
+        case RequestBody::State::BYTES:
+        case RequestBody::State::END:
+            break;
+    }
+    watchdog.progress();
+    return count;
+}
+
+// While we have nothing to send, the peer owes us nothing, whatever it says.
+void Transfer::noteProgress() {
+    if (!paused) {
+        watchdog.progress();
+    }
+}
+
+// libcurl goes on sending to a peer that has closed its side, but no answer can come any more.
+bool Transfer::hasPeerClosed() const {
+    curl_socket_t socket = CURL_SOCKET_BAD;
+    curl_easy_getinfo(easy.get(), CURLINFO_ACTIVESOCKET, &socket);
+    char next = 0;
+    return socket != CURL_SOCKET_BAD &&
+           ::recv(socket, &next, sizeof(next), MSG_PEEK | MSG_DONTWAIT) == 0;
+}
+
+void Transfer::handleHeadEnd() {
+    const long status = getStatus();
+    const bool interim = status < 200;
+    const bool redirected = status >= 300 && status < 400 && request->getMethod() != "POST" &&
+                            request->getFollowRedirects() && head.has("Location");
+    if (headDelivered || interim || redirected) {
+        return;
+    }
+    headDelivered = true;
+    if (paused) {
+        wake();
+    }
+    listener->onTransferHead(head.makeResponse(static_cast<int>(status)));
+}
+
+std::size_t Transfer::onRead(char* data, std::size_t size, std::size_t count, void* self) {
+    return static_cast<Transfer*>(self)->readBody(data, size * count);
+}
+
+int Transfer::onSeek(void* self, curl_off_t offset, int origin) {
+    if (origin != SEEK_SET || offset < 0) {
+        return CURL_SEEKFUNC_CANTSEEK;
+    }
+    static_cast<Transfer*>(self)->body.seek(static_cast<std::size_t>(offset));
+    return CURL_SEEKFUNC_OK;
+}
+
+std::size_t Transfer::onHeader(char* data, std::size_t size, std::size_t count, void* self) {
+    Transfer& transfer = *static_cast<Transfer*>(self);
+    transfer.noteProgress();
+    if (transfer.head.addLine(std::string(data, size * count))) {
+        transfer.handleHeadEnd();
+    }
+    return size * count;
+}
+
+std::size_t Transfer::onWrite(char* data, std::size_t size, std::size_t count, void* self) {
+    Transfer& transfer = *static_cast<Transfer*>(self);
+    transfer.noteProgress();
+    const std::size_t bytes = size * count;
+    const auto* const start = reinterpret_cast<const unsigned char*>(data);
+    if (!transfer.listener->onTransferBytes(start, bytes)) {
+        return CURL_WRITEFUNC_ERROR;
+    }
+    transfer.receivedBytes += static_cast<curl_off_t>(bytes);
+    return bytes;
+}
+
+int Transfer::onProgress(void* self, curl_off_t, curl_off_t downNow, curl_off_t, curl_off_t upNow) {
+    Transfer& transfer = *static_cast<Transfer*>(self);
+    const curl_off_t moved = downNow + upNow;
+    if (moved != transfer.movedBytes) {
+        transfer.movedBytes = moved;
+        transfer.noteProgress();
+    }
+    return 0;
+}
+
+}  // namespace Network

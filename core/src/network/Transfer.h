@@ -1,0 +1,109 @@
+#pragma once
+
+#include <curl/curl.h>
+
+#include <array>
+#include <atomic>
+#include <boost/enable_shared_from_this.hpp>
+#include <boost/shared_ptr.hpp>
+#include <cstddef>
+#include <memory>
+#include <string>
+
+#include "core/network/HttpRequest.h"
+#include "core/network/HttpResponse.h"
+#include "network/RequestBody.h"
+#include "network/ResponseHead.h"
+#include "network/Watchdog.h"
+
+namespace Network {
+
+class Transport;
+
+/** Hears of one transfer. All operations are called on the network thread without any lock. */
+class TransferListener {
+  public:
+    virtual ~TransferListener() = default;
+
+    virtual void onTransferHead(const boost::shared_ptr<HttpResponse>& response) = 0;
+    /** @return false to end the transfer */
+    virtual bool onTransferBytes(const unsigned char* bytes, std::size_t size) = 0;
+    /** The end; `code` as for `NetworkTask::onFinished`. */
+    virtual void onTransferEnd(int code) = 0;
+};
+
+/**
+ * One attempt of a request: a libcurl handle and its callbacks. Lives on the network thread, apart
+ * from the operations that say otherwise.
+ */
+class Transfer : public boost::enable_shared_from_this<Transfer> {
+  public:
+    Transfer(boost::shared_ptr<Transport> transport, boost::shared_ptr<HttpRequest> request,
+             boost::shared_ptr<TransferListener> listener);
+    Transfer(const Transfer&) = delete;
+    Transfer& operator=(const Transfer&) = delete;
+
+    /** Starts to measure the time. Any thread, under the event lock. */
+    void startWatchdog() { watchdog.start(); }
+
+    /** Sets up the handle; null when it cannot be done. */
+    CURL* open(const std::string& certificateFile);
+
+    /** What the listener is to hear of an end with this result, before the handle is freed. */
+    int judge(CURLcode result) const;
+
+    bool hasExpired() const { return watchdog.hasExpired(); }
+
+    /** Frees the handle, which is in no multi handle any more; tells the listener. */
+    void end(int code);
+
+    /** As `end`, silently. */
+    void abandon();
+
+  private:
+    struct EasyDeleter {
+        void operator()(CURL* handle) const { curl_easy_cleanup(handle); }
+    };
+    struct ListDeleter {
+        void operator()(curl_slist* list) const { curl_slist_free_all(list); }
+    };
+
+    void setUpConnection(const std::string& certificateFile);
+    void setUpRequest();
+    void setUpBody();
+    void setUpHeaders();
+    void addHeaderLine(const std::string& line);
+    void wake();
+    void resume();
+    void handleHeadEnd();
+    bool isAnswered() const;
+    long getStatus() const;
+    void noteProgress();
+    bool hasPeerClosed() const;
+
+    std::size_t readBody(char* data, std::size_t size);
+    static std::size_t onRead(char* data, std::size_t size, std::size_t count, void* self);
+    static int onSeek(void* self, curl_off_t offset, int origin);
+    static std::size_t onHeader(char* data, std::size_t size, std::size_t count, void* self);
+    static std::size_t onWrite(char* data, std::size_t size, std::size_t count, void* self);
+    static int onProgress(void* self, curl_off_t downTotal, curl_off_t downNow, curl_off_t upTotal,
+                          curl_off_t upNow);
+
+    const boost::shared_ptr<Transport> transport;
+    const boost::shared_ptr<HttpRequest> request;
+    boost::shared_ptr<TransferListener> listener;
+    Watchdog watchdog;
+    std::atomic<bool> wakeUpPosted{false};
+
+    std::unique_ptr<curl_slist, ListDeleter> headerLines;
+    std::array<char, CURL_ERROR_SIZE> errorText{};
+    std::unique_ptr<CURL, EasyDeleter> easy;
+    RequestBody body;
+    ResponseHead head;
+    bool paused = false;
+    bool headDelivered = false;
+    curl_off_t receivedBytes = 0;
+    curl_off_t movedBytes = 0;
+};
+
+}  // namespace Network

@@ -1,0 +1,85 @@
+#pragma once
+
+#include <curl/curl.h>
+
+#include <atomic>
+#include <boost/enable_shared_from_this.hpp>
+#include <boost/shared_ptr.hpp>
+#include <functional>
+#include <map>
+#include <memory>
+#include <mutex>
+#include <string>
+#include <thread>
+#include <vector>
+
+namespace Network {
+
+class Transfer;
+
+/**
+ * The network thread: runs commands and transfers. It never holds a lock of its own while a
+ * command or a callback runs, so these may take the event lock.
+ */
+class Transport : public boost::enable_shared_from_this<Transport> {
+  public:
+    Transport();
+    ~Transport();
+    Transport(const Transport&) = delete;
+    Transport& operator=(const Transport&) = delete;
+
+    /**
+     * Has a command run on the network thread. Any thread; does not block.
+     * @return false when the transport is closed: the command is not run
+     */
+    bool post(std::function<void()> command);
+
+    /** Has the network thread look whether the peer keeps this transfer waiting. Any thread. */
+    void requestCheck(const boost::shared_ptr<Transfer>& transfer);
+
+    /**
+     * Ends all transfers and the thread, and waits for that. The event lock, where the caller holds
+     * it, is lent to the network thread meanwhile.
+     */
+    void stop();
+
+    /** From the beginning of `stop` on. */
+    bool isStopping() const { return stopping; }
+
+    void setCertificateFile(const std::string& path);
+
+    /** Network thread only. */
+    void start(const boost::shared_ptr<Transfer>& transfer);
+
+    /** Network thread only; a transfer that is over or was never started is accepted. */
+    void abandon(const boost::shared_ptr<Transfer>& transfer);
+
+  private:
+    struct MultiDeleter {
+        void operator()(CURLM* handle) const { curl_multi_cleanup(handle); }
+    };
+    using Transfers = std::map<CURL*, boost::shared_ptr<Transfer>>;
+
+    void launchThread();
+    void run();
+    bool runCommands();
+    void perform();
+    void check(const boost::shared_ptr<Transfer>& transfer);
+    void finish(Transfers::iterator entry, CURLcode result);
+    void finishAll();
+    Transfers::iterator find(const boost::shared_ptr<Transfer>& transfer);
+
+    std::mutex mutex;
+    std::vector<std::function<void()>> commands;
+    bool closed = false;
+    std::string certificateFile;
+    std::thread thread;
+
+    std::atomic<bool> stopping{false};
+
+    // Network thread.
+    std::unique_ptr<CURLM, MultiDeleter> multi;
+    Transfers transfers;
+};
+
+}  // namespace Network
