@@ -41,7 +41,8 @@ void DecisionHistory::push(bool decision) {
 }
 
 bool DecisionHistory::at(std::size_t index) const {
-    const std::size_t position = (oldest + index) % length;
+    const std::size_t behindOldest = length - oldest;
+    const std::size_t position = index < behindOldest ? oldest + index : index - behindOldest;
     return (words[position / WORD_BITS] >> (position % WORD_BITS) & 1) != 0;
 }
 
