@@ -6,7 +6,7 @@
 #include <sstream>
 
 #include "pal/kd.h"
-#include "util/NumberText.h"
+#include "util/impl/NumberText.h"
 
 namespace Talvox {
 

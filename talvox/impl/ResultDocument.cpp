@@ -8,7 +8,7 @@
 #include "core/util/Base64Coder.h"
 #include "core/util/XmlUtils.h"
 #include "pal/kd.h"
-#include "util/NumberText.h"
+#include "util/impl/NumberText.h"
 
 namespace Talvox {
 

@@ -68,8 +68,7 @@ TEST_F(KorvelRecognizerTest, SendsEveryBufferFromTheFirst) {
         ASSERT_TRUE(events->waitForEnds());
         std::string sound;
         for (int16_t played = 0; played < 1100; played = static_cast<int16_t>(played + 100)) {
-            const auto& data = makeConstantBuffer(played)->getData();
-            sound.append(data.begin(), data.end());
+            sound += CloudTest::getConstantBytes(played);
         }
         const auto request = server.getRequest(streaming ? 1 : 0);
         EXPECT_EQ(request.line().find("POST /asrgw_chunked?") == 0, streaming);
@@ -453,8 +452,9 @@ TEST_F(KorvelRecognizerTest, DumpsItsSoundWhereARootIsMounted) {
     ASSERT_EQ(dump.size(), 44U + 11U * 3200U);
     EXPECT_EQ(dump.substr(0, 4), "RIFF");
     for (std::size_t i = 0; i < 11; ++i) {
-        const auto& data = makeConstantBuffer(static_cast<int16_t>(100 * i))->getData();
-        EXPECT_EQ(dump.substr(44 + 3200 * i, 3200), std::string(data.begin(), data.end())) << i;
+        EXPECT_EQ(dump.substr(44 + 3200 * i, 3200),
+                  CloudTest::getConstantBytes(static_cast<int16_t>(100 * i)))
+            << i;
     }
     EXPECT_TRUE(events->waitForEnds());
 }
@@ -499,7 +499,7 @@ TEST_F(KorvelRecognizerTest, SettingsChangedInMidSessionConcernTheNextOne) {
 TEST_F(KorvelRecognizerTest, SurvivesAbsurdSettings) {
     for (const int rate : {0, -1, 1, 7, 44100, 2147483647}) {
         for (const std::string& vad : {std::string(), std::string("engine=wrtc;framems=-5"),
-                                       std::string("framems=0"), std::string("=;==;engine")}) {
+                                       std::string("framems=0"), std::string("=;==;framems=abc")}) {
             configure([rate](Settings& settings) {
                 settings.putInt(Settings::SKS_SAMPLE_RATE, rate);
                 settings.putInt(Settings::SKS_SPEEX_QUALITY, -100);

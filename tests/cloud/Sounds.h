@@ -8,6 +8,7 @@
 #include <boost/shared_ptr.hpp>
 #include <cstddef>
 #include <cstdint>
+#include <string>
 #include <utility>
 #include <vector>
 
@@ -32,6 +33,12 @@ inline BufferPtr makeBuffer(Bytes bytes, int sampleRate = SAMPLE_RATE) {
 inline BufferPtr makeConstantBuffer(int16_t value) {
     return makeBuffer(TestSupport::toBytes(TestSupport::Samples(SAMPLES_PER_BUFFER, value), 0,
                                            SAMPLES_PER_BUFFER));
+}
+
+/** The bytes of such a buffer. */
+inline std::string getConstantBytes(int16_t value) {
+    const BufferPtr buffer = makeConstantBuffer(value);
+    return {buffer->getData().begin(), buffer->getData().end()};
 }
 
 }  // namespace CloudTest
