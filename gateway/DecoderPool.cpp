@@ -51,6 +51,11 @@ bool DecoderPool::isClosed() const {
     return closed;
 }
 
+std::size_t DecoderPool::getWaiting() const {
+    const std::lock_guard<std::mutex> lock(mutex);
+    return waiting.size();
+}
+
 DecoderPool::Lease DecoderPool::take(std::unique_lock<std::mutex>& lock) {
     if (!idle.empty()) {
         std::unique_ptr<SpeechDecoder> decoder = std::move(idle.back());

@@ -42,6 +42,9 @@ class DecoderPool {
 
     bool isClosed() const;
 
+    /** Threads that wait for a recogniser at the moment. */
+    std::size_t getWaiting() const;
+
   private:
     bool isAvailable() const { return !idle.empty() || created < limit; }
     Lease take(std::unique_lock<std::mutex>& lock);

@@ -166,7 +166,8 @@ std::string RecognitionRequest::beginSound(const MultipartPart& part) {
         return reason;
     }
     soundDecoder = std::make_unique<SoundDecoder>(format, SpeechModel::RATE_HZ);
-    if (pool.getModel().speaks(fields.get("lang"))) {
+    // Who sends transcripts with the sound wants it logged, not recognised.
+    if (pool.getModel().speaks(fields.get("lang")) && !fields.has("transcripts")) {
         utterance = std::make_unique<Utterance>(pool);
     }
     return std::string();
@@ -198,8 +199,8 @@ std::string RecognitionRequest::findIncompleteness() const {
 
 Answer RecognitionRequest::recognise() {
     Answer answer;
-    if (fields.has("canceled")) {
-        answer.body = "canceled\n";
+    if (fields.has("canceled") || fields.has("transcripts")) {
+        answer.body = fields.has("canceled") ? "canceled\n" : "logged\n";
         return answer;
     }
     if (utterance) {

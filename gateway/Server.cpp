@@ -85,22 +85,16 @@ std::string Server::start() {
     addrinfo hints{};
     hints.ai_flags = AI_PASSIVE | AI_NUMERICSERV;
     hints.ai_socktype = SOCK_STREAM;
-    AddressList address;
+    AddressList addresses;
     const int failure = getaddrinfo(options.host.c_str(), std::to_string(options.port).c_str(),
-                                    &hints, &address.first);
+                                    &hints, &addresses.first);
     if (failure != 0) {
         return "the address " + options.host + " is not known: " + gai_strerror(failure);
     }
-    isIpv6 = address.first->ai_family == AF_INET6;
-    const unsigned flags = MHD_USE_THREAD_PER_CONNECTION | MHD_USE_INTERNAL_POLLING_THREAD |
-                           MHD_USE_POLL | MHD_USE_ERROR_LOG |
-                           (isIpv6 ? static_cast<unsigned>(MHD_USE_IPv6) : 0u);
-    daemon = MHD_start_daemon(
-        flags, options.port, nullptr, nullptr, &onRequest, this, MHD_OPTION_EXTERNAL_LOGGER,
-        &onLibraryMessage, this, MHD_OPTION_SOCK_ADDR, address.first->ai_addr,
-        MHD_OPTION_CONNECTION_MEMORY_LIMIT, CONNECTION_MEMORY_BYTES, MHD_OPTION_CONNECTION_LIMIT,
-        MAX_CONNECTIONS, MHD_OPTION_CONNECTION_TIMEOUT, options.idleSeconds,
-        MHD_OPTION_NOTIFY_COMPLETED, &onCompleted, nullptr, MHD_OPTION_END);
+    for (const addrinfo* it = addresses.first; it != nullptr && daemon == nullptr;
+         it = it->ai_next) {
+        listen(*it);
+    }
     if (daemon == nullptr) {
         return "cannot listen on " + options.host + " port " + std::to_string(options.port) + ": " +
                std::strerror(errno);
@@ -108,6 +102,20 @@ std::string Server::start() {
     const MHD_DaemonInfo* info = MHD_get_daemon_info(daemon, MHD_DAEMON_INFO_BIND_PORT);
     port = info == nullptr ? options.port : info->port;
     return std::string();
+}
+
+void Server::listen(const addrinfo& address) {
+    unsigned flags = MHD_USE_THREAD_PER_CONNECTION | MHD_USE_INTERNAL_POLLING_THREAD |
+                     MHD_USE_POLL | MHD_USE_ERROR_LOG;
+    if (address.ai_family == AF_INET6) {
+        flags |= MHD_USE_IPv6;
+    }
+    daemon = MHD_start_daemon(
+        flags, options.port, nullptr, nullptr, &onRequest, this, MHD_OPTION_EXTERNAL_LOGGER,
+        &onLibraryMessage, this, MHD_OPTION_SOCK_ADDR, address.ai_addr,
+        MHD_OPTION_CONNECTION_MEMORY_LIMIT, CONNECTION_MEMORY_BYTES, MHD_OPTION_CONNECTION_LIMIT,
+        MAX_CONNECTIONS, MHD_OPTION_CONNECTION_TIMEOUT, options.idleSeconds,
+        MHD_OPTION_NOTIFY_COMPLETED, &onCompleted, nullptr, MHD_OPTION_END);
 }
 
 void Server::stop() {
@@ -119,8 +127,16 @@ void Server::stop() {
 }
 
 std::string Server::getUrl() const {
-    return "http://" + (isIpv6 ? "[" + options.host + "]" : options.host) + ":" +
-           std::to_string(port);
+    std::string host = options.host;
+    if (host == "0.0.0.0") {
+        host = "127.0.0.1";
+    } else if (host == "::") {
+        host = "::1";
+    }
+    if (host.find(':') != std::string::npos) {
+        host = "[" + host + "]";
+    }
+    return "http://" + host + ":" + std::to_string(port);
 }
 
 }  // namespace Gateway

@@ -2,13 +2,13 @@
 
 #include <cstddef>
 #include <cstdint>
-#include <memory>
 #include <string>
 
 #include "gateway/DecoderPool.h"
 #include "gateway/SpeechModel.h"
 
 struct MHD_Daemon;
+struct addrinfo;
 
 namespace Gateway {
 
@@ -41,7 +41,8 @@ class Server {
     Server(const Server&) = delete;
     Server& operator=(const Server&) = delete;
 
-    /** Loads the model and begins to listen. @return an empty text, or why that is impossible */
+    /** Loads the model and begins to listen, once. @return an empty text, or why that is impossible
+     */
     std::string start();
 
     /** Ends all connections and waits for their threads; does nothing when stopped. */
@@ -57,11 +58,12 @@ class Server {
     DecoderPool& getPool() { return pool; }
 
   private:
+    void listen(const addrinfo& address);
+
     const ServerOptions options;
     DecoderPool pool;
     MHD_Daemon* daemon = nullptr;
     uint16_t port = 0;
-    bool isIpv6 = false;
 };
 
 }  // namespace Gateway

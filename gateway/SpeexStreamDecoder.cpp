@@ -30,6 +30,18 @@ struct HeaderOwner {
     SpeexHeader* header;
 };
 
+/** Samples by which an encoder of that mode delays the sound. */
+std::size_t encoderDelay(int mode) {
+    void* encoder = speex_encoder_init(speex_lib_get_mode(mode));
+    if (encoder == nullptr) {
+        return 0;
+    }
+    spx_int32_t delay = 0;
+    speex_encoder_ctl(encoder, SPEEX_GET_LOOKAHEAD, &delay);
+    speex_encoder_destroy(encoder);
+    return static_cast<std::size_t>(delay);
+}
+
 }  // namespace
 
 SpeexStreamDecoder::SpeexStreamDecoder() {
@@ -142,7 +154,7 @@ std::string SpeexStreamDecoder::readHead(const ogg_packet& packet) {
     speex_decoder_ctl(decoder, SPEEX_GET_FRAME_SIZE, &value);
     frameSize = static_cast<std::size_t>(value);
     speex_decoder_ctl(decoder, SPEEX_GET_LOOKAHEAD, &value);
-    skip = static_cast<std::size_t>(value);
+    skip = static_cast<std::size_t>(value) + encoderDelay(header->mode);
     value = 1;
     speex_decoder_ctl(decoder, SPEEX_SET_ENH, &value);
     rateHz = static_cast<unsigned>(header->rate);

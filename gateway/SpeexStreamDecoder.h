@@ -15,8 +15,8 @@ namespace Gateway {
  *
  * Damage after the stream's head costs the packets that it hit and no more: bytes that are not a
  * page are skipped, a page with a wrong check sum is dropped, a packet that does not decode ends
- * with its last good frame. The encoder's look-ahead is taken off at the beginning and the padding
- * at the end, so that the samples are as many as were encoded.
+ * with its last good frame. The delay of encoder and decoder is taken off at the beginning and the
+ * padding at the end, as the stream's last page tells.
  */
 class SpeexStreamDecoder {
   public:

@@ -1,0 +1,133 @@
+#include "gateway/SoundDecoder.h"
+
+#include <gtest/gtest.h>
+
+#include <cmath>
+
+#include "gateway/RecordedSpeech.h"
+
+namespace {
+
+using Gateway::AudioFormat;
+using Gateway::Resampler;
+using Gateway::SoundDecoder;
+using Samples = std::vector<int16_t>;
+
+Samples sine(double hertz, unsigned rateHz, std::size_t count) {
+    Samples samples(count);
+    for (std::size_t i = 0; i < count; ++i) {
+        samples[i] = static_cast<int16_t>(
+            10000 * std::sin(2 * 3.14159265358979 * hertz * static_cast<double>(i) / rateHz));
+    }
+    return samples;
+}
+
+Samples resample(const Samples& input, unsigned from, unsigned to, std::size_t piece) {
+    Resampler resampler(from, to);
+    Samples output;
+    for (std::size_t i = 0; i < input.size(); i += piece) {
+        resampler.write(&input[i], std::min(piece, input.size() - i), output);
+    }
+    resampler.finish(output);
+    return output;
+}
+
+Samples decodePcm(const std::string& bytes, unsigned rateHz, std::size_t piece,
+                  std::string* remark = nullptr) {
+    AudioFormat format;
+    format.rateHz = rateHz;
+    SoundDecoder decoder(format, 16000);
+    Samples output;
+    for (std::size_t i = 0; i < bytes.size(); i += piece) {
+        EXPECT_EQ("", decoder.write(bytes.data() + i, std::min(piece, bytes.size() - i), output));
+    }
+    EXPECT_EQ("", decoder.finish(output));
+    if (remark != nullptr) {
+        *remark = decoder.getRemark();
+    }
+    return output;
+}
+
+}  // namespace
+
+TEST(Resampler, LeavesSoundOfTheRightRateAlone) {
+    const Samples input = sine(440, 16000, 3000);
+    EXPECT_EQ(input, resample(input, 16000, 16000, 700));
+}
+
+TEST(Resampler, KeepsLengthPitchAndPlace) {
+    for (const unsigned rate : {8000U, 11025U, 22050U, 44100U, 48000U}) {
+        const Samples output = resample(sine(440, rate, rate), rate, 16000, 1000);
+        ASSERT_NEAR(16000.0, static_cast<double>(output.size()), 1.0) << rate;
+        const Samples expected = sine(440, 16000, 16000);
+        for (std::size_t i = 200; i + 200 < output.size(); ++i) {
+            ASSERT_NEAR(expected[i], output[i], 150) << rate << " Hz, sample " << i;
+        }
+    }
+}
+
+TEST(Resampler, DoesNotFoldHighPitchesDown) {
+    const Samples output = resample(sine(12000, 44100, 44100), 44100, 16000, 1000);
+    for (std::size_t i = 200; i + 200 < output.size(); ++i) {
+        ASSERT_NEAR(0, output[i], 100);
+    }
+}
+
+TEST(Resampler, GivesTheSameFromPiecesOfAnySize) {
+    const Samples input = GatewayTest::readRecording("goforward.raw");
+    const Samples whole = resample(input, 11025, 16000, input.size());
+    for (const std::size_t piece : {1U, 7U, 160U, 1025U}) {
+        EXPECT_EQ(whole, resample(input, 11025, 16000, piece)) << piece;
+    }
+}
+
+TEST(Resampler, GivesNothingForNothing) {
+    EXPECT_TRUE(resample({}, 8000, 16000, 1).empty());
+}
+
+TEST(SoundDecoder, ReadsPcmFromPiecesOfAnySize) {
+    const Samples input = GatewayTest::readRecording("goforward.raw");
+    const std::string bytes = GatewayTest::toPcm(input);
+    for (const std::size_t piece : {1U, 3U, 3200U, 1000000U}) {
+        EXPECT_EQ(input, decodePcm(bytes, 16000, piece)) << piece;
+    }
+}
+
+TEST(SoundDecoder, IgnoresHalfASampleAndSaysSo) {
+    std::string remark;
+    EXPECT_EQ((Samples{0x0201}), decodePcm("\x01\x02\x03", 16000, 1, &remark));
+    EXPECT_EQ("half a sample at the end", remark);
+    EXPECT_EQ((Samples{-2}), decodePcm("\xfe\xff", 16000, 2, &remark));
+    EXPECT_EQ("", remark);
+}
+
+TEST(SoundDecoder, DoublesTheRateOfTelephoneSound) {
+    const Samples output = decodePcm(GatewayTest::toPcm(sine(440, 8000, 8000)), 8000, 333);
+    EXPECT_NEAR(16000.0, static_cast<double>(output.size()), 1.0);
+}
+
+TEST(SoundDecoder, ResamplesSpeexByTheRateOfItsHead) {
+    const std::string stream =
+        GatewayTest::encodeWithSpeexenc(sine(440, 8000, 8000), 8000, "narrowband");
+    AudioFormat format;
+    format.codec = AudioFormat::Codec::SPEEX;
+    SoundDecoder decoder(format, 16000);
+    EXPECT_EQ(0U, decoder.getInputRateHz());
+    Samples output;
+    EXPECT_EQ("", decoder.write(stream.data(), stream.size(), output));
+    EXPECT_EQ("", decoder.finish(output));
+    EXPECT_EQ(8000U, decoder.getInputRateHz());
+    EXPECT_NEAR(16000.0, static_cast<double>(output.size()), 1.0);
+}
+
+TEST(SoundDecoder, MissesTheHeadOfASpeexStreamThatBreaksOff) {
+    AudioFormat format;
+    format.codec = AudioFormat::Codec::SPEEX;
+    Samples output;
+    SoundDecoder decoder(format, 16000);
+    EXPECT_EQ("", decoder.write("OggS", 4, output));
+    EXPECT_EQ("the sound holds no Speex header", decoder.finish(output));
+    SoundDecoder silent(format, 16000);
+    EXPECT_EQ("", silent.finish(output));
+    EXPECT_TRUE(output.empty());
+}
