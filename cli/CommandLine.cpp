@@ -98,18 +98,20 @@ void addRequestOptions(CLI::App& command, SettingsOptions& settings) {
 
 CLI::App* addRecognize(CLI::App& app, RecognizeOptions& options) {
     CLI::App* command = app.add_subcommand("recognize", "Recognise what is said");
-    CLI::Option_group* source = command->add_option_group("Sound", "one of");
-    source
-        ->add_option("--file", options.file,
-                     "Sound file to play, at its own pace; \"-\" reads raw 16-bit "
-                     "little-endian mono sound from standard input, at most a minute")
-        ->type_name("FILE");
-    source->add_flag("--mic", options.microphone, "Record from the default input device");
-    source->require_option(1);
+    CLI::Option* file =
+        command
+            ->add_option("--file", options.file,
+                         "Sound file to play, at its own pace; \"-\" reads raw 16-bit "
+                         "little-endian mono sound from standard input, at most a minute")
+            ->type_name("FILE");
     command
-        ->add_option(
-            "--lead-in", options.leadInMs,
-            "Silence before the file, in milliseconds [" + std::to_string(LEAD_IN_MS_DFLT) + "]")
+        ->add_flag("--mic", options.microphone,
+                   "Record from the default input device instead of playing a file")
+        ->excludes(file);
+    command
+        ->add_option("--lead-in", options.leadInMs,
+                     "Silence before a file that begins with speech at once, in milliseconds [" +
+                         std::to_string(LEAD_IN_MS_DFLT) + "]")
         ->type_name("MS")
         ->check(CLI::Range(0, LEAD_IN_MS_MAX).description(""));
     addRequestOptions(*command, options.settings);
@@ -135,6 +137,13 @@ CLI::App* addRecognize(CLI::App& app, RecognizeOptions& options) {
         "Exit status: 0 results were delivered, 1 the recognition ended in an error,\n"
         "2 wrong usage or unreadable input.");
     return command;
+}
+
+/** What no single option can check for itself. */
+void checkSource(const RecognizeOptions& options) {
+    if (options.file.empty() && !options.microphone) {
+        throw UsageError("recognize needs --file FILE or --mic");
+    }
 }
 
 CLI::App* addVadCommand(CLI::App& app, VadOptions& options) {
@@ -175,19 +184,23 @@ int runTool(int argc, const char* const* argv, Console& console, LogOutput& log)
     arguments.recognize.settings.defaults = recognizeDefaults();
     CLI::App app("Speech recognition from the command line", "talvox");
     app.set_version_flag("--version", versionText());
-    app.require_subcommand(1);
+    app.require_subcommand(0, 1);
     const CLI::App* recognize = addRecognize(app, arguments.recognize);
     const CLI::App* vad = addVadCommand(app, arguments.vad);
-    addSettingsCommand(app, arguments.settings);
+    const CLI::App* settings = addSettingsCommand(app, arguments.settings);
     try {
         app.parse(argc, argv);
         if (recognize->parsed()) {
+            checkSource(arguments.recognize);
             return runRecognize(arguments.recognize, console, log);
         }
         if (vad->parsed()) {
             return runVad(arguments.vad, console, log);
         }
-        return runSettings(arguments.settings, console.out, log);
+        if (settings->parsed()) {
+            return runSettings(arguments.settings, console.out, log);
+        }
+        throw UsageError("no command given (recognize, vad or settings); see talvox --help");
     } catch (const CLI::ParseError& error) {
         if (error.get_exit_code() == 0) {
             return app.exit(error, console.out, console.err);

@@ -9,8 +9,11 @@
 
 namespace Cli {
 
-/** Silence that is played before a file, so that the detector learns a quiet background. */
-const int LEAD_IN_MS_DFLT = 300;
+/**
+ * Silence that is played before a file. A file that begins in the middle of speech needs some, so
+ * that the detector does not learn speech as the background.
+ */
+const int LEAD_IN_MS_DFLT = 0;
 const int LEAD_IN_MS_MAX = 4000;
 
 /** What `talvox recognize` was asked for. */

@@ -58,9 +58,10 @@ TEST(Tool, HelpsWithEveryCommand) {
 }
 
 TEST(Tool, RefusesWrongUsage) {
-    expectRefused({}, "subcommand");
+    expectRefused({}, "no command given (recognize, vad or settings); see talvox --help");
     expectRefused({"sing"}, "sing");
-    expectRefused({"recognize"}, "--file");
+    expectRefused({"recognize"}, "recognize needs --file FILE or --mic");
+    expectRefused({"recognize", "--file", ""}, "recognize needs --file FILE or --mic");
     expectRefused({"recognize", "--mic", "--file", "a.wav"}, "--mic");
     expectRefused({"recognize", "--file"}, "--file");
     expectRefused({"recognize", "--mic", "--loudness", "11"}, "--loudness");
