@@ -9,6 +9,7 @@
 #include "core/util/EventLock.h"
 #include "pal/kd.h"
 #include "talvox/Log.h"
+#include "talvox/impl/IsPresent.h"
 
 namespace Talvox {
 
@@ -75,8 +76,8 @@ void ParallelEncoder::cancel() {
 
 void ParallelEncoder::taskDone() {
     if (request) {
-        if (Sound::Encoder* const source = encoder.operator->()) {
-            writeOutput(*request, source->takeOutput(TAKE_ALL).get(), "");
+        if (isPresent(encoder)) {
+            writeOutput(*request, encoder->takeOutput(TAKE_ALL).get(), "");
         }
     }
     currentTask.reset();
@@ -102,9 +103,9 @@ void ParallelEncoder::startNextTask() {
 
 void ParallelEncoder::finishStream() {
     boost::shared_ptr<Sound::SoundDataBuffer> output;
-    if (Sound::Encoder* const source = encoder.operator->()) {
-        source->finish();
-        output = source->takeOutput(TAKE_ALL);
+    if (isPresent(encoder)) {
+        encoder->finish();
+        output = encoder->takeOutput(TAKE_ALL);
     }
     if (request) {
         writeOutput(*request, output.get(), "the last ");
@@ -120,11 +121,11 @@ void ParallelEncoder::callBack(const boost::shared_ptr<Sound::SoundDataBuffer>& 
         return;
     }
     int size = 0;
-    if (Sound::SoundDataBuffer* const stream = output.operator->()) {
+    if (isPresent(output)) {
         if (!wroteAny) {
-            stream->getData().clear();
+            output->getData().clear();
         }
-        size = static_cast<int>(stream->getData().size());
+        size = static_cast<int>(output->getData().size());
     }
     tvLogFormatMessage(LOG_LEVEL, "ParallelEncoder calls back with %d bytes", size);
     const Callback target = callback;

@@ -2,6 +2,7 @@
 
 #include <utility>
 
+#include "talvox/impl/IsPresent.h"
 #include "talvox/impl/ParallelEncoder.h"
 
 namespace Talvox {
@@ -12,10 +13,8 @@ ParallelEncoderTask::ParallelEncoderTask(ParallelEncoder* owner,
     : parent(owner), encoder(std::move(target)), buffer(std::move(sound)) {}
 
 void ParallelEncoderTask::runTask() {
-    Sound::Encoder* const target = encoder.operator->();
-    const Sound::SoundDataBuffer* const source = buffer.operator->();
-    if (target != nullptr && source != nullptr) {
-        target->encode(*source);
+    if (isPresent(encoder) && isPresent(buffer)) {
+        encoder->encode(*buffer);
     }
 }
 

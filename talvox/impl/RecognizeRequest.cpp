@@ -5,6 +5,7 @@
 
 #include "pal/kd.h"
 #include "talvox/Log.h"
+#include "talvox/impl/IsPresent.h"
 #include "talvox/impl/RequestFormat.h"
 #include "talvox/impl/ResultDocument.h"
 
@@ -136,8 +137,8 @@ void RecognizeRequest::writeBodyStart() {
 
 void RecognizeRequest::write(const void* data, unsigned size) {
     const boost::shared_ptr<Network::NetworkTaskWriter> current = writer;
-    if (Network::NetworkTaskWriter* const target = current.operator->()) {
-        target->write(data, size);
+    if (isPresent(current)) {
+        current->write(data, size);
     }
 }
 
@@ -152,8 +153,8 @@ void RecognizeRequest::close(bool finished) {
         writeText(makeField("canceled", "true"));
     }
     writeText(multipart->endEncodedContent());
-    if (Network::NetworkTaskWriter* const target = writer.operator->()) {
-        target->close();
+    if (isPresent(writer)) {
+        writer->close();
     }
 }
 
