@@ -131,7 +131,8 @@ class TALVOX_API Bundle {
     /**
      * The same for a text. After a syntax error, which is logged, what came before it is still
      * applied; a text that is not safe to parse at all (not UTF-8, too large, nested too deeply;
-     * see `Util::XmlUtils::findHazard`) is logged and changes nothing.
+     * see `Util::XmlUtils::findHazard`) is logged and changes nothing. Takes the event lock while
+     * it parses.
      */
     void updateFromXml(const std::string& xml, const std::string& path, const ElemSpec* spec);
 

@@ -2,6 +2,7 @@
 #include <sstream>
 #include <vector>
 
+#include "core/util/EventLock.h"
 #include "core/util/XmlUtils.h"
 #include "pal/kd_log.h"
 #include "tinyxml.h"
@@ -134,7 +135,12 @@ void Bundle::updateFromXml(const std::string& xml, const std::string& path, cons
         return;
     }
     TiXmlDocument document;
-    document.Parse(xml.c_str(), nullptr, TIXML_ENCODING_UTF8);
+    {
+        // The parser's treatment of white space is one setting for the process, which the engine's
+        // other user of the parser changes for a moment, under this lock.
+        const EventLock lock;
+        document.Parse(xml.c_str(), nullptr, TIXML_ENCODING_UTF8);
+    }
     if (document.Error()) {
         kdLogFormatMessage("Bundle::updateFromXml parse error: %s", document.ErrorDesc());
     }
