@@ -4,18 +4,15 @@
 #include <unistd.h>
 
 #include <algorithm>
-#include <atomic>
 #include <boost/make_shared.hpp>
 #include <boost/weak_ptr.hpp>
 #include <chrono>
 #include <climits>
 #include <condition_variable>
 #include <cstdint>
-#include <cstdlib>
 #include <functional>
 #include <mutex>
 #include <string>
-#include <thread>
 #include <vector>
 
 #include "core/sound/Recorder.h"
@@ -31,7 +28,6 @@ namespace {
 
 using Sound::Recorder;
 using Sound::SoundDataBuffer;
-using std::chrono::milliseconds;
 using std::chrono::steady_clock;
 using TestSupport::Samples;
 using Util::EventLock;
@@ -423,13 +419,14 @@ TEST_F(PulseRecorderWithServer, ReportsAKilledStreamWithinASecond) {
     ASSERT_TRUE(init());
     start();
     ASSERT_TRUE(listener->waitForBuffers(1));
-    const auto killed = steady_clock::now();
-    // The source goes, and with it all streams that cannot be moved.
+    // With the last source the stream goes, because it cannot be moved to another one.
     server.control({"unload-module", "module-remap-source"});
     server.control({"unload-module", "module-null-sink"});
+    const auto killed = steady_clock::now();
     ASSERT_TRUE(listener->waitForError());
-    EXPECT_LT(listener->getErrorTime() - killed, std::chrono::seconds(2));
+    EXPECT_LT(listener->getErrorTime() - killed, std::chrono::seconds(1));
     EXPECT_EQ(listener->getErrorCount(), 1);
+    EXPECT_TRUE(log.containsPart("PulseRecorder: the recording stream ended: "));
 }
 
 TEST_F(PulseRecorderWithServer, ReportsAServerThatFallsSilentWithinASecond) {
@@ -452,14 +449,12 @@ TEST_F(PulseRecorderWithServer, ReportsSoundThatIsNotTakenInTime) {
     make();
     recorder->setBufferLength(1);
     ASSERT_TRUE(init());
-    start();
-    ASSERT_TRUE(listener->waitForBuffers(1));
     listener->onData = [this](Recorder*) {
-        // The event thread is busy until the sound of 64 buffers and more has come.
-        server.control({"info"});
-        const Samples sound(16000 / 5, 1);
-        server.play(sound);
+        // The event thread is busy once, while the sound of more than 64 buffers comes.
+        listener->onData = nullptr;
+        server.play(Samples(16000 / 5, 1));
     };
+    start();
     ASSERT_TRUE(listener->waitForError());
     EXPECT_TRUE(log.contains("PulseRecorder: recorded sound was not taken in time"));
     EXPECT_FALSE(isRecording());
@@ -530,10 +525,8 @@ TEST_F(PulseRecorderWithServer, MicrophoneThatDeliversOnlyZerosIsLoggedOnce) {
     recorder->setBufferLength(50);
     ASSERT_TRUE(init());
     start();
-    ASSERT_TRUE(listener->waitForBuffers(20));
     const std::string line =
         "PulseRecorder: the microphone delivers only zeros; is the microphone muted?";
-    EXPECT_FALSE(log.contains(line) && listener->getBufferCount() == 20);
     ASSERT_TRUE(listener->waitForBuffers(25));
     EXPECT_EQ(log.count(line), 1U);
     EXPECT_EQ(listener->getErrorCount(), 0);
