@@ -155,7 +155,8 @@ std::string SpeexStreamDecoder::readHead(const ogg_packet& packet) {
     frameSize = static_cast<std::size_t>(value);
     speex_decoder_ctl(decoder, SPEEX_GET_LOOKAHEAD, &value);
     skip = static_cast<std::size_t>(value) + encoderDelay(header->mode);
-    value = 1;
+    // The enhancement pleases ears and makes the sound less like what was recorded.
+    value = 0;
     speex_decoder_ctl(decoder, SPEEX_SET_ENH, &value);
     rateHz = static_cast<unsigned>(header->rate);
     framesPerPacket = std::max(1, static_cast<int>(header->frames_per_packet));

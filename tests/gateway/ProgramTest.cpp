@@ -1,0 +1,69 @@
+#include <gtest/gtest.h>
+
+#include <csignal>
+#include <string>
+
+#include "gateway/Bodies.h"
+#include "gateway/HttpClient.h"
+#include "support/ChildProcess.h"
+
+namespace {
+
+using TestSupport::ChildProcess;
+
+/** Reads until a line begins with `start`. @return the line, empty when the program ended before */
+std::string readLine(ChildProcess& program, const std::string& start) {
+    std::string output;
+    for (std::string piece = program.read(); !piece.empty(); piece = program.read()) {
+        output += piece;
+        const std::size_t begin = output.find(start);
+        const std::size_t end = begin == std::string::npos ? begin : output.find('\n', begin);
+        if (end != std::string::npos) {
+            return output.substr(begin, end - begin);
+        }
+    }
+    return std::string();
+}
+
+}  // namespace
+
+TEST(GatewayProgram, ServesFromItsReadyLineToTheSignal) {
+    for (const int signal : {SIGINT, SIGTERM}) {
+        ChildProcess program({GATEWAY_BINARY, "--port", "0"});
+        const std::string start = "talvox-gateway listening on http://127.0.0.1:";
+        const std::string line = readLine(program, start);
+        ASSERT_EQ(0U, line.find(start)) << line;
+        const int port = std::stoi(line.substr(start.size()));
+        GatewayTest::HttpClient client(static_cast<uint16_t>(port));
+        const std::string body =
+            GatewayTest::parts(GatewayTest::usualFields()) + GatewayTest::closing();
+        client.send(GatewayTest::requestHead("/asrgw?uuid=u1", static_cast<long>(body.size())) +
+                    body);
+        EXPECT_EQ(200, client.read().status);
+        program.sendSignal(signal);
+        EXPECT_EQ(0, program.wait());
+    }
+}
+
+TEST(GatewayProgram, ExplainsItself) {
+    const ChildProcess::Result help = ChildProcess::run({GATEWAY_BINARY, "--help"});
+    EXPECT_EQ(0, help.exitStatus);
+    for (const char* text : {"loopback", "--host", "--port", "--model-dir", "--lm", "--dict",
+                             "--max-body", "16777216", "--decoders", "--verbose"}) {
+        EXPECT_NE(std::string::npos, help.output.find(text)) << text;
+    }
+    const ChildProcess::Result version = ChildProcess::run({GATEWAY_BINARY, "--version"});
+    EXPECT_EQ(0, version.exitStatus);
+    EXPECT_EQ(0U, version.output.find("talvox-gateway 133 ("));
+}
+
+TEST(GatewayProgram, RefusesWrongUsage) {
+    EXPECT_EQ(2, ChildProcess::run({GATEWAY_BINARY, "--nonsense"}).exitStatus);
+    EXPECT_EQ(2, ChildProcess::run({GATEWAY_BINARY, "--port", "70000"}).exitStatus);
+    EXPECT_EQ(2, ChildProcess::run({GATEWAY_BINARY, "--decoders", "0"}).exitStatus);
+    const ChildProcess::Result result =
+        ChildProcess::run({GATEWAY_BINARY, "--port", "0", "--lm", "/nowhere"});
+    EXPECT_EQ(1, result.exitStatus);
+    EXPECT_NE(std::string::npos,
+              result.output.find("talvox-gateway: cannot read the model's file /nowhere"));
+}
