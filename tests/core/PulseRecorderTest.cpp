@@ -10,6 +10,7 @@
 #include <climits>
 #include <condition_variable>
 #include <cstdint>
+#include <cstdlib>
 #include <functional>
 #include <mutex>
 #include <string>
@@ -323,6 +324,19 @@ TEST_F(PulseRecorderWithMuteServer, StopsAndGoesWithoutWaiting) {
     EXPECT_LT(steady_clock::now() - begin, std::chrono::seconds(1));
     kdAdvanceClockKOR(60 * NS_PER_SECOND);
     EXPECT_EQ(listener->getErrorCount(), 0);
+}
+
+TEST_F(PulseRecorderWithMuteServer, ProcessMayEndWhileItRecords) {
+    GTEST_FLAG_SET(death_test_style, "threadsafe");
+    EXPECT_EXIT(
+        {
+            make();
+            init();
+            start();
+            static const boost::shared_ptr<Recorder> kept = recorder;
+            std::exit(isRecording() ? 0 : 1);
+        },
+        ::testing::ExitedWithCode(0), "");
 }
 
 // With a real server.
