@@ -195,5 +195,10 @@ KDint kdDrainEventsKOR(void) {
     if (kdHoldsEventLockKOR() != 0) {
         return -1;
     }
-    return korvel_pal::EventLoop::instance().drain() ? 0 : -1;
+    if (!korvel_pal::EventLoop::instance().drain()) {
+        return -1;
+    }
+    // A timer's callback or a completion may be under way.
+    const korvel_pal::EventLockGuard lock;
+    return 0;
 }

@@ -40,7 +40,9 @@ class HandleTable {
     static std::uintptr_t toNumber(const Handle* handle) {
         return reinterpret_cast<std::uintptr_t>(handle);
     }
-    static Handle* toHandle(std::uintptr_t number) { return reinterpret_cast<Handle*>(number); }
+    static Handle* toHandle(std::uintptr_t number) {
+        return reinterpret_cast<Handle*>(number);  // NOLINT(performance-no-int-to-ptr)
+    }
 
     std::unordered_map<std::uintptr_t, Value> values;
     std::uintptr_t lastNumber = 0;

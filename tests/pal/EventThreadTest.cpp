@@ -112,6 +112,22 @@ TEST(Drain, IsRefusedWithTheLockHeld) {
     EXPECT_EQ(result.get_future().get(), -1);
 }
 
+TEST(Drain, WaitsForACallbackThatIsUnderWay) {
+    std::promise<void> begun;
+    std::promise<void> draining;
+    bool returned = false;
+    PalTest::Ticker ticker([&](const KDEvent&) {
+        begun.set_value();
+        draining.get_future().get();
+        returned = true;
+    });
+    ticker.start(1);
+    begun.get_future().get();
+    draining.set_value();
+    EXPECT_EQ(kdDrainEventsKOR(), 0);
+    EXPECT_TRUE(returned);
+}
+
 TEST(EventLock, IsRecursiveAndKnowsItsHolder) {
     EXPECT_EQ(kdHoldsEventLockKOR(), 0);
     kdEventLockKOR();

@@ -82,8 +82,9 @@ KD_API KDint kdHoldsEventLockKOR(void);
 KD_API void kdPostKOR(void (*func)(void* user), void* user);
 
 /**
- * Returns once everything that was posted before the call has run. Must not be called with the
- * event lock held, hence not from a callback.
+ * Returns once everything that was posted before the call has run, and any callback that ran at the
+ * time of the call has returned. Does not wait for timers or for background work. Must not be
+ * called with the event lock held, hence not from a callback.
  * @return 0, or -1 at once when the lock is held or the event thread has been stopped.
  */
 KD_API KDint kdDrainEventsKOR(void);
