@@ -134,6 +134,13 @@ std::optional<std::string> ScriptedHttpServer::Request::header(const std::string
     return std::nullopt;
 }
 
+template <typename Change>
+void ScriptedHttpServer::changeRequest(std::size_t index, Change change) {
+    const std::lock_guard<std::mutex> lock(mutex);
+    change(requests[index]);
+    changed.notify_all();
+}
+
 /** One connection: cuts the stream into requests and plays the answers. Its own thread only. */
 class ScriptedHttpServer::Connection {
   public:
@@ -153,8 +160,7 @@ class ScriptedHttpServer::Connection {
         }
         Request request;
         request.head = head;
-        body.clear();
-        chunkSizes.clear();
+        bodySize = 0;
         acted = false;
         open = true;
         requestIndex = server.addRequest(index, head, answer);
@@ -169,7 +175,8 @@ class ScriptedHttpServer::Connection {
                                    ? readChunks()
                                    : readBody(std::strtoul(length.c_str(), nullptr, 10));
             if (open && whole) {
-                server.updateRequest(requestIndex, body, chunkSizes, true);
+                server.changeRequest(requestIndex,
+                                     [](Request& record) { record.complete = true; });
                 actIfDue(true);
             }
             open = open && whole;
@@ -184,7 +191,8 @@ class ScriptedHttpServer::Connection {
             if (size == 0) {
                 return readUntil("\r\n", line);
             }
-            chunkSizes.push_back(size);
+            server.changeRequest(requestIndex,
+                                 [size](Request& record) { record.chunkSizes.push_back(size); });
             if (!readBody(size) || !readUntil("\r\n", line)) {
                 return false;
             }
@@ -198,10 +206,12 @@ class ScriptedHttpServer::Connection {
                 return false;
             }
             const std::size_t part = std::min(size, buffer.size());
-            body.append(buffer, 0, part);
+            server.changeRequest(requestIndex, [this, part](Request& record) {
+                record.body.append(buffer, 0, part);
+            });
+            bodySize += part;
             buffer.erase(0, part);
             size -= part;
-            server.updateRequest(requestIndex, body, chunkSizes, false);
             actIfDue(false);
         }
         return open;
@@ -231,7 +241,7 @@ class ScriptedHttpServer::Connection {
 
     void actIfDue(bool complete) {
         const bool due =
-            complete || (answer.actAfter != Answer::WHOLE_BODY && body.size() >= answer.actAfter);
+            complete || (answer.actAfter != Answer::WHOLE_BODY && bodySize >= answer.actAfter);
         if (acted || !due) {
             return;
         }
@@ -265,8 +275,8 @@ class ScriptedHttpServer::Connection {
             open = false;
         } else if (answer.end == Answer::End::CLOSE) {
             ::shutdown(socket, SHUT_WR);
-            // Unread bytes would turn the close into a reset.
-            while (receive()) {
+            // Unread bytes would turn the close into a reset, which may overtake the answer.
+            while (!answer.pieces.empty() && receive()) {
                 buffer.clear();
             }
             open = false;
@@ -279,8 +289,7 @@ class ScriptedHttpServer::Connection {
     std::string buffer;
     Answer answer;
     std::size_t requestIndex = 0;
-    std::string body;
-    std::vector<std::size_t> chunkSizes;
+    std::size_t bodySize = 0;
     bool acted = false;
     bool open = true;
 };
@@ -416,15 +425,6 @@ std::size_t ScriptedHttpServer::addRequest(std::size_t connection, const std::st
     requests.push_back(request);
     changed.notify_all();
     return requests.size() - 1;
-}
-
-void ScriptedHttpServer::updateRequest(std::size_t index, const std::string& body,
-                                       const std::vector<std::size_t>& chunkSizes, bool complete) {
-    const std::lock_guard<std::mutex> lock(mutex);
-    requests[index].body = body;
-    requests[index].chunkSizes = chunkSizes;
-    requests[index].complete = complete;
-    changed.notify_all();
 }
 
 bool ScriptedHttpServer::waitForRelease() {

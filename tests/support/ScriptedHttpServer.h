@@ -135,8 +135,8 @@ class ScriptedHttpServer {
     void acceptLoop();
     void serve(std::size_t index, int socket);
     std::size_t addRequest(std::size_t connection, const std::string& head, Answer& answer);
-    void updateRequest(std::size_t index, const std::string& body,
-                       const std::vector<std::size_t>& chunkSizes, bool complete);
+    template <typename Change>
+    void changeRequest(std::size_t index, Change change);
     bool waitForRelease();
     template <typename Condition>
     bool waitUntil(std::chrono::milliseconds timeout, Condition condition) const;

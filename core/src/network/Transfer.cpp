@@ -1,7 +1,5 @@
 #include "network/Transfer.h"
 
-#include <sys/socket.h>
-
 #include <boost/weak_ptr.hpp>
 #include <limits>
 #include <utility>
@@ -197,9 +195,6 @@ void Transfer::resume() {
 
 std::size_t Transfer::readBody(char* data, std::size_t size) {
     std::size_t count = 0;
-    if (!headDelivered && hasPeerClosed()) {
-        return CURL_READFUNC_ABORT;
-    }
     // Once the answer is there, nobody waits for the rest: an early end keeps the connection.
     const bool cutShort = headDelivered && request->isChunked();
     switch (cutShort ? RequestBody::State::END : body.read(data, size, count)) {
@@ -220,15 +215,6 @@ void Transfer::noteProgress() {
     if (!paused) {
         watchdog.progress();
     }
-}
-
-// libcurl goes on sending to a peer that has closed its side, but no answer can come any more.
-bool Transfer::hasPeerClosed() const {
-    curl_socket_t socket = CURL_SOCKET_BAD;
-    curl_easy_getinfo(easy.get(), CURLINFO_ACTIVESOCKET, &socket);
-    char next = 0;
-    return socket != CURL_SOCKET_BAD &&
-           ::recv(socket, &next, sizeof(next), MSG_PEEK | MSG_DONTWAIT) == 0;
 }
 
 void Transfer::handleHeadEnd() {

@@ -79,7 +79,6 @@ class Transfer : public boost::enable_shared_from_this<Transfer> {
     bool isAnswered() const;
     long getStatus() const;
     void noteProgress();
-    bool hasPeerClosed() const;
 
     std::size_t readBody(char* data, std::size_t size);
     static std::size_t onRead(char* data, std::size_t size, std::size_t count, void* self);

@@ -24,10 +24,15 @@ class KORVEL_CORE_API XmlUtils {
     static constexpr std::size_t MAX_SIZE_BYTES = std::size_t{1024} * 1024;
     /** Deepest accepted nesting of elements. */
     static constexpr unsigned MAX_DEPTH = 64;
+    /** Most accepted attributes of one element; the parser needs quadratic time for them. */
+    static constexpr unsigned MAX_ATTRIBUTES = 256;
 
     /**
      * Tells what in `xml` must not be handed to the parser: a text beyond `MAX_SIZE_BYTES`, bytes
-     * that are not UTF-8 (an embedded zero byte counts), nesting beyond `MAX_DEPTH`.
+     * that are not UTF-8 (an embedded zero byte counts), nesting beyond `MAX_DEPTH`, more than
+     * `MAX_ATTRIBUTES` attributes, numeric character references that are malformed or name no
+     * character, an unfinished declaration. Other errors are left to the parser, so that what
+     * stands before them can be used.
      * @return an empty text when the parser may have it, else the reason in plain words
      */
     static std::string findHazard(const std::string& xml);

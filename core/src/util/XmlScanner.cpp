@@ -1,0 +1,266 @@
+#include "util/XmlScanner.h"
+
+#include <cstdint>
+
+namespace Util {
+
+namespace {
+
+constexpr std::uint32_t LAST_CODE_POINT = 0x10FFFF;
+
+bool isBlank(char c) {
+    return c == ' ' || (c >= '\t' && c <= '\r');
+}
+
+bool isDigit(char c) {
+    return c >= '0' && c <= '9';
+}
+
+// The parser takes every byte beyond ASCII, and DEL, for a letter.
+bool isNameStart(char c) {
+    const auto byte = static_cast<unsigned char>(c);
+    return (c >= 'A' && c <= 'Z') || (c >= 'a' && c <= 'z') || c == '_' || byte >= 0x7F;
+}
+
+bool isNameCharacter(char c) {
+    return isNameStart(c) || isDigit(c) || c == '-' || c == '.' || c == ':';
+}
+
+int hexValue(char c) {
+    if (isDigit(c)) {
+        return c - '0';
+    }
+    if (c >= 'a' && c <= 'f') {
+        return c - 'a' + 10;
+    }
+    return c >= 'A' && c <= 'F' ? c - 'A' + 10 : -1;
+}
+
+char toLower(char c) {
+    return c >= 'A' && c <= 'Z' ? static_cast<char>(c - 'A' + 'a') : c;
+}
+
+bool isXmlCharacter(std::uint32_t code) {
+    return code == '\t' || code == '\n' || code == '\r' || (code >= 0x20 && code < 0xD800) ||
+           (code >= 0xE000 && code < 0xFFFE) || (code > 0xFFFF && code <= LAST_CODE_POINT);
+}
+
+}  // namespace
+
+XmlScanner::XmlScanner(const std::string& xml, unsigned deepest, unsigned mostAttributes)
+    : text(xml), maxDepth(deepest), maxAttributes(mostAttributes) {}
+
+std::string XmlScanner::findHazard() {
+    Step step = Step::ON;
+    while (step == Step::ON && !atEnd()) {
+        step = current() == '<' ? scanMarkup() : scanText("<");
+    }
+    return hazard;
+}
+
+XmlScanner::Step XmlScanner::scanMarkup() {
+    if (startsWithNoCase("<?xml")) {
+        return scanDeclaration();
+    }
+    if (startsWith("<!--")) {
+        position += 4;
+        return skipBehind("-->");
+    }
+    if (startsWith("<![CDATA[")) {
+        position += 9;
+        return skipBehind("]]>");
+    }
+    if (startsWith("</")) {
+        return scanClosingTag();
+    }
+    if (position + 1 < text.size() && isNameStart(text[position + 1])) {
+        return scanElement();
+    }
+    // Everything else, document types included, is skipped up to the next ">".
+    return skipBehind(">");
+}
+
+XmlScanner::Step XmlScanner::scanElement() {
+    ++position;
+    skipWhiteSpace();
+    if (!skipName()) {
+        return Step::STOP;
+    }
+    if (++depth > maxDepth) {
+        return fail("elements are nested too deeply");
+    }
+    for (unsigned attributes = 0;; ++attributes) {
+        skipWhiteSpace();
+        if (atEnd()) {
+            return Step::STOP;
+        }
+        if (startsWith("/>")) {
+            position += 2;
+            --depth;
+            return Step::ON;
+        }
+        if (current() == '>') {
+            ++position;
+            return Step::ON;
+        }
+        if (attributes >= maxAttributes) {
+            return fail("an element has too many attributes");
+        }
+        if (scanAttribute() == Step::STOP) {
+            return Step::STOP;
+        }
+    }
+}
+
+XmlScanner::Step XmlScanner::scanClosingTag() {
+    depth -= depth > 0 ? 1 : 0;
+    return skipBehind(">");
+}
+
+XmlScanner::Step XmlScanner::scanDeclaration() {
+    position += 5;
+    while (!atEnd()) {
+        if (current() == '>') {
+            ++position;
+            return Step::ON;
+        }
+        skipWhiteSpace();
+        if (startsWithNoCase("version") || startsWithNoCase("encoding") ||
+            startsWithNoCase("standalone")) {
+            if (scanAttribute() == Step::STOP) {
+                return Step::STOP;
+            }
+            continue;
+        }
+        while (!atEnd() && current() != '>' && !isBlank(current())) {
+            ++position;
+        }
+    }
+    // The parser has been seen to fail an assertion of its own on these.
+    return fail("the text ends inside its declaration");
+}
+
+XmlScanner::Step XmlScanner::scanAttribute() {
+    skipWhiteSpace();
+    if (!skipName()) {
+        return Step::STOP;
+    }
+    skipWhiteSpace();
+    if (atEnd() || current() != '=') {
+        return Step::STOP;
+    }
+    ++position;
+    skipWhiteSpace();
+    if (atEnd()) {
+        return Step::STOP;
+    }
+    if (current() == '"' || current() == '\'') {
+        const std::string quote(1, current());
+        ++position;
+        const Step step = scanText(quote);
+        position += atEnd() ? 0 : 1;
+        return atEnd() ? Step::STOP : step;
+    }
+    while (!atEnd() && !isBlank(current()) && current() != '/' && current() != '>') {
+        if (current() == '"' || current() == '\'') {
+            return Step::STOP;
+        }
+        ++position;
+    }
+    return Step::ON;
+}
+
+// The end itself is left alone.
+XmlScanner::Step XmlScanner::scanText(const std::string& end) {
+    while (!atEnd() && !startsWith(end)) {
+        if (!startsWith("&#")) {
+            ++position;
+        } else if (scanReference() == Step::STOP) {
+            return Step::STOP;
+        }
+    }
+    return Step::ON;
+}
+
+// In a malformed reference the parser looks for the next ";", wherever it is, and may take markup
+// on the way for a part of the reference.
+XmlScanner::Step XmlScanner::scanReference() {
+    position += 2;
+    const bool hexadecimal = startsWith("x");
+    position += hexadecimal ? 1 : 0;
+    std::uint32_t code = 0;
+    const std::size_t start = position;
+    for (; !atEnd() && current() != ';'; ++position) {
+        const int digit = hexadecimal || isDigit(current()) ? hexValue(current()) : -1;
+        if (digit < 0) {
+            return fail("a character reference is malformed");
+        }
+        if (code <= LAST_CODE_POINT) {
+            code = code * (hexadecimal ? 16 : 10) + static_cast<std::uint32_t>(digit);
+        }
+    }
+    if (atEnd()) {
+        return Step::STOP;
+    }
+    if (position == start || !isXmlCharacter(code)) {
+        return fail("a character reference names no character");
+    }
+    ++position;
+    return Step::ON;
+}
+
+XmlScanner::Step XmlScanner::skipBehind(const std::string& end) {
+    const std::size_t found = text.find(end, position);
+    if (found == std::string::npos) {
+        return Step::STOP;
+    }
+    position = found + end.size();
+    return Step::ON;
+}
+
+XmlScanner::Step XmlScanner::fail(const std::string& reason) {
+    hazard = reason;
+    return Step::STOP;
+}
+
+bool XmlScanner::startsWith(const std::string& prefix) const {
+    return text.compare(position, prefix.size(), prefix) == 0;
+}
+
+bool XmlScanner::startsWithNoCase(const std::string& lowerPrefix) const {
+    if (text.size() - position < lowerPrefix.size()) {
+        return false;
+    }
+    for (std::size_t i = 0; i < lowerPrefix.size(); ++i) {
+        if (toLower(text[position + i]) != lowerPrefix[i]) {
+            return false;
+        }
+    }
+    return true;
+}
+
+bool XmlScanner::skipName() {
+    if (atEnd() || !isNameStart(current())) {
+        return false;
+    }
+    while (!atEnd() && isNameCharacter(current())) {
+        ++position;
+    }
+    return true;
+}
+
+// The parser's white space: byte order marks and the two non-characters behind them belong to it.
+void XmlScanner::skipWhiteSpace() {
+    while (!atEnd()) {
+        if (startsWith("\xEF\xBB\xBF") || startsWith("\xEF\xBF\xBE") ||
+            startsWith("\xEF\xBF\xBF")) {
+            position += 3;
+        } else if (isBlank(current())) {
+            ++position;
+        } else {
+            return;
+        }
+    }
+}
+
+}  // namespace Util
