@@ -71,26 +71,29 @@ void HumanEvents::clearBar() {
     }
 }
 
+void HumanEvents::printTable(const Talvox::RecognitionResults& hypotheses) {
+    std::size_t columns = TEXT_COLUMN_MIN;
+    for (const Talvox::RecognitionResult& hypothesis : hypotheses) {
+        columns = std::max(columns, characterCount(printable(hypothesis.getText())));
+    }
+    out << "\n  #  " << padded("hypothesis", columns) << "  confidence\n";
+    int number = 0;
+    for (const Talvox::RecognitionResult& hypothesis : hypotheses) {
+        out << fixed(++number, 3, 0) << "  " << padded(printable(hypothesis.getText()), columns)
+            << "  " << confidenceText(hypothesis.getConfidence()) << '\n';
+    }
+    if (hypotheses.empty()) {
+        out << "  -  " << padded("(none)", columns) << "  -\n";
+    }
+}
+
 void HumanEvents::printResults(const SessionEvent& event) {
     const Talvox::Recognition& recognition = *event.recognition;
     printLine(event.ms, recordingDoneMs < 0
                             ? "answer"
                             : "answer, " + std::to_string(event.ms - recordingDoneMs) +
                                   " ms after the end of speech");
-    out << '\n';
-    std::size_t columns = TEXT_COLUMN_MIN;
-    for (const Talvox::RecognitionResult& result : *recognition.getResults()) {
-        columns = std::max(columns, characterCount(printable(result.getText())));
-    }
-    out << "  #  " << padded("hypothesis", columns) << "  confidence\n";
-    int number = 0;
-    for (const Talvox::RecognitionResult& result : *recognition.getResults()) {
-        out << fixed(++number, 3, 0) << "  " << padded(printable(result.getText()), columns) << "  "
-            << confidenceText(result.getConfidence()) << '\n';
-    }
-    if (recognition.getResults()->empty()) {
-        out << "  -  " << padded("(none)", columns) << "  -\n";
-    }
+    printTable(*recognition.getResults());
     out << '\n'
         << "verdict: " << outcomeName(recognition.getOutcome()) << '\n'
         << "request: " << printable(recognition.getRequestId()) << '\n';

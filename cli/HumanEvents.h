@@ -22,6 +22,7 @@ class HumanEvents : public EventPrinter {
     void printLine(int64_t ms, const std::string& text);
     void printLevel(const SessionEvent& event);
     void printResults(const SessionEvent& event);
+    void printTable(const Talvox::RecognitionResults& hypotheses);
     void clearBar();
 
     std::ostream& out;

@@ -139,6 +139,10 @@ int runRecognize(const RecognizeOptions& options, Console& console, LogOutput& l
     Session session(settings);
     const Interrupts interrupts([&session] { session.interrupt(); });
     const SessionEvent last = session.run(printers);
+    if (!eventsFile) {
+        console.err << "talvox: cannot write to " << options.eventsFile << std::endl;
+        return EXIT_ENDED_IN_ERROR;
+    }
     if (last.kind == SessionEvent::RESULTS) {
         return EXIT_OK;
     }
