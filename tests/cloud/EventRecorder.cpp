@@ -62,8 +62,12 @@ void EventRecorder::onError(Talvox::Recognizer* recognizer, Talvox::SpeechError 
 }
 
 bool EventRecorder::waitForEnds(std::size_t count) const {
+    return waitForEnds(count, LONGEST_WAIT);
+}
+
+bool EventRecorder::waitForEnds(std::size_t count, std::chrono::milliseconds timeout) const {
     std::unique_lock<std::mutex> lock(mutex);
-    return changed.wait_for(lock, LONGEST_WAIT, [this, count] { return ends >= count; });
+    return changed.wait_for(lock, timeout, [this, count] { return ends >= count; });
 }
 
 std::vector<std::string> EventRecorder::texts() const {

@@ -4,6 +4,7 @@
  */
 #pragma once
 
+#include <chrono>
 #include <condition_variable>
 #include <cstddef>
 #include <cstdint>
@@ -42,6 +43,7 @@ class EventRecorder : public Talvox::RecognizerListener {
 
     /** Waits for `count` ends (results or errors). @return false when they do not come */
     bool waitForEnds(std::size_t count = 1) const;
+    bool waitForEnds(std::size_t count, std::chrono::milliseconds timeout) const;
 
     /** The events but buffers and levels, in order. */
     std::vector<std::string> texts() const;

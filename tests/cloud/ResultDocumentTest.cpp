@@ -139,11 +139,8 @@ TEST(ResultDocument, DoesNotExpandEntitiesOfItsOwn) {
     const Results results =
         parse("<!DOCTYPE r [<!ENTITY a \"aaaaaaaaaa\"><!ENTITY b \"&a;&a;&a;&a;&a;\">]>" +
               wrap("<variant confidence=\"1\">&b;</variant>"));
-    if (results) {
-        for (const Talvox::RecognitionResult& result : *results) {
-            EXPECT_EQ(result.getText().find("aaaa"), std::string::npos);
-        }
-    }
+    const std::string text = results && !results->empty() ? results->front().getText() : "";
+    EXPECT_TRUE(text.empty() || text == "&b;") << text;
 }
 
 TEST(ResultDocument, ResolvesTheEntitiesOfXml) {
