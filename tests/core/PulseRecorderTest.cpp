@@ -11,6 +11,7 @@
 #include <condition_variable>
 #include <cstdint>
 #include <cstdlib>
+#include <filesystem>
 #include <functional>
 #include <mutex>
 #include <string>
@@ -334,6 +335,8 @@ TEST_F(PulseRecorderWithMuteServer, ProcessMayEndWhileItRecords) {
             init();
             start();
             static const boost::shared_ptr<Recorder> kept = recorder;
+            // The end of the process leaves the fixture as it is.
+            std::filesystem::remove_all(directory.path(""));
             std::exit(isRecording() ? 0 : 1);
         },
         ::testing::ExitedWithCode(0), "");
