@@ -13,7 +13,8 @@ constexpr KDint64 MS = 1000000;
 
 // Waits on a worker until the event thread is being stopped, then calls everything once more. The
 // process cannot end before.
-void callEverythingAfterTheStop(void* /*user*/) {
+void callEverythingAfterTheStop(void* begun) {
+    static_cast<std::promise<void>*>(begun)->set_value();
     while (kdDrainEventsKOR() == 0) {
         std::this_thread::yield();
     }
@@ -71,10 +72,11 @@ TEST_F(ProcessEndDeathTest, WithTimersAndPostsWaiting) {
 
 TEST_F(ProcessEndDeathTest, LaterCallsAreHarmless) {
     EXPECT_EXIT(endProcess([] {
+                    std::promise<void> begun;
                     kdQueueWorkKOR(
                         &callEverythingAfterTheStop,
-                        [](void*) { kdLogMessage("completed after the stop"); }, nullptr);
-                    startEventThread();
+                        [](void*) { kdLogMessage("completed after the stop"); }, &begun);
+                    begun.get_future().wait();
                 }),
                 CLEANLY, "^after the stop: drained -1 cancelled 0 closed 0\n$");
 }
