@@ -3,6 +3,7 @@
 #include <cstdio>
 #include <cstdlib>
 #include <future>
+#include <memory>
 #include <thread>
 
 #include "pal/kd.h"
@@ -72,7 +73,7 @@ TEST_F(ProcessEndDeathTest, WithTimersAndPostsWaiting) {
 
 TEST_F(ProcessEndDeathTest, LaterCallsAreHarmless) {
     EXPECT_EXIT(endProcess([] {
-                    std::promise<void> begun;
+                    static std::promise<void> begun;
                     kdQueueWorkKOR(
                         &callEverythingAfterTheStop,
                         [](void*) { kdLogMessage("completed after the stop"); }, &begun);
@@ -103,9 +104,9 @@ TEST_F(ProcessEndDeathTest, FromACallback) {
 TEST_F(ProcessEndDeathTest, WhileOtherThreadsGoOnCalling) {
     EXPECT_EXIT(endProcess([] {
                     for (int i = 0; i < 3; ++i) {
-                        std::promise<void> begun;
-                        std::thread([&begun] {
-                            begun.set_value();
+                        const auto begun = std::make_shared<std::promise<void>>();
+                        std::thread([begun] {
+                            begun->set_value();
                             for (;;) {
                                 kdPostKOR([](void*) {}, nullptr);
                                 kdCancelTimer(kdSetTimer(1, KD_TIMER_ONESHOT, nullptr));
@@ -114,7 +115,7 @@ TEST_F(ProcessEndDeathTest, WhileOtherThreadsGoOnCalling) {
                                 kdDrainEventsKOR();
                             }
                         }).detach();
-                        begun.get_future().wait();
+                        begun->get_future().wait();
                     }
                     startEventThread();
                 }),
