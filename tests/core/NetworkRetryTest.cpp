@@ -125,7 +125,7 @@ TEST_F(NetworkRetryTest, AsksThePolicyWithCodeAndAttempt) {
         }
         mutable std::vector<std::pair<int, int>> asked;
     };
-    server.script({Answer::status(404), Answer::closing(), Answer::status(200)});
+    server.script({Answer::status(404).thenClose(), Answer::closing(), Answer::status(200)});
     const auto policy = boost::make_shared<Policy>();
     const auto task = makeTask(server.getUrl());
     holder.submit(task, policy);

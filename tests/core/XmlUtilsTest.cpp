@@ -109,8 +109,10 @@ TEST(XmlUtils, LogsWhyATextWasRefused) {
     const TestSupport::LogCapture log;
     EXPECT_FALSE(loads("\xFF"));
     EXPECT_TRUE(log.contains("XmlUtils: the text is not UTF-8"));
-    EXPECT_FALSE(loads("<a>"));
+    EXPECT_FALSE(loads("<a></b>"));
     EXPECT_TRUE(log.contains("XmlUtils: Error reading end tag."));
+    EXPECT_FALSE(loads("<!-- nothing -->"));
+    EXPECT_TRUE(log.contains("XmlUtils: no element"));
     EXPECT_FALSE(loads("<a/>garbage"));
     EXPECT_TRUE(log.contains("XmlUtils: text outside of the elements"));
 }

@@ -128,7 +128,7 @@ XmlScanner::Step XmlScanner::scanDeclaration() {
         if (startsWithNoCase("version") || startsWithNoCase("encoding") ||
             startsWithNoCase("standalone")) {
             if (scanAttribute() == Step::STOP) {
-                return Step::STOP;
+                break;
             }
             continue;
         }
@@ -136,8 +136,8 @@ XmlScanner::Step XmlScanner::scanDeclaration() {
             ++position;
         }
     }
-    // The parser has been seen to fail an assertion of its own on these.
-    return fail("the text ends inside its declaration");
+    // The parser ends quietly here, or with a failed assertion of its own.
+    return hazard.empty() ? fail("a declaration is malformed") : Step::STOP;
 }
 
 XmlScanner::Step XmlScanner::scanAttribute() {
@@ -157,9 +157,11 @@ XmlScanner::Step XmlScanner::scanAttribute() {
     if (current() == '"' || current() == '\'') {
         const std::string quote(1, current());
         ++position;
-        const Step step = scanText(quote);
-        position += atEnd() ? 0 : 1;
-        return atEnd() ? Step::STOP : step;
+        if (scanText(quote) == Step::STOP || atEnd()) {
+            return Step::STOP;
+        }
+        ++position;
+        return Step::ON;
     }
     while (!atEnd() && !isBlank(current()) && current() != '/' && current() != '>') {
         if (current() == '"' || current() == '\'') {

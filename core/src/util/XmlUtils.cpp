@@ -40,6 +40,9 @@ std::string parse(const std::string& xml, bool keepWhiteSpace, TiXmlDocument& do
     if (document.Error()) {
         return document.ErrorDesc();
     }
+    if (document.RootElement() == nullptr) {
+        return "no element";
+    }
     return rest != nullptr && *rest != '\0' ? "text outside of the elements" : std::string();
 }
 

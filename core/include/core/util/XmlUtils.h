@@ -31,7 +31,7 @@ class KORVEL_CORE_API XmlUtils {
      * Tells what in `xml` must not be handed to the parser: a text beyond `MAX_SIZE_BYTES`, bytes
      * that are not UTF-8 (an embedded zero byte counts), nesting beyond `MAX_DEPTH`, more than
      * `MAX_ATTRIBUTES` attributes, numeric character references that are malformed or name no
-     * character, an unfinished declaration. Other errors are left to the parser, so that what
+     * character, a malformed declaration. Other errors are left to the parser, so that what
      * stands before them can be used.
      * @return an empty text when the parser may have it, else the reason in plain words
      */
@@ -43,8 +43,8 @@ class KORVEL_CORE_API XmlUtils {
      * @param keepWhiteSpace keep runs of white space in texts as they stand; otherwise they are
      *                       condensed to one blank
      * @param[out] document  the parsed document; what it holds after a failure is not specified
-     * @return true when the whole text was parsed without an error; otherwise a line with the
-     *         reason was logged
+     * @return true when the whole text was parsed without an error and has an element; otherwise a
+     *         line with the reason was logged
      */
     static bool load(const std::vector<unsigned char>& bytes, bool keepWhiteSpace,
                      TiXmlDocument& document);
