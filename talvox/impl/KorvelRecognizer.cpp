@@ -17,7 +17,7 @@ const int LOG_LEVEL = 2;
 const int BUFFER_LENGTH_MS = 100;
 const char* const DUMP_PATH = "/removable/in.wav";
 
-const int64_t NS_PER_MS = 1000 * 1000;
+const int64_t NS_PER_MS = 1000000;
 const int64_t NO_VOICE_LIMIT_NS = 5000 * NS_PER_MS;
 const unsigned SOUND_LIMIT_MS = 20000;
 
