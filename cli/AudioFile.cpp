@@ -52,7 +52,9 @@ std::string plainReason(const char* message) {
 SoundFile openSoundFile(const std::string& path, SF_INFO& info) {
     SoundFile file(sf_open(path.c_str(), SFM_READ, &info), &sf_close);
     if (!file) {
-        refuse(path, plainReason(sf_strerror(nullptr)));
+        refuse(path, sf_error(nullptr) == SF_ERR_UNRECOGNISED_FORMAT
+                         ? "it is not sound of a known format"
+                         : plainReason(sf_strerror(nullptr)));
     }
     if (info.samplerate < RATE_MIN_HZ || info.samplerate > RATE_MAX_HZ) {
         refuse(path,

@@ -50,11 +50,16 @@ std::string makeUuid() {
 
 void mountDump(const std::string& directory) {
     struct stat status = {};
-    if (stat(directory.c_str(), &status) != 0 || access(directory.c_str(), W_OK | X_OK) != 0) {
-        throw UsageError("cannot write to " + directory + ": " + std::strerror(errno));
+    std::string reason;
+    if (stat(directory.c_str(), &status) != 0) {
+        reason = std::strerror(errno);
+    } else if (!S_ISDIR(status.st_mode)) {
+        reason = "it is not a directory";
+    } else if (access(directory.c_str(), W_OK | X_OK) != 0) {
+        reason = std::strerror(errno);
     }
-    if (!S_ISDIR(status.st_mode)) {
-        throw UsageError("cannot write to " + directory + ": it is not a directory");
+    if (!reason.empty()) {
+        throw UsageError("cannot write to " + directory + ": " + reason);
     }
     kdMountKOR(DUMP_ROOT, directory.c_str());
 }

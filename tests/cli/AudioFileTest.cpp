@@ -131,7 +131,7 @@ TEST(AudioFile, RefusesAnEmptyFile) {
 TEST(AudioFile, RefusesWhatIsNotSound) {
     const TempDirectory directory;
     const std::string path = directory.write("letter.txt", "Dear Sir or Madam, this is no sound.");
-    EXPECT_EQ(refusal(path), "cannot read " + path + ": File contains data in an unknown format");
+    EXPECT_EQ(refusal(path), "cannot read " + path + ": it is not sound of a known format");
 }
 
 TEST(AudioFile, RefusesAMissingFileAndADirectory) {

@@ -99,7 +99,7 @@ TEST(Tool, RefusesBadSoundFiles) {
         expectRefused({command, "--file", directory.path()}, "it is a directory");
         expectRefused({command, "--file", directory.write("empty.wav", "")}, "the file is empty");
         expectRefused({command, "--file", directory.write("letter.txt", "Dear Sir or Madam")},
-                      "unknown format");
+                      "it is not sound of a known format");
         expectRefused({command, "--file", silent}, "it holds no sound");
         expectRefused({command, "--file", cut}, "cannot read " + cut);
         expectRefused({command, "--file", "-"}, "standard input: it holds no sound");
