@@ -39,6 +39,7 @@ std::vector<std::string> mergeEnvironment(const ChildProcess::Environment& chang
 
 std::vector<char*> toPointers(std::vector<std::string>& texts) {
     std::vector<char*> pointers;
+    pointers.reserve(texts.size() + 1);
     for (std::string& text : texts) {
         pointers.push_back(text.data());
     }

@@ -10,11 +10,13 @@
 // instrumented, so ThreadSanitizer does not see what orders the threads that pass such an object
 // on. Frames of the library stand in a report only where the library itself calls a function of the
 // C library.
+// NOLINTBEGIN(bugprone-reserved-identifier): the name that the sanitizer looks for.
 extern "C" __attribute__((visibility("default"))) const char* __tsan_default_suppressions();
 
 extern "C" const char* __tsan_default_suppressions() {
     return "race:libpulsecommon";
 }
+// NOLINTEND(bugprone-reserved-identifier)
 
 namespace TestSupport {
 
