@@ -1,0 +1,15 @@
+# The Java bindings need jni.h only: no JDK library is linked. Android has it in its sysroot.
+add_library(korvel_jni INTERFACE)
+set(korvel_has_jni ${ANDROID})
+if(NOT ANDROID)
+    find_package(JNI QUIET)
+    if(JAVA_INCLUDE_PATH AND JAVA_INCLUDE_PATH2)
+        set(korvel_has_jni ON)
+        target_include_directories(korvel_jni SYSTEM INTERFACE
+            $<BUILD_INTERFACE:${JAVA_INCLUDE_PATH}> $<BUILD_INTERFACE:${JAVA_INCLUDE_PATH2}>)
+    endif()
+endif()
+option(TALVOX_JNI "Build the Java bindings into libKorvelTalvox" ${korvel_has_jni})
+if(TALVOX_JNI AND NOT korvel_has_jni)
+    message(FATAL_ERROR "TALVOX_JNI needs jni.h (Debian: openjdk-17-jdk-headless)")
+endif()

@@ -1,0 +1,43 @@
+#include "Refs.h"
+
+#include "Env.h"
+#include "pal/kd_jni.h"
+
+namespace Jni {
+
+GlobalRef::GlobalRef(JNIEnv* env, jobject object)
+    : ref(object != nullptr ? env->NewGlobalRef(object) : nullptr) {}
+
+GlobalRef& GlobalRef::operator=(GlobalRef&& other) noexcept {
+    if (this != &other) {
+        reset();
+        ref = std::exchange(other.ref, nullptr);
+    }
+    return *this;
+}
+
+GlobalRef::~GlobalRef() {
+    reset();
+}
+
+void GlobalRef::reset() {
+    if (ref == nullptr) {
+        return;
+    }
+    if (JNIEnv* const env = kdGetJNIEnvKOR()) {
+        env->DeleteGlobalRef(ref);
+    }
+    ref = nullptr;
+}
+
+LocalFrame::LocalFrame(JNIEnv* environment, jint capacity) : env(environment) {
+    if (env->PushLocalFrame(capacity) != 0) {
+        throw PendingException();
+    }
+}
+
+LocalFrame::~LocalFrame() {
+    env->PopLocalFrame(nullptr);
+}
+
+}  // namespace Jni
