@@ -175,8 +175,7 @@ class ScriptedHttpServer::Connection {
                                    ? readChunks()
                                    : readBody(std::strtoul(length.c_str(), nullptr, 10));
             if (open && whole) {
-                server.changeRequest(requestIndex,
-                                     [](Request& record) { record.complete = true; });
+                server.changeRequest(requestIndex, [](Request& record) { record.complete = true; });
                 actIfDue(true);
             }
             open = open && whole;

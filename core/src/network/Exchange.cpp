@@ -15,7 +15,7 @@ namespace Network {
 
 namespace {
 
-constexpr std::size_t MOST_COLLECTED_BYTES = 1024 * 1024;
+constexpr std::size_t MOST_COLLECTED_BYTES = std::size_t{1024} * 1024;
 constexpr int64_t NS_PER_MS = 1000000;
 
 }  // namespace

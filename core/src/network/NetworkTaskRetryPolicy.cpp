@@ -8,7 +8,7 @@ namespace Network {
 
 namespace {
 
-constexpr int64_t LONGEST_DELAY_MS = 24 * 60 * 60 * 1000;
+constexpr int64_t LONGEST_DELAY_MS = int64_t{24} * 60 * 60 * 1000;
 
 bool canBeMended(int code) {
     return code == NetworkTask::NO_RESPONSE || code == NetworkTask::TIMED_OUT ||

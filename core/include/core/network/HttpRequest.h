@@ -67,12 +67,17 @@ class KORVEL_CORE_API HttpRequest {
      * @param timeoutMs bounds each wait for the peer, on the platform clock: for the connection,
      *                  for taking bytes that are ready, and for the answer after the last of them.
      *                  The time in which a streamed body is still being written does not count.
+     *                  Values below 1 mean no bound.
      * @param followRedirects follow 3xx answers; never done for a request with a body
      */
     static boost::shared_ptr<HttpRequest> create(const std::string& url, const std::string& method,
                                                  int timeoutMs, bool followRedirects);
 
-    /** True: the body is what `setWriter` gives, sent with chunked transfer coding. */
+    /**
+     * True: the body is what `setWriter` gives, sent with chunked transfer coding. When the final
+     * answer comes before the writer is closed, the body is ended there and the exchange with it;
+     * the writer stays usable, but nobody reads what is written later.
+     */
     void setChunked(bool value) { chunked = value; }
     bool isChunked() const { return chunked; }
 

@@ -15,7 +15,10 @@ namespace Network {
 
 class Transport;
 
-/** The process's view of the network. */
+/**
+ * The process's view of the network. Connections go straight to the host of the URL: settings come
+ * from the application only, so proxies named by environment variables are not used.
+ */
 class KORVEL_CORE_API NetworkManager : public Util::Singleton<NetworkManager> {
   public:
     /** Reachability: 0 and 1 are fixed; every other value is a connection that is metered. */
@@ -23,7 +26,12 @@ class KORVEL_CORE_API NetworkManager : public Util::Singleton<NetworkManager> {
 
     static NetworkManager& getInstance();
 
-    /** Ends all transfers and the network thread; bounded, whatever the peers do. */
+    /**
+     * Ends all transfers and the network thread; bounded, whatever the peers do. Their tasks end
+     * with `NO_RESPONSE` and without a retry. The event lock, under which singletons are deleted,
+     * is lent to the network thread meanwhile. Must not happen inside a callback of a task that
+     * runs on the network thread.
+     */
     ~NetworkManager() override;
 
     /**

@@ -43,7 +43,8 @@ class KORVEL_CORE_API NetworkTask {
 
     /**
      * True: the body is handed on piece by piece as it arrives; false (default): it is collected,
-     * up to 1 MiB, and handed on in one piece unless it is empty.
+     * up to 1 MiB, and handed on in one piece unless it is empty; a larger one ends the attempt
+     * with `NO_RESPONSE`.
      */
     virtual bool recieveResponseBodyByParts() const;
 
