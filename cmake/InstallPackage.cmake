@@ -11,7 +11,7 @@ install(TARGETS KorvelPAL KorvelCore KorvelLibs KorvelTalvox korvel_boost_assert
         EXPORT KorvelTalvoxTargets
         LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR})
 install(DIRECTORY pal/include/ core/include/ libs/include/ DESTINATION ${korvel_headers})
-install(DIRECTORY talvox util DESTINATION ${korvel_headers}
+install(DIRECTORY logcollector talvox util DESTINATION ${korvel_headers}
         FILES_MATCHING PATTERN "*.h" PATTERN "impl" EXCLUDE)
 install(EXPORT KorvelTalvoxTargets NAMESPACE KorvelTalvox:: DESTINATION ${korvel_package})
 

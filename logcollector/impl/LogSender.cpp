@@ -1,0 +1,194 @@
+#include "logcollector/impl/LogSender.h"
+
+#include <boost/make_shared.hpp>
+#include <utility>
+
+#include "core/Logger.h"
+#include "core/util/EventLock.h"
+#include "logcollector/impl/LogCollectorNetworkTask.h"
+
+namespace LogCollector {
+
+namespace {
+
+constexpr int64_t NS_PER_S = 1000000000;
+constexpr int64_t NS_PER_MS = 1000000;
+constexpr int RETRY_DELAY_MS = 3000;
+constexpr int ATTEMPTS = 2;
+
+class QueueLock {
+  public:
+    explicit QueueLock(KDThreadMutex* which) : mutex(which) { kdThreadMutexLock(mutex); }
+    ~QueueLock() { kdThreadMutexUnlock(mutex); }
+    QueueLock(const QueueLock&) = delete;
+    QueueLock& operator=(const QueueLock&) = delete;
+
+  private:
+    KDThreadMutex* const mutex;
+};
+
+}  // namespace
+
+const std::string LogSender::TAG("LogSender");
+const std::string LogSender::delimiter(";");
+
+std::string timeToString(long long seconds) {
+    const KDtime time = seconds;
+    KDTm fields{};
+    kdGmtime_r(&time, &fields);
+    char text[96];
+    kdSprintf_s(text, sizeof(text), "%d-%02d-%02d %02d:%02d:%02d", fields.tm_year, fields.tm_mon,
+                fields.tm_mday, fields.tm_hour, fields.tm_min, fields.tm_sec);
+    return text;
+}
+
+LogSender::LogSender() : queueMutex(kdThreadMutexCreate(nullptr)), pause([this] { goOn(); }) {
+    kdInstallCallback(&LogSender::onTimerFired, KD_EVENT_TIMER, this);
+}
+
+LogSender::~LogSender() {
+    const Util::EventLock lock;
+    cancel();
+    pause.cancel();
+    stopTimer();
+    kdInstallCallback(nullptr, KD_EVENT_TIMER, this);
+    kdThreadMutexFree(queueMutex);
+}
+
+void LogSender::sendLogRecord(const boost::shared_ptr<LogEvent>& event,
+                              const std::string& sessionId) {
+    sendLogRecord(toString(event, sessionId));
+}
+
+std::string LogSender::toString(const boost::shared_ptr<LogEvent>& event,
+                                const std::string& sessionId) {
+    std::string record = "time=" + timeToString(event->getTimestamp());
+    record += delimiter + "sessionId=" + sessionId;
+    record += delimiter + "type=" + LogEvent::eventTypesDescriptions[event->getType()];
+    record += delimiter + "name=" + event->getName();
+    for (auto it = event->getParamsIterator(); it != event->getParamsEndIterator(); ++it) {
+        record += delimiter + it->first + "=" + it->second;
+    }
+    return record;
+}
+
+void LogSender::sendLogRecord(const std::string& record) {
+    const Util::EventLock lock;
+    if (isWorking() || hold != Hold::NONE) {
+        append(record);
+        return;
+    }
+    submit(
+        boost::make_shared<LogCollectorNetworkTask>(
+            record, [this](bool success, const std::string& sent,
+                           int status) { onRequestComplete(success, sent, status); }),
+        boost::make_shared<Network::NetworkTaskBasicRetryPolicy>(RETRY_DELAY_MS, ATTEMPTS, false));
+}
+
+void LogSender::append(const std::string& record) {
+    const QueueLock lock(queueMutex);
+    queue.push_back(record);
+}
+
+void LogSender::sendNextRecord() {
+    const Util::EventLock lock;
+    if (isWorking() || hold != Hold::NONE) {
+        return;
+    }
+    std::list<std::string> next;
+    {
+        const QueueLock queueLock(queueMutex);
+        if (!queue.empty()) {
+            next.splice(next.end(), queue, queue.begin());
+        }
+    }
+    if (next.empty()) {
+        stopTimer();
+    } else {
+        sendLogRecord(next.front());
+    }
+}
+
+void LogSender::startTimer() {
+    const Util::EventLock lock;
+    if (timer == nullptr) {
+        timer = kdSetTimer(timerPeriodS * NS_PER_S, KD_TIMER_PERIODIC_AVERAGE, this);
+    }
+}
+
+void LogSender::stopTimer() {
+    const Util::EventLock lock;
+    if (timer != nullptr) {
+        kdCancelTimer(timer);
+        timer = nullptr;
+    }
+}
+
+bool LogSender::isTimerRunning() const {
+    const Util::EventLock lock;
+    return timer != nullptr;
+}
+
+void LogSender::onTimerFired(const KDEvent* event) {
+    static_cast<LogSender*>(event->userptr)->goOn();
+}
+
+void LogSender::goOn() {
+    hold = Hold::NONE;
+    pause.cancel();
+    sendNextRecord();
+}
+
+void LogSender::onRequestComplete(bool success, const std::string& record, int status) {
+    const Util::EventLock lock;
+    onFinished();
+    if (!success) {
+        append(record);
+        startTimer();
+        holdBack(status);
+        Logger::log(Logger::PROBLEM, "%s: a dummy record send request fails", TAG.c_str());
+    }
+    if (isWorking()) {
+        onFinished();
+    }
+    sendNextRecord();
+    if (success && getPendingCount() == 0 && onDelivered) {
+        // Last, and a copy: it may replace itself or end the collector.
+        const std::function<void()> callback = onDelivered;
+        callback();
+    }
+}
+
+// The retry policy spaces the attempts of what it repeats. An endpoint that refuses at once, with a
+// status that is final for the policy, gets no more requests than that; and where no request can be
+// made at all, trying the next record would be as useless.
+void LogSender::holdBack(int status) {
+    const int64_t now = kdGetTimeUST();
+    if (status == Network::NetworkTask::NO_REQUEST) {
+        hold = Hold::REFUSED;
+    } else if (lastFailureAt && now - *lastFailureAt < RETRY_DELAY_MS * NS_PER_MS) {
+        hold = Hold::PAUSED;
+        pause.start(KD_TIMER_ONESHOT, RETRY_DELAY_MS * NS_PER_MS);
+    }
+    lastFailureAt = now;
+}
+
+void LogSender::onConfigured() {
+    const Util::EventLock lock;
+    if (hold == Hold::REFUSED) {
+        goOn();
+    }
+}
+
+std::size_t LogSender::getPendingCount() const {
+    const Util::EventLock lock;
+    const QueueLock queueLock(queueMutex);
+    return queue.size() + (isWorking() ? 1 : 0);
+}
+
+void LogSender::setDeliveredCallback(std::function<void()> callback) {
+    const Util::EventLock lock;
+    onDelivered = std::move(callback);
+}
+
+}  // namespace LogCollector
