@@ -256,7 +256,7 @@ TEST_F(PulseRecorderWithoutServer, StartInSpiteOfARefusedInitReportsAnError) {
 }
 
 TEST_F(PulseRecorderWithoutServer, RecordersThatAreGoneReportNothing) {
-    const boost::weak_ptr<Collector> weakListener = listener;
+    const boost::weak_ptr<Sound::RecorderListener> weakListener = listener;
     for (int i = 0; i < 20; ++i) {
         const EventLock lock;
         const boost::shared_ptr<Recorder> brief = Recorder::createRecorder();
