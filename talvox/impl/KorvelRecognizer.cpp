@@ -106,22 +106,21 @@ void KorvelRecognizer::chooseSessionMode(const Settings& engineSettings) {
 }
 
 bool KorvelRecognizer::startRecorder(int sampleRateHz) {
-    recorder = Sound::Recorder::createRecorder();
-    recorder->setMode(sessionMode);
-    recorder->addListener(boost::static_pointer_cast<KorvelRecognizer>(shared_from_this()));
-    recorder->setBufferLength(BUFFER_LENGTH_MS);
-    recorder->setSampleRate(sampleRateHz);
-    if (!recorder->init()) {
-        recorder.reset();
+    const boost::shared_ptr<Sound::Recorder> starting = Sound::Recorder::createRecorder();
+    starting->setMode(sessionMode);
+    starting->addListener(boost::static_pointer_cast<KorvelRecognizer>(shared_from_this()));
+    starting->setBufferLength(BUFFER_LENGTH_MS);
+    starting->setSampleRate(sampleRateHz);
+    if (!starting->init()) {
         recorderRefused = true;
         getEngine()->unregisterRecognizer(this);
         callOnError(SpeechError(SpeechError::ErrorAudio));
         return false;
     }
     // Starting may report an error at once, which ends the session.
-    const boost::shared_ptr<Sound::Recorder> starting = recorder;
+    recorder = starting;
     starting->startRecording();
-    return recorder != nullptr;
+    return !isOver();
 }
 
 void KorvelRecognizer::startProtocol(bool streaming) {
