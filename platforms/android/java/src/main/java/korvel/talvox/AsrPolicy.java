@@ -1,0 +1,24 @@
+package korvel.talvox;
+
+/** The application's choice of recogniser. See {@link TalvoxSettings#ASR_POLICY}. */
+public enum AsrPolicy implements SettingValue {
+    /** The gateway. */
+    KORVEL_ONLY("korvel_only"),
+    /** The device's own recogniser. */
+    PLATFORM_ONLY("platform_only"),
+    /** The device's own recogniser if there is one, else the gateway. */
+    PLATFORM_FIRST("platform_first"),
+    /** None: every recognition ends with {@link SpeechError#NOT_AVAILABLE}. */
+    DISABLED("disabled");
+
+    private final String text;
+
+    AsrPolicy(String text) {
+        this.text = text;
+    }
+
+    @Override
+    public String getText() {
+        return text;
+    }
+}

@@ -1,0 +1,44 @@
+package korvel.talvox;
+
+/** One thing that may have been said. Immutable. */
+public final class Hypothesis {
+    private static final float UNKNOWN = -1.0f;
+
+    private final String text;
+    private final float confidence;
+
+    Hypothesis(String text, float confidence) {
+        this.text = text;
+        this.confidence = confidence;
+    }
+
+    public String getText() {
+        return text;
+    }
+
+    /** From 0 to 1, or −1 when the recogniser did not say. */
+    public float getConfidence() {
+        return confidence;
+    }
+
+    public boolean hasConfidence() {
+        return confidence != UNKNOWN;
+    }
+
+    @Override
+    public boolean equals(Object other) {
+        return other instanceof Hypothesis
+                && text.equals(((Hypothesis) other).text)
+                && Float.compare(confidence, ((Hypothesis) other).confidence) == 0;
+    }
+
+    @Override
+    public int hashCode() {
+        return 31 * text.hashCode() + Float.hashCode(confidence);
+    }
+
+    @Override
+    public String toString() {
+        return hasConfidence() ? text + " (" + confidence + ")" : text;
+    }
+}

@@ -1,0 +1,37 @@
+package korvel.talvox;
+
+/** A position in degrees, kept in single precision as the engine does. Immutable. */
+public final class LatLon {
+    private final float latitude;
+    private final float longitude;
+
+    public LatLon(double latitude, double longitude) {
+        this.latitude = (float) latitude;
+        this.longitude = (float) longitude;
+    }
+
+    public float getLatitude() {
+        return latitude;
+    }
+
+    public float getLongitude() {
+        return longitude;
+    }
+
+    @Override
+    public boolean equals(Object other) {
+        return other instanceof LatLon
+                && Float.compare(latitude, ((LatLon) other).latitude) == 0
+                && Float.compare(longitude, ((LatLon) other).longitude) == 0;
+    }
+
+    @Override
+    public int hashCode() {
+        return 31 * Float.hashCode(latitude) + Float.hashCode(longitude);
+    }
+
+    @Override
+    public String toString() {
+        return latitude + ", " + longitude;
+    }
+}

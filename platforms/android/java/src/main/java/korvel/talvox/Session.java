@@ -1,0 +1,186 @@
+package korvel.talvox;
+
+import java.util.concurrent.Executor;
+import korvel.talvox.impl.NativeHandle;
+import korvel.talvox.impl.Recognizer;
+
+/**
+ * One recognition from start to close: takes the events from native code and hands them to the
+ * listener's executor. The monitor is never held while native code or the listener runs.
+ */
+final class Session implements Recognizer.Events {
+    private final RecognitionListener listener;
+    private final Executor executor;
+    private Object owner;
+    private NativeHandle handle;
+    private boolean stopWanted;
+    private boolean cancelWanted;
+    private volatile boolean ended;
+    private volatile boolean closed;
+
+    Session(RecognitionListener listener, Executor executor) {
+        this.listener = listener;
+        this.executor = new SerialExecutor(executor);
+    }
+
+    /**
+     * Starts.
+     *
+     * @param owner kept alive until the last event has been delivered
+     */
+    void start(TalvoxEngine engine, TalvoxSettings settings, Object owner) {
+        synchronized (this) {
+            this.owner = owner;
+        }
+        final NativeHandle started;
+        try {
+            started = Recognizer.start(engine.getHandle(), settings.toBundle(), this);
+        } catch (RuntimeException failure) {
+            over();
+            throw failure;
+        }
+        synchronized (this) {
+            handle = started;
+        }
+        catchUp(started);
+    }
+
+    /** Does what was asked for, from an event or another thread, before the start had returned. */
+    private void catchUp(NativeHandle started) {
+        final boolean stop;
+        final boolean cancel;
+        synchronized (this) {
+            stop = stopWanted;
+            cancel = cancelWanted;
+        }
+        if (closed) {
+            release(started);
+        } else if (cancel) {
+            cancel(started);
+        } else if (stop) {
+            stop(started);
+        }
+    }
+
+    void stop() {
+        final NativeHandle running;
+        synchronized (this) {
+            running = handle;
+            stopWanted = true;
+        }
+        if (running != null) {
+            stop(running);
+        }
+    }
+
+    void cancel() {
+        final NativeHandle running;
+        synchronized (this) {
+            running = handle;
+            cancelWanted = true;
+        }
+        if (running != null) {
+            cancel(running);
+        }
+    }
+
+    void close() {
+        final NativeHandle running;
+        synchronized (this) {
+            running = handle;
+            closed = true;
+            owner = null;
+        }
+        if (running != null) {
+            release(running);
+        }
+    }
+
+    private void stop(NativeHandle running) {
+        if (!ended) {
+            Recognizer.stop(running);
+        }
+    }
+
+    private void cancel(NativeHandle running) {
+        if (!ended) {
+            Recognizer.cancel(running);
+        }
+    }
+
+    private void release(NativeHandle running) {
+        cancel(running);
+        running.close();
+    }
+
+    private synchronized void over() {
+        owner = null;
+    }
+
+    private void deliver(Runnable event) {
+        if (!ended) {
+            post(event);
+        }
+    }
+
+    /** The event lock serialises the events, so one of them is the last. */
+    private void deliverLast(Runnable event) {
+        if (ended) {
+            return;
+        }
+        ended = true;
+        post(
+                () -> {
+                    over();
+                    event.run();
+                });
+    }
+
+    private void post(Runnable event) {
+        executor.execute(
+                () -> {
+                    if (!closed) {
+                        event.run();
+                    }
+                });
+    }
+
+    @Override
+    public void onRecordingBegin() {
+        deliver(listener::onRecordingBegin);
+    }
+
+    @Override
+    public void onSpeakingBegin() {
+        deliver(listener::onSpeakingBegin);
+    }
+
+    @Override
+    public void onRecordingDone() {
+        deliver(listener::onRecordingDone);
+    }
+
+    @Override
+    public void onPowerChanged(float power) {
+        deliver(() -> listener.onPowerChanged(power));
+    }
+
+    @Override
+    public void onBufferReceived(byte[] buffer) {
+        deliver(() -> listener.onBufferReceived(buffer));
+    }
+
+    @Override
+    public void onError(int code) {
+        final SpeechError error = SpeechError.fromCode(code);
+        deliverLast(() -> listener.onError(error));
+    }
+
+    @Override
+    public void onResults(
+            int outcome, String[] texts, float[] confidences, String requestId) {
+        final Recognition recognition =
+                Recognition.fromNative(outcome, texts, confidences, requestId);
+        deliverLast(() -> listener.onResults(recognition));
+    }
+}

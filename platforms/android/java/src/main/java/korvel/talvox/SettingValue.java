@@ -1,0 +1,6 @@
+package korvel.talvox;
+
+/** A value that the engine knows by a text. */
+interface SettingValue {
+    String getText();
+}

@@ -1,0 +1,114 @@
+package korvel.talvox;
+
+import android.content.Context;
+import android.os.Handler;
+import android.os.Looper;
+import java.util.ArrayList;
+import java.util.List;
+import java.util.Objects;
+import java.util.TreeSet;
+import java.util.concurrent.Executor;
+import korvel.core.CoreApplication;
+import korvel.talvox.impl.PlatformRecognizer;
+import korvel.talvox.impl.Talvox;
+
+/**
+ * The speech-recognition engine. There is one per process, which lives as long as the process.
+ *
+ * <p>Any thread may call any method; none waits for the network or a device.
+ */
+public final class TalvoxEngine {
+    private static TalvoxEngine instance;
+
+    private final long handle;
+
+    private TalvoxEngine(long handle) {
+        this.handle = handle;
+    }
+
+    /**
+     * The engine. The first call loads the native library and takes some ten milliseconds.
+     *
+     * @param context any context of the application; only its application context is kept
+     * @throws UnsatisfiedLinkError if the application was built without the library for this
+     *     device's processor
+     */
+    public static TalvoxEngine getInstance(Context context) {
+        final Context application = context.getApplicationContext();
+        CoreApplication.install(application == null ? context : application);
+        PlatformRecognizer.queryLanguages();
+        final long handle = Talvox.getHandle();
+        synchronized (TalvoxEngine.class) {
+            if (instance == null) {
+                instance = new TalvoxEngine(handle);
+            }
+            return instance;
+        }
+    }
+
+    long getHandle() {
+        return handle;
+    }
+
+    /** The engine's version, for example "133". */
+    public String getVersion() {
+        return Talvox.getVersion();
+    }
+
+    /** The engine's settings, all keys set. */
+    public TalvoxSettings getSettings() {
+        return TalvoxSettings.fromBundle(Talvox.getSettings(handle));
+    }
+
+    /** Changes the engine's settings: those that are set here. Recognitions under way keep theirs. */
+    public void updateSettings(TalvoxSettings settings) {
+        Talvox.updateSettings(handle, settings.toBundle());
+    }
+
+    /**
+     * Changes the engine's settings to what an XML document says under {@code
+     * /startup/features/voice}. What cannot be read there is logged and changes nothing.
+     */
+    public void updateSettingsFromXml(String xml) {
+        Talvox.updateSettingsFromXml(handle, xml);
+    }
+
+    /** Whether a recognition with these settings would find a recogniser. */
+    public boolean isRecognitionAvailable(TalvoxSettings settings) {
+        return Talvox.isRecognitionAvailable(handle, settings.toBundle());
+    }
+
+    /**
+     * The languages that can be recognised, sorted, each once. Those of the device's own recogniser
+     * are asked for when the engine is created and join as soon as it has answered.
+     */
+    public List<String> getAvailableLanguages() {
+        final TreeSet<String> languages = new TreeSet<>(Talvox.getAvailableLanguages(handle));
+        languages.addAll(PlatformRecognizer.getAvailableLanguages());
+        return new ArrayList<>(languages);
+    }
+
+    /** A recognition whose events are delivered on the main looper. */
+    public TalvoxRecognizer createRecognizer(
+            TalvoxSettings settings, RecognitionListener listener) {
+        final Handler main = new Handler(Looper.getMainLooper());
+        return createRecognizer(settings, listener, main::post);
+    }
+
+    /**
+     * A recognition, not started yet.
+     *
+     * @param settings what differs from the engine's settings
+     * @param listener hears the events
+     * @param executor runs the listener. One that runs it at once, on the calling thread, has it run
+     *     on the engine's event thread: then the listener must not block at all
+     */
+    public TalvoxRecognizer createRecognizer(
+            TalvoxSettings settings, RecognitionListener listener, Executor executor) {
+        return new TalvoxRecognizer(
+                this,
+                Objects.requireNonNull(settings, "settings"),
+                Objects.requireNonNull(listener, "listener"),
+                Objects.requireNonNull(executor, "executor"));
+    }
+}

@@ -1,0 +1,77 @@
+package korvel.talvox.impl;
+
+import android.app.Activity;
+import android.content.BroadcastReceiver;
+import android.content.Context;
+import android.content.Intent;
+import android.os.Bundle;
+import android.os.Handler;
+import android.os.Looper;
+import android.speech.RecognizerIntent;
+import android.util.Log;
+import java.util.ArrayList;
+
+/**
+ * The languages of the device's recogniser: asked for by an ordered broadcast, kept from then on.
+ * All methods may be called from any thread and return at once.
+ */
+final class PlatformLanguages {
+    private static final String TAG = "Talvox";
+
+    private final ArrayList<String> languages = new ArrayList<>();
+    private String preference = "";
+    private boolean asked;
+
+    /** Asks, unless that has been done; an empty answer may be asked for again. */
+    void query(Context context) {
+        synchronized (this) {
+            if (asked) {
+                return;
+            }
+            asked = true;
+        }
+        final Intent details = RecognizerIntent.getVoiceDetailsIntent(context);
+        final Intent question =
+                details != null ? details : new Intent(RecognizerIntent.ACTION_GET_LANGUAGE_DETAILS);
+        try {
+            context.sendOrderedBroadcast(
+                    question,
+                    null,
+                    new BroadcastReceiver() {
+                        @Override
+                        public void onReceive(Context ignored, Intent alsoIgnored) {
+                            keep(getResultExtras(true));
+                        }
+                    },
+                    new Handler(Looper.getMainLooper()),
+                    Activity.RESULT_OK,
+                    null,
+                    null);
+        } catch (RuntimeException failure) {
+            Log.w(TAG, "asking for the languages of the device's recogniser failed", failure);
+            keep(Bundle.EMPTY);
+        }
+    }
+
+    private synchronized void keep(Bundle answer) {
+        final ArrayList<String> supported =
+                answer.getStringArrayList(RecognizerIntent.EXTRA_SUPPORTED_LANGUAGES);
+        languages.clear();
+        if (supported != null) {
+            languages.addAll(supported);
+        }
+        final String preferred = answer.getString(RecognizerIntent.EXTRA_LANGUAGE_PREFERENCE);
+        preference = preferred == null ? "" : preferred;
+        asked = !languages.isEmpty();
+    }
+
+    /** A copy of what is known; empty until the device has answered. */
+    synchronized ArrayList<String> get() {
+        return new ArrayList<>(languages);
+    }
+
+    /** The language that the user chose for recognition on the device, empty if not known. */
+    synchronized String getPreference() {
+        return preference;
+    }
+}

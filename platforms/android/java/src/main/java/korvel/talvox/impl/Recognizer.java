@@ -1,0 +1,98 @@
+package korvel.talvox.impl;
+
+import android.os.Bundle;
+
+/**
+ * The native side's partner in one recognition. Applications use {@link
+ * korvel.talvox.TalvoxRecognizer}.
+ *
+ * <p>Native code reads the field {@code settings} and calls the {@code on...} methods under the
+ * event lock; it keeps this object alive until the recognition is released.
+ */
+public final class Recognizer {
+    /** Receives the events, under the event lock: it must not block. */
+    public interface Events {
+        void onRecordingBegin();
+
+        void onSpeakingBegin();
+
+        void onRecordingDone();
+
+        void onPowerChanged(float power);
+
+        void onBufferReceived(byte[] buffer);
+
+        void onError(int code);
+
+        void onResults(int outcome, String[] texts, float[] confidences, String requestId);
+    }
+
+    static {
+        NativeLibrary.load();
+    }
+
+    private final Bundle settings;
+    private final Events events;
+
+    private Recognizer(Bundle settings, Events events) {
+        this.settings = settings;
+        this.events = events;
+    }
+
+    /**
+     * Starts a recognition. Events may arrive before this returns.
+     *
+     * @param engine from {@link Talvox#getHandle}
+     * @param settings what differs from the engine's settings
+     * @return the recognition; closing it ends it without a further event
+     */
+    public static NativeHandle start(long engine, Bundle settings, Events events) {
+        return new NativeHandle(
+                start(engine, new Recognizer(settings, events)), Recognizer::releaseRecognizer);
+    }
+
+    public static void stop(NativeHandle recognizer) {
+        recognizer.use(Recognizer::stop);
+    }
+
+    public static void cancel(NativeHandle recognizer) {
+        recognizer.use(Recognizer::cancel);
+    }
+
+    private static native long start(long engine, Recognizer object);
+
+    private static native void stop(long recognizer);
+
+    private static native void cancel(long recognizer);
+
+    private static native void releaseRecognizer(long recognizer);
+
+    private void onRecordingBegin() {
+        events.onRecordingBegin();
+    }
+
+    private void onSpeakingBegin() {
+        events.onSpeakingBegin();
+    }
+
+    private void onRecordingDone() {
+        events.onRecordingDone();
+    }
+
+    private void onPowerChanged(float power) {
+        events.onPowerChanged(power);
+    }
+
+    private void onBufferReceived(byte[] buffer) {
+        events.onBufferReceived(buffer);
+    }
+
+    private void onError(int code) {
+        events.onError(code);
+    }
+
+    private void onResults(
+            int outcome, String[] texts, float[] confidences, String requestId) {
+        events.onResults(outcome, texts, confidences, requestId);
+    }
+}
