@@ -5,6 +5,8 @@
 #pragma once
 
 #include <algorithm>
+#include <chrono>
+#include <condition_variable>
 #include <cstddef>
 #include <mutex>
 #include <string>
@@ -44,6 +46,15 @@ class LogCapture {
         });
     }
 
+    /** Waits until a message has been logged `times` times; false when it takes too long. */
+    bool waitFor(const std::string& message, std::size_t times = 1) const {
+        std::unique_lock<std::mutex> lock(mutex);
+        return changed.wait_for(lock, std::chrono::seconds(10), [&] {
+            return static_cast<std::size_t>(std::count(entries.begin(), entries.end(), message)) >=
+                   times;
+        });
+    }
+
     void clear() {
         const std::lock_guard<std::mutex> lock(mutex);
         entries.clear();
@@ -54,9 +65,11 @@ class LogCapture {
         auto* self = static_cast<LogCapture*>(user);
         const std::lock_guard<std::mutex> lock(self->mutex);
         self->entries.emplace_back(message);
+        self->changed.notify_all();
     }
 
     mutable std::mutex mutex;
+    mutable std::condition_variable changed;
     std::vector<std::string> entries;
 };
 

@@ -15,14 +15,20 @@ namespace TestSupport {
 
 namespace {
 
+/** Binds to a port, 0 for any; tells which. */
 int openLoopbackSocket(unsigned short& port) {
     const int descriptor = ::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0);
     sockaddr_in address{};
     address.sin_family = AF_INET;
     address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
+    address.sin_port = htons(port);
     socklen_t length = sizeof(address);
     auto* generic = reinterpret_cast<sockaddr*>(&address);
-    if (descriptor < 0 || ::bind(descriptor, generic, length) != 0 ||
+    // Connections of a server that has gone do not keep its port from the next one.
+    const int reuse = port != 0 ? 1 : 0;
+    if (descriptor < 0 ||
+        ::setsockopt(descriptor, SOL_SOCKET, SO_REUSEADDR, &reuse, sizeof(reuse)) != 0 ||
+        ::bind(descriptor, generic, length) != 0 ||
         ::getsockname(descriptor, generic, &length) != 0) {
         throw std::runtime_error("no loopback socket for the test server");
     }
@@ -293,8 +299,8 @@ class ScriptedHttpServer::Connection {
     bool open = true;
 };
 
-ScriptedHttpServer::ScriptedHttpServer() : defaultAnswer(Answer::status(200)) {
-    listener = openLoopbackSocket(port);
+ScriptedHttpServer::ScriptedHttpServer(unsigned short fixedPort)
+    : port(fixedPort), listener(openLoopbackSocket(port)), defaultAnswer(Answer::status(200)) {
     if (::listen(listener, 64) != 0) {
         throw std::runtime_error("the test server cannot listen");
     }

@@ -94,7 +94,8 @@ class ScriptedHttpServer {
         std::optional<std::string> header(const std::string& name) const;
     };
 
-    ScriptedHttpServer();
+    /** @param fixedPort the port to listen on, such as that of a server that has gone; 0: any */
+    explicit ScriptedHttpServer(unsigned short fixedPort = 0);
     ~ScriptedHttpServer();
     ScriptedHttpServer(const ScriptedHttpServer&) = delete;
     ScriptedHttpServer& operator=(const ScriptedHttpServer&) = delete;
@@ -141,8 +142,8 @@ class ScriptedHttpServer {
     template <typename Condition>
     bool waitUntil(std::chrono::milliseconds timeout, Condition condition) const;
 
-    int listener = -1;
-    unsigned short port = 0;
+    unsigned short port;
+    int listener;
     mutable std::mutex mutex;
     mutable std::condition_variable changed;
     std::deque<Answer> answers;
