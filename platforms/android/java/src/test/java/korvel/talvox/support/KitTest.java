@@ -1,0 +1,79 @@
+package korvel.talvox.support;
+
+import static org.junit.Assert.assertTrue;
+import static org.robolectric.Shadows.shadowOf;
+
+import android.Manifest;
+import android.app.Application;
+import android.os.Handler;
+import android.os.Looper;
+import java.util.concurrent.CountDownLatch;
+import java.util.concurrent.TimeUnit;
+import java.util.stream.Collectors;
+import org.junit.Before;
+import org.junit.runner.RunWith;
+import org.robolectric.RobolectricTestRunner;
+import org.robolectric.RuntimeEnvironment;
+import org.robolectric.annotation.Config;
+import org.robolectric.annotation.LooperMode;
+import org.robolectric.shadows.ShadowLog;
+
+/**
+ * A test with the framework classes and, as on a device, a main looper with a thread of its own.
+ * All tests have this configuration: the native library can be loaded by one class loader only.
+ */
+@RunWith(RobolectricTestRunner.class)
+@Config(sdk = 34)
+@LooperMode(LooperMode.Mode.INSTRUMENTATION_TEST)
+public abstract class KitTest {
+    /** Longest wait for anything that has to come, in seconds. */
+    public static final int PATIENCE_S = 60;
+
+    protected Application application;
+
+    @Before
+    public void allowRecording() {
+        application = RuntimeEnvironment.getApplication();
+        shadowOf(application).grantPermissions(Manifest.permission.RECORD_AUDIO);
+    }
+
+    /** Runs something on the main looper and waits until it has run. */
+    protected static void onMain(Runnable action) {
+        final CountDownLatch done = new CountDownLatch(1);
+        new Handler(Looper.getMainLooper())
+                .post(
+                        () -> {
+                            try {
+                                action.run();
+                            } finally {
+                                done.countDown();
+                            }
+                        });
+        await(done);
+    }
+
+    /** Waits until the main looper has run all that has been posted so far. */
+    protected static void drainMain() {
+        onMain(() -> {});
+    }
+
+    protected static void await(CountDownLatch latch) {
+        try {
+            assertTrue("nothing came", latch.await(PATIENCE_S, TimeUnit.SECONDS));
+        } catch (InterruptedException interrupted) {
+            throw new AssertionError(interrupted);
+        }
+    }
+
+    /** All that has been logged in this test, one line each. */
+    protected static String log() {
+        return ShadowLog.getLogs().stream()
+                .map(item -> item.msg)
+                .collect(Collectors.joining("\n"));
+    }
+
+    protected static void assertLogged(String text) {
+        final String log = log();
+        assertTrue("not logged: " + text + "\n" + log, log.contains(text));
+    }
+}
