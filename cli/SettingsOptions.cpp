@@ -19,7 +19,7 @@ namespace {
 using Util::Bundle;
 
 // Well beyond what the engine accepts; a device that never ends must not fill the memory.
-const std::size_t DOCUMENT_MAX_BYTES = 16 * 1024 * 1024;
+const std::size_t DOCUMENT_MAX_BYTES = std::size_t{16} * 1024 * 1024;
 
 bool parseBoolean(std::string text) {
     std::transform(text.begin(), text.end(), text.begin(), [](char character) {
@@ -152,7 +152,7 @@ void assign(Talvox::Settings& settings, const std::string& key, const std::strin
 }
 
 boost::shared_ptr<Talvox::Settings> buildSettings(const SettingsOptions& options) {
-    const auto settings = boost::make_shared<Talvox::Settings>();
+    auto settings = boost::make_shared<Talvox::Settings>();
     for (const auto& [key, text] : options.defaults) {
         assign(*settings, key, text);
     }

@@ -9,7 +9,6 @@
 namespace {
 
 using Cli::EventQueue;
-using Cli::SessionEvent;
 
 TEST(EventQueue, HandsEventsOnInOrder) {
     EventQueue queue;

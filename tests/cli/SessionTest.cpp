@@ -56,7 +56,7 @@ class SessionTest : public ::testing::Test {
     }
 
     /** Starts the session on a thread of its own; returns once recording runs. */
-    std::future<SessionEvent> start(Cli::Session& session, std::vector<int16_t> samples) {
+    std::future<SessionEvent> start(Cli::Session& session, const std::vector<int16_t>& samples) {
         std::promise<void> asked;
         Sound::Recorder::setFactory([&asked, samples] {
             asked.set_value();

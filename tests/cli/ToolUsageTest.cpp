@@ -93,7 +93,7 @@ TEST(Tool, RefusesBadSoundFiles) {
     ASSERT_TRUE(
         TestSupport::writeSoundFile(silent, SF_FORMAT_WAV | SF_FORMAT_PCM_16, 16000, 1, {}));
     const std::string cut = directory.write("cut.wav", TempDirectory::read(silent).substr(0, 30));
-    for (const std::string command : {"recognize", "vad"}) {
+    for (const char* command : {"recognize", "vad"}) {
         expectRefused({command, "--file", directory.path("nowhere.wav")},
                       "nowhere.wav: No such file or directory");
         expectRefused({command, "--file", directory.path()}, "it is a directory");
