@@ -8,6 +8,7 @@
 #include "pal/kd_assert.h"
 #include "pal/kd_log.h"
 #include "talvox/DummyRecognizer.h"
+#include "talvox/PlatformMechanism.h"
 #include "talvox/impl/EarlyInit.h"
 #include "talvox/impl/KorvelRecognizer.h"
 
@@ -167,6 +168,15 @@ boost::shared_ptr<Recognizer> Talvox::makeRecognizer(
     if (mechanism == MechanismKorvel) {
         return boost::make_shared<KorvelRecognizer>(this, settings);
     }
+    if (mechanism == MechanismPlatform) {
+        const Util::EventLock lock;
+        PlatformMechanism* const platform = PlatformMechanism::getInstalled();
+        boost::shared_ptr<Recognizer> recognizer;
+        if (platform != nullptr) {
+            recognizer = platform->createRecognizer(this, settings);
+        }
+        return recognizer ? recognizer : boost::make_shared<DummyRecognizer>(this, settings);
+    }
     if (mechanism != MechanismDummy) {
         assertUnknownMechanism();
     }
@@ -177,7 +187,10 @@ const std::vector<std::string>& Talvox::getAvailableLanguages() const {
     static std::vector<std::string> languages;
     const Util::EventLock lock;
     if (languages.empty()) {
-        languages = mergeLanguages(KorvelRecognizer::getAvailableLanguages(), {});
+        PlatformMechanism* const platform = PlatformMechanism::getInstalled();
+        languages = mergeLanguages(
+            KorvelRecognizer::getAvailableLanguages(),
+            platform != nullptr ? platform->getAvailableLanguages() : std::vector<std::string>());
     }
     return languages;
 }
@@ -192,7 +205,9 @@ std::vector<std::string> Talvox::mergeLanguages(const std::vector<std::string>& 
 }
 
 bool Talvox::isPlatformSupported() {
-    return false;
+    const Util::EventLock lock;
+    PlatformMechanism* const platform = PlatformMechanism::getInstalled();
+    return platform != nullptr && platform->isRecognitionAvailable();
 }
 
 }  // namespace Talvox

@@ -154,6 +154,14 @@ bool Bundle::hasKey(const std::string& key) const {
     return rep.count(normalizeKey(key)) > 0;
 }
 
+std::vector<std::string> Bundle::getKeys() const {
+    std::vector<std::string> keys;
+    for (const auto& entry : rep) {
+        keys.push_back(entry.first);
+    }
+    return keys;
+}
+
 boost::shared_ptr<Bundle> Bundle::clone() const {
     boost::shared_ptr<Bundle> copy = boost::make_shared<Bundle>();
     for (const auto& entry : rep) {

@@ -8,6 +8,7 @@
 #include <cstdint>
 #include <map>
 #include <string>
+#include <vector>
 
 #include "talvox/Export.h"
 
@@ -95,6 +96,9 @@ class TALVOX_API Bundle {
     ElemType getType(const std::string& key) const;
     /** Never fails. */
     bool hasKey(const std::string& key) const;
+
+    /** All keys, normalised, in the bundle's order. */
+    std::vector<std::string> getKeys() const;
 
     /** A new bundle with the same elements; sub-bundles are shared with this one. */
     boost::shared_ptr<Bundle> clone() const;

@@ -69,6 +69,15 @@ TEST(BundleKeys, NormalizingKeepsEverythingElse) {
     EXPECT_EQ(std::string("a\0b", 3), Bundle::normalizeKey(std::string("A\0B", 3)));
 }
 
+TEST(BundleKeys, AreListedNormalizedInByteOrder) {
+    Util::Bundle bundle;
+    EXPECT_TRUE(bundle.getKeys().empty());
+    bundle.putInt("Sample_Rate", 1);
+    bundle.putInt("a", 2);
+    bundle.putInt("ab", 3);
+    EXPECT_EQ(bundle.getKeys(), (std::vector<std::string>{"a", "ab", "samplerate"}));
+}
+
 TEST(BundleValues, EveryTypeIsReadAsItWasStored) {
     Bundle bundle;
     const auto sub = boost::make_shared<Bundle>();

@@ -1,8 +1,10 @@
 #include "Env.h"
 
 #include <algorithm>
+#include <stdexcept>
 
 #include "Text.h"
+#include "pal/kd_jni.h"
 #include "pal/kd_log.h"
 
 namespace Jni {
@@ -32,6 +34,14 @@ std::string describe(JNIEnv* env, jthrowable exception) {
 
 }  // namespace
 
+JNIEnv* getEnv() {
+    JNIEnv* const env = kdGetJNIEnvKOR();
+    if (env == nullptr) {
+        throw std::runtime_error("no Java VM");
+    }
+    return env;
+}
+
 void check(JNIEnv* env) {
     if (env->ExceptionCheck() != JNI_FALSE) {
         throw PendingException();
@@ -49,8 +59,9 @@ void throwNew(JNIEnv* env, const char* className, const std::string& message) no
         const LocalRef<jobject> exception =
             newObject(env, type.get(), "(Ljava/lang/String;)V", text.get());
         env->Throw(static_cast<jthrowable>(exception.get()));
-    } catch (const PendingException&) {
-        return;  // that one tells about the failure, too
+    } catch (...) {
+        // What failed here has left a Java exception, too.
+        return;
     }
 }
 
@@ -74,7 +85,7 @@ void logAndClear(JNIEnv* env, const char* where) noexcept {
     try {
         kdLogFormatMessage("Java exception in %s: %s", where,
                            describe(env, exception.get()).c_str());
-    } catch (const PendingException&) {
+    } catch (...) {
         env->ExceptionClear();
         kdLogFormatMessage("Java exception in %s that does not describe itself", where);
     }

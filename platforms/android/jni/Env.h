@@ -15,6 +15,9 @@ namespace Jni {
 /** Thrown while a Java exception is pending on the thread; carries nothing itself. */
 class PendingException {};
 
+/** The calling thread's environment. @throw std::runtime_error where there is no VM (any more) */
+JNIEnv* getEnv();
+
 /** Throws `PendingException` when a Java exception is pending. */
 void check(JNIEnv* env);
 

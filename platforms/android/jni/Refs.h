@@ -16,8 +16,7 @@ template <typename T>
 class LocalRef {
   public:
     LocalRef(JNIEnv* environment, T object) : env(environment), ref(object) {}
-    LocalRef(LocalRef&& other) noexcept
-        : env(other.env), ref(std::exchange(other.ref, nullptr)) {}
+    LocalRef(LocalRef&& other) noexcept : env(other.env), ref(std::exchange(other.ref, nullptr)) {}
     LocalRef(const LocalRef&) = delete;
     LocalRef& operator=(const LocalRef&) = delete;
     LocalRef& operator=(LocalRef&&) = delete;

@@ -1,0 +1,86 @@
+/**
+ * @file
+ * The recognizer that uses the platform's own speech recogniser.
+ */
+#pragma once
+
+#include <jni.h>
+
+#include <boost/shared_ptr.hpp>
+#include <cstdint>
+#include <string>
+#include <vector>
+
+#include "Refs.h"
+#include "core/sound/SoundDataBuffer.h"
+#include "talvox/Recognizer.h"
+#include "talvox/impl/ParallelEncoder.h"
+
+/**
+ * Drives a Java object that drives Android's recogniser, and turns its callbacks into the events
+ * of a recognition. By policy it also uploads what was recognised, and the sound, to the service;
+ * nobody waits for that upload.
+ *
+ * `start`, `stop`, `cancel` and the destructor take the event lock; everything else is called
+ * under it. After the one end of a session (results or an error) the callbacks have no effect.
+ */
+class PlatformRecognizer : public Talvox::Recognizer {
+  public:
+    PlatformRecognizer(const Talvox::Talvox* facade,
+                       boost::shared_ptr<const Talvox::Settings> recognizerSettings);
+    ~PlatformRecognizer() override;
+
+    /** Makes an object at an address that no earlier one had for long: Java knows it by that. */
+    static boost::shared_ptr<PlatformRecognizer> create(
+        const Talvox::Talvox* facade, const boost::shared_ptr<const Talvox::Settings>& settings);
+
+    void start() override;
+    void stop() override;
+    void cancel() override;
+
+    /** Whether the device has a recogniser; false outside Android. */
+    static bool isRecognitionAvailable();
+    /** What the device's recogniser says so far. */
+    static const std::vector<std::string>& getAvailableLanguages();
+
+    void onReadyForSpeech();
+    void onBeginningOfSpeech();
+    void onRmsChanged(float rms);
+    /** Sound for the upload: 16-bit mono at 8000 Hz. */
+    void onBufferReceived(const char* data, unsigned size);
+    void onEndOfSpeech();
+    /** Partial results are not reported. */
+    void onPartialResults(const boost::shared_ptr<const Talvox::RecognitionResults>& results);
+    void onResults(const boost::shared_ptr<const Talvox::RecognitionResults>& results);
+    /** @param code a `SpeechError` code, or -1: the session ended without a hypothesis */
+    void onError(int code);
+
+  private:
+    void chooseLogging();
+    void prepareSound(bool isWifi);
+    void createJavaObject();
+    void cancelSilently();
+    void endWithError(int code);
+    template <typename Call>
+    void announce(Call call);
+
+    void finishWithResults(const boost::shared_ptr<const Talvox::RecognitionResults>& results);
+    void makeHttpRequest(const boost::shared_ptr<const Sound::SoundDataBuffer>& sound);
+    void submitLog(const boost::shared_ptr<const Sound::SoundDataBuffer>& sound);
+    int getMsSinceRequest() const;
+
+    std::string getModel();
+    std::string getLanguagePreference();
+    std::string getSource();
+    std::string getStringProperty(const char* methodName);
+
+    Jni::GlobalRef jobj;
+    bool loggingEnabled = false;
+    bool logWithSound = false;
+    bool encodeWithSpeex = false;
+    boost::shared_ptr<Sound::SoundDataBuffer> pcmBuffer;
+    boost::shared_ptr<Talvox::ParallelEncoder> encoder;
+    boost::shared_ptr<const Talvox::RecognitionResults> pendingResults;
+    int64_t requestTime = 0;
+    bool over = false;
+};

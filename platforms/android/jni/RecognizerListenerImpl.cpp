@@ -1,0 +1,128 @@
+#include "RecognizerListenerImpl.h"
+
+#include <exception>
+
+#include "Env.h"
+#include "Text.h"
+#include "pal/kd_jni.h"
+#include "pal/kd_log.h"
+
+namespace {
+
+/** References that an event needs besides those of its hypotheses. */
+const jint FRAME_SIZE = 10;
+
+Jni::LocalRef<jobjectArray> makeTexts(JNIEnv* env, const Talvox::RecognitionResults& results) {
+    std::vector<std::string> texts;
+    for (std::size_t index = 0; index < results.size(); ++index) {
+        texts.push_back(results.at(index).getText());
+    }
+    return Jni::toJStrings(env, texts);
+}
+
+Jni::LocalRef<jfloatArray> makeConfidences(JNIEnv* env, const Talvox::RecognitionResults& results) {
+    std::vector<jfloat> values;
+    for (std::size_t index = 0; index < results.size(); ++index) {
+        values.push_back(results.at(index).getConfidence());
+    }
+    const auto count = static_cast<jsize>(values.size());
+    Jni::LocalRef<jfloatArray> array(env, env->NewFloatArray(count));
+    Jni::check(env);
+    env->SetFloatArrayRegion(array.get(), 0, count, values.data());
+    Jni::check(env);
+    return array;
+}
+
+}  // namespace
+
+RecognizerListenerImpl::~RecognizerListenerImpl() = default;
+
+void RecognizerListenerImpl::attach(JNIEnv* env, jobject object) {
+    const Jni::LocalRef<jclass> type(env, env->GetObjectClass(object));
+    javaObject = Jni::GlobalRef(env, object);
+    javaClass = Jni::GlobalRef(env, type.get());
+}
+
+void RecognizerListenerImpl::detach() {
+    javaObject.reset();
+    javaClass.reset();
+}
+
+template <typename Event>
+void RecognizerListenerImpl::deliver(const char* name, jint localReferences, Event event) {
+    JNIEnv* const env = kdGetJNIEnvKOR();
+    if (env == nullptr || !javaObject) {
+        return;
+    }
+    try {
+        const Jni::LocalFrame frame(env, localReferences);
+        event(env);
+    } catch (const Jni::PendingException&) {
+        Jni::logAndClear(env, name);
+    } catch (const std::exception& failure) {
+        kdLogFormatMessage("%s is lost: %s", name, failure.what());
+    }
+}
+
+template <typename... Args>
+void RecognizerListenerImpl::callJava(JNIEnv* env, const char* name, const char* signature,
+                                      Args... args) {
+    const jmethodID method = Jni::findMethod(env, javaClass.getClass(), name, signature);
+    env->CallNonvirtualVoidMethod(javaObject.get(), javaClass.getClass(), method, args...);
+    Jni::check(env);
+}
+
+void RecognizerListenerImpl::onRecordingBegin(Talvox::Recognizer* /*source*/) {
+    deliver("onRecordingBegin", FRAME_SIZE,
+            [this](JNIEnv* env) { callJava(env, "onRecordingBegin", "()V"); });
+}
+
+void RecognizerListenerImpl::onSpeakingBegin(Talvox::Recognizer* /*source*/) {
+    deliver("onSpeakingBegin", FRAME_SIZE,
+            [this](JNIEnv* env) { callJava(env, "onSpeakingBegin", "()V"); });
+}
+
+void RecognizerListenerImpl::onRecordingDone(Talvox::Recognizer* /*source*/) {
+    deliver("onRecordingDone", FRAME_SIZE,
+            [this](JNIEnv* env) { callJava(env, "onRecordingDone", "()V"); });
+}
+
+void RecognizerListenerImpl::onBufferReceived(Talvox::Recognizer* /*source*/,
+                                              const Sound::SoundDataBuffer& buffer) {
+    deliver("onBufferReceived", FRAME_SIZE, [this, &buffer](JNIEnv* env) {
+        const std::vector<unsigned char>& data = buffer.getData();
+        const auto size = static_cast<jsize>(data.size());
+        const Jni::LocalRef<jbyteArray> bytes(env, env->NewByteArray(size));
+        Jni::check(env);
+        env->SetByteArrayRegion(bytes.get(), 0, size, reinterpret_cast<const jbyte*>(data.data()));
+        Jni::check(env);
+        callJava(env, "onBufferReceived", "([B)V", bytes.get());
+    });
+}
+
+void RecognizerListenerImpl::onPowerChanged(Talvox::Recognizer* /*source*/, float power) {
+    deliver("onPowerChanged", FRAME_SIZE, [this, power](JNIEnv* env) {
+        callJava(env, "onPowerChanged", "(F)V", static_cast<jfloat>(power));
+    });
+}
+
+void RecognizerListenerImpl::onResults(Talvox::Recognizer* /*source*/,
+                                       boost::shared_ptr<Talvox::Recognition> recognition) {
+    const Talvox::RecognitionResults& results = *recognition->getResults();
+    deliver("onResults", static_cast<jint>(results.size()) + FRAME_SIZE,
+            [this, &recognition, &results](JNIEnv* env) {
+                const Jni::LocalRef<jobjectArray> texts = makeTexts(env, results);
+                const Jni::LocalRef<jfloatArray> confidences = makeConfidences(env, results);
+                const Jni::LocalRef<jstring> request =
+                    Jni::toJString(env, recognition->getRequestId());
+                callJava(env, "onResults", "(I[Ljava/lang/String;[FLjava/lang/String;)V",
+                         static_cast<jint>(recognition->getOutcome()), texts.get(),
+                         confidences.get(), request.get());
+            });
+}
+
+void RecognizerListenerImpl::onError(Talvox::Recognizer* /*source*/, Talvox::SpeechError error) {
+    deliver("onError", FRAME_SIZE, [this, error](JNIEnv* env) {
+        callJava(env, "onError", "(I)V", static_cast<jint>(error.getCode()));
+    });
+}
