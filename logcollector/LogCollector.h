@@ -74,7 +74,8 @@ class TALVOX_API LogCollector : public Util::Singleton<LogCollector> {
 
     /**
      * Sends an event of an open session; for a session that is not open it is dropped.
-     * @param params any bytes in names and values; a record is at most about 8 MB long when encoded
+     * @param params any bytes in names and values. A record of more than 1,000,000 bytes when
+     *               percent-encoded cannot be sent: it is tried in vain and holds nothing else up.
      */
     void logEvent(const std::string& sessionId, const std::string& name,
                   const std::map<std::string, std::string>& params);

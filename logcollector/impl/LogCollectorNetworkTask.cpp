@@ -19,6 +19,11 @@ const std::string LogCollectorNetworkTask::TAG("LogCollectorNetworkTask");
 LogCollectorNetworkTask::LogCollectorNetworkTask(std::string recordText, Callback completion)
     : record(std::move(recordText)), callback(std::move(completion)) {}
 
+bool LogCollectorNetworkTask::isTooLong(const std::string& record) {
+    return record.size() > MAX_ENCODED_BYTES ||
+           Util::UrlCoder::urlEncodeString(record).size() > MAX_ENCODED_BYTES;
+}
+
 bool LogCollectorNetworkTask::isReadyToPerform() const {
     return true;
 }
@@ -29,6 +34,11 @@ boost::shared_ptr<Network::HttpRequest> LogCollectorNetworkTask::issueRequest() 
     // What follows a "#" is never sent: the endpoint would confirm a record that it did not get.
     if (prefix.find('#') != std::string::npos) {
         Logger::log(Logger::PROBLEM, "%s: no record can follow %s", TAG.c_str(), prefix.c_str());
+        return nullptr;
+    }
+    if (isTooLong(record)) {
+        Logger::log(Logger::PROBLEM, "%s: a record of %zu bytes is too long", TAG.c_str(),
+                    record.size());
         return nullptr;
     }
     const std::string address = prefix + "&logmessage=" + Util::UrlCoder::urlEncodeString(record);

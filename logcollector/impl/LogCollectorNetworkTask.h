@@ -5,6 +5,7 @@
 #pragma once
 
 #include <boost/shared_ptr.hpp>
+#include <cstddef>
 #include <functional>
 #include <string>
 #include <vector>
@@ -24,6 +25,12 @@ class LogCollectorNetworkTask : public Network::NetworkTask {
     static const std::string TAG;
 
     static constexpr int TIMEOUT_MS = 30000;
+
+    /** The network layer sends no longer head of a request than about 1 MiB. */
+    static constexpr std::size_t MAX_ENCODED_BYTES = 1000000;
+
+    /** A record that no request can carry, whatever the address. */
+    static bool isTooLong(const std::string& record);
 
     LogCollectorNetworkTask(std::string recordText, Callback completion);
 

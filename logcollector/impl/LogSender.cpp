@@ -145,7 +145,7 @@ void LogSender::onRequestComplete(bool success, const std::string& record, int s
     if (!success) {
         append(record);
         startTimer();
-        holdBack(status);
+        holdBack(record, status);
         Logger::log(Logger::PROBLEM, "%s: a dummy record send request fails", TAG.c_str());
     }
     if (isWorking()) {
@@ -160,11 +160,11 @@ void LogSender::onRequestComplete(bool success, const std::string& record, int s
 }
 
 // The retry policy spaces the attempts of what it repeats. An endpoint that refuses at once, with a
-// status that is final for the policy, gets no more requests than that; and where no request can be
-// made at all, trying the next record would be as useless.
-void LogSender::holdBack(int status) {
+// status that is final for the policy, gets no more requests than that; and where the address makes
+// every request impossible, trying the next record would be as useless.
+void LogSender::holdBack(const std::string& record, int status) {
     const int64_t now = kdGetTimeUST();
-    if (status == Network::NetworkTask::NO_REQUEST) {
+    if (status == Network::NetworkTask::NO_REQUEST && !LogCollectorNetworkTask::isTooLong(record)) {
         hold = Hold::REFUSED;
     } else if (lastFailureAt && now - *lastFailureAt < RETRY_DELAY_MS * NS_PER_MS) {
         hold = Hold::PAUSED;

@@ -77,7 +77,7 @@ class LogSender : public Network::NetworkTaskHolder {
     };
 
     void append(const std::string& record);
-    void holdBack(int status);
+    void holdBack(const std::string& record, int status);
     void goOn();
 
     std::list<std::string> queue;

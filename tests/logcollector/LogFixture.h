@@ -3,12 +3,14 @@
 #include <gmock/gmock.h>
 #include <gtest/gtest.h>
 
+#include <boost/make_shared.hpp>
 #include <condition_variable>
 #include <mutex>
 #include <string>
 #include <vector>
 
 #include "core/Logger.h"
+#include "core/network/NetworkTaskHolder.h"
 #include "core/util/Singleton.h"
 #include "core/util/UrlCoder.h"
 #include "logcollector/LogCollector.h"
@@ -17,6 +19,7 @@
 #include "support/ScriptedHttpServer.h"
 
 const char* const FAILURE = "LogSender: a dummy record send request fails";
+const char* const NETWORK_FAILURE = "Network: a request failed: ";
 const char* const UUID = "0123456789abcdef0123456789abcdef";
 const char* const MESSAGE_KEY = "&logmessage=";
 
@@ -51,6 +54,21 @@ class Signal {
     std::size_t count = 0;
 };
 
+/** Passes through the network thread and ends on the event thread; nothing is sent. */
+class BarrierTask : public Network::NetworkTask {
+  public:
+    explicit BarrierTask(Signal& signal) : passed(signal) {}
+
+    bool isReadyToPerform() const override { return false; }
+    boost::shared_ptr<Network::HttpRequest> issueRequest() const override { return nullptr; }
+    void onResponseRecieved(boost::shared_ptr<Network::HttpResponse>) override {}
+    void onBytesReceived(const std::vector<unsigned char>&) override {}
+    void onFinished(int) override { passed.raise(); }
+
+  private:
+    Signal& passed;
+};
+
 /** An endpoint, a collector that is to use it, and a clock that only the test moves. */
 class LogFixture : public ::testing::Test {
   protected:
@@ -72,9 +90,23 @@ class LogFixture : public ::testing::Test {
 
     static void advanceMs(int64_t milliseconds) { kdAdvanceClockKOR(milliseconds * 1000000); }
 
+    /**
+     * Waits until the network thread and the event thread have done what they know of, and what
+     * the event thread gave the network thread to do then.
+     */
+    static void settle() {
+        for (int round = 0; round < 2; ++round) {
+            Signal passed;
+            Network::NetworkTaskHolder holder;
+            holder.submitNoRetries(boost::make_shared<BarrierTask>(passed));
+            ASSERT_TRUE(passed.waitFor(1));
+        }
+    }
+
+    /** Path and query of a request. */
     std::string addressOf(std::size_t request) const {
         const std::string line = server.getRequest(request).line();
-        return line.substr(0, line.rfind(' '));
+        return line.substr(4, line.rfind(' ') - 4);  // between the method and the protocol
     }
 
     std::string recordOf(std::size_t request) const { return recordIn(addressOf(request)); }

@@ -46,13 +46,15 @@ class LogCapture {
         });
     }
 
-    /** Waits until a message has been logged `times` times; false when it takes too long. */
+    /** Waits until exactly this message was logged `times` times; false when it takes too long. */
     bool waitFor(const std::string& message, std::size_t times = 1) const {
-        std::unique_lock<std::mutex> lock(mutex);
-        return changed.wait_for(lock, std::chrono::seconds(10), [&] {
-            return static_cast<std::size_t>(std::count(entries.begin(), entries.end(), message)) >=
-                   times;
-        });
+        return waitUntil(times, [&](const std::string& entry) { return entry == message; });
+    }
+
+    /** Waits until `times` messages have `part` somewhere in them; false when it takes too long. */
+    bool waitForPart(const std::string& part, std::size_t times = 1) const {
+        return waitUntil(
+            times, [&](const std::string& entry) { return entry.find(part) != std::string::npos; });
     }
 
     void clear() {
@@ -61,6 +63,15 @@ class LogCapture {
     }
 
   private:
+    template <typename Match>
+    bool waitUntil(std::size_t times, Match match) const {
+        std::unique_lock<std::mutex> lock(mutex);
+        return changed.wait_for(lock, std::chrono::seconds(10), [&] {
+            return static_cast<std::size_t>(std::count_if(entries.begin(), entries.end(), match)) >=
+                   times;
+        });
+    }
+
     static void receive(const char* message, void* user) {
         auto* self = static_cast<LogCapture*>(user);
         const std::lock_guard<std::mutex> lock(self->mutex);
