@@ -25,11 +25,14 @@ int openLoopbackSocket(unsigned short& port) {
     socklen_t length = sizeof(address);
     auto* generic = reinterpret_cast<sockaddr*>(&address);
     // Connections of a server that has gone do not keep its port from the next one.
-    const int reuse = port != 0 ? 1 : 0;
-    if (descriptor < 0 ||
-        ::setsockopt(descriptor, SOL_SOCKET, SO_REUSEADDR, &reuse, sizeof(reuse)) != 0 ||
-        ::bind(descriptor, generic, length) != 0 ||
-        ::getsockname(descriptor, generic, &length) != 0) {
+    // Where any port will do, the option must not let us share one, so it follows the binding.
+    const int reuse = 1;
+    const bool early = port != 0;
+    const auto shareOldPort = [descriptor, &reuse] {
+        return ::setsockopt(descriptor, SOL_SOCKET, SO_REUSEADDR, &reuse, sizeof(reuse)) == 0;
+    };
+    if (descriptor < 0 || (early && !shareOldPort()) || ::bind(descriptor, generic, length) != 0 ||
+        !shareOldPort() || ::getsockname(descriptor, generic, &length) != 0) {
         throw std::runtime_error("no loopback socket for the test server");
     }
     port = ntohs(address.sin_port);
