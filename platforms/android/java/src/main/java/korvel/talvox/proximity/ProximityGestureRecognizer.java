@@ -52,8 +52,10 @@ public final class ProximityGestureRecognizer implements AutoCloseable {
      * Adds a gesture to those that are looked for.
      *
      * @param name what the listener is told
-     * @param pattern spans of time during which something is near or far, oldest first, for example
-     *     {@code "near 50-500, far 50-500, near 50-500"} in milliseconds
+     * @param pattern spans of time during which something is near or far, oldest first: each {@code
+     *     near:} or {@code far:} with its least and its greatest length in milliseconds, as in
+     *     {@code "near:50-500 far:50-500 near:50-500"} for a hand that waves twice. Without the
+     *     greatest it may last for ever: {@code "near:1000-"}
      * @throws IllegalArgumentException if the pattern is not understood
      * @throws IllegalStateException if this is closed
      */

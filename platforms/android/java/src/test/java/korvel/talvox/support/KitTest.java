@@ -38,7 +38,7 @@ public abstract class KitTest {
     }
 
     /** Runs something on the main looper and waits until it has run. */
-    protected static void onMain(Runnable action) {
+    public static void onMain(Runnable action) {
         final CountDownLatch done = new CountDownLatch(1);
         new Handler(Looper.getMainLooper())
                 .post(
@@ -53,7 +53,7 @@ public abstract class KitTest {
     }
 
     /** Waits until the main looper has run all that has been posted so far. */
-    protected static void drainMain() {
+    public static void drainMain() {
         onMain(() -> {});
     }
 

@@ -1,0 +1,116 @@
+package korvel.talvox.support;
+
+import java.io.IOException;
+import java.io.UncheckedIOException;
+import java.nio.ByteBuffer;
+import java.nio.ByteOrder;
+import java.nio.file.Files;
+import java.nio.file.Paths;
+import java.util.Random;
+import java.util.concurrent.Executors;
+import java.util.concurrent.ScheduledExecutorService;
+import java.util.concurrent.Semaphore;
+import java.util.concurrent.TimeUnit;
+import org.robolectric.shadows.ShadowAudioRecord;
+
+/**
+ * The microphone of a test: 16-bit mono sound, then quiet noise without end, at a multiple of the
+ * speed of real time. A read waits until its samples are due, as that of a device does.
+ */
+public final class Microphone implements ShadowAudioRecord.AudioRecordSource, AutoCloseable {
+    private static final int TICK_MS = 10;
+    private static final int NOISE_AMPLITUDE = 8;
+
+    private final byte[] sound;
+    private final Random noise = new Random(1);
+    private final Semaphore due = new Semaphore(0);
+    private final ScheduledExecutorService clock =
+            Executors.newSingleThreadScheduledExecutor(
+                    task -> {
+                        final Thread thread = new Thread(task, "microphone");
+                        thread.setDaemon(true);
+                        return thread;
+                    });
+    private int position;
+
+    /**
+     * @param sound what is said
+     * @param sampleRateHz of the sound
+     * @param speed 1 for real time
+     */
+    public Microphone(byte[] sound, int sampleRateHz, int speed) {
+        this.sound = sound;
+        final int bytesPerTick = 2 * sampleRateHz * TICK_MS * speed / 1000;
+        clock.scheduleAtFixedRate(
+                () -> due.release(bytesPerTick), 0, TICK_MS, TimeUnit.MILLISECONDS);
+    }
+
+    /** Opens it for the recordings that begin from now on. */
+    public Microphone plugIn() {
+        ShadowAudioRecord.setSource(this);
+        return this;
+    }
+
+    /** Half a second of quiet, a recording of 16 kHz from the test data, then quiet. */
+    public static byte[] recording(String name) {
+        try {
+            final byte[] speech =
+                    Files.readAllBytes(Paths.get(System.getProperty("talvox.recordings"), name));
+            final byte[] sound = new byte[16000 + speech.length];
+            fill(sound, 0, 16000, new Random(2));
+            System.arraycopy(speech, 0, sound, 16000, speech.length);
+            return sound;
+        } catch (IOException failure) {
+            throw new UncheckedIOException(failure);
+        }
+    }
+
+    private static void fill(byte[] target, int from, int size, Random noise) {
+        final ByteBuffer samples =
+                ByteBuffer.wrap(target, from, size).order(ByteOrder.LITTLE_ENDIAN);
+        while (samples.remaining() >= 2) {
+            samples.putShort((short) (noise.nextInt(2 * NOISE_AMPLITUDE + 1) - NOISE_AMPLITUDE));
+        }
+    }
+
+    @Override
+    public int readInByteArray(byte[] target, int offset, int size, boolean isBlocking) {
+        if (isBlocking) {
+            due.acquireUninterruptibly(size);
+        } else if (!due.tryAcquire(size)) {
+            return 0;
+        }
+        synchronized (this) {
+            final int rest = Math.min(size, sound.length - position);
+            System.arraycopy(sound, position, target, offset, rest);
+            fill(target, offset + rest, size - rest, noise);
+            position += rest;
+        }
+        return size;
+    }
+
+    @Override
+    public int readInShortArray(short[] target, int offset, int size, boolean isBlocking) {
+        final byte[] bytes = new byte[2 * size];
+        final int read = readInByteArray(bytes, 0, bytes.length, isBlocking);
+        ByteBuffer.wrap(bytes, 0, read)
+                .order(ByteOrder.LITTLE_ENDIAN)
+                .asShortBuffer()
+                .get(target, offset, read / 2);
+        return read / 2;
+    }
+
+    @Override
+    public int readInDirectBuffer(ByteBuffer target, int size, boolean isBlocking) {
+        final byte[] bytes = new byte[size];
+        final int read = readInByteArray(bytes, 0, size, isBlocking);
+        target.duplicate().put(bytes, 0, read);
+        return read;
+    }
+
+    @Override
+    public void close() {
+        clock.shutdownNow();
+        due.release(1 << 28); // whoever still reads gets noise at once
+    }
+}

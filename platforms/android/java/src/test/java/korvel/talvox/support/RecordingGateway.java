@@ -1,0 +1,124 @@
+package korvel.talvox.support;
+
+import static org.junit.Assert.assertNotNull;
+import static org.junit.Assert.assertTrue;
+
+import com.sun.net.httpserver.HttpExchange;
+import com.sun.net.httpserver.HttpServer;
+import java.io.ByteArrayOutputStream;
+import java.io.IOException;
+import java.io.UncheckedIOException;
+import java.net.InetAddress;
+import java.net.InetSocketAddress;
+import java.nio.charset.StandardCharsets;
+import java.util.LinkedHashMap;
+import java.util.Map;
+import java.util.concurrent.BlockingQueue;
+import java.util.concurrent.CountDownLatch;
+import java.util.concurrent.ExecutorService;
+import java.util.concurrent.Executors;
+import java.util.concurrent.LinkedBlockingQueue;
+import java.util.concurrent.TimeUnit;
+
+/** A gateway that keeps each request and answers with nothing recognised, or when it is told to. */
+public final class RecordingGateway implements AutoCloseable {
+    /** One request. */
+    public static final class Request {
+        public final String path;
+        public final String query;
+        public final Map<String, byte[]> parts;
+
+        Request(String path, String query, Map<String, byte[]> parts) {
+            this.path = path;
+            this.query = query;
+            this.parts = parts;
+        }
+
+        public String text(String part) {
+            final byte[] bytes = parts.get(part);
+            assertNotNull("no part " + part + " in " + parts.keySet(), bytes);
+            return new String(bytes, StandardCharsets.UTF_8);
+        }
+    }
+
+    private final HttpServer server;
+    private final ExecutorService threads = Executors.newCachedThreadPool();
+    private final BlockingQueue<Request> requests = new LinkedBlockingQueue<>();
+    private final CountDownLatch answering;
+
+    /**
+     * @param answers false to let every client wait for its answer until {@link #close}
+     */
+    public RecordingGateway(boolean answers) {
+        answering = new CountDownLatch(answers ? 0 : 1);
+        try {
+            server = HttpServer.create(new InetSocketAddress(InetAddress.getLoopbackAddress(), 0), 0);
+        } catch (IOException failure) {
+            throw new UncheckedIOException(failure);
+        }
+        server.createContext("/", this::handle);
+        server.setExecutor(threads);
+        server.start();
+    }
+
+    public String getUrl() {
+        return "http://127.0.0.1:" + server.getAddress().getPort();
+    }
+
+    /** Waits for the next request. */
+    public Request take() throws InterruptedException {
+        final Request request = requests.poll(KitTest.PATIENCE_S, TimeUnit.SECONDS);
+        assertNotNull("no request came", request);
+        return request;
+    }
+
+    public boolean isEmpty() {
+        return requests.isEmpty();
+    }
+
+    private void handle(HttpExchange exchange) throws IOException {
+        final ByteArrayOutputStream body = new ByteArrayOutputStream();
+        exchange.getRequestBody().transferTo(body);
+        final String type = exchange.getRequestHeaders().getFirst("Content-Type");
+        requests.add(
+                new Request(
+                        exchange.getRequestURI().getPath(),
+                        exchange.getRequestURI().getQuery(),
+                        type != null && type.contains("boundary=")
+                                ? parse(body.toString("ISO-8859-1"), boundary(type))
+                                : new LinkedHashMap<>()));
+        try {
+            answering.await();
+        } catch (InterruptedException closing) {
+            exchange.close();
+            return;
+        }
+        exchange.sendResponseHeaders(200, -1);
+        exchange.close();
+    }
+
+    private static String boundary(String type) {
+        return type.substring(type.indexOf("boundary=") + 9).replace("\"", "");
+    }
+
+    private static Map<String, byte[]> parse(String body, String boundary) {
+        final Map<String, byte[]> parts = new LinkedHashMap<>();
+        final String[] pieces = ("\r\n" + body).split("\r\n--" + boundary, -1);
+        assertTrue("not closed: " + body, pieces[pieces.length - 1].startsWith("--"));
+        for (int i = 1; i < pieces.length - 1; i++) {
+            final int end = pieces[i].indexOf("\r\n\r\n");
+            final String header = pieces[i].substring(0, end);
+            final int name = header.indexOf("name=\"") + 6;
+            parts.put(
+                    header.substring(name, header.indexOf('"', name)),
+                    pieces[i].substring(end + 4).getBytes(StandardCharsets.ISO_8859_1));
+        }
+        return parts;
+    }
+
+    @Override
+    public void close() {
+        server.stop(0);
+        threads.shutdownNow();
+    }
+}
