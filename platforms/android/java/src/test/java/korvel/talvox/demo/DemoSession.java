@@ -1,0 +1,97 @@
+package korvel.talvox.demo;
+
+import java.util.concurrent.CountDownLatch;
+import korvel.talvox.Hypothesis;
+import korvel.talvox.Recognition;
+import korvel.talvox.RecognitionListener;
+import korvel.talvox.SpeechError;
+import korvel.talvox.TalvoxEngine;
+import korvel.talvox.TalvoxRecognizer;
+import korvel.talvox.TalvoxSettings;
+import korvel.talvox.support.DevelopmentGateway;
+import korvel.talvox.support.KitTest;
+import korvel.talvox.support.Microphone;
+import org.junit.Test;
+
+/** What the demo does; as code of an application, apart from the microphone. */
+public class DemoSession extends KitTest {
+    private static final long BEGIN = System.nanoTime();
+
+    /** Prints each event with its time. */
+    private static final class Printer implements RecognitionListener {
+        private final CountDownLatch over = new CountDownLatch(1);
+        private int buffers;
+        private int levels;
+
+        private static void print(String event) {
+            System.out.printf("%7.3f s  %s%n", (System.nanoTime() - BEGIN) / 1e9, event);
+        }
+
+        @Override
+        public void onRecordingBegin() {
+            print("recording began");
+        }
+
+        @Override
+        public void onSpeakingBegin() {
+            print("speech began");
+        }
+
+        @Override
+        public void onBufferReceived(byte[] pcm) {
+            buffers++;
+        }
+
+        @Override
+        public void onPowerChanged(float level) {
+            levels++;
+        }
+
+        @Override
+        public void onRecordingDone() {
+            print("recording done, " + buffers + " buffers, " + levels + " levels");
+        }
+
+        @Override
+        public void onResults(Recognition recognition) {
+            print("results: " + recognition.getOutcome());
+            for (Hypothesis hypothesis : recognition.getHypotheses()) {
+                print("  " + hypothesis);
+            }
+            over.countDown();
+        }
+
+        @Override
+        public void onError(SpeechError error) {
+            print("error: " + error);
+            over.countDown();
+        }
+    }
+
+    @Test
+    public void recognise() throws Exception {
+        final SpeechFile speech = SpeechFile.read(System.getProperty("talvox.demo.file"));
+        final Printer printer = new Printer();
+        final TalvoxEngine engine = TalvoxEngine.getInstance(application);
+        try (DevelopmentGateway gateway = new DevelopmentGateway();
+                Microphone microphone =
+                        new Microphone(speech.samples, speech.sampleRateHz, 1).plugIn();
+                TalvoxRecognizer recognizer =
+                        engine.createRecognizer(
+                                TalvoxSettings.builder()
+                                        .set(TalvoxSettings.SAMPLE_RATE, speech.sampleRateHz)
+                                        .set(TalvoxSettings.STREAMING, true)
+                                        .build(),
+                                printer)) {
+            engine.updateSettings(
+                    TalvoxSettings.builder()
+                            .set(TalvoxSettings.URL, gateway.getUrl())
+                            .set(TalvoxSettings.UUID, "0123456789abcdef0123456789abcdef")
+                            .set(TalvoxSettings.LANGUAGE, "en-US")
+                            .build());
+            Printer.print("engine " + engine.getVersion() + ", gateway " + gateway.getUrl());
+            recognizer.start();
+            await(printer.over);
+        }
+    }
+}
