@@ -1,15 +1,23 @@
-# The Java bindings need jni.h only: no JDK library is linked. Android has it in its sysroot.
+# The Java bindings need jni.h only: no JDK library is linked. Android has it in its sysroot; else
+# it is that of JAVA_HOME or of the JDK whose javac is on the search path.
 add_library(korvel_jni INTERFACE)
-set(korvel_has_jni ${ANDROID})
 if(NOT ANDROID)
-    find_package(JNI QUIET)
-    if(JAVA_INCLUDE_PATH AND JAVA_INCLUDE_PATH2)
-        set(korvel_has_jni ON)
-        target_include_directories(korvel_jni SYSTEM INTERFACE
-            $<BUILD_INTERFACE:${JAVA_INCLUDE_PATH}> $<BUILD_INTERFACE:${JAVA_INCLUDE_PATH2}>)
-    endif()
+    find_program(JAVAC_PROGRAM javac)
+    get_filename_component(javac_path "${JAVAC_PROGRAM}" REALPATH)
+    get_filename_component(javac_home "${javac_path}/../.." ABSOLUTE)
+    find_path(JNI_H_DIR jni.h HINTS $ENV{JAVA_HOME}/include ${javac_home}/include)
+    find_path(JNI_MD_H_DIR jni_md.h HINTS ${JNI_H_DIR} ${JNI_H_DIR}/linux)
+endif()
+if(ANDROID OR (JNI_H_DIR AND JNI_MD_H_DIR))
+    set(korvel_has_jni ON)
+else()
+    set(korvel_has_jni OFF)
 endif()
 option(TALVOX_JNI "Build the Java bindings into libKorvelTalvox" ${korvel_has_jni})
 if(TALVOX_JNI AND NOT korvel_has_jni)
     message(FATAL_ERROR "TALVOX_JNI needs jni.h (Debian: openjdk-17-jdk-headless)")
+endif()
+if(TALVOX_JNI AND NOT ANDROID)
+    target_include_directories(korvel_jni SYSTEM INTERFACE
+        $<BUILD_INTERFACE:${JNI_H_DIR}> $<BUILD_INTERFACE:${JNI_MD_H_DIR}>)
 endif()

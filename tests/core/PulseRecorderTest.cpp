@@ -310,7 +310,7 @@ TEST_F(PulseRecorderWithMuteServer, ReportsAnErrorFiveSecondsAfterTheStart) {
     kdAdvanceClockKOR(1);
     EXPECT_EQ(listener->getErrorCount(), 1);
     EXPECT_FALSE(isRecording());
-    EXPECT_TRUE(log.contains("PulseRecorder: the sound server sends nothing"));
+    EXPECT_TRUE(log.contains("PulseRecorder: the device sends nothing"));
     kdAdvanceClockKOR(60 * NS_PER_SECOND);
     EXPECT_EQ(listener->getErrorCount(), 1);
 }
@@ -462,7 +462,7 @@ TEST_F(PulseRecorderWithServer, ReportsAServerThatFallsSilentWithinASecond) {
     kdAdvanceClockKOR(NS_PER_SECOND / 5);
     kdAdvanceClockKOR(NS_PER_SECOND);
     EXPECT_EQ(listener->getErrorCount(), 1);
-    EXPECT_TRUE(log.contains("PulseRecorder: the sound server sends nothing"));
+    EXPECT_TRUE(log.contains("PulseRecorder: the device sends nothing"));
     kdUseRealClockKOR();
 }
 

@@ -4,9 +4,9 @@
 #include <cstddef>
 #include <vector>
 
-#include "sound/CaptureQueue.h"
-#include "sound/RecorderFormat.h"
-#include "sound/ZeroWatch.h"
+#include "core/sound/CaptureQueue.h"
+#include "core/sound/RecorderFormat.h"
+#include "core/sound/ZeroWatch.h"
 
 namespace {
 

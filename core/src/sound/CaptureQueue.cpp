@@ -1,4 +1,4 @@
-#include "sound/CaptureQueue.h"
+#include "core/sound/CaptureQueue.h"
 
 #include <algorithm>
 #include <boost/make_shared.hpp>

@@ -4,8 +4,8 @@
 #include <boost/make_shared.hpp>
 #include <utility>
 
+#include "core/sound/RecorderFormat.h"
 #include "pal/kd_event.h"
-#include "sound/RecorderFormat.h"
 
 namespace Sound {
 

@@ -9,8 +9,8 @@
 #include <mutex>
 #include <string>
 
+#include "core/sound/CaptureQueue.h"
 #include "core/sound/Recorder.h"
-#include "sound/CaptureQueue.h"
 
 namespace Sound {
 

@@ -1,4 +1,4 @@
-#include "sound/RecorderFormat.h"
+#include "core/sound/RecorderFormat.h"
 
 #include <cstdint>
 

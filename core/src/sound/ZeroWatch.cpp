@@ -1,4 +1,4 @@
-#include "sound/ZeroWatch.h"
+#include "core/sound/ZeroWatch.h"
 
 #include <algorithm>
 

@@ -15,36 +15,43 @@
 namespace Jni {
 
 /**
- * Runs the body of an entry point under the event lock. A Java exception that is pending at its
- * end goes back to Java, a C++ exception as a `RuntimeException`; the value is `fallback` then.
+ * Runs the body of an entry point for threads that must not wait, without the event lock. A Java
+ * exception that is pending at its end goes back to Java, a C++ exception as a
+ * `RuntimeException`. Does nothing once the VM ends.
  * @param body called with the calling thread's environment
  */
-template <typename Result, typename Body>
-Result enter(Result fallback, Body body) noexcept {
+template <typename Body>
+void enterUnlocked(Body body) noexcept {
     JNIEnv* const env = kdGetJNIEnvKOR();
     if (env == nullptr) {
-        return fallback;
+        return;
     }
     try {
-        const Util::EventLock lock;
-        return body(env);
+        body(env);
     } catch (const PendingException&) {
-        return fallback;
+        return;
     } catch (const std::exception& failure) {
         throwNew(env, "java/lang/RuntimeException", failure.what());
     } catch (...) {
         throwNew(env, "java/lang/RuntimeException", "unknown native failure");
     }
-    return fallback;
 }
 
-/** The same without a value. */
+/** The same under the event lock. */
 template <typename Body>
 void enter(Body body) noexcept {
-    enter<bool>(false, [&body](JNIEnv* env) {
+    enterUnlocked([&body](JNIEnv* env) {
+        const Util::EventLock lock;
         body(env);
-        return true;
     });
+}
+
+/** The same with a value, which is `fallback` when there is an exception. */
+template <typename Result, typename Body>
+Result enter(Result fallback, Body body) noexcept {
+    Result result = fallback;
+    enter([&result, &body](JNIEnv* env) { result = body(env); });
+    return result;
 }
 
 }  // namespace Jni

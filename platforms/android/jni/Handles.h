@@ -97,15 +97,17 @@ class KnownObjects {
 
     /** @throw PendingException with an `IllegalStateException` for an object that is gone */
     static boost::shared_ptr<T> get(JNIEnv* env, jlong handle) {
-        const auto found = objects().find(handle);
-        boost::shared_ptr<T> object;
-        if (found != objects().end()) {
-            object = found->second.lock();
-        }
+        boost::shared_ptr<T> object = find(handle);
         if (!object) {
             raiseStale(env, handle);
         }
         return object;
+    }
+
+    /** Null for an object that is gone. */
+    static boost::shared_ptr<T> find(jlong handle) {
+        const auto found = objects().find(handle);
+        return found != objects().end() ? found->second.lock() : boost::shared_ptr<T>();
     }
 
   private:

@@ -1,13 +1,18 @@
+/**
+ * @file
+ * Notices a muted microphone.
+ */
 #pragma once
 
 #include <cstdint>
 
+#include "core/Export.h"
 #include "core/sound/SoundDataBuffer.h"
 
 namespace Sound {
 
 /** Notices a microphone that delivers nothing but zeros, which no live one does. */
-class ZeroWatch {
+class KORVEL_CORE_API ZeroWatch {
   public:
     /** Looks at the next recorded buffer. @return true once: zeros alone for over a second */
     bool isSuspicious(const SoundDataBuffer& buffer);

@@ -1,13 +1,18 @@
+/**
+ * @file
+ * The buffers that a recorder is asked for.
+ */
 #pragma once
 
 #include <cstddef>
 
+#include "core/Export.h"
 #include "core/sound/SoundDataInfo.h"
 
 namespace Sound {
 
 /** The buffers that a recorder is asked for: 16-bit mono of a rate and a length. */
-class RecorderFormat {
+class KORVEL_CORE_API RecorderFormat {
   public:
     RecorderFormat(int sampleRateHz, int bufferLengthMs);
 

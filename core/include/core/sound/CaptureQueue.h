@@ -1,3 +1,7 @@
+/**
+ * @file
+ * Hands sound from a device's thread to the event thread; for recorders of a platform.
+ */
 #pragma once
 
 #include <boost/shared_ptr.hpp>
@@ -7,8 +11,9 @@
 #include <string>
 #include <vector>
 
+#include "core/Export.h"
+#include "core/sound/RecorderFormat.h"
 #include "core/sound/SoundDataBuffer.h"
-#include "sound/RecorderFormat.h"
 
 namespace Sound {
 
@@ -16,7 +21,7 @@ namespace Sound {
  * What a device's thread hands to the event thread: sound, cut into buffers of the asked length,
  * and at most one failure, behind all sound that came before it.
  */
-class CaptureQueue {
+class KORVEL_CORE_API CaptureQueue {
   public:
     /** The most buffers that wait; one more is a failure, because sound would be lost. */
     static constexpr std::size_t BUFFERS_MAX = 64;

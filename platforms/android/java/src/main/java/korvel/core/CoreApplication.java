@@ -1,0 +1,74 @@
+package korvel.core;
+
+import android.app.Application;
+import android.content.Context;
+
+/**
+ * The Android application that the native libraries live in.
+ *
+ * <p>On Android nothing needs to be done: the process's application is found when it is asked for.
+ * Whoever has another context, for instance in a test, hands it over with {@link #install}.
+ *
+ * <p>Threads: any.
+ */
+public final class CoreApplication {
+    private static final long LAST_EVENT_WAIT_MS = 2000;
+
+    private static volatile Context installed;
+    private static volatile boolean isLoaded;
+
+    private CoreApplication() {}
+
+    /** The application's context, or null outside Android. */
+    public static Context getApplicationContext() {
+        final Context context = installed;
+        return context != null ? context : findApplication();
+    }
+
+    /**
+     * Makes the native libraries use this context, and Android's microphone, network state,
+     * proximity sensor and log through it. May be called before they are loaded, and repeatedly.
+     *
+     * @param context any context of the application; not null
+     */
+    public static void install(Context context) {
+        final Context application = context.getApplicationContext();
+        installed = application != null ? application : context;
+        if (isLoaded) {
+            installBackends();
+        }
+    }
+
+    private static Context findApplication() {
+        try {
+            // Hidden, but in place since the first Android; there is no public way without a
+            // context.
+            final Class<?> thread = Class.forName("android.app.ActivityThread");
+            return (Application) thread.getMethod("currentApplication").invoke(null);
+        } catch (ReflectiveOperationException | LinkageError notAndroid) {
+            return null;
+        }
+    }
+
+    /** Called by the native library, once, while it is loaded. */
+    static void onLibraryLoaded() {
+        isLoaded = true;
+        Runtime.getRuntime().addShutdownHook(new Thread(CoreApplication::end, "talvox-end"));
+    }
+
+    /** Ends the events; an application that never returns from one is not waited for long. */
+    private static void end() {
+        final Thread ending = new Thread(CoreApplication::endInternal, "talvox-last-event");
+        ending.setDaemon(true);
+        ending.start();
+        try {
+            ending.join(LAST_EVENT_WAIT_MS);
+        } catch (InterruptedException interrupted) {
+            Thread.currentThread().interrupt();
+        }
+    }
+
+    private static native void installBackends();
+
+    private static native void endInternal();
+}

@@ -1,0 +1,82 @@
+package korvel.core;
+
+import android.content.Context;
+import android.net.ConnectivityManager;
+import android.net.Network;
+import android.net.NetworkCapabilities;
+import android.util.Log;
+
+/** Tells the native library how the network is reached: by the default network's transport. */
+final class ReachabilityBackend extends ConnectivityManager.NetworkCallback {
+    static final int UNREACHABLE = 0;
+    static final int WIFI = 1;
+    static final int METERED = 2;
+
+    /** The system's own view, where Android does not tell. */
+    private static final int UNKNOWN = -1;
+
+    private static ConnectivityManager watched;
+    private static ReachabilityBackend watcher;
+
+    private ReachabilityBackend() {}
+
+    /** Called by the native library. Watches from now on, instead of what was watched before. */
+    private static synchronized void start(Context context) {
+        stop();
+        final Object service = context.getSystemService(Context.CONNECTIVITY_SERVICE);
+        if (!(service instanceof ConnectivityManager)) {
+            onReachabilityChangedInternal(UNKNOWN);
+            return;
+        }
+        final ConnectivityManager manager = (ConnectivityManager) service;
+        try {
+            final ReachabilityBackend callback = new ReachabilityBackend();
+            onReachabilityChangedInternal(judge(manager));
+            manager.registerDefaultNetworkCallback(callback);
+            watched = manager;
+            watcher = callback;
+        } catch (RuntimeException refused) {
+            // No permission ACCESS_NETWORK_STATE, or too many callbacks in this application.
+            Log.w(LogBackend.TAG, "The state of the network is not watched", refused);
+            onReachabilityChangedInternal(UNKNOWN);
+        }
+    }
+
+    private static void stop() {
+        if (watcher != null) {
+            try {
+                watched.unregisterNetworkCallback(watcher);
+            } catch (IllegalArgumentException unknown) {
+                // The manager has forgotten it by itself.
+            }
+            watcher = null;
+        }
+    }
+
+    private static int judge(ConnectivityManager manager) {
+        final Network network = manager.getActiveNetwork();
+        return network == null ? UNREACHABLE : judge(manager.getNetworkCapabilities(network));
+    }
+
+    private static int judge(NetworkCapabilities capabilities) {
+        if (capabilities == null) {
+            return METERED; // there is a network, of a kind that nobody knows
+        }
+        final boolean isWifi =
+                capabilities.hasTransport(NetworkCapabilities.TRANSPORT_WIFI)
+                        || capabilities.hasTransport(NetworkCapabilities.TRANSPORT_ETHERNET);
+        return isWifi ? WIFI : METERED;
+    }
+
+    @Override
+    public void onCapabilitiesChanged(Network network, NetworkCapabilities capabilities) {
+        onReachabilityChangedInternal(judge(capabilities));
+    }
+
+    @Override
+    public void onLost(Network network) {
+        onReachabilityChangedInternal(UNREACHABLE);
+    }
+
+    private static native void onReachabilityChangedInternal(int value);
+}
