@@ -1,6 +1,5 @@
 #include "EntryPoint.h"
 #include "PlatformRecognizer.h"
-#include "backends/Backends.h"
 #include "talvox/PlatformMechanism.h"
 
 namespace {
@@ -29,7 +28,6 @@ void load(JNIEnv* env) {
         Jni::findStaticMethod(env, application.get(), "onLibraryLoaded", "()V");
     env->CallStaticVoidMethod(application.get(), onLibraryLoaded);
     Jni::check(env);
-    Backends::install(env);
 }
 
 }  // namespace

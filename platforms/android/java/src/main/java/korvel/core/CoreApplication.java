@@ -34,6 +34,14 @@ public final class CoreApplication {
     public static void install(Context context) {
         final Context application = context.getApplicationContext();
         installed = application != null ? application : context;
+        connect();
+    }
+
+    /**
+     * Connects the native library to Android as soon as it is loaded, where there is an
+     * application. Not done while it is being loaded: its native methods are found afterwards only.
+     */
+    public static void connect() {
         if (isLoaded) {
             installBackends();
         }

@@ -1,9 +1,12 @@
 package korvel.talvox.impl;
 
+import korvel.core.CoreApplication;
+
 /** Loads {@code libKorvelTalvox.so}, once per process. */
 public final class NativeLibrary {
     static {
         System.loadLibrary("KorvelTalvox");
+        CoreApplication.connect();
     }
 
     private NativeLibrary() {}

@@ -173,6 +173,7 @@ public class NativeNamesTest extends KitTest {
         for (String name : classNames(sources)) {
             addMembers(load(name), members);
         }
+        addMembers(ClassLoader.class, members); // it finds the classes
         for (Class<?> type : kitClasses()) {
             addMembers(type, members); // objects whose class native code asks the object for
         }
