@@ -2,8 +2,10 @@
 
 #include <microhttpd.h>
 
+#include <cctype>
 #include <cstdlib>
 
+#include "core/util/UrlCoder.h"
 #include "gateway/LogText.h"
 #include "pal/kd_log.h"
 
@@ -15,6 +17,23 @@ std::string toText(const char* text) {
     return text == nullptr ? std::string() : text;
 }
 
+/** Every "%" introduces two hexadecimal digits. */
+bool isWellCoded(const std::string& text) {
+    for (std::size_t i = text.find('%'); i != std::string::npos; i = text.find('%', i + 1)) {
+        if (text.size() - i < 3 || std::isxdigit(static_cast<unsigned char>(text[i + 1])) == 0 ||
+            std::isxdigit(static_cast<unsigned char>(text[i + 2])) == 0) {
+            return false;
+        }
+    }
+    return true;
+}
+
+Answer refuseMethod(const std::string& reason, const std::string& allowed) {
+    Answer answer = Answer::refuse(405, reason);
+    answer.headers.emplace_back("Allow", allowed);
+    return answer;
+}
+
 bool isRecognitionPath(const std::string& path) {
     return path == "/asrgw" || path == "/asrgw_chunked";
 }
@@ -24,7 +43,7 @@ bool isRecognitionPath(const std::string& path) {
 HttpExchange::HttpExchange(Server& exchangeServer, MHD_Connection* httpConnection, const char* path,
                            const char* method)
     : server(exchangeServer), connection(httpConnection) {
-    head.path = toText(path);
+    head.path = Util::UrlCoder::urlDecodeString(toText(path));
     head.method = toText(method);
     head.uuid = readArgument("uuid");
     head.sessionId = readArgument("sessionId");
@@ -34,25 +53,33 @@ HttpExchange::HttpExchange(Server& exchangeServer, MHD_Connection* httpConnectio
 
 bool HttpExchange::onHead() {
     const Answer answer = judgeHead();
+    if (carriesRecord) {
+        return true;
+    }
     if (request) {
         if (server.getOptions().verbose) {
             log(0, "begins");
         }
         return true;
     }
-    log(answer.status, "uuid=" + toLogText(head.uuid) +
-                           " refused: " + toLogText(answer.body.substr(0, answer.body.find('\n'))));
+    logRefusal(answer);
     return send(answer);
 }
 
 Answer HttpExchange::judgeHead() {
-    if (!isRecognitionPath(head.path)) {
-        return Answer::refuse(404, "there is nothing here but /asrgw and /asrgw_chunked");
+    if (isRecognitionPath(head.path)) {
+        return judgeRecognition();
     }
+    if (head.path != "/log") {
+        return Answer::refuse(404, "there is nothing here but /asrgw, /asrgw_chunked and /log");
+    }
+    carriesRecord = head.method == "GET";
+    return carriesRecord ? Answer() : refuseMethod("records come in GET requests", "GET");
+}
+
+Answer HttpExchange::judgeRecognition() {
     if (head.method != "POST") {
-        Answer answer = Answer::refuse(405, "recognition requests are POST requests");
-        answer.headers.emplace_back("Allow", "POST");
-        return answer;
+        return refuseMethod("recognition requests are POST requests", "POST");
     }
     std::string boundary;
     const std::string reason = RecognitionRequest::checkHead(head, boundary);
@@ -79,7 +106,33 @@ bool HttpExchange::onBody(const char* data, std::size_t size) {
     return request->write(data, size);
 }
 
+Answer HttpExchange::keepRecord() const {
+    const std::optional<std::string> uuid = readRawArgument("uuid");
+    const std::optional<std::string> record = readRawArgument("logmessage");
+    if (!uuid || !record) {
+        return Answer::refuse(400, uuid ? "there is no logmessage" : "there is no uuid");
+    }
+    if (!isWellCoded(*uuid) || !isWellCoded(*record)) {
+        return Answer::refuse(400, "a % without two hexadecimal digits");
+    }
+    if (record->empty()) {
+        return Answer::refuse(400, "the logmessage is empty");
+    }
+    const bool kept = server.getRecordLog().append(Util::UrlCoder::urlDecodeString(*uuid),
+                                                   Util::UrlCoder::urlDecodeString(*record));
+    return kept ? Answer() : Answer::refuse(500, "the record could not be written");
+}
+
 bool HttpExchange::onEnd() {
+    if (carriesRecord && !answered) {
+        const Answer answer = keepRecord();
+        if (answer.status != 200) {
+            logRefusal(answer);
+        } else if (server.getOptions().verbose) {
+            log(answer.status, "uuid=" + toLogText(head.uuid));
+        }
+        return send(answer);
+    }
     if (!request || answered) {
         return true;
     }
@@ -113,6 +166,11 @@ bool HttpExchange::send(const Answer& answer) {
     return sendable;
 }
 
+void HttpExchange::logRefusal(const Answer& answer) const {
+    log(answer.status, "uuid=" + toLogText(head.uuid) +
+                           " refused: " + toLogText(answer.body.substr(0, answer.body.find('\n'))));
+}
+
 void HttpExchange::log(unsigned status, const std::string& what) const {
     kdLogFormatMessage("%s %s %s %s", toLogText(head.method).c_str(), toLogText(head.path).c_str(),
                        status == 0 ? "..." : std::to_string(status).c_str(), what.c_str());
@@ -123,7 +181,12 @@ std::string HttpExchange::readHeader(const char* name) const {
 }
 
 std::string HttpExchange::readArgument(const char* name) const {
-    return toText(MHD_lookup_connection_value(connection, MHD_GET_ARGUMENT_KIND, name));
+    return Util::UrlCoder::urlDecodeString(readRawArgument(name).value_or(""));
+}
+
+std::optional<std::string> HttpExchange::readRawArgument(const char* name) const {
+    const char* value = MHD_lookup_connection_value(connection, MHD_GET_ARGUMENT_KIND, name);
+    return value == nullptr ? std::nullopt : std::optional<std::string>(value);
 }
 
 }  // namespace Gateway

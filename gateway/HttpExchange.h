@@ -3,6 +3,7 @@
 #include <cstddef>
 #include <cstdint>
 #include <memory>
+#include <optional>
 #include <string>
 
 #include "gateway/RecognitionRequest.h"
@@ -33,15 +34,20 @@ class HttpExchange {
 
   private:
     Answer judgeHead();
+    Answer judgeRecognition();
+    Answer keepRecord() const;
     bool send(const Answer& answer);
+    void logRefusal(const Answer& answer) const;
     void log(unsigned status, const std::string& what) const;
     std::string readHeader(const char* name) const;
+    std::optional<std::string> readRawArgument(const char* name) const;
     std::string readArgument(const char* name) const;
 
     Server& server;
     MHD_Connection* const connection;
     RequestHead head;
     std::unique_ptr<RecognitionRequest> request;
+    bool carriesRecord = false;
     bool answered = false;
 };
 

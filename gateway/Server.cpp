@@ -48,6 +48,11 @@ void onCompleted(void* /*user*/, MHD_Connection* /*connection*/, void** state,
     }
 }
 
+/** Query values stay coded: zero bytes would end them, and mistakes in them would not show. */
+std::size_t leaveCoded(void* /*user*/, MHD_Connection* /*connection*/, char* text) {
+    return std::strlen(text);
+}
+
 /** The library's messages: of interest to who asked for everything. */
 __attribute__((format(printf, 2, 0))) void onLibraryMessage(void* user, const char* format,
                                                             va_list arguments) {
@@ -78,6 +83,10 @@ std::string Server::start() {
     const std::string problem = options.model.findProblem();
     if (!problem.empty()) {
         return problem;
+    }
+    const std::string logProblem = recordLog.open(options.recordFile);
+    if (!logProblem.empty()) {
+        return logProblem;
     }
     if (!pool.load()) {
         return "the recogniser does not accept the model";
@@ -112,10 +121,11 @@ void Server::listen(const addrinfo& address) {
     }
     daemon = MHD_start_daemon(
         flags, options.port, nullptr, nullptr, &onRequest, this, MHD_OPTION_EXTERNAL_LOGGER,
-        &onLibraryMessage, this, MHD_OPTION_SOCK_ADDR, address.ai_addr,
-        MHD_OPTION_CONNECTION_MEMORY_LIMIT, CONNECTION_MEMORY_BYTES, MHD_OPTION_CONNECTION_LIMIT,
-        MAX_CONNECTIONS, MHD_OPTION_CONNECTION_TIMEOUT, options.idleSeconds,
-        MHD_OPTION_NOTIFY_COMPLETED, &onCompleted, nullptr, MHD_OPTION_END);
+        &onLibraryMessage, this, MHD_OPTION_UNESCAPE_CALLBACK, &leaveCoded, nullptr,
+        MHD_OPTION_SOCK_ADDR, address.ai_addr, MHD_OPTION_CONNECTION_MEMORY_LIMIT,
+        CONNECTION_MEMORY_BYTES, MHD_OPTION_CONNECTION_LIMIT, MAX_CONNECTIONS,
+        MHD_OPTION_CONNECTION_TIMEOUT, options.idleSeconds, MHD_OPTION_NOTIFY_COMPLETED,
+        &onCompleted, nullptr, MHD_OPTION_END);
 }
 
 void Server::stop() {
@@ -124,6 +134,7 @@ void Server::stop() {
         MHD_stop_daemon(daemon);
         daemon = nullptr;
     }
+    recordLog.close();
 }
 
 std::string Server::getUrl() const {

@@ -5,6 +5,7 @@
 #include <string>
 
 #include "gateway/DecoderPool.h"
+#include "gateway/RecordLog.h"
 #include "gateway/SpeechModel.h"
 
 struct MHD_Daemon;
@@ -26,12 +27,15 @@ struct ServerOptions {
     /** Seconds after which a client that says nothing is given up. */
     unsigned idleSeconds = 30;
     bool verbose = false;
+    /** File to which usage records are appended; empty for the standard output. */
+    std::string recordFile;
     SpeechModel model;
 };
 
 /**
  * The HTTP face of the gateway: a thread per connection, each of which carries one request after
- * the other into a `RecognitionRequest`. `start` and `stop` belong to one thread.
+ * the other into a `RecognitionRequest` or the log of records. `start` and `stop` belong to one
+ * thread.
  */
 class Server {
   public:
@@ -56,12 +60,14 @@ class Server {
 
     const ServerOptions& getOptions() const { return options; }
     DecoderPool& getPool() { return pool; }
+    RecordLog& getRecordLog() { return recordLog; }
 
   private:
     void listen(const addrinfo& address);
 
     const ServerOptions options;
     DecoderPool pool;
+    RecordLog recordLog;
     MHD_Daemon* daemon = nullptr;
     uint16_t port = 0;
 };

@@ -39,6 +39,9 @@ void declareOptions(CLI::App& app, Gateway::ServerOptions& options) {
                    "Longest request body in bytes; longer ones get status 413")
         ->check(CLI::PositiveNumber)
         ->capture_default_str();
+    app.add_option("--log-file", options.recordFile,
+                   "File to which the usage records that clients send to /log are appended, one "
+                   "line each [standard output]");
     app.add_flag("--verbose", options.verbose, "Log each piece of a request as it arrives");
 }
 
