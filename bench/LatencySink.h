@@ -34,8 +34,8 @@ class LatencySink {
     void serve();
     void decode(const char* data, std::size_t size);
 
-    int listener = -1;
     int port = 0;
+    int listener = -1;
     std::thread thread;
     std::string line;
     std::size_t chunkLeft = 0;
