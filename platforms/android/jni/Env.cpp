@@ -106,9 +106,14 @@ LocalRef<jclass> findClass(JNIEnv* env, const char* name) {
     std::string dotted(name);
     std::replace(dotted.begin(), dotted.end(), '/', '.');
     const LocalRef<jstring> text = toJString(env, dotted);
-    return callObject(env, classLoader().get(), "loadClass",
-                      "(Ljava/lang/String;)Ljava/lang/Class;", text.get())
-        .as<jclass>();
+    const LocalRef<jclass> loaderClass(env, env->FindClass("java/lang/ClassLoader"));
+    check(env);
+    const jmethodID loadClass =
+        findMethod(env, loaderClass.get(), "loadClass", "(Ljava/lang/String;)Ljava/lang/Class;");
+    LocalRef<jclass> found(env, static_cast<jclass>(env->CallObjectMethod(classLoader().get(),
+                                                                          loadClass, text.get())));
+    check(env);
+    return found;
 }
 
 jmethodID findMethod(JNIEnv* env, jclass owner, const char* name, const char* signature) {
