@@ -4,6 +4,7 @@
 #include <string>
 
 #include "ExitStatus.h"
+#include "LogCommand.h"
 #include "SettingsCommand.h"
 #include "SoundInput.h"
 #include "UsageError.h"
@@ -25,6 +26,7 @@ struct Arguments {
     RecognizeOptions recognize;
     VadOptions vad;
     SettingsOptions settings;
+    LogOptions log;
 };
 
 /** Adds an option that stands for one setting. */
@@ -172,6 +174,38 @@ CLI::App* addSettingsCommand(CLI::App& app, SettingsOptions& options) {
     return command;
 }
 
+CLI::App* addLogCommand(CLI::App& app, LogOptions& options) {
+    CLI::App* command =
+        app.add_subcommand("log", "Send a usage event to a log collection endpoint");
+    command->add_option("--url", options.url, "Address of the endpoint [http://127.0.0.1:8090/log]")
+        ->type_name("URL");
+    command->add_option("--uuid", options.uuid, "Identifier of this installation, as it is [empty]")
+        ->type_name("TEXT");
+    command->add_option("--session", options.session, "Session that the event belongs to")
+        ->type_name("TEXT")
+        ->required();
+    command->add_flag("--error", options.error, "Send it as an error");
+    command
+        ->add_option("--timeout", options.timeoutS,
+                     "How long to wait for the delivery, in seconds [" +
+                         std::to_string(LOG_TIMEOUT_S_DFLT) + "]")
+        ->type_name("S")
+        ->check(CLI::Range(0, LOG_TIMEOUT_S_MAX).description(""));
+    command
+        ->add_option("--verbosity", options.verbosity,
+                     "How much is logged to standard error: 0 nothing, 1 problems, 2 every request "
+                     "[" +
+                         std::to_string(LOG_VERBOSITY_DFLT) + "]")
+        ->type_name("N")
+        ->check(CLI::Range(0, LOG_VERBOSITY_MAX).description(""));
+    command->add_option("name", options.name, "Name of the event")->type_name("NAME")->required();
+    command->add_option("params", options.params, "Parameters of the event")
+        ->type_name("KEY=VALUE");
+    command->footer(
+        "Exit status: 0 the event was delivered, 1 it was not within the time, 2 wrong usage.");
+    return command;
+}
+
 int fail(std::ostream& err, const std::string& reason) {
     err << "talvox: " << reason.substr(0, reason.find('\n')) << std::endl;
     return EXIT_USAGE;
@@ -188,6 +222,7 @@ int runTool(int argc, const char* const* argv, Console& console, LogOutput& log)
     const CLI::App* recognize = addRecognize(app, arguments.recognize);
     const CLI::App* vad = addVadCommand(app, arguments.vad);
     const CLI::App* settings = addSettingsCommand(app, arguments.settings);
+    const CLI::App* logEvent = addLogCommand(app, arguments.log);
     try {
         app.parse(argc, argv);
         if (recognize->parsed()) {
@@ -200,7 +235,10 @@ int runTool(int argc, const char* const* argv, Console& console, LogOutput& log)
         if (settings->parsed()) {
             return runSettings(arguments.settings, console.out, log);
         }
-        throw UsageError("no command given (recognize, vad or settings); see talvox --help");
+        if (logEvent->parsed()) {
+            return runLog(arguments.log, console, log);
+        }
+        throw UsageError("no command given (recognize, vad, settings or log); see talvox --help");
     } catch (const CLI::ParseError& error) {
         if (error.get_exit_code() == 0) {
             return app.exit(error, console.out, console.err);

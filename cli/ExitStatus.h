@@ -5,7 +5,7 @@ namespace Cli {
 /** What the process tells the shell. */
 enum ExitStatus {
     EXIT_OK = 0,             /**< the command did what it was asked for; results were delivered */
-    EXIT_ENDED_IN_ERROR = 1, /**< the recognition ended in an error */
+    EXIT_ENDED_IN_ERROR = 1, /**< the recognition ended in an error, or nothing was delivered */
     EXIT_USAGE = 2           /**< wrong usage or unreadable input */
 };
 

@@ -1,0 +1,83 @@
+#include "LogCommand.h"
+
+#include <future>
+#include <map>
+#include <mutex>
+
+#include "ExitStatus.h"
+#include "Interrupts.h"
+#include "UsageError.h"
+#include "core/Logger.h"
+#include "core/util/Timer.h"
+#include "logcollector/LogCollector.h"
+#include "pal/kd_event.h"
+
+namespace Cli {
+
+namespace {
+
+const int64_t NS_PER_S = 1000000000;
+
+std::map<std::string, std::string> readParams(const std::vector<std::string>& texts) {
+    std::map<std::string, std::string> params;
+    for (const std::string& text : texts) {
+        const std::size_t equals = text.find('=');
+        if (equals == std::string::npos || equals == 0) {
+            throw UsageError("parameter " + text + ": expected key=value");
+        }
+        if (!params.emplace(text.substr(0, equals), text.substr(equals + 1)).second) {
+            throw UsageError("parameter " + text.substr(0, equals) + " is given twice");
+        }
+    }
+    return params;
+}
+
+/** Something that may come to its end in several ways, at several times. */
+class End {
+  public:
+    void come() {
+        std::call_once(once, [this] { promise.set_value(); });
+    }
+    void wait() { promise.get_future().wait(); }
+
+  private:
+    std::once_flag once;
+    std::promise<void> promise;
+};
+
+void submit(const LogOptions& options, const std::map<std::string, std::string>& params) {
+    if (options.url.empty()) {
+        LogCollector::configure(options.uuid);
+    } else {
+        LogCollector::configure(options.uuid, options.url);
+    }
+    LogCollector::setLoggingEnabled(true);
+    LogCollector::startSession(options.session);
+    const auto log = options.error ? &LogCollector::logError : &LogCollector::logEvent;
+    log(options.session, options.name, params);
+}
+
+}  // namespace
+
+int runLog(const LogOptions& options, Console& console, LogOutput& log) {
+    const std::map<std::string, std::string> params = readParams(options.params);
+    Logger::setLevel(options.verbosity);
+    log.show(options.verbosity > 0);
+    End end;
+    Util::Timer timer([&end] { end.come(); });
+    const Interrupts interrupts([&end] { end.come(); });
+    LogCollector::setDeliveredCallback([&end] { end.come(); });
+    timer.start(KD_TIMER_ONESHOT, options.timeoutS * NS_PER_S);
+    submit(options, params);
+    end.wait();
+    LogCollector::setDeliveredCallback({});
+    const std::size_t left = LogCollector::getPendingCount();
+    if (left == 0) {
+        return EXIT_OK;
+    }
+    console.err << "talvox: " << left << (left == 1 ? " record is" : " records are")
+                << " not delivered" << std::endl;
+    return EXIT_ENDED_IN_ERROR;
+}
+
+}  // namespace Cli

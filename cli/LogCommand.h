@@ -1,0 +1,36 @@
+#pragma once
+
+#include <string>
+#include <vector>
+
+#include "LogOutput.h"
+#include "RecognizeCommand.h"
+
+namespace Cli {
+
+const int LOG_TIMEOUT_S_DFLT = 30;
+const int LOG_TIMEOUT_S_MAX = 24 * 60 * 60;
+const int LOG_VERBOSITY_DFLT = 1;
+const int LOG_VERBOSITY_MAX = 2;
+
+/** What `talvox log` was asked for. */
+struct LogOptions {
+    std::string url; /**< empty for the collector's default */
+    std::string uuid;
+    std::string session;
+    std::string name;
+    std::vector<std::string> params; /**< key=value */
+    bool error = false;
+    int timeoutS = LOG_TIMEOUT_S_DFLT;
+    int verbosity = LOG_VERBOSITY_DFLT;
+};
+
+/**
+ * `talvox log`: sends one event with the collector and waits until it is delivered, the time is
+ * over, or Ctrl-C is pressed.
+ * @return the exit status
+ * @throws UsageError
+ */
+int runLog(const LogOptions& options, Console& console, LogOutput& log);
+
+}  // namespace Cli
