@@ -1,17 +1,43 @@
 #include "gateway/SoundDecoder.h"
 
+#include <algorithm>
+
 namespace Gateway {
+
+namespace {
+
+const std::string OGG_MAGIC = "OggS";
+
+}  // namespace
 
 SoundDecoder::SoundDecoder(const AudioFormat& soundFormat, unsigned outputRateHz)
     : format(soundFormat), outputRate(outputRateHz) {
     if (format.codec == AudioFormat::Codec::SPEEX) {
         speex = std::make_unique<SpeexStreamDecoder>();
+        beginningKnown = true;
     }
 }
 
 SoundDecoder::~SoundDecoder() = default;
 
 std::string SoundDecoder::write(const char* data, std::size_t size, std::vector<int16_t>& output) {
+    if (beginningKnown) {
+        return decode(data, size, output);
+    }
+    beginning.append(data, size);
+    const std::size_t compared = std::min(beginning.size(), OGG_MAGIC.size());
+    const bool mayBeOgg = beginning.compare(0, compared, OGG_MAGIC, 0, compared) == 0;
+    if (mayBeOgg && compared < OGG_MAGIC.size()) {
+        return std::string();
+    }
+    if (mayBeOgg) {
+        speex = std::make_unique<SpeexStreamDecoder>();
+    }
+    beginningKnown = true;
+    return decode(beginning.data(), beginning.size(), output);
+}
+
+std::string SoundDecoder::decode(const char* data, std::size_t size, std::vector<int16_t>& output) {
     std::vector<int16_t> samples;
     std::string reason;
     if (speex) {
@@ -30,6 +56,10 @@ std::string SoundDecoder::write(const char* data, std::size_t size, std::vector<
 }
 
 std::string SoundDecoder::finish(std::vector<int16_t>& output) {
+    if (!beginningKnown) {
+        beginningKnown = true;
+        decode(beginning.data(), beginning.size(), output);
+    }
     if (resampler) {
         resampler->finish(output);
     }

@@ -12,7 +12,11 @@
 
 namespace Gateway {
 
-/** Turns the bytes of a client's sound, as they arrive, into samples of the recogniser's rate. */
+/**
+ * Turns the bytes of a client's sound, as they arrive, into samples of the recogniser's rate. Sound
+ * that begins as an Ogg stream is Speex, also where its content type says PCM: clients that choose
+ * the encoding by the connection announce the format that they were set to.
+ */
 class SoundDecoder {
   public:
     SoundDecoder(const AudioFormat& soundFormat, unsigned outputRateHz);
@@ -36,6 +40,7 @@ class SoundDecoder {
     std::string getRemark() const;
 
   private:
+    std::string decode(const char* data, std::size_t size, std::vector<int16_t>& output);
     void readPcm(const char* data, std::size_t size, std::vector<int16_t>& samples);
 
     const AudioFormat format;
@@ -43,6 +48,9 @@ class SoundDecoder {
     std::unique_ptr<SpeexStreamDecoder> speex;
     std::unique_ptr<Resampler> resampler;
     bool hasBytes = false;
+    /** The first bytes, until they tell whether the sound is an Ogg stream. */
+    std::string beginning;
+    bool beginningKnown = false;
     /** First byte of a sample that two calls share, -1 when there is none. */
     int pending = -1;
 };

@@ -131,3 +131,22 @@ TEST(SoundDecoder, MissesTheHeadOfASpeexStreamThatBreaksOff) {
     EXPECT_EQ("", silent.finish(output));
     EXPECT_TRUE(output.empty());
 }
+
+TEST(SoundDecoder, TakesAnOggStreamForSpeexWhateverItsTypeSays) {
+    const std::string stream =
+        GatewayTest::encodeWithSpeexenc(sine(440, 16000, 16000), 16000, "wideband");
+    AudioFormat speex;
+    speex.codec = AudioFormat::Codec::SPEEX;
+    SoundDecoder announced(speex, 16000);
+    Samples expected;
+    EXPECT_EQ("", announced.write(stream.data(), stream.size(), expected));
+    EXPECT_EQ("", announced.finish(expected));
+
+    EXPECT_EQ(expected, decodePcm(stream, 16000, 1));
+    EXPECT_EQ(expected, decodePcm(stream, 16000, 1000));
+}
+
+TEST(SoundDecoder, KeepsPcmThatOnlyBeginsLikeAnOggStream) {
+    EXPECT_EQ((Samples{0x674F}), decodePcm("Og", 16000, 1));
+    EXPECT_EQ((Samples{0x674F, 0x5067}), decodePcm("OggP", 16000, 1));
+}
