@@ -3,10 +3,18 @@
 # Makes one of the shared libraries from object libraries (which the tests link as well, so that
 # they reach the internals). Only what the version script names is exported; the alignment is that
 # of 16 KB pages; an undefined symbol fails the link instead of the application's start.
+#
+# With TALVOX_ONE_LIBRARY all but the engine's are static, so that libKorvelTalvox holds everything.
+option(TALVOX_ONE_LIBRARY "Link everything into libKorvelTalvox; nothing is installed then" OFF)
 function(korvel_library target)
     cmake_parse_arguments(ARG "" "OUTPUT;EXPORTS" "OBJECTS" ${ARGN})
     set(script ${CMAKE_CURRENT_SOURCE_DIR}/${ARG_EXPORTS})
-    add_library(${target} SHARED)
+    if(TALVOX_ONE_LIBRARY AND NOT target STREQUAL KorvelTalvox)
+        add_library(${target} STATIC)
+    else()
+        add_library(${target} SHARED)
+    endif()
+    add_library(KorvelTalvox::${target} ALIAS ${target})
     foreach(objects ${ARG_OBJECTS})
         target_link_libraries(${target} PRIVATE ${objects})
     endforeach()
@@ -24,5 +32,4 @@ function(korvel_library target)
     if(NOT (TALVOX_SANITIZERS AND CMAKE_CXX_COMPILER_ID MATCHES "Clang"))
         target_link_options(${target} PRIVATE -Wl,--no-undefined)
     endif()
-    add_library(KorvelTalvox::${target} ALIAS ${target})
 endfunction()

@@ -185,12 +185,15 @@ boost::shared_ptr<Recognizer> Talvox::makeRecognizer(
 
 const std::vector<std::string>& Talvox::getAvailableLanguages() const {
     static std::vector<std::string> languages;
+    static bool isPlatformAwaited = true;
     const Util::EventLock lock;
-    if (languages.empty()) {
-        PlatformMechanism* const platform = PlatformMechanism::getInstalled();
-        languages = mergeLanguages(
-            KorvelRecognizer::getAvailableLanguages(),
-            platform != nullptr ? platform->getAvailableLanguages() : std::vector<std::string>());
+    // A platform may learn its languages later.
+    PlatformMechanism* const platform = PlatformMechanism::getInstalled();
+    if (languages.empty() || (platform != nullptr && isPlatformAwaited)) {
+        const std::vector<std::string> others =
+            platform != nullptr ? platform->getAvailableLanguages() : std::vector<std::string>();
+        isPlatformAwaited = others.empty();
+        languages = mergeLanguages(KorvelRecognizer::getAvailableLanguages(), others);
     }
     return languages;
 }

@@ -93,7 +93,9 @@ class TALVOX_API Talvox : public Util::Singleton<Talvox> {
         const boost::shared_ptr<RecognizerListener>& listener,
         const boost::shared_ptr<const Settings>& settings) const;
 
-    /** The languages of all mechanisms, each once, in ascending byte order. Takes the event lock.
+    /**
+     * The languages of all mechanisms, each once, in ascending byte order. Computed once, but as
+     * long as a platform does not know its own, asked of it again. Takes the event lock.
      */
     const std::vector<std::string>& getAvailableLanguages() const;
 
