@@ -181,7 +181,8 @@ void BufferedVAD::setParameter(const std::string& name, const std::string& value
 
 void BufferedVAD::dumpFrames() const {
     const float share = shareOf(frames.countNewest(frames.size()), frames.size());
-    kdLogFormatMessage("%f: %s\n", static_cast<double>(share), frames.toString().c_str());
+    kdLogFormatMessage("%f: %s\n", static_cast<double>(share),
+                       frames.toString(DUMPED_FRAMES_MAX).c_str());
 }
 
 float BufferedVAD::getActivity(bool whileSpeechIsOn) const {

@@ -28,6 +28,9 @@ class BufferedVAD : public VoiceActivityDetector {
     /** Longest history in frames (8 MB); longer spans are cut to it, with a log line. */
     static constexpr unsigned HISTORY_FRAMES_MAX = 64U * 1024 * 1024;
 
+    /** The most frames that `dumpFrames` writes out: more than ten minutes of them. */
+    static constexpr unsigned DUMPED_FRAMES_MAX = 64U * 1024;
+
     explicit BufferedVAD(const boost::shared_ptr<FrameVAD>& frameDetector);
 
     void setSoundDataInfo(const Sound::SoundDataInfo& format) override;
@@ -44,7 +47,10 @@ class BufferedVAD : public VoiceActivityDetector {
     void cancel() override;
     void setParameter(const std::string& name, const std::string& value) override;
 
-    /** Logs the share of speech in the history, and the history, oldest first. */
+    /**
+     * Logs the share of speech in the history, and the history, oldest first. Of a history longer
+     * than `DUMPED_FRAMES_MAX` only the newest frames are written out: this runs once a buffer.
+     */
     void dumpFrames() const;
 
     /**

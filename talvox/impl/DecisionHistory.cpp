@@ -75,10 +75,11 @@ std::size_t DecisionHistory::countStored(std::size_t begin, std::size_t end) con
     return ones;
 }
 
-std::string DecisionHistory::toString() const {
-    std::string text(length, '0');
-    for (std::size_t i = 0; i < length; ++i) {
-        if (at(i)) {
+std::string DecisionHistory::toString(std::size_t count) const {
+    const std::size_t span = std::min(count, length);
+    std::string text(span, '0');
+    for (std::size_t i = 0; i < span; ++i) {
+        if (at(length - span + i)) {
             text[i] = '1';
         }
     }

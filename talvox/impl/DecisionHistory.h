@@ -31,8 +31,9 @@ class DecisionHistory {
     /** How many of the `count` newest decisions (of all, where there are fewer) are true. */
     std::size_t countNewest(std::size_t count) const;
 
-    /** "1" and "0", oldest first. */
-    std::string toString() const;
+    /** "1" and "0", oldest first, of the `count` newest decisions (of all, where there are fewer).
+     */
+    std::string toString(std::size_t count) const;
 
   private:
     std::size_t countStored(std::size_t begin, std::size_t end) const;

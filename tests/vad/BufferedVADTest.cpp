@@ -51,7 +51,7 @@ class BufferedVADTest : public ::testing::Test {
         log.clear();
     }
 
-    std::string history() const { return vad.getHistory().toString(); }
+    std::string history() const { return vad.getHistory().toString(vad.getHistory().size()); }
 
     LogCapture log;
     boost::shared_ptr<ScriptedFrameVAD> frameVad = boost::make_shared<ScriptedFrameVAD>();
@@ -382,6 +382,14 @@ TEST_F(BufferedVADTest, AnAbsurdHistoryIsCutTo8Megabytes) {
     EXPECT_EQ(67108864U, vad.getHistory().size());
     process(10);
     EXPECT_EQ(10.0F / 67108864.0F, vad.getActivity(false));
+}
+
+TEST_F(BufferedVADTest, TheDumpOfAnAbsurdHistoryIsItsNewestPart) {
+    start({{"analyzems", "655370"}, {"verboselog", "2"}});
+    ASSERT_EQ(65537U, vad.getHistory().size());
+    vad.process(makeMarkedBuffer({1, 1}));
+    ASSERT_FALSE(log.messages().empty());
+    EXPECT_EQ("0.000031: " + std::string(65534, '0') + "11\n", log.messages().front());
 }
 
 TEST_F(BufferedVADTest, AHistoryOf8MegabytesIsNotCut) {

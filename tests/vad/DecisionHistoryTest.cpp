@@ -24,36 +24,45 @@ TEST(DecisionHistory, BeginsEmpty) {
     DecisionHistory history;
     history.push(true);
     EXPECT_EQ(0U, history.size());
-    EXPECT_EQ("", history.toString());
+    EXPECT_EQ("", history.toString(1000));
     EXPECT_EQ(0U, history.countNewest(10));
 }
 
 TEST(DecisionHistory, NewDecisionsPushOutTheOldest) {
     DecisionHistory history;
     history.resize(4);
-    EXPECT_EQ("0000", history.toString());
+    EXPECT_EQ("0000", history.toString(1000));
     history.push(true);
-    EXPECT_EQ("0001", history.toString());
+    EXPECT_EQ("0001", history.toString(1000));
     history.push(false);
     history.push(true);
     history.push(true);
-    EXPECT_EQ("1011", history.toString());
+    EXPECT_EQ("1011", history.toString(1000));
     history.push(false);
-    EXPECT_EQ("0110", history.toString());
+    EXPECT_EQ("0110", history.toString(1000));
+}
+
+TEST(DecisionHistory, ShowsItsNewestDecisions) {
+    DecisionHistory history = makeHistory("0110");
+    history.push(true);
+    EXPECT_EQ("1101", history.toString(4));
+    EXPECT_EQ("101", history.toString(3));
+    EXPECT_EQ("1", history.toString(1));
+    EXPECT_EQ("", history.toString(0));
 }
 
 TEST(DecisionHistory, IsCutAndExtendedAtItsEnd) {
     DecisionHistory history = makeHistory("0110");
     history.push(true);
-    ASSERT_EQ("1101", history.toString());
+    ASSERT_EQ("1101", history.toString(1000));
     history.resize(6);
-    EXPECT_EQ("110100", history.toString());
+    EXPECT_EQ("110100", history.toString(1000));
     history.resize(2);
-    EXPECT_EQ("11", history.toString());
+    EXPECT_EQ("11", history.toString(1000));
     history.resize(2);
-    EXPECT_EQ("11", history.toString());
+    EXPECT_EQ("11", history.toString(1000));
     history.resize(0);
-    EXPECT_EQ("", history.toString());
+    EXPECT_EQ("", history.toString(1000));
 }
 
 TEST(DecisionHistory, CountsTheNewestOfAnyLengthAtAnyTurn) {
@@ -66,7 +75,7 @@ TEST(DecisionHistory, CountsTheNewestOfAnyLengthAtAnyTurn) {
             const bool decision = noise.next() > 0;
             history.push(decision);
             model = model.substr(1) + (decision ? '1' : '0');
-            ASSERT_EQ(model, history.toString());
+            ASSERT_EQ(model, history.toString(1000));
             for (std::size_t span = 0; span <= length + 2; ++span) {
                 const std::size_t begin = length - std::min(span, length);
                 ASSERT_EQ(
