@@ -15,9 +15,13 @@ std::atomic<uint64_t> allocations{0};
 
 // The names under which glibc keeps its own allocator reachable for programs that wrap it.
 extern "C" {
+// NOLINTBEGIN(bugprone-reserved-identifier)
+// NOLINTBEGIN(bugprone-reserved-identifier): glibc's choice of names
 void* __libc_malloc(std::size_t size);
 void* __libc_calloc(std::size_t count, std::size_t size);
 void* __libc_realloc(void* memory, std::size_t size);
+// NOLINTEND(bugprone-reserved-identifier)
+// NOLINTEND(bugprone-reserved-identifier)
 
 void* malloc(std::size_t size) {
     allocations.fetch_add(1, std::memory_order_relaxed);

@@ -24,6 +24,8 @@ namespace {
 
 constexpr std::size_t BUFFER_SAMPLES = 1600;
 constexpr std::size_t BUFFERS = 190;  // below the limit of 20 seconds of sound
+constexpr std::size_t MEASURED = 95;  // the last ones, in steady state
+constexpr std::size_t WARM_UP_BUFFERS = BUFFERS / 2;
 constexpr int ROUNDS = 15;
 constexpr int QUALITY = 8;
 
@@ -83,7 +85,7 @@ SessionCost runSession(const std::vector<int16_t>& speech, EncodedSignal& encode
     recognizer->start();
     uint64_t allocations = 0;
     for (std::size_t i = 0; i < BUFFERS; ++i) {
-        if (i == BUFFERS / 2) {
+        if (i == WARM_UP_BUFFERS) {
             allocations = Bench::allocationCount();
         }
         Bench::BenchRecorder::current()->deliver(speech.data() + i * BUFFER_SAMPLES,
@@ -93,7 +95,7 @@ SessionCost runSession(const std::vector<int16_t>& speech, EncodedSignal& encode
     recognizer->stop();
     encoded.wait();
     cost.allocationsPerBuffer = static_cast<double>(Bench::allocationCount() - allocations) /
-                                static_cast<double>(BUFFERS - BUFFERS / 2);
+                                static_cast<double>(BUFFERS - WARM_UP_BUFFERS);
     cost.cpuMs = Bench::processCpuMs() - begin;
     recognizer->cancel();
     return cost;
