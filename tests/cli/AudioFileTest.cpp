@@ -6,8 +6,8 @@
 #include <sstream>
 
 #include "SoundFiles.h"
-#include "TempDirectory.h"
 #include "cli/UsageError.h"
+#include "support/ScratchDirectory.h"
 
 namespace {
 
@@ -17,8 +17,8 @@ using ::testing::Each;
 using ::testing::ElementsAre;
 using ::testing::FloatNear;
 using ::testing::StartsWith;
+using TestSupport::ScratchDirectory;
 using TestSupport::sine;
-using TestSupport::TempDirectory;
 using TestSupport::writeSoundFile;
 
 const int WAV = SF_FORMAT_WAV | SF_FORMAT_PCM_16;
@@ -34,7 +34,7 @@ std::string refusal(const std::string& path) {
 }
 
 TEST(AudioFile, Keeps16BitMonoSamplesAsTheyAre) {
-    const TempDirectory directory;
+    const ScratchDirectory directory;
     const std::string path = directory.path("a.wav");
     ASSERT_TRUE(writeSoundFile(path, WAV, 16000, 1, {0, 1, -1, 32767, -32768, 12345}));
     const AudioClip clip = readAudioFile(path);
@@ -43,7 +43,7 @@ TEST(AudioFile, Keeps16BitMonoSamplesAsTheyAre) {
 }
 
 TEST(AudioFile, MixesStereoDownToTheMean) {
-    const TempDirectory directory;
+    const ScratchDirectory directory;
     const std::string path = directory.path("stereo.wav");
     ASSERT_TRUE(writeSoundFile(path, WAV, 44100, 2, {100, 300, -50, 50, 32767, 32767}));
     const AudioClip clip = readAudioFile(path);
@@ -52,7 +52,7 @@ TEST(AudioFile, MixesStereoDownToTheMean) {
 }
 
 TEST(AudioFile, MixesManyChannels) {
-    const TempDirectory directory;
+    const ScratchDirectory directory;
     const std::string path = directory.path("eight.wav");
     ASSERT_TRUE(writeSoundFile(path, SF_FORMAT_WAVEX | SF_FORMAT_PCM_16, 48000, 8,
                                {80, 0, 0, 0, 0, 0, 0, 0, 8, 8, 8, 8, 8, 8, 8, 8}));
@@ -60,7 +60,7 @@ TEST(AudioFile, MixesManyChannels) {
 }
 
 TEST(AudioFile, ReadsEightBitSound) {
-    const TempDirectory directory;
+    const ScratchDirectory directory;
     const std::string path = directory.path("eight-bit.wav");
     ASSERT_TRUE(writeSoundFile(path, SF_FORMAT_WAV | SF_FORMAT_PCM_U8, 8000, 1,
                                {0, 256 * 100, -256 * 100}));
@@ -71,7 +71,7 @@ TEST(AudioFile, ReadsEightBitSound) {
 }
 
 TEST(AudioFile, ReadsFloatSoundAndSilencesWhatIsNoNumber) {
-    const TempDirectory directory;
+    const ScratchDirectory directory;
     const std::string path = directory.path("float.wav");
     SF_INFO info = {};
     info.format = SF_FORMAT_WAV | SF_FORMAT_FLOAT;
@@ -87,7 +87,7 @@ TEST(AudioFile, ReadsFloatSoundAndSilencesWhatIsNoNumber) {
 }
 
 TEST(AudioFile, ReadsOtherContainers) {
-    const TempDirectory directory;
+    const ScratchDirectory directory;
     const std::string aiff = directory.path("a.aiff");
     ASSERT_TRUE(writeSoundFile(aiff, SF_FORMAT_AIFF | SF_FORMAT_PCM_24, 16000, 1, {1000, -1000}));
     EXPECT_THAT(readAudioFile(aiff).samples, ElementsAre(1000, -1000));
@@ -97,10 +97,10 @@ TEST(AudioFile, ReadsOtherContainers) {
 }
 
 TEST(AudioFile, GivesTheSoundThatIsLeftOfATruncatedFile) {
-    const TempDirectory directory;
+    const ScratchDirectory directory;
     const std::string whole = directory.path("whole.wav");
     ASSERT_TRUE(writeSoundFile(whole, WAV, 16000, 1, std::vector<int16_t>(1000, 7)));
-    const std::string bytes = TempDirectory::read(whole);
+    const std::string bytes = ScratchDirectory::read(whole);
     ASSERT_EQ(bytes.size(), 44U + 2000U);
     const AudioClip clip = readAudioFile(directory.write("cut.wav", bytes.substr(0, 44 + 401)));
     EXPECT_EQ(clip.samples.size(), 200U);
@@ -108,41 +108,42 @@ TEST(AudioFile, GivesTheSoundThatIsLeftOfATruncatedFile) {
 }
 
 TEST(AudioFile, RefusesAFileThatIsCutInItsHeader) {
-    const TempDirectory directory;
+    const ScratchDirectory directory;
     const std::string whole = directory.path("whole.wav");
     ASSERT_TRUE(writeSoundFile(whole, WAV, 16000, 1, std::vector<int16_t>(1000, 7)));
-    const std::string path = directory.write("cut.wav", TempDirectory::read(whole).substr(0, 20));
+    const std::string path =
+        directory.write("cut.wav", ScratchDirectory::read(whole).substr(0, 20));
     EXPECT_THAT(refusal(path), StartsWith("cannot read " + path + ": "));
 }
 
 TEST(AudioFile, RefusesAFileWithoutSamples) {
-    const TempDirectory directory;
+    const ScratchDirectory directory;
     const std::string path = directory.path("silent.wav");
     ASSERT_TRUE(writeSoundFile(path, WAV, 16000, 1, {}));
     EXPECT_EQ(refusal(path), "cannot read " + path + ": it holds no sound");
 }
 
 TEST(AudioFile, RefusesAnEmptyFile) {
-    const TempDirectory directory;
+    const ScratchDirectory directory;
     const std::string path = directory.write("empty.wav", "");
     EXPECT_EQ(refusal(path), "cannot read " + path + ": the file is empty");
 }
 
 TEST(AudioFile, RefusesWhatIsNotSound) {
-    const TempDirectory directory;
+    const ScratchDirectory directory;
     const std::string path = directory.write("letter.txt", "Dear Sir or Madam, this is no sound.");
     EXPECT_EQ(refusal(path), "cannot read " + path + ": it is not sound of a known format");
 }
 
 TEST(AudioFile, RefusesAMissingFileAndADirectory) {
-    const TempDirectory directory;
+    const ScratchDirectory directory;
     const std::string missing = directory.path("nowhere.wav");
     EXPECT_EQ(refusal(missing), "cannot read " + missing + ": No such file or directory");
     EXPECT_EQ(refusal(directory.path()), "cannot read " + directory.path() + ": it is a directory");
 }
 
 TEST(AudioFile, RefusesAnAbsurdSampleRate) {
-    const TempDirectory directory;
+    const ScratchDirectory directory;
     const std::string path = directory.path("slow.wav");
     ASSERT_TRUE(writeSoundFile(path, WAV, 10, 1, {1, 2, 3}));
     EXPECT_EQ(refusal(path), "cannot read " + path + ": its sample rate of 10 Hz is out of range");

@@ -5,13 +5,13 @@
 #include <fstream>
 #include <nlohmann/json.hpp>
 
-#include "TempDirectory.h"
 #include "ToolProcess.h"
+#include "support/ScratchDirectory.h"
 
 namespace {
 
 using TestSupport::runTalvox;
-using TestSupport::TempDirectory;
+using TestSupport::ScratchDirectory;
 using TestSupport::ToolProcess;
 using TestSupport::ToolResult;
 
@@ -24,7 +24,7 @@ nlohmann::json recognise(const std::string& url, const std::string& name,
     std::vector<std::string> arguments = {"recognize", "--json", "--file", "-",
                                           "--rate",    "16000",  "--url",  url};
     arguments.insert(arguments.end(), options.begin(), options.end());
-    const ToolResult result = runTalvox(arguments, TempDirectory::read(RECORDINGS + name));
+    const ToolResult result = runTalvox(arguments, ScratchDirectory::read(RECORDINGS + name));
     EXPECT_EQ(result.status, 0) << result.err;
     const std::size_t last = result.out.rfind('\n', result.out.size() - 2);
     return nlohmann::json::parse(result.out.substr(last == std::string::npos ? 0 : last + 1));

@@ -2,9 +2,9 @@
 
 #include <gmock/gmock.h>
 
-#include "TempDirectory.h"
 #include "cli/UsageError.h"
 #include "support/LogCapture.h"
+#include "support/ScratchDirectory.h"
 
 namespace {
 
@@ -13,7 +13,7 @@ using Cli::buildSettings;
 using Cli::SettingsOptions;
 using Talvox::Settings;
 using TestSupport::LogCapture;
-using TestSupport::TempDirectory;
+using TestSupport::ScratchDirectory;
 
 std::string refusal(const std::string& key, const std::string& text) {
     Settings settings;
@@ -98,7 +98,7 @@ TEST(Assign, RefusesWhatIsNotWhollyAValueOfTheType) {
 }
 
 TEST(BuildSettings, AppliesItsSourcesInOrder) {
-    const TempDirectory directory;
+    const ScratchDirectory directory;
     const LogCapture log;
     SettingsOptions options;
     options.defaults = {{"url", "default"}, {"uuid", "default"}, {"model", "d"}, {"vad", "d"}};
@@ -133,7 +133,7 @@ TEST(BuildSettings, RefusesAnAssignmentWithoutAnEqualsSign) {
 }
 
 TEST(BuildSettings, LogsWhatIsWrongInADocumentAndAppliesTheRest) {
-    const TempDirectory directory;
+    const ScratchDirectory directory;
     const LogCapture log;
     SettingsOptions options;
     options.file = directory.write(
@@ -146,7 +146,7 @@ TEST(BuildSettings, LogsWhatIsWrongInADocumentAndAppliesTheRest) {
 }
 
 TEST(BuildSettings, KeepsTheDefaultsWhenTheDocumentIsBroken) {
-    const TempDirectory directory;
+    const ScratchDirectory directory;
     for (const char* text : {"", "<startup>", "not XML at all", "<startup/>", "\xC3"}) {
         const LogCapture log;
         SettingsOptions options;
@@ -157,7 +157,7 @@ TEST(BuildSettings, KeepsTheDefaultsWhenTheDocumentIsBroken) {
 }
 
 TEST(BuildSettings, RefusesADocumentThatCannotBeRead) {
-    const TempDirectory directory;
+    const ScratchDirectory directory;
     SettingsOptions options;
     options.file = directory.path("nowhere.xml");
     try {

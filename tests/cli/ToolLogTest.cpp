@@ -3,8 +3,8 @@
 
 #include <csignal>
 
-#include "TempDirectory.h"
 #include "ToolProcess.h"
+#include "support/ScratchDirectory.h"
 #include "support/ScriptedHttpServer.h"
 
 namespace {
@@ -14,8 +14,8 @@ using ::testing::HasSubstr;
 using ::testing::MatchesRegex;
 using TestSupport::Answer;
 using TestSupport::runTalvox;
+using TestSupport::ScratchDirectory;
 using TestSupport::ScriptedHttpServer;
-using TestSupport::TempDirectory;
 using TestSupport::ToolProcess;
 using TestSupport::ToolResult;
 
@@ -88,7 +88,7 @@ TEST(ToolLog, RefusesWrongUsage) {
 }
 
 TEST(ToolLog, ReachesTheGateway) {
-    const TempDirectory directory;
+    const ScratchDirectory directory;
     const std::string records = directory.path("records");
     ToolProcess gateway(GATEWAY_BINARY, {"--port", "0", "--log-file", records});
     const std::string line = gateway.waitForLine("listening on");
@@ -98,7 +98,7 @@ TEST(ToolLog, ReachesTheGateway) {
     EXPECT_EQ(0, result.status) << result.err;
     gateway.signal(SIGTERM);
     EXPECT_EQ(0, gateway.wait().status);
-    EXPECT_THAT(TempDirectory::read(records),
+    EXPECT_THAT(ScratchDirectory::read(records),
                 MatchesRegex("20[0-9-]+T[0-9:]+Z uuid=u1 time=[0-9 :-]+;sessionId=s;type=error;"
                              "name=n;k=one\\\\x0atwo\n"));
 }

@@ -8,9 +8,9 @@
 #include <sstream>
 
 #include "SoundFiles.h"
-#include "TempDirectory.h"
 #include "ToolProcess.h"
 #include "core/util/Base64Coder.h"
+#include "support/ScratchDirectory.h"
 #include "support/ScriptedHttpServer.h"
 
 namespace {
@@ -22,8 +22,8 @@ using ::testing::Not;
 using TestSupport::Answer;
 using TestSupport::RefusingPort;
 using TestSupport::runTalvox;
+using TestSupport::ScratchDirectory;
 using TestSupport::ScriptedHttpServer;
-using TestSupport::TempDirectory;
 using TestSupport::ToolProcess;
 using TestSupport::ToolResult;
 
@@ -145,7 +145,7 @@ TEST(ToolRecognize, HasDefaultsOfItsOwn) {
 }
 
 TEST(ToolRecognize, PlaysTheWholeFileAndDumpsWhatWasHeard) {
-    const TempDirectory directory;
+    const ScratchDirectory directory;
     ScriptedHttpServer server;
     server.script({resultAnswer("<variant confidence=\"1\">a</variant>")});
     const std::vector<int16_t> samples = TestSupport::voiceLike(16000, 0.6);
@@ -158,13 +158,13 @@ TEST(ToolRecognize, PlaysTheWholeFileAndDumpsWhatWasHeard) {
                    directory.path(), "--events", directory.path("events")});
     EXPECT_EQ(result.status, 0) << result.err;
     const std::string sound = std::string(8000, '\0') + TestSupport::rawBytes(samples);
-    const std::string dump = TempDirectory::read(directory.path("in.wav"));
+    const std::string dump = ScratchDirectory::read(directory.path("in.wav"));
     ASSERT_GT(dump.size(), 44 + sound.size());
     EXPECT_EQ(dump.substr(0, 4), "RIFF");
     EXPECT_TRUE(dump.compare(44, sound.size(), sound) == 0) << "the dump is not the sound played";
     EXPECT_TRUE(server.getRequest(0).body.find(sound) != std::string::npos)
         << "the sound did not arrive at the gateway";
-    EXPECT_EQ(TempDirectory::read(directory.path("events")), result.out);
+    EXPECT_EQ(ScratchDirectory::read(directory.path("events")), result.out);
 }
 
 TEST(ToolRecognize, EndsWithStatus1WhenTheGatewayIsNotThere) {
@@ -234,14 +234,14 @@ TEST(ToolRecognize, CtrlCCancelsWhileTheAnswerIsAwaited) {
 TEST(ToolRecognize, RunsToItsEndWhenNobodyReadsItsOutput) {
     ScriptedHttpServer server;
     server.setDefaultAnswer(resultAnswer("<variant confidence=\"1\">a</variant>"));
-    const TempDirectory directory;
+    const ScratchDirectory directory;
     const std::string sound = directory.write("a.raw", voice());
     std::string command = std::string(TALVOX_BINARY) + " recognize --file - --json --url " +
                           server.getUrl() + " --vad '" + QUICK_VAD + "' < " + sound + " 2>" +
                           directory.path("err") + " | true; exit ${PIPESTATUS[0]}";
     ToolProcess process("/bin/bash", {"-c", command});
     EXPECT_EQ(process.wait().status, 1);
-    EXPECT_EQ(TempDirectory::read(directory.path("err")),
+    EXPECT_EQ(ScratchDirectory::read(directory.path("err")),
               "talvox: cannot write to standard output\n");
     EXPECT_TRUE(server.waitForRequest(1));
 }

@@ -5,8 +5,8 @@
 #include <algorithm>
 
 #include "SoundFiles.h"
-#include "TempDirectory.h"
 #include "ToolProcess.h"
+#include "support/ScratchDirectory.h"
 
 namespace {
 
@@ -15,7 +15,7 @@ using ::testing::HasSubstr;
 using ::testing::MatchesRegex;
 using ::testing::StartsWith;
 using TestSupport::runTalvox;
-using TestSupport::TempDirectory;
+using TestSupport::ScratchDirectory;
 using TestSupport::ToolResult;
 
 /** Status 2, one line of the tool on standard error, nothing on standard output. */
@@ -88,11 +88,12 @@ TEST(Tool, RefusesWrongSettings) {
 }
 
 TEST(Tool, RefusesBadSoundFiles) {
-    const TempDirectory directory;
+    const ScratchDirectory directory;
     const std::string silent = directory.path("silent.wav");
     ASSERT_TRUE(
         TestSupport::writeSoundFile(silent, SF_FORMAT_WAV | SF_FORMAT_PCM_16, 16000, 1, {}));
-    const std::string cut = directory.write("cut.wav", TempDirectory::read(silent).substr(0, 30));
+    const std::string cut =
+        directory.write("cut.wav", ScratchDirectory::read(silent).substr(0, 30));
     for (const char* command : {"recognize", "vad"}) {
         expectRefused({command, "--file", directory.path("nowhere.wav")},
                       "nowhere.wav: No such file or directory");
@@ -109,7 +110,7 @@ TEST(Tool, RefusesBadSoundFiles) {
 }
 
 TEST(Tool, RefusesADumpDirectoryThatItCannotUse) {
-    const TempDirectory directory;
+    const ScratchDirectory directory;
     expectRefused({"recognize", "--mic", "--dump", directory.path("nowhere")},
                   "nowhere: No such file or directory");
     expectRefused({"recognize", "--mic", "--dump", directory.write("file", "x")},
@@ -155,7 +156,7 @@ TEST(ToolSettings, PrintsDefaultsAndWhatValidationFindsInThem) {
 }
 
 TEST(ToolSettings, AppliesADocumentThenAssignmentsAndTellsEveryRepair) {
-    const TempDirectory directory;
+    const ScratchDirectory directory;
     const std::string file = directory.write(
         "settings.xml",
         "<startup><features><voice>"
@@ -177,7 +178,7 @@ TEST(ToolSettings, AppliesADocumentThenAssignmentsAndTellsEveryRepair) {
 }
 
 TEST(ToolSettings, TellsWhenADocumentIsBroken) {
-    const TempDirectory directory;
+    const ScratchDirectory directory;
     const ToolResult result =
         runTalvox({"settings", "--settings", directory.write("s.xml", "<startup>")});
     EXPECT_EQ(result.status, 0);

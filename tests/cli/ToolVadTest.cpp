@@ -6,14 +6,14 @@
 #include <sstream>
 
 #include "SoundFiles.h"
-#include "TempDirectory.h"
 #include "ToolProcess.h"
+#include "support/ScratchDirectory.h"
 
 namespace {
 
 using ::testing::HasSubstr;
 using TestSupport::runTalvox;
-using TestSupport::TempDirectory;
+using TestSupport::ScratchDirectory;
 using TestSupport::ToolResult;
 
 /** One second of silence, one and a half of voice, one and a half of silence. */
@@ -67,7 +67,7 @@ TEST(ToolVad, FindsTheUtteranceInRawSound) {
 }
 
 TEST(ToolVad, FindsTheUtteranceInAFileOfAnotherRate) {
-    const TempDirectory directory;
+    const ScratchDirectory directory;
     const std::string path = directory.path("a.wav");
     ASSERT_TRUE(TestSupport::writeSoundFile(path, SF_FORMAT_WAV | SF_FORMAT_PCM_16, 44100, 1,
                                             utterance(44100)));

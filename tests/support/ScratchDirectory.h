@@ -6,6 +6,8 @@
 
 #include <cstdlib>
 #include <filesystem>
+#include <fstream>
+#include <iterator>
 #include <stdexcept>
 #include <string>
 #include <system_error>
@@ -29,8 +31,22 @@ class ScratchDirectory {
     ScratchDirectory(const ScratchDirectory&) = delete;
     ScratchDirectory& operator=(const ScratchDirectory&) = delete;
 
-    /** The path of a file in the directory. */
-    std::string path(const std::string& name) const { return root + "/" + name; }
+    /** The path of a file in the directory, or of the directory itself. */
+    std::string path(const std::string& name = "") const {
+        return name.empty() ? root : root + "/" + name;
+    }
+
+    /** Writes a file in the directory. @return its path */
+    std::string write(const std::string& name, const std::string& bytes) const {
+        std::ofstream(path(name), std::ios::binary) << bytes;
+        return path(name);
+    }
+
+    /** All bytes of any file; none when it cannot be read. */
+    static std::string read(const std::string& path) {
+        std::ifstream file(path, std::ios::binary);
+        return {std::istreambuf_iterator<char>(file), std::istreambuf_iterator<char>()};
+    }
 
   private:
     std::string root;
