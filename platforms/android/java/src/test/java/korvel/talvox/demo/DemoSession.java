@@ -19,9 +19,16 @@ public class DemoSession extends KitTest {
 
     /** Prints each event with its time. */
     private static final class Printer implements RecognitionListener {
+        private final Microphone microphone;
+        private final byte[] speech;
         private final CountDownLatch over = new CountDownLatch(1);
         private int buffers;
         private int levels;
+
+        Printer(Microphone microphone, byte[] speech) {
+            this.microphone = microphone;
+            this.speech = speech;
+        }
 
         private static void print(String event) {
             System.out.printf("%7.3f s  %s%n", (System.nanoTime() - BEGIN) / 1e9, event);
@@ -30,6 +37,7 @@ public class DemoSession extends KitTest {
         @Override
         public void onRecordingBegin() {
             print("recording began");
+            microphone.say(speech);
         }
 
         @Override
@@ -71,18 +79,14 @@ public class DemoSession extends KitTest {
     @Test
     public void recognise() throws Exception {
         final SpeechFile speech = SpeechFile.read(System.getProperty("talvox.demo.file"));
-        final Printer printer = new Printer();
         final TalvoxEngine engine = TalvoxEngine.getInstance(application);
+        final TalvoxSettings settings =
+                TalvoxSettings.builder()
+                        .set(TalvoxSettings.SAMPLE_RATE, speech.sampleRateHz)
+                        .set(TalvoxSettings.STREAMING, true)
+                        .build();
         try (DevelopmentGateway gateway = new DevelopmentGateway();
-                Microphone microphone =
-                        new Microphone(speech.samples, speech.sampleRateHz, 1).plugIn();
-                TalvoxRecognizer recognizer =
-                        engine.createRecognizer(
-                                TalvoxSettings.builder()
-                                        .set(TalvoxSettings.SAMPLE_RATE, speech.sampleRateHz)
-                                        .set(TalvoxSettings.STREAMING, true)
-                                        .build(),
-                                printer)) {
+                Microphone microphone = new Microphone(speech.sampleRateHz, 1).plugIn()) {
             engine.updateSettings(
                     TalvoxSettings.builder()
                             .set(TalvoxSettings.URL, gateway.getUrl())
@@ -90,8 +94,11 @@ public class DemoSession extends KitTest {
                             .set(TalvoxSettings.LANGUAGE, "en-US")
                             .build());
             Printer.print("engine " + engine.getVersion() + ", gateway " + gateway.getUrl());
-            recognizer.start();
-            await(printer.over);
+            final Printer printer = new Printer(microphone, speech.samples);
+            try (TalvoxRecognizer recognizer = engine.createRecognizer(settings, printer)) {
+                recognizer.start();
+                await(printer.over);
+            }
         }
     }
 }

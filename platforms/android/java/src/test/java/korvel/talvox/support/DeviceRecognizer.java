@@ -65,10 +65,20 @@ public final class DeviceRecognizer {
 
     /** Calls back on the main looper, as the device does. */
     public static void callBack(Callback callback) {
-        final Object state = ReflectionHelpers.callInstanceMethod(latest(), "getState");
-        final RecognitionListener listener =
-                ReflectionHelpers.getField(state, "recognitionListener");
+        final RecognitionListener listener = getListener();
         KitTest.onMain(() -> callback.call(listener));
+    }
+
+    /** The framework hands the listener over after some turns of the main looper. */
+    private static RecognitionListener getListener() {
+        final Object state = ReflectionHelpers.callInstanceMethod(latest(), "getState");
+        RecognitionListener listener = null;
+        for (int turn = 0; listener == null && turn < 10; turn++) {
+            KitTest.drainMain();
+            listener = ReflectionHelpers.getField(state, "recognitionListener");
+        }
+        assertNotNull("the device's recogniser has no listener", listener);
+        return listener;
     }
 
     /**

@@ -8,9 +8,15 @@ import android.app.Application;
 import android.os.Handler;
 import android.os.Looper;
 import java.util.concurrent.CountDownLatch;
+import java.util.concurrent.ExecutionException;
+import java.util.concurrent.FutureTask;
 import java.util.concurrent.TimeUnit;
+import java.util.concurrent.TimeoutException;
 import java.util.stream.Collectors;
 import org.junit.Before;
+import org.junit.Rule;
+import org.junit.rules.TestWatcher;
+import org.junit.runner.Description;
 import org.junit.runner.RunWith;
 import org.robolectric.RobolectricTestRunner;
 import org.robolectric.RuntimeEnvironment;
@@ -27,29 +33,35 @@ import org.robolectric.shadows.ShadowLog;
 @LooperMode(LooperMode.Mode.INSTRUMENTATION_TEST)
 public abstract class KitTest {
     /** Longest wait for anything that has to come, in seconds. */
-    public static final int PATIENCE_S = 60;
+    public static final int PATIENCE_S = 20;
+
+    /** Shows the log of a test that fails. */
+    @Rule
+    public final TestWatcher logOfFailures =
+            new TestWatcher() {
+                @Override
+                protected void failed(Throwable failure, Description test) {
+                    System.out.println("log of " + test.getMethodName() + ":\n" + log());
+                }
+            };
 
     protected Application application;
 
     @Before
-    public void allowRecording() {
+    public final void allowRecording() {
         application = RuntimeEnvironment.getApplication();
         shadowOf(application).grantPermissions(Manifest.permission.RECORD_AUDIO);
     }
 
-    /** Runs something on the main looper and waits until it has run. */
+    /** Runs something on the main looper and waits until it has run; what it throws comes here. */
     public static void onMain(Runnable action) {
-        final CountDownLatch done = new CountDownLatch(1);
-        new Handler(Looper.getMainLooper())
-                .post(
-                        () -> {
-                            try {
-                                action.run();
-                            } finally {
-                                done.countDown();
-                            }
-                        });
-        await(done);
+        final FutureTask<Void> task = new FutureTask<>(action, null);
+        new Handler(Looper.getMainLooper()).post(task);
+        try {
+            task.get(PATIENCE_S, TimeUnit.SECONDS);
+        } catch (InterruptedException | ExecutionException | TimeoutException failure) {
+            throw new AssertionError(failure);
+        }
     }
 
     /** Waits until the main looper has run all that has been posted so far. */

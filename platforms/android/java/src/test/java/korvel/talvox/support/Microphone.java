@@ -14,14 +14,15 @@ import java.util.concurrent.TimeUnit;
 import org.robolectric.shadows.ShadowAudioRecord;
 
 /**
- * The microphone of a test: 16-bit mono sound, then quiet noise without end, at a multiple of the
- * speed of real time. A read waits until its samples are due, as that of a device does.
+ * The microphone of a test: 16-bit mono, quiet noise until something is said and after it, at a
+ * multiple of the speed of real time. A read waits until its samples are due, as that of a device
+ * does.
  */
 public final class Microphone implements ShadowAudioRecord.AudioRecordSource, AutoCloseable {
     private static final int TICK_MS = 10;
+    private static final int TICKS_KEPT = 8;
     private static final int NOISE_AMPLITUDE = 8;
 
-    private final byte[] sound;
     private final Random noise = new Random(1);
     private final Semaphore due = new Semaphore(0);
     private final ScheduledExecutorService clock =
@@ -31,18 +32,25 @@ public final class Microphone implements ShadowAudioRecord.AudioRecordSource, Au
                         thread.setDaemon(true);
                         return thread;
                     });
+    private byte[] sound = new byte[0];
     private int position;
 
     /**
-     * @param sound what is said
      * @param sampleRateHz of the sound
      * @param speed 1 for real time
      */
-    public Microphone(byte[] sound, int sampleRateHz, int speed) {
-        this.sound = sound;
+    public Microphone(int sampleRateHz, int speed) {
         final int bytesPerTick = 2 * sampleRateHz * TICK_MS * speed / 1000;
         clock.scheduleAtFixedRate(
-                () -> due.release(bytesPerTick), 0, TICK_MS, TimeUnit.MILLISECONDS);
+                () -> {
+                    // What nobody reads is lost, as with a device.
+                    if (due.availablePermits() < TICKS_KEPT * bytesPerTick) {
+                        due.release(bytesPerTick);
+                    }
+                },
+                0,
+                TICK_MS,
+                TimeUnit.MILLISECONDS);
     }
 
     /** Opens it for the recordings that begin from now on. */
@@ -51,15 +59,16 @@ public final class Microphone implements ShadowAudioRecord.AudioRecordSource, Au
         return this;
     }
 
-    /** Half a second of quiet, a recording of 16 kHz from the test data, then quiet. */
+    /** Says something from now on. */
+    public synchronized void say(byte[] what) {
+        sound = what;
+        position = 0;
+    }
+
+    /** A recording of 16 kHz from the test data. */
     public static byte[] recording(String name) {
         try {
-            final byte[] speech =
-                    Files.readAllBytes(Paths.get(System.getProperty("talvox.recordings"), name));
-            final byte[] sound = new byte[16000 + speech.length];
-            fill(sound, 0, 16000, new Random(2));
-            System.arraycopy(speech, 0, sound, 16000, speech.length);
-            return sound;
+            return Files.readAllBytes(Paths.get(System.getProperty("talvox.recordings"), name));
         } catch (IOException failure) {
             throw new UncheckedIOException(failure);
         }
