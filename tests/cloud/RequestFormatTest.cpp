@@ -2,9 +2,8 @@
 
 #include <gtest/gtest.h>
 
-#include <clocale>
-
 #include "support/AssertCapture.h"
+#include "support/CommaLocale.h"
 
 namespace {
 
@@ -12,6 +11,7 @@ using Talvox::Settings;
 using Talvox::TranscriptsOrigin;
 using TestSupport::AssertCapture;
 using TestSupport::AssertReport;
+using TestSupport::CommaLocale;
 
 const char* const SOURCE = "talvox/impl/RecognizeRequest";
 
@@ -98,12 +98,12 @@ TEST(Location, HasSixDecimalsEach) {
 }
 
 TEST(Location, HasPointsWhateverTheLocale) {
-    const std::string before = std::setlocale(LC_NUMERIC, nullptr);
-    if (std::setlocale(LC_NUMERIC, "de_DE.UTF-8") == nullptr) {
-        GTEST_SKIP() << "no locale with a decimal comma on this system";
+    if (!CommaLocale::isAvailable()) {
+        GTEST_SKIP() << "no locale with a decimal comma can be made on this machine";
     }
+    const CommaLocale comma;
+    ASSERT_TRUE(comma.isSet());
     EXPECT_EQ(Talvox::formatLocation({1.5F, 2.5F}), "1.500000,2.500000");
-    std::setlocale(LC_NUMERIC, before.c_str());
 }
 
 TEST(Transcripts, AreWrittenLineByLine) {

@@ -3,12 +3,14 @@
 #include <gtest/gtest.h>
 
 #include <cfloat>
-#include <clocale>
 #include <cmath>
 #include <limits>
 #include <locale>
 #include <string>
 
+#include "support/CommaLocale.h"
+
+using TestSupport::CommaLocale;
 using Util::NumberText;
 
 namespace {
@@ -174,17 +176,11 @@ TEST(NumberText, AHostApplicationsLocaleChangesNothing) {
 }
 
 TEST(NumberText, AHostApplicationsCLocaleChangesNothing) {
-    const std::string old = std::setlocale(LC_NUMERIC, nullptr);
-    const char* comma = nullptr;
-    for (const char* name : {"de_DE.UTF-8", "ru_RU.UTF-8", "fr_FR.UTF-8"}) {
-        comma = comma == nullptr ? std::setlocale(LC_NUMERIC, name) : comma;
+    if (!CommaLocale::isAvailable()) {
+        GTEST_SKIP() << "no locale with a decimal comma can be made on this machine";
     }
-    if (comma == nullptr) {
-        GTEST_SKIP() << "no locale with a decimal comma on this machine";
-    }
-    const float value = NumberText::readFloat("0.9").value;
-    const std::string text = NumberText::writeFloat(0.9F);
-    std::setlocale(LC_NUMERIC, old.c_str());
-    EXPECT_EQ(0.9F, value);
-    EXPECT_EQ("0.9", text);
+    const CommaLocale comma;
+    ASSERT_TRUE(comma.isSet());
+    EXPECT_EQ(0.9F, NumberText::readFloat("0.9").value);
+    EXPECT_EQ("0.9", NumberText::writeFloat(0.9F));
 }
