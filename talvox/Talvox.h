@@ -95,19 +95,14 @@ class TALVOX_API Talvox : public Util::Singleton<Talvox> {
 
     /**
      * The languages of all mechanisms, each once, in ascending byte order. Computed once, but as
-     * long as a platform does not know its own, asked of it again. Takes the event lock.
+     * long as a platform does not know its own, asked of it again: until then a later call may
+     * change the list, which is therefore to be read under the event lock. Takes the event lock.
      */
     const std::vector<std::string>& getAvailableLanguages() const;
 
     /** Joins two lists of languages into one that is sorted and free of duplicates. */
     static std::vector<std::string> mergeLanguages(const std::vector<std::string>& first,
                                                    const std::vector<std::string>& second);
-
-    /**
-     * Keeps fire-and-forget requests alive: whoever submits one appends its holder, and removes it
-     * when the request has finished. Used under the event lock only.
-     */
-    std::vector<boost::shared_ptr<Network::NetworkTaskHolder>> runningTaskHolders;
 
   private:
     friend class Util::Singleton<Talvox>;
@@ -120,6 +115,15 @@ class TALVOX_API Talvox : public Util::Singleton<Talvox> {
         RecognitionMechanism mechanism, const boost::shared_ptr<const Settings>& settings) const;
 
     boost::shared_ptr<const Settings> talvoxSettings;
+
+  public:
+    /**
+     * Keeps fire-and-forget requests alive: whoever submits one appends its holder, and removes it
+     * when the request has finished. Used under the event lock only.
+     */
+    std::vector<boost::shared_ptr<Network::NetworkTaskHolder>> runningTaskHolders;
+
+  private:
     KDThreadMutex* registrationLock;
     mutable std::atomic<Recognizer*> activeRecognizer;
 };
