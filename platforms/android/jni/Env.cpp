@@ -1,6 +1,7 @@
 #include "Env.h"
 
 #include <algorithm>
+#include <cstring>
 #include <stdexcept>
 
 #include "Text.h"
@@ -98,7 +99,9 @@ void keepClassLoader(JNIEnv* env, jclass classOfApplication) {
 }
 
 LocalRef<jclass> findClass(JNIEnv* env, const char* name) {
-    if (!classLoader()) {
+    // Every loader knows the system's own, and asking the VM is quicker.
+    const bool isSystem = std::strncmp(name, "java/", std::strlen("java/")) == 0;
+    if (isSystem || !classLoader()) {
         LocalRef<jclass> found(env, env->FindClass(name));
         check(env);
         return found;

@@ -75,43 +75,38 @@ LocalRef<jobject> callObject(JNIEnv* env, jobject object, const char* name, cons
     return result;
 }
 
-template <typename... Args>
-jboolean callBoolean(JNIEnv* env, jobject object, const char* name, const char* signature,
-                     Args... args) {
+/** Calls a method of a primitive type by the environment's function for that type. */
+template <typename T, typename... Args>
+T callPrimitive(JNIEnv* env, T (JNIEnv::*function)(jobject, jmethodID, ...), jobject object,
+                const char* name, const char* signature, Args... args) {
     const LocalRef<jclass> type(env, env->GetObjectClass(object));
     const jmethodID method = findMethod(env, type.get(), name, signature);
-    const jboolean result = env->CallBooleanMethod(object, method, args...);
+    const T result = (env->*function)(object, method, args...);
     check(env);
     return result;
 }
 
 template <typename... Args>
+jboolean callBoolean(JNIEnv* env, jobject object, const char* name, const char* signature,
+                     Args... args) {
+    return callPrimitive(env, &JNIEnv::CallBooleanMethod, object, name, signature, args...);
+}
+
+template <typename... Args>
 jint callInt(JNIEnv* env, jobject object, const char* name, const char* signature, Args... args) {
-    const LocalRef<jclass> type(env, env->GetObjectClass(object));
-    const jmethodID method = findMethod(env, type.get(), name, signature);
-    const jint result = env->CallIntMethod(object, method, args...);
-    check(env);
-    return result;
+    return callPrimitive(env, &JNIEnv::CallIntMethod, object, name, signature, args...);
 }
 
 template <typename... Args>
 jfloat callFloat(JNIEnv* env, jobject object, const char* name, const char* signature,
                  Args... args) {
-    const LocalRef<jclass> type(env, env->GetObjectClass(object));
-    const jmethodID method = findMethod(env, type.get(), name, signature);
-    const jfloat result = env->CallFloatMethod(object, method, args...);
-    check(env);
-    return result;
+    return callPrimitive(env, &JNIEnv::CallFloatMethod, object, name, signature, args...);
 }
 
 template <typename... Args>
 jdouble callDouble(JNIEnv* env, jobject object, const char* name, const char* signature,
                    Args... args) {
-    const LocalRef<jclass> type(env, env->GetObjectClass(object));
-    const jmethodID method = findMethod(env, type.get(), name, signature);
-    const jdouble result = env->CallDoubleMethod(object, method, args...);
-    check(env);
-    return result;
+    return callPrimitive(env, &JNIEnv::CallDoubleMethod, object, name, signature, args...);
 }
 
 template <typename... Args>

@@ -29,17 +29,19 @@ public class RecorderTest extends EngineTestCase {
     /** Delivers one piece for each permit; fails or ends when it is told to. */
     private static final class Input implements SoundInput {
         final Semaphore permits = new Semaphore(0);
+        final CountDownLatch reading = new CountDownLatch(1);
         final CountDownLatch closed = new CountDownLatch(1);
         volatile IOException failure;
         volatile int lastSize;
 
         @Override
         public int read(byte[] buffer, int sizeInBytes) throws IOException {
+            lastSize = sizeInBytes;
+            reading.countDown();
             permits.acquireUninterruptibly();
             if (failure != null) {
                 throw failure;
             }
-            lastSize = sizeInBytes;
             return sizeInBytes;
         }
 
@@ -51,7 +53,6 @@ public class RecorderTest extends EngineTestCase {
 
     private final Input input = new Input();
     private final List<String> openings = Collections.synchronizedList(new ArrayList<>());
-    private final CountDownLatch opened = new CountDownLatch(1);
 
     @Before
     public void plugIn() {
@@ -60,7 +61,6 @@ public class RecorderTest extends EngineTestCase {
         AudioRecorderBackend.setInputFactory(
                 (sampleRateHz, bufferLengthMs, mode) -> {
                     openings.add(sampleRateHz + " Hz, " + bufferLengthMs + " ms, mode " + mode);
-                    opened.countDown();
                     return input;
                 });
     }
@@ -80,9 +80,9 @@ public class RecorderTest extends EngineTestCase {
                         .build());
         try (TalvoxRecognizer recognizer = engine.createRecognizer(NOTHING, new Events())) {
             recognizer.start();
-            await(opened);
-            input.permits.release();
+            await(input.reading);
         }
+        input.permits.release();
         await(input.closed);
         assertEquals(Collections.singletonList("8000 Hz, 100 ms, mode 0"), openings);
         assertEquals(2 * 8000 * 20 / 1000, input.lastSize);
@@ -121,7 +121,7 @@ public class RecorderTest extends EngineTestCase {
     public void theNextRecordingWaitsForTheDeviceOfTheOneBefore() throws Exception {
         try (TalvoxRecognizer recognizer = engine.createRecognizer(NOTHING, new Events())) {
             recognizer.start();
-            await(opened);
+            await(input.reading);
         }
         final CountDownLatch openedAgain = new CountDownLatch(1);
         final AtomicInteger openInputs = new AtomicInteger();

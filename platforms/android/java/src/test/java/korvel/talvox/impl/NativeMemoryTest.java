@@ -57,7 +57,7 @@ public class NativeMemoryTest extends EngineTestCase {
         convert(bundle, CONVERSIONS);
         System.gc();
         final long grown = residentKib() - before;
-        // 40 bytes for each conversion: less than one lost reference or text.
+        // 40 bytes for each conversion: less than a text or an element that is lost.
         assertTrue("grown by " + grown + " KiB", grown < KIB_ALLOWED);
     }
 }
