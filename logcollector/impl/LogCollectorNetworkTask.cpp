@@ -20,8 +20,10 @@ LogCollectorNetworkTask::LogCollectorNetworkTask(std::string recordText, Callbac
     : record(std::move(recordText)), callback(std::move(completion)) {}
 
 bool LogCollectorNetworkTask::isTooLong(const std::string& record) {
-    return record.size() > MAX_ENCODED_BYTES ||
-           Util::UrlCoder::urlEncodeString(record).size() > MAX_ENCODED_BYTES;
+    constexpr std::size_t MOST_BYTES_OF_ONE = 3;
+    const bool isShort = record.size() <= MAX_ENCODED_BYTES / MOST_BYTES_OF_ONE;
+    return !isShort && (record.size() > MAX_ENCODED_BYTES ||
+                        Util::UrlCoder::urlEncodeString(record).size() > MAX_ENCODED_BYTES);
 }
 
 bool LogCollectorNetworkTask::isReadyToPerform() const {

@@ -1,6 +1,8 @@
 #include "logcollector/impl/LogSender.h"
 
 #include <boost/make_shared.hpp>
+#include <boost/weak_ptr.hpp>
+#include <memory>
 #include <utility>
 
 #include "core/Logger.h"
@@ -42,7 +44,11 @@ std::string timeToString(long long seconds) {
     return text;
 }
 
-LogSender::LogSender() : queueMutex(kdThreadMutexCreate(nullptr)), pause([this] { goOn(); }) {
+// The next record follows where the last one ends: on the network thread.
+LogSender::LogSender()
+    : NetworkTaskHolder(EndThread::NETWORK),
+      queueMutex(kdThreadMutexCreate(nullptr)),
+      pause([this] { goOn(); }) {
     kdInstallCallback(&LogSender::onTimerFired, KD_EVENT_TIMER, this);
 }
 
@@ -152,11 +158,23 @@ void LogSender::onRequestComplete(bool success, const std::string& record, int s
         onFinished();
     }
     sendNextRecord();
-    if (success && getPendingCount() == 0 && onDelivered) {
-        // Last, and a copy: it may replace itself or end the collector.
-        const std::function<void()> callback = onDelivered;
-        callback();
+    if (success && onDelivered && getPendingCount() == 0) {
+        postDelivered();
     }
+}
+
+// The callback may end everything, the network thread included; so it is not for that thread.
+void LogSender::postDelivered() {
+    using WeakCallback = boost::weak_ptr<const std::function<void()>>;
+    auto post = std::make_unique<WeakCallback>(onDelivered);
+    kdPostKOR(
+        [](void* user) {
+            const std::unique_ptr<WeakCallback> posted(static_cast<WeakCallback*>(user));
+            if (const auto callback = posted->lock()) {
+                (*callback)();
+            }
+        },
+        post.release());
 }
 
 // The retry policy spaces the attempts of what it repeats. An endpoint that refuses at once, with a
@@ -188,7 +206,11 @@ std::size_t LogSender::getPendingCount() const {
 
 void LogSender::setDeliveredCallback(std::function<void()> callback) {
     const Util::EventLock lock;
-    onDelivered = std::move(callback);
+    // One that has been posted and is replaced now must not run any more.
+    onDelivered.reset();
+    if (callback) {
+        onDelivered = boost::make_shared<const std::function<void()>>(std::move(callback));
+    }
 }
 
 }  // namespace LogCollector

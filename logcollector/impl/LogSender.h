@@ -79,6 +79,7 @@ class LogSender : public Network::NetworkTaskHolder {
     void append(const std::string& record);
     void holdBack(const std::string& record, int status);
     void goOn();
+    void postDelivered();
 
     std::list<std::string> queue;
     KDTimer* timer = nullptr;
@@ -88,7 +89,7 @@ class LogSender : public Network::NetworkTaskHolder {
     Hold hold = Hold::NONE;
     Util::Timer pause;
     std::optional<int64_t> lastFailureAt;
-    std::function<void()> onDelivered;
+    boost::shared_ptr<const std::function<void()>> onDelivered;
 };
 
 }  // namespace LogCollector

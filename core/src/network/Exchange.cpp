@@ -21,10 +21,11 @@ constexpr int64_t NS_PER_MS = 1000000;
 }  // namespace
 
 Exchange::Exchange(boost::shared_ptr<Transport> owner, boost::shared_ptr<NetworkTask> what,
-                   boost::shared_ptr<NetworkTaskRetryPolicy> when)
+                   boost::shared_ptr<NetworkTaskRetryPolicy> when, bool endHere)
     : transport(std::move(owner)),
       task(std::move(what)),
       policy(std::move(when)),
+      endsHere(endHere),
       retryTimer([this] { postAttempt(); }) {}
 
 void Exchange::start() {
@@ -49,7 +50,8 @@ void Exchange::cancel() {
 void Exchange::postAttempt() {
     const boost::shared_ptr<Exchange> self = shared_from_this();
     if (!transport->post([self] { self->attempt(); })) {
-        finish(NetworkTask::NO_RESPONSE);
+        // Never from inside `start`, so never on the caller's thread.
+        postEnd(NetworkTask::NO_RESPONSE);
     }
 }
 
@@ -152,6 +154,14 @@ void Exchange::retryOrFinish(int code) {
 }
 
 void Exchange::finish(int code) {
+    if (endsHere) {
+        deliverEnd(code);
+    } else {
+        postEnd(code);
+    }
+}
+
+void Exchange::postEnd(int code) {
     const boost::shared_ptr<Exchange> self = shared_from_this();
     postToEventThread([self, code] { self->deliverEnd(code); });
 }

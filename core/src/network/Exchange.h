@@ -21,8 +21,9 @@ class Transport;
  */
 class Exchange : public boost::enable_shared_from_this<Exchange>, public TransferListener {
   public:
+    /** @param endHere the task's end is told on the network thread */
     Exchange(boost::shared_ptr<Transport> transport, boost::shared_ptr<NetworkTask> task,
-             boost::shared_ptr<NetworkTaskRetryPolicy> policy);
+             boost::shared_ptr<NetworkTaskRetryPolicy> policy, bool endHere);
 
     /** Begins the first attempt. Under the event lock, as the next two. */
     void start();
@@ -44,11 +45,13 @@ class Exchange : public boost::enable_shared_from_this<Exchange>, public Transfe
     bool collect(const unsigned char* bytes, std::size_t size);
     void retryOrFinish(int code);
     void finish(int code);
+    void postEnd(int code);
     void deliverEnd(int code);
 
     const boost::shared_ptr<Transport> transport;
     boost::shared_ptr<NetworkTask> task;
     boost::shared_ptr<NetworkTaskRetryPolicy> policy;
+    const bool endsHere;
     boost::shared_ptr<Transfer> transfer;
     std::vector<unsigned char> collected;
     Util::Timer retryTimer;

@@ -12,7 +12,7 @@
 
 namespace Network {
 
-NetworkTaskHolder::NetworkTaskHolder() = default;
+NetworkTaskHolder::NetworkTaskHolder(EndThread endThread) : thread(endThread) {}
 
 NetworkTaskHolder::~NetworkTaskHolder() {
     cancel();
@@ -28,7 +28,8 @@ void NetworkTaskHolder::submit(const boost::shared_ptr<NetworkTask>& task,
         kdLogMessage("NetworkTaskHolder: a running task gives way to the next one");
     }
     Transport& transport = NetworkManager::getInstance().getTransport();
-    const auto next = boost::make_shared<Exchange>(transport.shared_from_this(), task, policy);
+    const auto next = boost::make_shared<Exchange>(transport.shared_from_this(), task, policy,
+                                                   thread == EndThread::NETWORK);
     const boost::shared_ptr<Exchange> previous = std::move(exchange);
     exchange = next;
     next->start();

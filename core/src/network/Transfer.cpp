@@ -36,7 +36,7 @@ Transfer::Transfer(boost::shared_ptr<Transport> owner, boost::shared_ptr<HttpReq
       body(request) {}
 
 CURL* Transfer::open(const std::string& certificateFile) {
-    easy.reset(curl_easy_init());
+    easy.reset(transport->takeHandle());
     if (easy) {
         setUpConnection(certificateFile);
         setUpRequest();
@@ -173,7 +173,9 @@ void Transfer::abandon() {
     }
     watchdog.stop();
     listener.reset();
-    easy.reset();
+    if (easy) {
+        transport->giveBack(easy.release());
+    }
 }
 
 // Writes may come faster than the network thread wakes up: one command serves them all.

@@ -61,7 +61,7 @@ bool Transport::post(std::function<void()> command) {
     }
     launchThread();
     commands.push_back(std::move(command));
-    if (commands.size() == 1) {
+    if (commands.size() == 1 && thread.get_id() != std::this_thread::get_id()) {
         curl_multi_wakeup(multi.get());
     }
     return true;
@@ -113,11 +113,18 @@ void Transport::launchThread() {
 void Transport::run() {
     while (runCommands()) {
         perform();
-        curl_multi_poll(multi.get(), nullptr, 0, LONGEST_SLEEP_MS, nullptr);
+        if (!hasCommands()) {
+            curl_multi_poll(multi.get(), nullptr, 0, LONGEST_SLEEP_MS, nullptr);
+        }
     }
     finishAll();
     // Closes the connections that were kept.
     multi.reset();
+}
+
+bool Transport::hasCommands() {
+    const std::lock_guard<std::mutex> lock(mutex);
+    return !commands.empty();
 }
 
 // The end comes when there is nothing left to run, so that each command that was accepted is run.
@@ -161,6 +168,16 @@ void Transport::start(const boost::shared_ptr<Transfer>& transfer) {
     if (easy == nullptr || curl_multi_add_handle(multi.get(), easy) != CURLM_OK) {
         finish(entry, CURLE_FAILED_INIT);
     }
+}
+
+// Making one costs as much as all that a small request does besides.
+CURL* Transport::takeHandle() {
+    return spareHandle ? spareHandle.release() : curl_easy_init();
+}
+
+void Transport::giveBack(CURL* handle) {
+    curl_easy_reset(handle);
+    spareHandle.reset(handle);
 }
 
 void Transport::abandon(const boost::shared_ptr<Transfer>& transfer) {

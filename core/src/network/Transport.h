@@ -51,6 +51,12 @@ class Transport : public boost::enable_shared_from_this<Transport> {
     /** Network thread only. */
     void start(const boost::shared_ptr<Transfer>& transfer);
 
+    /** A handle without any settings, owned by the caller; null on failure. Network thread only. */
+    CURL* takeHandle();
+
+    /** Takes back a handle, to be used again. Network thread only. */
+    void giveBack(CURL* handle);
+
     /** Network thread only; a transfer that is over or was never started is accepted. */
     void abandon(const boost::shared_ptr<Transfer>& transfer);
 
@@ -58,10 +64,14 @@ class Transport : public boost::enable_shared_from_this<Transport> {
     struct MultiDeleter {
         void operator()(CURLM* handle) const { curl_multi_cleanup(handle); }
     };
+    struct EasyDeleter {
+        void operator()(CURL* handle) const { curl_easy_cleanup(handle); }
+    };
     using Transfers = std::map<CURL*, boost::shared_ptr<Transfer>>;
 
     void launchThread();
     void run();
+    bool hasCommands();
     bool runCommands();
     void perform();
     void check(const boost::shared_ptr<Transfer>& transfer);
@@ -79,6 +89,7 @@ class Transport : public boost::enable_shared_from_this<Transport> {
 
     // Network thread.
     std::unique_ptr<CURLM, MultiDeleter> multi;
+    std::unique_ptr<CURL, EasyDeleter> spareHandle;
     Transfers transfers;
 };
 

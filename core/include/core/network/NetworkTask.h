@@ -15,7 +15,8 @@ namespace Network {
 
 /**
  * What a `NetworkTaskHolder` runs. All operations are called under the event lock: the requests
- * and response callbacks on the network thread, `onFinished` on the event thread. The order is
+ * and response callbacks on the network thread, `onFinished` on the thread that the holder was made
+ * for, by default the event thread. The order is
  * `isReadyToPerform`, then per attempt `issueRequest`, `onResponseRecieved` and (by parts)
  * `onBytesReceived`, with `onRetried` between two attempts, then `onFinished` exactly once, unless
  * the holder was cancelled or destroyed: then nothing more is called.

@@ -21,7 +21,14 @@ class Exchange;
  */
 class KORVEL_CORE_API NetworkTaskHolder {
   public:
-    NetworkTaskHolder();
+    /** The thread on which a task's `onFinished` is called; under the event lock in any case. */
+    enum class EndThread {
+        EVENT,  /**< the event thread, as everything that the engine sees */
+        NETWORK /**< the network thread, as the task's other operations: a task that is submitted
+                     from `onFinished` follows without a change of threads */
+    };
+
+    explicit NetworkTaskHolder(EndThread endThread = EndThread::EVENT);
     NetworkTaskHolder(const NetworkTaskHolder&) = delete;
     NetworkTaskHolder& operator=(const NetworkTaskHolder&) = delete;
     virtual ~NetworkTaskHolder();
@@ -49,6 +56,7 @@ class KORVEL_CORE_API NetworkTaskHolder {
     void onFinished();
 
   private:
+    const EndThread thread;
     boost::shared_ptr<Exchange> exchange;
 };
 
