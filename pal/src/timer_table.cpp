@@ -35,7 +35,9 @@ KDTimer* TimerTable::start(std::int64_t intervalNs, KDint type, void* userptr) {
         const std::int64_t interval = std::max<std::int64_t>(intervalNs, 1);
         handle = timers.add({0, startedCount++, interval, type, userptr, false});
         enqueue(handle, *timers.find(handle), addTime(Clock::now(), interval));
-        isNext = queue.begin()->second == handle && !Clock::isManual();
+        const std::int64_t due = queue.begin()->first.first;
+        isNext = queue.begin()->second == handle && !Clock::isManual() && due < loopWakesAt;
+        loopWakesAt = isNext ? due : loopWakesAt;
     }
     if (isNext) {
         EventLoop::instance().wake();
@@ -59,8 +61,10 @@ bool TimerTable::cancel(KDTimer* handle) {
 std::int64_t TimerTable::timeToNext() {
     const std::lock_guard<std::mutex> lock(mutex);
     if (queue.empty() || Clock::isManual()) {
+        loopWakesAt = std::numeric_limits<std::int64_t>::max();
         return NEVER;
     }
+    loopWakesAt = queue.begin()->first.first;
     return std::max<std::int64_t>(queue.begin()->first.first - Clock::now(), 0);
 }
 

@@ -1,6 +1,7 @@
 #pragma once
 
 #include <cstdint>
+#include <limits>
 #include <map>
 #include <mutex>
 #include <utility>
@@ -23,7 +24,10 @@ class TimerTable {
     KDTimer* start(std::int64_t intervalNs, KDint type, void* userptr);
     bool cancel(KDTimer* handle);
 
-    /** Nanoseconds until the event loop has to call `fireDue`, or `NEVER`. */
+    /**
+     * Nanoseconds until the event loop has to call `fireDue`, or `NEVER`. It is expected to do so
+     * then: until that time it is only woken for timers that are due earlier.
+     */
     std::int64_t timeToNext();
 
     /** Fires what is due on the real clock. */
@@ -55,6 +59,7 @@ class TimerTable {
     HandleTable<KDTimer, Timer> timers;
     Queue queue;
     std::uint64_t startedCount = 0;
+    std::int64_t loopWakesAt = std::numeric_limits<std::int64_t>::max();
 };
 
 }  // namespace korvel_pal
