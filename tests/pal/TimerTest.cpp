@@ -1,5 +1,6 @@
 #include <gmock/gmock.h>
 
+#include <chrono>
 #include <future>
 #include <limits>
 #include <thread>
@@ -37,6 +38,22 @@ TEST(KdTimer, NeverGivesAHandleTwice) {
     KDTimer* const second = kdSetTimer(3600000 * MS, KD_TIMER_ONESHOT, &userptrOnly);
     EXPECT_EQ(kdCancelTimer(first), -1);
     EXPECT_EQ(kdCancelTimer(second), 0);
+}
+
+TEST(KdTimer, FiresOnTheRealClockAfterTimersThatWereCancelledOrAreLater) {
+    std::promise<void> fired;
+    const auto tell = [](const KDEvent* event) {
+        static_cast<std::promise<void>*>(event->userptr)->set_value();
+    };
+    kdInstallCallback(tell, KD_EVENT_TIMER, &fired);
+    KDTimer* const later = kdSetTimer(3600000 * MS, KD_TIMER_ONESHOT, &userptrOnly);
+    KDTimer* const cancelled = kdSetTimer(1 * MS, KD_TIMER_ONESHOT, &userptrOnly);
+    EXPECT_EQ(kdCancelTimer(cancelled), 0);
+    KDTimer* const timer = kdSetTimer(2 * MS, KD_TIMER_ONESHOT, &fired);
+    EXPECT_EQ(fired.get_future().wait_for(std::chrono::seconds(10)), std::future_status::ready);
+    EXPECT_EQ(kdCancelTimer(timer), 0);
+    EXPECT_EQ(kdCancelTimer(later), 0);
+    kdInstallCallback(nullptr, KD_EVENT_TIMER, &fired);
 }
 
 TEST(KdTimer, KeepsTheHandleOfAOneShotThatHasFired) {
