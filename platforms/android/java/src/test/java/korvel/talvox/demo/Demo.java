@@ -19,7 +19,7 @@ public final class Demo {
         System.setProperty("talvox.demo.file", arguments[0]);
         final Result result = JUnitCore.runClasses(DemoSession.class);
         for (Failure failure : result.getFailures()) {
-            System.err.println("demo-java: " + failure.getException());
+            System.out.println("demo-java: " + failure.getException());
         }
         System.exit(result.wasSuccessful() ? 0 : 1);
     }

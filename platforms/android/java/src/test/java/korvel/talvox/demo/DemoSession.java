@@ -4,6 +4,7 @@ import java.util.concurrent.CountDownLatch;
 import korvel.talvox.Hypothesis;
 import korvel.talvox.Recognition;
 import korvel.talvox.RecognitionListener;
+import korvel.talvox.SoundFormat;
 import korvel.talvox.SpeechError;
 import korvel.talvox.TalvoxEngine;
 import korvel.talvox.TalvoxRecognizer;
@@ -16,6 +17,7 @@ import org.junit.Test;
 /** What the demo does; as code of an application, apart from the microphone. */
 public class DemoSession extends KitTest {
     private static final long BEGIN = System.nanoTime();
+    private static final TalvoxSettings NOTHING_ELSE = TalvoxSettings.builder().build();
 
     /** Prints each event with its time. */
     private static final class Printer implements RecognitionListener {
@@ -80,11 +82,6 @@ public class DemoSession extends KitTest {
     public void recognise() throws Exception {
         final SpeechFile speech = SpeechFile.read(System.getProperty("talvox.demo.file"));
         final TalvoxEngine engine = TalvoxEngine.getInstance(application);
-        final TalvoxSettings settings =
-                TalvoxSettings.builder()
-                        .set(TalvoxSettings.SAMPLE_RATE, speech.sampleRateHz)
-                        .set(TalvoxSettings.STREAMING, true)
-                        .build();
         try (DevelopmentGateway gateway = new DevelopmentGateway();
                 Microphone microphone = new Microphone(speech.sampleRateHz, 1).plugIn()) {
             engine.updateSettings(
@@ -92,10 +89,13 @@ public class DemoSession extends KitTest {
                             .set(TalvoxSettings.URL, gateway.getUrl())
                             .set(TalvoxSettings.UUID, "0123456789abcdef0123456789abcdef")
                             .set(TalvoxSettings.LANGUAGE, "en-US")
+                            .set(TalvoxSettings.STREAMING, true)
+                            .set(TalvoxSettings.SOUND_FORMAT, SoundFormat.SPEEX)
+                            .set(TalvoxSettings.SAMPLE_RATE, speech.sampleRateHz)
                             .build());
             Printer.print("engine " + engine.getVersion() + ", gateway " + gateway.getUrl());
             final Printer printer = new Printer(microphone, speech.samples);
-            try (TalvoxRecognizer recognizer = engine.createRecognizer(settings, printer)) {
+            try (TalvoxRecognizer recognizer = engine.createRecognizer(NOTHING_ELSE, printer)) {
                 recognizer.start();
                 await(printer.over);
             }
