@@ -51,9 +51,7 @@ std::string makeUuid() {
 void mountDump(const std::string& directory) {
     struct stat status = {};
     std::string reason;
-    if (stat(directory.c_str(), &status) != 0) {
-        reason = std::strerror(errno);
-    } else if (!S_ISDIR(status.st_mode)) {
+    if (stat(directory.c_str(), &status) == 0 && !S_ISDIR(status.st_mode)) {
         reason = "it is not a directory";
     } else if (access(directory.c_str(), W_OK | X_OK) != 0) {
         reason = std::strerror(errno);

@@ -45,6 +45,7 @@ void CepstralMean::add(const int16_t* samples, std::size_t count) {
     }
     std::vector<mfcc_t> cepstra(sums.size() * MAX_FRAMES_PER_CALL);
     std::vector<mfcc_t*> rows;
+    rows.reserve(MAX_FRAMES_PER_CALL);
     for (int i = 0; i < MAX_FRAMES_PER_CALL; ++i) {
         rows.push_back(&cepstra[static_cast<std::size_t>(i) * sums.size()]);
     }

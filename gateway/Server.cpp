@@ -80,11 +80,11 @@ Server::~Server() {
 }
 
 std::string Server::start() {
-    const std::string problem = options.model.findProblem();
+    std::string problem = options.model.findProblem();
     if (!problem.empty()) {
         return problem;
     }
-    const std::string logProblem = recordLog.open(options.recordFile);
+    std::string logProblem = recordLog.open(options.recordFile);
     if (!logProblem.empty()) {
         return logProblem;
     }

@@ -15,7 +15,7 @@ namespace Gateway {
 
 /** How the gateway is to run. */
 struct ServerOptions {
-    static constexpr std::size_t MAX_BODY_BYTES_DFLT = 16u * 1024 * 1024;
+    static constexpr std::size_t MAX_BODY_BYTES_DFLT = std::size_t{16} * 1024 * 1024;
 
     /** Address to listen on: numeric, or a name that the system knows. */
     std::string host = "127.0.0.1";

@@ -89,7 +89,7 @@ std::string SpeexStreamDecoder::readPages(std::vector<int16_t>& samples) {
             return std::string();
         }
         if (found > 0) {
-            const std::string reason = readPage(page, samples);
+            std::string reason = readPage(page, samples);
             if (!reason.empty()) {
                 return reason;
             }
@@ -122,7 +122,7 @@ std::string SpeexStreamDecoder::readPage(ogg_page& page, std::vector<int16_t>& s
         if (found < 0) {
             ++damagedPackets;
         } else if (decoder == nullptr) {
-            const std::string reason = readHead(packet);
+            std::string reason = readHead(packet);
             if (!reason.empty()) {
                 return reason;
             }

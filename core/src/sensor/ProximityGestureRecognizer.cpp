@@ -13,7 +13,7 @@ namespace Sensor {
 
 namespace {
 
-const int64_t NS_PER_MS = 1000 * 1000;
+const int64_t NS_PER_MS = 1000000;
 
 }  // namespace
 
