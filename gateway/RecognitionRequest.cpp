@@ -161,7 +161,7 @@ std::string RecognitionRequest::beginSound(const MultipartPart& part) {
                 : fields.has("Content-Type") ? fields.get("Content-Type")
                                              : head.soundType;
     AudioFormat format;
-    const std::string reason = AudioFormat::parse(soundType, format);
+    std::string reason = AudioFormat::parse(soundType, format);
     if (!reason.empty()) {
         return reason;
     }

@@ -11,7 +11,7 @@ namespace CloudTest {
 namespace {
 
 const int64_t NS_PER_MS = 1000000;
-const int64_t CLOCK_START = 1000 * 1000 * NS_PER_MS;
+const int64_t CLOCK_START = 1000000 * NS_PER_MS;
 
 }  // namespace
 

@@ -40,7 +40,7 @@ class TestRecorderTest : public CloudTest::EngineTest {
   protected:
     /** @return the path of a file with these bytes */
     std::string makeFile(const Bytes& bytes) const {
-        const std::string path = directory.path("sound.pcm");
+        std::string path = directory.path("sound.pcm");
         std::ofstream file(path, std::ios::binary);
         file.write(reinterpret_cast<const char*>(bytes.data()),
                    static_cast<std::streamsize>(bytes.size()));
@@ -49,7 +49,7 @@ class TestRecorderTest : public CloudTest::EngineTest {
     }
 
     boost::shared_ptr<TestRecorder> makeRecorder(const std::string& path) {
-        const auto made = boost::make_shared<TestRecorder>(path);
+        auto made = boost::make_shared<TestRecorder>(path);
         made->addListener(listener);
         made->setBufferLength(100);
         made->setSampleRate(16000);

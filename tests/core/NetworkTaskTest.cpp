@@ -40,7 +40,7 @@ TEST_F(NetworkTaskTest, SendsTheRequestByteForByte) {
 TEST_F(NetworkTaskTest, SendsItsHeadersAndRefusesThoseThatWouldSplitTheRequest) {
     const std::string url = server.getUrl();
     const auto task = boost::make_shared<RecordingTask>([url] {
-        const auto request = HttpRequest::create(url + "/", "GET", REQUEST_TIMEOUT_MS, false);
+        auto request = HttpRequest::create(url + "/", "GET", REQUEST_TIMEOUT_MS, false);
         request->addHeader("X-One", "first value");
         request->addHeader("X-Empty", "");
         request->addHeader("X-Bad", "a\r\nX-Injected: b");
@@ -233,7 +233,7 @@ TEST_F(NetworkTaskTest, RefusesRequestsThatMakeNoSense) {
     EXPECT_EQ("finished -4", run(boost::make_shared<RecordingTask>(nullptr)));
     EXPECT_EQ("finished -4", run(makeTask(url, "DELETE")));
     EXPECT_EQ("finished -4", run(boost::make_shared<RecordingTask>([url] {
-                  const auto request = HttpRequest::create(url, "GET", REQUEST_TIMEOUT_MS, false);
+                  auto request = HttpRequest::create(url, "GET", REQUEST_TIMEOUT_MS, false);
                   request->setBody("B", "text");
                   return request;
               })));

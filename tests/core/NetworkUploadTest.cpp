@@ -152,7 +152,7 @@ TEST_F(NetworkUploadTest, DoesNotFollowARedirect) {
     const std::string url = server.getUrl();
     for (const int code : {307, 301}) {
         const auto task = boost::make_shared<RecordingTask>([url] {
-            const auto request = HttpRequest::create(url, "POST", REQUEST_TIMEOUT_MS, true);
+            auto request = HttpRequest::create(url, "POST", REQUEST_TIMEOUT_MS, true);
             request->setBody("B", "body");
             return request;
         });

@@ -54,7 +54,7 @@ class FakeMechanism : public Talvox::PlatformMechanism {
 class PlatformMechanismTest : public ::testing::Test {
   protected:
     static boost::shared_ptr<Settings> settingsWith(const std::string& policy) {
-        const auto settings = boost::make_shared<Settings>();
+        auto settings = boost::make_shared<Settings>();
         settings->putString(Settings::RS_ASR_POLICY, policy);
         return settings;
     }

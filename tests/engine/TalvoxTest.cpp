@@ -51,7 +51,7 @@ class TalvoxTest : public ::testing::Test {
 };
 
 boost::shared_ptr<Settings> completeSettings() {
-    const auto settings = boost::make_shared<Settings>();
+    auto settings = boost::make_shared<Settings>();
     settings->putString(Settings::SKS_URL, "http://127.0.0.1:8090");
     settings->putString(Settings::SKS_UUID, "0123456789abcdef0123456789abcdef");
     return settings;
@@ -134,7 +134,7 @@ TEST_F(TalvoxTest, SettingsMayBeReadWhileTheyAreReplaced) {
         }
     });
     engine.setTalvoxSettings([] {
-        const auto settings = boost::make_shared<Settings>();
+        auto settings = boost::make_shared<Settings>();
         settings->putInt(Settings::SKS_SPEEX_QUALITY, 0);
         settings->putInt(Settings::SKS_SAMPLE_RATE, 0);
         return settings;

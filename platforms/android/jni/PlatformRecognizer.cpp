@@ -31,7 +31,7 @@ const char* const ASSERT_PATH = "platforms/android/jni/PlatformRecognizer";
 const int LOG_LEVEL = 2;
 const int SAMPLE_RATE_HZ = 8000;
 const int BYTES_PER_SAMPLE = 2;
-const int64_t NS_PER_MS = 1000 * 1000;
+const int64_t NS_PER_MS = 1000000;
 const int NO_HYPOTHESIS = -1;
 
 Sound::SoundDataInfo makeSoundFormat() {
@@ -78,7 +78,7 @@ PlatformRecognizer::PlatformRecognizer(const Talvox::Talvox* facade,
 
 boost::shared_ptr<PlatformRecognizer> PlatformRecognizer::create(
     const Talvox::Talvox* facade, const boost::shared_ptr<const Settings>& settings) {
-    const auto recognizer = boost::allocate_shared<PlatformRecognizer>(
+    auto recognizer = boost::allocate_shared<PlatformRecognizer>(
         Jni::QuarantineAllocator<PlatformRecognizer>(), facade, settings);
     Jni::KnownObjects<PlatformRecognizer>::add(recognizer);
     return recognizer;

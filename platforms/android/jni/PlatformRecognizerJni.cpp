@@ -40,7 +40,7 @@ boost::shared_ptr<const RecognitionResults> readResults(JNIEnv* env, jobjectArra
     const jsize count = env->GetArrayLength(strings);
     KOR_ASSERT_AT(jconfidenceScores == nullptr || static_cast<std::size_t>(count) == scores.size(),
                   SAME_LENGTH, ASSERT_PATH, __LINE__);
-    const auto results = boost::make_shared<RecognitionResults>();
+    auto results = boost::make_shared<RecognitionResults>();
     for (jsize index = 0; index < count; ++index) {
         const Jni::LocalRef<jstring> text(
             env, static_cast<jstring>(env->GetObjectArrayElement(strings, index)));

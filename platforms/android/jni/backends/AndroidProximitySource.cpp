@@ -16,7 +16,7 @@ AndroidProximitySource::~AndroidProximitySource() {
 
 void AndroidProximitySource::install() {
     setFactory([]() -> boost::shared_ptr<ProximitySource> {
-        const auto source = boost::allocate_shared<AndroidProximitySource>(
+        auto source = boost::allocate_shared<AndroidProximitySource>(
             Jni::QuarantineAllocator<AndroidProximitySource>());
         Sources::add(source);
         return source;
