@@ -1,7 +1,7 @@
 #include "SoundInput.h"
 
 #include "AudioFile.h"
-#include "Resampler.h"
+#include "ClipSamples.h"
 #include "UsageError.h"
 
 namespace Cli {

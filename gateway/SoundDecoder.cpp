@@ -47,7 +47,7 @@ std::string SoundDecoder::decode(const char* data, std::size_t size, std::vector
     }
     hasBytes = hasBytes || size > 0;
     if (!resampler && getInputRateHz() != 0) {
-        resampler = std::make_unique<Resampler>(getInputRateHz(), outputRate);
+        resampler = std::make_unique<Tools::Resampler>(getInputRateHz(), outputRate);
     }
     if (resampler) {
         resampler->write(samples.data(), samples.size(), output);

@@ -7,8 +7,8 @@
 #include <vector>
 
 #include "gateway/AudioFormat.h"
-#include "gateway/Resampler.h"
 #include "gateway/SpeexStreamDecoder.h"
+#include "tools/Resampler.h"
 
 namespace Gateway {
 
@@ -46,7 +46,7 @@ class SoundDecoder {
     const AudioFormat format;
     const unsigned outputRate;
     std::unique_ptr<SpeexStreamDecoder> speex;
-    std::unique_ptr<Resampler> resampler;
+    std::unique_ptr<Tools::Resampler> resampler;
     bool hasBytes = false;
     /** The first bytes, until they tell whether the sound is an Ogg stream. */
     std::string beginning;

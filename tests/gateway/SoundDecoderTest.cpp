@@ -9,7 +9,6 @@
 namespace {
 
 using Gateway::AudioFormat;
-using Gateway::Resampler;
 using Gateway::SoundDecoder;
 using Samples = std::vector<int16_t>;
 
@@ -20,16 +19,6 @@ Samples sine(double hertz, unsigned rateHz, std::size_t count) {
             10000 * std::sin(2 * 3.14159265358979 * hertz * static_cast<double>(i) / rateHz));
     }
     return samples;
-}
-
-Samples resample(const Samples& input, unsigned from, unsigned to, std::size_t piece) {
-    Resampler resampler(from, to);
-    Samples output;
-    for (std::size_t i = 0; i < input.size(); i += piece) {
-        resampler.write(&input[i], std::min(piece, input.size() - i), output);
-    }
-    resampler.finish(output);
-    return output;
 }
 
 Samples decodePcm(const std::string& bytes, unsigned rateHz, std::size_t piece,
@@ -49,41 +38,6 @@ Samples decodePcm(const std::string& bytes, unsigned rateHz, std::size_t piece,
 }
 
 }  // namespace
-
-TEST(Resampler, LeavesSoundOfTheRightRateAlone) {
-    const Samples input = sine(440, 16000, 3000);
-    EXPECT_EQ(input, resample(input, 16000, 16000, 700));
-}
-
-TEST(Resampler, KeepsLengthPitchAndPlace) {
-    for (const unsigned rate : {8000U, 11025U, 22050U, 44100U, 48000U}) {
-        const Samples output = resample(sine(440, rate, rate), rate, 16000, 1000);
-        ASSERT_NEAR(16000.0, static_cast<double>(output.size()), 1.0) << rate;
-        const Samples expected = sine(440, 16000, 16000);
-        for (std::size_t i = 200; i + 200 < output.size(); ++i) {
-            ASSERT_NEAR(expected[i], output[i], 150) << rate << " Hz, sample " << i;
-        }
-    }
-}
-
-TEST(Resampler, DoesNotFoldHighPitchesDown) {
-    const Samples output = resample(sine(12000, 44100, 44100), 44100, 16000, 1000);
-    for (std::size_t i = 200; i + 200 < output.size(); ++i) {
-        ASSERT_NEAR(0, output[i], 100);
-    }
-}
-
-TEST(Resampler, GivesTheSameFromPiecesOfAnySize) {
-    const Samples input = GatewayTest::readRecording("goforward.raw");
-    const Samples whole = resample(input, 11025, 16000, input.size());
-    for (const std::size_t piece : {1U, 7U, 160U, 1025U}) {
-        EXPECT_EQ(whole, resample(input, 11025, 16000, piece)) << piece;
-    }
-}
-
-TEST(Resampler, GivesNothingForNothing) {
-    EXPECT_TRUE(resample({}, 8000, 16000, 1).empty());
-}
 
 TEST(SoundDecoder, ReadsPcmFromPiecesOfAnySize) {
     const Samples input = GatewayTest::readRecording("goforward.raw");

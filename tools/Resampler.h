@@ -7,14 +7,17 @@
 // Named so by the library that the resampler comes from.
 struct SpeexResamplerState_;
 
-namespace Gateway {
+namespace Tools {
 
 /**
  * Brings mono sound to another rate as it arrives. How the sound is cut into calls does not
- * change what comes out; its delay is taken off, so that the first sample stays the first.
+ * change what comes out; its delay is taken off, so that the first sample stays the first. N
+ * samples become N x output rate / input rate, rounded to the nearest. Between equal rates the
+ * sound stays as it is, bit for bit.
  */
 class Resampler {
   public:
+    /** @throws std::invalid_argument when the rates cannot be converted into each other */
     Resampler(unsigned inputRateHz, unsigned outputRateHz);
     ~Resampler();
     Resampler(const Resampler&) = delete;
@@ -27,7 +30,9 @@ class Resampler {
     void finish(std::vector<int16_t>& output);
 
   private:
-    void run(const int16_t* samples, std::size_t count, std::vector<int16_t>& output);
+    /** Converts until the samples are used up or `limit` have come out since the beginning. */
+    void run(const int16_t* samples, std::size_t count, uint64_t limit,
+             std::vector<int16_t>& output);
 
     const unsigned inputRate;
     const unsigned outputRate;
@@ -37,4 +42,4 @@ class Resampler {
     uint64_t produced = 0;
 };
 
-}  // namespace Gateway
+}  // namespace Tools
