@@ -1,11 +1,9 @@
 #include "event_loop.h"
 
-#include <pthread.h>
-#include <signal.h>
-
 #include <chrono>
 
 #include "event_lock.h"
+#include "pal/SignalsBlocked.h"
 #include "pal/kd_assert.h"
 #include "pal/kd_log.h"
 #include "timer_table.h"
@@ -17,23 +15,6 @@ namespace {
 
 constexpr std::chrono::seconds STOP_LIMIT{2};
 constexpr std::int64_t NS_PER_MS = 1000000;
-
-// Signals belong to the application's threads: the event thread and the workers, which inherit
-// its mask, must not be the ones that a handler interrupts.
-class AllSignalsBlocked {
-  public:
-    AllSignalsBlocked() {
-        sigset_t all;
-        sigfillset(&all);
-        pthread_sigmask(SIG_SETMASK, &all, &before);
-    }
-    ~AllSignalsBlocked() { pthread_sigmask(SIG_SETMASK, &before, nullptr); }
-    AllSignalsBlocked(const AllSignalsBlocked&) = delete;
-    AllSignalsBlocked& operator=(const AllSignalsBlocked&) = delete;
-
-  private:
-    sigset_t before{};
-};
 
 struct StopAtExit {
     StopAtExit() = default;
@@ -105,7 +86,7 @@ bool EventLoop::start() {
     if (started) {
         return true;
     }
-    const AllSignalsBlocked blocked;
+    const SignalsBlocked blocked;
     if (!KOR_ASSERT(uv_loop_init(&loop) == 0)) {
         return false;
     }

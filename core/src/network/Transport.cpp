@@ -1,12 +1,10 @@
 #include "network/Transport.h"
 
-#include <pthread.h>
-#include <signal.h>
-
 #include <algorithm>
 #include <utility>
 
 #include "network/Transfer.h"
+#include "pal/SignalsBlocked.h"
 #include "pal/kd_assert.h"
 #include "pal/kd_event.h"
 
@@ -96,18 +94,13 @@ void Transport::stop() {
     thread.join();
 }
 
-// Signals belong to the application's threads.
 void Transport::launchThread() {
     if (thread.joinable()) {
         return;
     }
-    sigset_t all;
-    sigset_t before;
-    sigfillset(&all);
-    pthread_sigmask(SIG_SETMASK, &all, &before);
+    const korvel_pal::SignalsBlocked signalsBlocked;
     const boost::shared_ptr<Transport> self = shared_from_this();
     thread = std::thread([self] { self->run(); });
-    pthread_sigmask(SIG_SETMASK, &before, nullptr);
 }
 
 void Transport::run() {

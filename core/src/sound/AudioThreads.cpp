@@ -1,8 +1,5 @@
 #include "sound/AudioThreads.h"
 
-#include <pthread.h>
-#include <signal.h>
-
 #include <algorithm>
 #include <chrono>
 #include <condition_variable>
@@ -11,6 +8,8 @@
 #include <thread>
 #include <utility>
 #include <vector>
+
+#include "pal/SignalsBlocked.h"
 
 namespace Sound {
 
@@ -41,22 +40,6 @@ void runCapture(const boost::shared_ptr<PulseCapture>& capture) {
     std::notify_all_at_thread_exit(running().changed, std::move(lock));
 }
 
-/** Keeps signals away from a thread that is started meanwhile: they are the application's. */
-class SignalsBlocked {
-  public:
-    SignalsBlocked() {
-        sigset_t all;
-        sigfillset(&all);
-        pthread_sigmask(SIG_SETMASK, &all, &before);
-    }
-    ~SignalsBlocked() { pthread_sigmask(SIG_SETMASK, &before, nullptr); }
-    SignalsBlocked(const SignalsBlocked&) = delete;
-    SignalsBlocked& operator=(const SignalsBlocked&) = delete;
-
-  private:
-    sigset_t before;
-};
-
 }  // namespace
 
 AudioThreads::~AudioThreads() {
@@ -68,7 +51,7 @@ AudioThreads::~AudioThreads() {
 }
 
 bool AudioThreads::start(const boost::shared_ptr<PulseCapture>& capture) {
-    const SignalsBlocked signalsBlocked;
+    const korvel_pal::SignalsBlocked signalsBlocked;
     const std::lock_guard<std::mutex> lock(running().mutex);
     try {
         std::thread(&runCapture, capture).detach();
