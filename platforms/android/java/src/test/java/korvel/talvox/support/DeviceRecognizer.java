@@ -70,7 +70,7 @@ public final class DeviceRecognizer {
     }
 
     /** The framework hands the listener over after some turns of the main looper. */
-    private static RecognitionListener getListener() {
+    public static RecognitionListener getListener() {
         final Object state = ReflectionHelpers.callInstanceMethod(latest(), "getState");
         RecognitionListener listener = null;
         for (int turn = 0; listener == null && turn < 10; turn++) {

@@ -1,0 +1,86 @@
+package korvel.talvox.impl;
+
+import android.os.Bundle;
+import java.util.concurrent.CountDownLatch;
+import java.util.concurrent.TimeUnit;
+import korvel.core.AudioRecorderBackend;
+import korvel.core.SoundInput;
+
+/**
+ * A program on a plain JVM that ends while it records. Its argument says how: "return" from {@code
+ * main} or "exit".
+ */
+final class EndingProgram {
+    static final int EXIT_STATUS = 3;
+
+    private static final int PIECE_MS = 20;
+
+    /** Noise at the speed of real time. */
+    private static final class Noise implements SoundInput {
+        private final CountDownLatch never = new CountDownLatch(1);
+
+        @Override
+        public int read(byte[] buffer, int sizeInBytes) {
+            try {
+                never.await(PIECE_MS, TimeUnit.MILLISECONDS);
+            } catch (InterruptedException interrupted) {
+                return 0;
+            }
+            for (int index = 0; index < sizeInBytes; index++) {
+                buffer[index] = (byte) (index & 1);
+            }
+            return sizeInBytes;
+        }
+
+        @Override
+        public void close() {}
+    }
+
+    /** Hears of the beginning. */
+    private static final class Listener implements Recognizer.Events {
+        private final CountDownLatch began = new CountDownLatch(1);
+
+        @Override
+        public void onRecordingBegin() {
+            began.countDown();
+        }
+
+        @Override
+        public void onSpeakingBegin() {}
+
+        @Override
+        public void onRecordingDone() {}
+
+        @Override
+        public void onPowerChanged(float power) {}
+
+        @Override
+        public void onBufferReceived(byte[] buffer) {}
+
+        @Override
+        public void onError(int code) {}
+
+        @Override
+        public void onResults(
+                int outcome, String[] texts, float[] confidences, String requestId) {}
+    }
+
+    private EndingProgram() {}
+
+    public static void main(String[] arguments) throws InterruptedException {
+        NativeLibrary.load();
+        AudioRecorderBackend.setInputFactory((rate, length, mode) -> new Noise());
+        final long engine = Talvox.getHandle();
+        Talvox.updateSettingsFromXml(
+                engine,
+                "<startup><features><voice><url>http://127.0.0.1:9/</url>"
+                        + "<uuid>0123456789abcdef0123456789abcdef</uuid>"
+                        + "</voice></features></startup>");
+        final Listener listener = new Listener();
+        Recognizer.start(engine, new Bundle(), listener);
+        listener.began.await();
+        if (arguments[0].equals("exit")) {
+            System.exit(EXIT_STATUS);
+        }
+    }
+}
