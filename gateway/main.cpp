@@ -1,6 +1,7 @@
 #include <CLI/CLI.hpp>
 #include <csignal>
 #include <cstdio>
+#include <exception>
 
 #include "gateway/Server.h"
 #include "pal/kd_log.h"
@@ -80,16 +81,29 @@ int run(const Gateway::ServerOptions& options) {
     return 0;
 }
 
-}  // namespace
-
-int main(int argc, char** argv) {
+int parseAndRun(int argc, char** argv) {
     CLI::App app(DESCRIPTION, "talvox-gateway");
     Gateway::ServerOptions options;
     declareOptions(app, options);
     try {
         app.parse(argc, argv);
     } catch (const CLI::ParseError& error) {
-        return app.exit(error) == 0 ? 0 : 2;
+        if (error.get_exit_code() == 0) {
+            return app.exit(error);
+        }
+        std::fprintf(stderr, "talvox-gateway: %s\n", error.what());
+        return 2;
     }
     return run(options);
+}
+
+}  // namespace
+
+int main(int argc, char** argv) {
+    try {
+        return parseAndRun(argc, argv);
+    } catch (const std::exception& failure) {
+        std::fprintf(stderr, "talvox-gateway: %s\n", failure.what());
+        return 1;
+    }
 }

@@ -2,6 +2,7 @@
 
 #include <csignal>
 #include <string>
+#include <vector>
 
 #include "gateway/Bodies.h"
 #include "gateway/HttpClient.h"
@@ -58,9 +59,17 @@ TEST(GatewayProgram, ExplainsItself) {
 }
 
 TEST(GatewayProgram, RefusesWrongUsage) {
-    EXPECT_EQ(2, ChildProcess::run({GATEWAY_BINARY, "--nonsense"}).exitStatus);
-    EXPECT_EQ(2, ChildProcess::run({GATEWAY_BINARY, "--port", "70000"}).exitStatus);
-    EXPECT_EQ(2, ChildProcess::run({GATEWAY_BINARY, "--decoders", "0"}).exitStatus);
+    const std::vector<std::string> wrongs[] = {
+        {"--nonsense"}, {"--port", "70000"}, {"--port", "http"}, {"--decoders", "0"}};
+    for (const std::vector<std::string>& wrong : wrongs) {
+        std::vector<std::string> command = {GATEWAY_BINARY};
+        command.insert(command.end(), wrong.begin(), wrong.end());
+        const ChildProcess::Result refusal = ChildProcess::run(command);
+        EXPECT_EQ(2, refusal.exitStatus);
+        EXPECT_EQ(0U, refusal.output.find("talvox-gateway: ")) << refusal.output;
+        EXPECT_NE(std::string::npos, refusal.output.find(wrong[0])) << refusal.output;
+        EXPECT_EQ(refusal.output.size() - 1, refusal.output.find('\n')) << refusal.output;
+    }
     const ChildProcess::Result result =
         ChildProcess::run({GATEWAY_BINARY, "--port", "0", "--lm", "/nowhere"});
     EXPECT_EQ(1, result.exitStatus);
