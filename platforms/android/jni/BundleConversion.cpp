@@ -195,7 +195,7 @@ jobject bundleToJBundle(const Util::Bundle& bundle) {
 
 boost::shared_ptr<Util::Bundle> jBundleToBundle(jobject javaBundle, const Util::Bundle& base,
                                                 const Util::Bundle::ElemSpec* spec) {
-    const boost::shared_ptr<Bundle> result = base.clone();
+    boost::shared_ptr<Bundle> result = base.clone();
     updateFromJBundle(javaBundle, *result, spec);
     return result;
 }

@@ -45,7 +45,7 @@ Parameters toMap(JNIEnv* env, jobject bundle) {
         const std::string name = Jni::toUtf8(env, key.get());
         const std::string value = readValue(env, bundle, key.get());
         parameters[name] = value;
-        kdLogMessage(("LogCollector: parameter " + name + " = " + value).c_str());
+        kdLogFormatMessage("LogCollector: parameter %s = %s", name.c_str(), value.c_str());
     }
     return parameters;
 }
