@@ -36,59 +36,19 @@ public abstract class SettingKey<T> {
     abstract T get(Bundle bundle);
 
     static SettingKey<Boolean> ofBoolean(String name) {
-        return new SettingKey<Boolean>(name) {
-            @Override
-            void put(Bundle bundle, Boolean value) {
-                bundle.putBoolean(getName(), value);
-            }
-
-            @Override
-            Boolean get(Bundle bundle) {
-                return read(bundle, getName(), Boolean.class);
-            }
-        };
+        return ofType(name, Boolean.class, Bundle::putBoolean);
     }
 
     static SettingKey<Integer> ofInteger(String name) {
-        return new SettingKey<Integer>(name) {
-            @Override
-            void put(Bundle bundle, Integer value) {
-                bundle.putInt(getName(), value);
-            }
-
-            @Override
-            Integer get(Bundle bundle) {
-                return read(bundle, getName(), Integer.class);
-            }
-        };
+        return ofType(name, Integer.class, Bundle::putInt);
     }
 
     static SettingKey<Float> ofFloat(String name) {
-        return new SettingKey<Float>(name) {
-            @Override
-            void put(Bundle bundle, Float value) {
-                bundle.putFloat(getName(), value);
-            }
-
-            @Override
-            Float get(Bundle bundle) {
-                return read(bundle, getName(), Float.class);
-            }
-        };
+        return ofType(name, Float.class, Bundle::putFloat);
     }
 
     static SettingKey<String> ofText(String name) {
-        return new SettingKey<String>(name) {
-            @Override
-            void put(Bundle bundle, String value) {
-                bundle.putString(getName(), value);
-            }
-
-            @Override
-            String get(Bundle bundle) {
-                return read(bundle, getName(), String.class);
-            }
-        };
+        return ofType(name, String.class, Bundle::putString);
     }
 
     static <E extends Enum<E> & SettingValue> SettingKey<E> ofChoice(
@@ -128,6 +88,25 @@ public abstract class SettingKey<T> {
                 return location == null
                         ? null
                         : new LatLon(location.getLatitude(), location.getLongitude());
+            }
+        };
+    }
+
+    /** Puts a value of a type that bundles know. */
+    private interface Writer<V> {
+        void put(Bundle bundle, String name, V value);
+    }
+
+    private static <V> SettingKey<V> ofType(String name, Class<V> type, Writer<V> writer) {
+        return new SettingKey<V>(name) {
+            @Override
+            void put(Bundle bundle, V value) {
+                writer.put(bundle, getName(), value);
+            }
+
+            @Override
+            V get(Bundle bundle) {
+                return read(bundle, getName(), type);
             }
         };
     }
