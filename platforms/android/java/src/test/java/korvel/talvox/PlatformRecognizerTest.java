@@ -10,7 +10,10 @@ import static org.robolectric.Shadows.shadowOf;
 import android.Manifest;
 import android.app.Activity;
 import android.content.BroadcastReceiver;
+import android.content.ComponentName;
+import android.content.ContentResolver;
 import android.content.Context;
+import android.content.ContextWrapper;
 import android.content.Intent;
 import android.content.IntentFilter;
 import android.os.Bundle;
@@ -249,24 +252,59 @@ public class PlatformRecognizerTest extends EngineTestCase {
         assertEquals(Collections.singletonList("results"), heard());
     }
 
-    @Test
-    public void aDeviceThatRefusesToStartIsNotAvailable() throws Exception {
-        recognizer = engine.createRecognizer(ON_DEVICE, events);
-        // The service vanishes between the choice of the recogniser and its start.
-        final android.content.ComponentName service =
-                new android.content.ComponentName(
-                        DeviceRecognizer.PACKAGE, DeviceRecognizer.PACKAGE + ".Service");
-        onMain(() -> shadowOf(application.getPackageManager()).removeService(service));
-        recognizer.start();
+    /** An application whose context fails when the device's recogniser is started. */
+    private void startIn(Context context) throws Exception {
+        TalvoxEngine.getInstance(context);
+        start();
         assertEquals("error NOT_AVAILABLE", events.end());
-        assertFalse(DeviceRecognizer.isUsed());
+        TalvoxEngine.getInstance(application);
+        final Events next = new Events();
+        try (TalvoxRecognizer one = engine.createRecognizer(ON_DEVICE, next)) {
+            one.start(); // the failed one does not stand in its way
+            DeviceRecognizer.callBack(
+                    device -> device.onResults(DeviceRecognizer.results(null, "next")));
+            assertEquals("results", next.end());
+        }
+        assertEquals(1, heard().size());
+    }
+
+    @Test
+    public void anExceptionFromStartIsNotAvailable() throws Exception {
+        startIn(
+                new ContextWrapper(application) {
+                    @Override
+                    public Context getApplicationContext() {
+                        return this;
+                    }
+
+                    @Override
+                    public ContentResolver getContentResolver() {
+                        throw new SecurityException("refused for the test");
+                    }
+                });
+    }
+
+    @Test
+    public void anExceptionOnTheMainLooperIsNotAvailable() throws Exception {
+        startIn(
+                new ContextWrapper(application) {
+                    @Override
+                    public Context getApplicationContext() {
+                        return this;
+                    }
+
+                    @Override
+                    public String getPackageName() {
+                        throw new SecurityException("refused for the test");
+                    }
+                });
+        assertLogged("the device's recogniser does not start");
     }
 
     @Test
     public void withoutADevicesRecogniserItIsNotAvailable() throws Exception {
-        final android.content.ComponentName service =
-                new android.content.ComponentName(
-                        DeviceRecognizer.PACKAGE, DeviceRecognizer.PACKAGE + ".Service");
+        final ComponentName service =
+                new ComponentName(DeviceRecognizer.PACKAGE, DeviceRecognizer.PACKAGE + ".Service");
         assertTrue(engine.isRecognitionAvailable(ON_DEVICE));
         onMain(() -> shadowOf(application.getPackageManager()).removeService(service));
         assertFalse(engine.isRecognitionAvailable(ON_DEVICE));
