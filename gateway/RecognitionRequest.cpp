@@ -1,5 +1,6 @@
 #include "gateway/RecognitionRequest.h"
 
+#include <algorithm>
 #include <cstdio>
 #include <random>
 
@@ -12,6 +13,8 @@
 namespace Gateway {
 
 namespace {
+
+constexpr std::size_t SOUND_PIECE_BYTES = 4096;
 
 /** 128 bits nobody can guess, so that no two requests share them. */
 std::string makeRequestId() {
@@ -134,9 +137,19 @@ std::string RecognitionRequest::onPartData(const char* data, std::size_t size) {
         return fields.append(data, size);
     }
     soundBytes += size;
-    std::vector<int16_t> samples;
-    const std::string reason = soundDecoder->write(data, size, samples);
-    return reason.empty() ? takeSamples(samples) : reason;
+    std::string reason;
+    // A few bytes of Speex may hold seconds of sound.
+    while (size > 0 && reason.empty()) {
+        const std::size_t count = std::min(size, SOUND_PIECE_BYTES);
+        std::vector<int16_t> samples;
+        reason = soundDecoder->write(data, count, samples);
+        if (reason.empty()) {
+            reason = takeSamples(samples);
+        }
+        data += count;
+        size -= count;
+    }
+    return reason;
 }
 
 std::string RecognitionRequest::onPartEnd() {
@@ -174,7 +187,9 @@ std::string RecognitionRequest::beginSound(const MultipartPart& part) {
 }
 
 std::string RecognitionRequest::takeSamples(const std::vector<int16_t>& samples) {
-    if (utterance && !utterance->add(samples)) {
+    soundSamples += samples.size();
+    // Sound that nobody recognises is decoded all the same.
+    if (soundSamples > Utterance::MAX_SAMPLES || (utterance && !utterance->add(samples))) {
         refuse(413,
                "the sound is longer than " + std::to_string(Utterance::MAX_SECONDS) + " seconds");
         return refusedReason;

@@ -87,6 +87,7 @@ class RecognitionRequest : private MultipartListener {
     bool inSound = false;
     std::size_t bodyBytes = 0;
     std::size_t soundBytes = 0;
+    uint64_t soundSamples = 0;
     uint64_t utteranceMs = 0;
     uint64_t decodeMs = 0;
     uint64_t answerMs = 0;

@@ -7,7 +7,7 @@
 
 #include <cerrno>
 #include <cstring>
-#include <new>
+#include <exception>
 
 #include "gateway/HttpExchange.h"
 #include "pal/kd_log.h"
@@ -20,22 +20,33 @@ namespace {
 constexpr std::size_t CONNECTION_MEMORY_BYTES = 1024 * 1024;
 constexpr unsigned MAX_CONNECTIONS = 64;
 
-/** Called for the head, for each piece of the body, and for its end. */
-MHD_Result onRequest(void* user, MHD_Connection* connection, const char* url, const char* method,
-                     const char* /*version*/, const char* data, std::size_t* size, void** state) {
+/** Handles the head, each piece of the body, and its end. @return false to close the connection */
+bool handle(Server& server, MHD_Connection* connection, const char* url, const char* method,
+            const char* data, std::size_t* size, void** state) {
     if (*state == nullptr) {
-        auto* begun =
-            new (std::nothrow) HttpExchange(*static_cast<Server*>(user), connection, url, method);
+        auto* const begun = new HttpExchange(server, connection, url, method);
         *state = begun;
-        return begun != nullptr && begun->onHead() ? MHD_YES : MHD_NO;
+        return begun->onHead();
     }
-    auto* exchange = static_cast<HttpExchange*>(*state);
+    auto* const exchange = static_cast<HttpExchange*>(*state);
     if (*size == 0) {
-        return exchange->onEnd() ? MHD_YES : MHD_NO;
+        return exchange->onEnd();
     }
     const std::size_t count = *size;
     *size = 0;
-    return exchange->onBody(data, count) ? MHD_YES : MHD_NO;
+    return exchange->onBody(data, count);
+}
+
+/** Costs a client its connection, not everybody the gateway, when memory runs out. */
+MHD_Result onRequest(void* user, MHD_Connection* connection, const char* url, const char* method,
+                     const char* /*version*/, const char* data, std::size_t* size, void** state) {
+    try {
+        Server& server = *static_cast<Server*>(user);
+        return handle(server, connection, url, method, data, size, state) ? MHD_YES : MHD_NO;
+    } catch (const std::exception& failure) {
+        kdLogFormatMessage("a request was given up: %s", failure.what());
+        return MHD_NO;
+    }
 }
 
 void onCompleted(void* /*user*/, MHD_Connection* /*connection*/, void** state,

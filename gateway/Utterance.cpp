@@ -9,7 +9,7 @@ namespace Gateway {
 Utterance::Utterance(DecoderPool& decoderPool) : pool(decoderPool), mean(pool.getModel()) {}
 
 bool Utterance::add(const std::vector<int16_t>& samples) {
-    if (total + samples.size() > MAX_SECONDS * SpeechModel::RATE_HZ) {
+    if (total + samples.size() > MAX_SAMPLES) {
         return false;
     }
     total += samples.size();

@@ -27,6 +27,7 @@ class Utterance {
     static constexpr std::size_t MEAN_FRAMES = 150;
     /** Longest utterance in seconds; the recogniser holds 150 s at most. */
     static constexpr std::size_t MAX_SECONDS = 120;
+    static constexpr std::size_t MAX_SAMPLES = MAX_SECONDS * SpeechModel::RATE_HZ;
     /** Wait for a free recogniser; clients give up after 20 s. */
     static constexpr unsigned WAIT_MS = 18000;
 

@@ -282,10 +282,12 @@ TEST(RecognitionRequest, RefusesBodiesThatAreTooLong) {
 }
 
 TEST(RecognitionRequest, RefusesSoundThatIsTooLong) {
-    RecognitionRequest request(usualHead(), BOUNDARY, sharedPool(), 16 * MAX_BODY);
-    const std::string body = bodyWithSound(std::string(121 * 32000, '\0'), PCM16K);
-    EXPECT_TRUE(request.write(body.data(), body.size()));
-    const Answer answer = request.finish();
-    EXPECT_EQ(413U, answer.status);
-    EXPECT_EQ("the sound is longer than 120 seconds\n", answer.body);
+    for (const char* language : {"en-US", "ru-RU"}) {
+        RecognitionRequest request(usualHead(), BOUNDARY, sharedPool(), 16 * MAX_BODY);
+        const std::string body = bodyWithSound(std::string(121 * 32000, '\0'), PCM16K, language);
+        EXPECT_TRUE(request.write(body.data(), body.size()));
+        const Answer answer = request.finish();
+        EXPECT_EQ(413U, answer.status) << language;
+        EXPECT_EQ("the sound is longer than 120 seconds\n", answer.body) << language;
+    }
 }
