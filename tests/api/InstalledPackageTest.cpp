@@ -45,9 +45,8 @@ class InstalledPackage : public ::testing::Test {
   protected:
     InstalledPackage() {
         kdUseManualClockKOR(0);
-        Sound::Recorder::setFactory([] {
-            return boost::make_shared<Sound::FileRecorder>(std::vector<int16_t>());
-        });
+        Sound::Recorder::setFactory(
+            [] { return boost::make_shared<Sound::FileRecorder>(std::vector<int16_t>()); });
     }
     ~InstalledPackage() override {
         Sound::Recorder::setFactory({});
@@ -57,7 +56,9 @@ class InstalledPackage : public ::testing::Test {
 
 }  // namespace
 
-TEST_F(InstalledPackage, TellsItsVersion) { EXPECT_EQ("133", Talvox::Talvox::VERSION); }
+TEST_F(InstalledPackage, TellsItsVersion) {
+    EXPECT_EQ("133", Talvox::Talvox::VERSION);
+}
 
 TEST_F(InstalledPackage, SilentSessionEndsInNoVoiceAfterFiveSeconds) {
     auto& engine = Talvox::Talvox::getInstance();
