@@ -19,10 +19,18 @@ namespace {
 using Talvox::Settings;
 
 const char* const RATE_HELP =
-    "Sample rate in Hz of the recognition, and of raw sound on standard input";
+    "Sample rate in Hz of the recognition, and of raw sound on standard input; at others than "
+    "8000, 16000 and 32000 the speech detector takes everything for speech [16000]";
 
 /** What the arguments are read into. */
 struct Arguments {
+    Arguments() {
+        for (SettingsOptions* run : {&recognize.settings, &vad.settings}) {
+            run->defaults = recognizeDefaults();
+            run->repairDocument = true;
+        }
+    }
+
     RecognizeOptions recognize;
     VadOptions vad;
     SettingsOptions settings;
@@ -215,7 +223,6 @@ int fail(std::ostream& err, const std::string& reason) {
 
 int runTool(int argc, const char* const* argv, Console& console, LogOutput& log) {
     Arguments arguments;
-    arguments.recognize.settings.defaults = recognizeDefaults();
     CLI::App app("Speech recognition from the command line", "talvox");
     app.set_version_flag("--version", versionText());
     app.require_subcommand(0, 1);

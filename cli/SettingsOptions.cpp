@@ -158,6 +158,9 @@ boost::shared_ptr<Talvox::Settings> buildSettings(const SettingsOptions& options
     }
     if (!options.file.empty()) {
         applyDocument(*settings, options.file);
+        if (options.repairDocument) {
+            settings->validate();
+        }
     }
     for (const std::string& assignment : options.assignments) {
         applyAssignment(*settings, assignment);

@@ -15,6 +15,7 @@ struct SettingsOptions {
 
     std::vector<Assignment> defaults;       /**< the tool's own, over the engine's */
     std::string file;                       /**< configuration document; empty for none */
+    bool repairDocument = false;            /**< validate what the defaults and `file` make */
     std::vector<std::string> assignments;   /**< key=value */
     std::vector<Assignment> explicitValues; /**< options that name one setting each */
 };
@@ -28,7 +29,9 @@ void assign(Talvox::Settings& settings, const std::string& key, const std::strin
 
 /**
  * The settings that all sources together make. The document at `file` is applied as the engine
- * applies a configuration document: what is wrong in it is logged and skipped.
+ * applies a configuration document: what is wrong in it is logged and skipped. With
+ * `repairDocument`, values in it that validation does not accept are repaired and logged as well;
+ * what the user assigns by hand stays as it is.
  * @throws UsageError when the file cannot be read or an assignment is wrong
  */
 boost::shared_ptr<Talvox::Settings> buildSettings(const SettingsOptions& options);

@@ -145,6 +145,32 @@ TEST(BuildSettings, LogsWhatIsWrongInADocumentAndAppliesTheRest) {
     EXPECT_TRUE(log.contains("streaming: no body"));
 }
 
+TEST(BuildSettings, RepairsADocumentOnlyWhereAskedTo) {
+    const ScratchDirectory directory;
+    SettingsOptions options;
+    options.defaults = {{"url", "http://127.0.0.1"}, {"uuid", std::string(32, 'a')}};
+    options.file = directory.write(
+        "settings.xml",
+        document("<samplerate>96000</samplerate><speexquality>20</speexquality><vad>v</vad>"));
+    options.assignments = {"speexquality=-1"};
+    {
+        const LogCapture log;
+        const boost::shared_ptr<Settings> asWritten = buildSettings(options);
+        EXPECT_EQ(asWritten->getInt("samplerate"), 96000);
+        EXPECT_TRUE(log.messages().empty());
+    }
+    options.repairDocument = true;
+    const LogCapture log;
+    const boost::shared_ptr<Settings> repaired = buildSettings(options);
+    EXPECT_EQ(repaired->getInt("samplerate"), 16000);
+    EXPECT_EQ(repaired->getInt("speexquality"), -1);
+    EXPECT_EQ(repaired->getString("vad"), "v");
+    EXPECT_THAT(log.messages(),
+                ::testing::ElementsAre(
+                    "TalvoxSettings::validate: bad sampleRate: 96000, setting to default",
+                    "TalvoxSettings::validate: bad speexQuality: 20, setting to default"));
+}
+
 TEST(BuildSettings, KeepsTheDefaultsWhenTheDocumentIsBroken) {
     const ScratchDirectory directory;
     for (const char* text : {"", "<startup>", "not XML at all", "<startup/>", "\xC3"}) {

@@ -203,6 +203,23 @@ TEST(ToolRecognize, LogsOnlyWhenAsked) {
     EXPECT_THAT(verbose.err, HasSubstr("talvox: Request request-7 finished in "));
 }
 
+TEST(ToolRecognize, RepairsWhatADocumentSaysBeyondRange) {
+    ScriptedHttpServer server;
+    server.setDefaultAnswer(resultAnswer("<variant confidence=\"1\">a</variant>"));
+    const ScratchDirectory directory;
+    const std::string file =
+        directory.write("settings.xml",
+                        "<startup><features><voice><samplerate>96000</samplerate>"
+                        "<language>tr-TR</language></voice></features></startup>");
+    const ToolResult result =
+        runTalvox(recognize(server.getUrl(), {"--json", "--settings", file}), voice());
+    EXPECT_EQ(result.status, 0) << result.err;
+    EXPECT_EQ(result.err,
+              "talvox: TalvoxSettings::validate: bad sampleRate: 96000, setting to default\n");
+    ASSERT_EQ(server.getRequestCount(), 1U);
+    EXPECT_THAT(server.getRequest(0).body, HasSubstr("tr-TR\r\n"));
+}
+
 TEST(ToolRecognize, CtrlCCancels) {
     ScriptedHttpServer server;
     server.setDefaultAnswer(Answer::never());

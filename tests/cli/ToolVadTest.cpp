@@ -101,6 +101,22 @@ TEST(ToolVad, FollowsTheDetectorsParameters) {
     EXPECT_EQ(bySet.out, deaf.out);
 }
 
+TEST(ToolVad, RunsWithADocumentOfNumbersBeyondRangeAndTellsItsRepairs) {
+    const ScratchDirectory directory;
+    const std::string file =
+        directory.write("settings.xml",
+                        "<startup><features><voice><samplerate>96000</samplerate>"
+                        "<vad>activityon=1.0</vad></voice></features></startup>");
+    const ToolResult result = runTalvox({"vad", "--file", "-", "--json", "--settings", file},
+                                        TestSupport::rawBytes(utterance(16000)));
+    EXPECT_EQ(result.status, 0);
+    EXPECT_EQ(result.err,
+              "talvox: TalvoxSettings::validate: bad sampleRate: 96000, setting to default\n"
+              "talvox: activityOn 1.000000\n");
+    EXPECT_EQ(objects(result.out, "buffer").size(), 40U);
+    EXPECT_TRUE(objects(result.out, "segment").empty());
+}
+
 TEST(ToolVad, SurvivesAndTellsMistakesInTheParameters) {
     const std::string sound = TestSupport::rawBytes(utterance(16000));
     const ToolResult unknown =
