@@ -172,6 +172,22 @@ TEST_F(NetworkTaskTest, FailsCleanlyOnAHeaderBeyondTheLimit) {
     EXPECT_THAT(task->getEvents(), ElementsAre("ready?", "issue", "finished -1"));
 }
 
+TEST_F(NetworkTaskTest, FailsCleanlyOnHeadersWithoutEnd) {
+    const std::string line = "X-Filler: " + std::string(1000, 'v') + "\r\n";
+    std::string many;
+    while (many.size() < 250000) {
+        many += line;
+    }
+    const std::string begin = "HTTP/1.1 200 OK\r\nContent-Length: 0\r\n";
+    server.script({Answer::raw(begin + many + "\r\n"), Answer::raw(begin + many + many)});
+    EXPECT_EQ("finished 200", run(makeTask(server.getUrl())));
+    const TestSupport::LogCapture log;
+    const auto task = makeTask(server.getUrl());
+    EXPECT_EQ("finished -1", run(task));
+    EXPECT_THAT(task->getEvents(), ElementsAre("ready?", "issue", "finished -1"));
+    EXPECT_EQ(1U, log.count("Network: the head of a response is too large"));
+}
+
 TEST_F(NetworkTaskTest, FailsOnABodyBeyondWhatItCollects) {
     const std::string most(1024 * 1024, 'b');
     server.script({Answer::status(200, {}, most), Answer::status(200, {}, most + "b")});

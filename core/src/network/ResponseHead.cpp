@@ -4,7 +4,19 @@
 
 namespace Network {
 
+namespace {
+
+// libcurl bounds a head as well, but only since late versions.
+constexpr std::size_t MOST_BYTES = std::size_t{256} * 1024;
+
+}  // namespace
+
+bool ResponseHead::hasRoom(std::size_t size) const {
+    return size <= MOST_BYTES - bytes;
+}
+
 bool ResponseHead::addLine(const std::string& line) {
+    bytes += line.size();
     const std::string text = line.substr(0, line.find_last_not_of("\r\n") + 1);
     if (text.empty()) {
         return true;

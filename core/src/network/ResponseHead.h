@@ -1,6 +1,7 @@
 #pragma once
 
 #include <boost/shared_ptr.hpp>
+#include <cstddef>
 #include <string>
 #include <utility>
 #include <vector>
@@ -12,6 +13,9 @@ namespace Network {
 /** Gathers the header lines of a response. */
 class ResponseHead {
   public:
+    /** Whether a line of so many bytes still finds room; interim heads and trailers count too. */
+    bool hasRoom(std::size_t size) const;
+
     /** Takes the next line, with its end. @return true when it was the empty line */
     bool addLine(const std::string& line);
 
@@ -21,6 +25,7 @@ class ResponseHead {
 
   private:
     std::vector<std::pair<std::string, std::string>> fields;
+    std::size_t bytes = 0;
 };
 
 }  // namespace Network

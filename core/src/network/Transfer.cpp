@@ -248,11 +248,16 @@ int Transfer::onSeek(void* self, curl_off_t offset, int origin) {
 
 std::size_t Transfer::onHeader(char* data, std::size_t size, std::size_t count, void* self) {
     Transfer& transfer = *static_cast<Transfer*>(self);
+    const std::size_t bytes = size * count;
     transfer.noteProgress();
-    if (transfer.head.addLine(std::string(data, size * count))) {
+    if (!transfer.head.hasRoom(bytes)) {
+        kdLogMessage("Network: the head of a response is too large");
+        return 0;
+    }
+    if (transfer.head.addLine(std::string(data, bytes))) {
         transfer.handleHeadEnd();
     }
-    return size * count;
+    return bytes;
 }
 
 std::size_t Transfer::onWrite(char* data, std::size_t size, std::size_t count, void* self) {
