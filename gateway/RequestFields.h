@@ -10,7 +10,7 @@ namespace Gateway {
 class RequestFields {
   public:
     static constexpr std::size_t MAX_VALUE_BYTES = 4096;
-    static constexpr std::size_t MAX_TRANSCRIPTS_BYTES = 1024 * 1024;
+    static constexpr std::size_t MAX_TRANSCRIPTS_BYTES = std::size_t{1024} * 1024;
 
     /** Opens a field. @return an empty text, or why the request is refused, as all below */
     std::string begin(const std::string& name);

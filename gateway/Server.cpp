@@ -17,7 +17,7 @@ namespace Gateway {
 namespace {
 
 /** Room for a request's headers and for an answer's, of which the results may be 90 KB. */
-constexpr std::size_t CONNECTION_MEMORY_BYTES = 1024 * 1024;
+constexpr std::size_t CONNECTION_MEMORY_BYTES = std::size_t{1024} * 1024;
 constexpr unsigned MAX_CONNECTIONS = 64;
 
 /** Handles the head, each piece of the body, and its end. @return false to close the connection */
