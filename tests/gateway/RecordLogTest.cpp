@@ -15,8 +15,6 @@
 namespace {
 
 using Gateway::RecordLog;
-using ::testing::HasSubstr;
-using ::testing::StartsWith;
 
 class RecordLogTest : public ::testing::Test {
   protected:
@@ -66,6 +64,7 @@ TEST_F(RecordLogTest, SyncsInBatchesAndBeforeItCloses) {
     constexpr int LINES = 250;
     ASSERT_EQ("", log.open(path));
     std::vector<std::thread> threads;
+    threads.reserve(THREADS);
     for (int thread = 0; thread < THREADS; ++thread) {
         threads.emplace_back([this] {
             for (int i = 0; i < LINES; ++i) {

@@ -1,11 +1,9 @@
 #include "LogFixture.h"
 
-using TestSupport::Answer;
-
 namespace {
 
 constexpr int64_t PAUSE_MS = 3000;
-constexpr std::size_t MEGABYTE = 1024 * 1024;
+constexpr std::size_t MEGABYTE = std::size_t{1024} * 1024;
 
 std::string allBytes() {
     std::string bytes;
@@ -55,7 +53,7 @@ TEST_F(LogBytesTest, TheLongestRecordArrives) {
     const std::size_t coding = Util::UrlCoder::urlEncodeString(around).size();
     const std::string value(1000000 - coding, 'a');
     LogCollector::logEvent("s", "n", {{"k", value}});
-    ASSERT_TRUE(delivered.waitFor(1));
+    ASSERT_TRUE(delivered.waitFor(1, std::chrono::seconds(60)));
     EXPECT_TRUE(around + value == recordOf(0));
 }
 

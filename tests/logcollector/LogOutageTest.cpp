@@ -18,7 +18,7 @@ namespace {
 
 constexpr int THREADS = 4;
 constexpr int RECORDS_PER_THREAD = 2500;
-constexpr std::size_t RECORDS = THREADS * RECORDS_PER_THREAD;
+constexpr std::size_t RECORDS = std::size_t{THREADS} * RECORDS_PER_THREAD;
 constexpr int64_t RETRY_MS = 3000;
 const char* const ATTEMPT = "LogCollectorNetworkTask: request url is ";
 
@@ -173,6 +173,7 @@ TEST_F(LogOutageTest, EveryRecordArrivesInTheOrderOfTheQueueWhateverTheEndpointD
         }
     });
     std::vector<std::thread> threads;
+    threads.reserve(THREADS);
     for (int thread = 0; thread < THREADS; ++thread) {
         threads.emplace_back([&sender, &logging, thread] {
             for (int number = 0; number < RECORDS_PER_THREAD; ++number) {
@@ -241,6 +242,7 @@ TEST_F(LogOutageTest, EightThreadsMayLogWhileTheConfigurationChanges) {
     other.script(flapping);
     std::atomic<int> running{MANY};
     std::vector<std::thread> threads;
+    threads.reserve(MANY);
     for (int thread = 0; thread < MANY; ++thread) {
         threads.emplace_back([&, thread] {
             const std::string session = std::to_string(thread);

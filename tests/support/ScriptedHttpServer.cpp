@@ -228,10 +228,12 @@ class ScriptedHttpServer::Connection {
     bool readUntil(const std::string& mark, std::string& text) {
         std::size_t found = buffer.find(mark);
         while (found == std::string::npos) {
+            // What has been searched is not searched again: heads may be a megabyte long.
+            const std::size_t searched = buffer.size() - std::min(buffer.size(), mark.size());
             if (!receive()) {
                 return false;
             }
-            found = buffer.find(mark);
+            found = buffer.find(mark, searched);
         }
         text = buffer.substr(0, found + mark.size());
         buffer.erase(0, found + mark.size());
