@@ -18,6 +18,8 @@ const char* const FUNCTION = "jBundleToBundle";
 const char* const PROVIDER = "Talvox";
 const char* const BUNDLE_CLASS = "android/os/Bundle";
 const char* const LOCATION_CLASS = "android/location/Location";
+/** References that a nested bundle needs at one time, without those of its own nested ones. */
+const jint FRAME_SIZE = 10;
 
 void logUnknownType(const std::string& key, int type) {
     tvLogFormatMessage(0, "%s: unknown elem type for field %s: %d, ignoring", FUNCTION, key.c_str(),
@@ -63,6 +65,7 @@ void putElement(JNIEnv* env, jobject target, jstring key, const std::string& nam
         }
         case Bundle::BUNDLE: {
             const Bundle nothing;
+            const Jni::LocalFrame frame(env, FRAME_SIZE);
             const LocalRef<jobject> nested(
                 env, bundleToJBundle(element.bundle ? *element.bundle : nothing));
             Jni::callVoid(env, target, "putBundle", "(Ljava/lang/String;Landroid/os/Bundle;)V", key,
@@ -118,6 +121,7 @@ Bundle::LatLon readLocation(JNIEnv* env, jobject source, jstring key) {
 
 boost::shared_ptr<Bundle> readNested(JNIEnv* env, jobject source, jstring key, const Bundle& target,
                                      const Bundle::ElemSpec& row) {
+    const Jni::LocalFrame frame(env, FRAME_SIZE);
     const LocalRef<jobject> nested =
         Jni::callObject(env, source, "getBundle", "(Ljava/lang/String;)Landroid/os/Bundle;", key);
     const bool isThere = target.hasKey(row.name) && target.getType(row.name) == Bundle::BUNDLE;
