@@ -337,18 +337,21 @@ public class PlatformRecognizerTest extends EngineTestCase {
     @Test
     public void theNextOneMayStartFromInsideOnResults() throws Exception {
         final Events second = new Events();
-        recognizer =
-                engine.createRecognizer(
-                        ON_DEVICE,
-                        new Events() {
-                            @Override
-                            public void onResults(Recognition recognition) {
-                                engine.createRecognizer(ON_DEVICE, second).start();
-                            }
-                        });
-        recognizer.start();
-        DeviceRecognizer.callBack(
-                device -> device.onResults(DeviceRecognizer.results(null, "one")));
+        final Events first =
+                new Events() {
+                    @Override
+                    public void onResults(Recognition recognition) {
+                        recognizer = engine.createRecognizer(ON_DEVICE, second);
+                        recognizer.start();
+                        super.onResults(recognition);
+                    }
+                };
+        try (TalvoxRecognizer one = engine.createRecognizer(ON_DEVICE, first)) {
+            one.start();
+            DeviceRecognizer.callBack(
+                    device -> device.onResults(DeviceRecognizer.results(null, "one")));
+            assertEquals("results", first.end());
+        }
         DeviceRecognizer.callBack(
                 device -> device.onResults(DeviceRecognizer.results(null, "two")));
         assertEquals("results", second.end());
