@@ -71,6 +71,7 @@ int runLog(const LogOptions& options, Console& console, LogOutput& log) {
     submit(options, params);
     end.wait();
     LogCollector::setDeliveredCallback({});
+    log.show(false);  // the verdict is the last line
     const std::size_t left = LogCollector::getPendingCount();
     if (left == 0) {
         return EXIT_OK;

@@ -14,12 +14,16 @@ LogOutput::~LogOutput() {
     kdSetLogSinkKOR(nullptr, nullptr);
 }
 
+void LogOutput::show(bool value) {
+    const std::lock_guard<std::mutex> lock(mutex);
+    shown = value;
+}
+
 void LogOutput::receive(const char* message, void* self) {
     auto& output = *static_cast<LogOutput*>(self);
+    const std::lock_guard<std::mutex> lock(output.mutex);
     if (output.shown) {
-        const std::string line = std::string("talvox: ") + message + '\n';
-        const std::lock_guard<std::mutex> lock(output.mutex);
-        output.out << line << std::flush;
+        output.out << std::string("talvox: ") + message + '\n' << std::flush;
     }
 }
 

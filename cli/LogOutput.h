@@ -1,6 +1,5 @@
 #pragma once
 
-#include <atomic>
 #include <mutex>
 #include <ostream>
 
@@ -17,15 +16,15 @@ class LogOutput {
     LogOutput(const LogOutput&) = delete;
     LogOutput& operator=(const LogOutput&) = delete;
 
-    /** Any thread. */
-    void show(bool value) { shown = value; }
+    /** Any thread. After `show(false)` has returned no message is written any more. */
+    void show(bool value);
 
   private:
     static void receive(const char* message, void* self);
 
     std::ostream& out;
     std::mutex mutex;
-    std::atomic<bool> shown{false};
+    bool shown = false;
 };
 
 }  // namespace Cli
