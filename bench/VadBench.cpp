@@ -80,7 +80,7 @@ void countSound(benchmark::State& state) {
 
 void bareDetector(benchmark::State& state) {
     TestSupport::BareVad bare(MODE);
-    for (auto _ : state) {
+    for ([[maybe_unused]] auto _ : state) {
         benchmark::DoNotOptimize(processBare(bare));
     }
     countSound(state);
@@ -92,7 +92,7 @@ void ownLibrary(benchmark::State& state) {
     WebRtcVad_Create(&handle);
     WebRtcVad_Init(handle);
     WebRtcVad_set_mode(handle, MODE);
-    for (auto _ : state) {
+    for ([[maybe_unused]] auto _ : state) {
         for (std::size_t begin = 0; begin < speech().size(); begin += FRAME_SAMPLES) {
             benchmark::DoNotOptimize(
                 WebRtcVad_Process(handle, RATE, speech().data() + begin, FRAME_SAMPLES));
@@ -105,7 +105,7 @@ BENCHMARK(ownLibrary)->Unit(benchmark::kMillisecond);
 
 void detector(benchmark::State& state, const std::string& parameters) {
     const Detector subject = makeDetector(parameters);
-    for (auto _ : state) {
+    for ([[maybe_unused]] auto _ : state) {
         benchmark::DoNotOptimize(processBuffers(*subject));
     }
     countSound(state);
@@ -118,7 +118,7 @@ BENCHMARK_CAPTURE(detector, history_of_8_megabytes, "analyzems=671088640")
 void soundLevel(benchmark::State& state) {
     Talvox::VoicePowerEstimator estimator;
     estimator.setMode(1);
-    for (auto _ : state) {
+    for ([[maybe_unused]] auto _ : state) {
         for (const Sound::SoundDataBuffer& buffer : speechBuffers()) {
             estimator.updatePower(buffer);
         }
@@ -138,7 +138,7 @@ void bufferedAgainstBare(benchmark::State& state) {
     const Detector buffered = makeDetector("");
     Clock::duration fastestBare = Clock::duration::max();
     Clock::duration fastestBuffered = Clock::duration::max();
-    for (auto _ : state) {
+    for ([[maybe_unused]] auto _ : state) {
         const Clock::time_point begin = Clock::now();
         benchmark::DoNotOptimize(processBare(bare));
         const Clock::time_point between = Clock::now();

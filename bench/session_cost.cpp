@@ -24,7 +24,6 @@ namespace {
 
 constexpr std::size_t BUFFER_SAMPLES = 1600;
 constexpr std::size_t BUFFERS = 190;  // below the limit of 20 seconds of sound
-constexpr std::size_t MEASURED = 95;  // the last ones, in steady state
 constexpr std::size_t WARM_UP_BUFFERS = BUFFERS / 2;
 constexpr int ROUNDS = 15;
 constexpr int QUALITY = 8;
