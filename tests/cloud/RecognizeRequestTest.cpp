@@ -13,7 +13,6 @@
 namespace {
 
 using CloudTest::UUID;
-using Network::HttpRequest;
 using Talvox::RecognizeRequest;
 using Talvox::Settings;
 using TestSupport::AssertCapture;

@@ -8,7 +8,6 @@
 namespace {
 
 using Talvox::Settings;
-using Talvox::TranscriptsOrigin;
 using TestSupport::AssertCapture;
 using TestSupport::AssertReport;
 using TestSupport::CommaLocale;

@@ -9,7 +9,6 @@
 
 namespace {
 
-using CloudTest::EventRecorder;
 using CloudTest::makeDocument;
 using CloudTest::SHORT_SPEECH;
 using CloudTest::Texts;

@@ -6,7 +6,6 @@
 namespace {
 
 using Sensor::GesturePattern;
-using Sensor::ProximitySpan;
 using testing::HasSubstr;
 
 GesturePattern parse(const std::string& text) {

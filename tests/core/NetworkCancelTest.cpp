@@ -5,7 +5,6 @@
 #include "NetworkFixture.h"
 #include "support/AssertCapture.h"
 
-using Network::NetworkManager;
 using Network::NetworkTaskHolder;
 using Network::NetworkTaskWriter;
 using ::testing::ElementsAre;

@@ -3,7 +3,6 @@
 #include "NetworkFixture.h"
 #include "core/network/NetworkTaskRetryPolicy.h"
 
-using Network::NetworkTask;
 using Network::NetworkTaskBasicRetryPolicy;
 using Network::NetworkTaskWriter;
 using ::testing::ElementsAre;

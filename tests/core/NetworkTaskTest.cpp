@@ -2,8 +2,6 @@
 #include "support/LogCapture.h"
 
 using Network::HttpRequest;
-using Network::NetworkManager;
-using Network::NetworkTask;
 using Network::NetworkTaskHolder;
 using ::testing::ElementsAre;
 using TestSupport::Answer;

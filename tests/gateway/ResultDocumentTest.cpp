@@ -3,7 +3,6 @@
 #include <gtest/gtest.h>
 #include <tinyxml.h>
 
-using Gateway::Hypothesis;
 using Gateway::makeResultDocument;
 
 TEST(ResultDocument, ListsTheVariantsInOrder) {

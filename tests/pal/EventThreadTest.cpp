@@ -9,8 +9,6 @@
 #include "pal/kd_event.h"
 #include "support/AssertCapture.h"
 
-using ::testing::ElementsAre;
-
 namespace {
 
 void post(std::function<void()> function) {

@@ -14,7 +14,6 @@
 namespace {
 
 using Talvox::VoiceActivityDetectorWebRTC;
-using ::testing::Each;
 using ::testing::ElementsAre;
 using ::testing::IsEmpty;
 using TestSupport::AssertCapture;
