@@ -37,32 +37,13 @@ final class EndingProgram {
     }
 
     /** Hears of the beginning. */
-    private static final class Listener implements Recognizer.Events {
+    private static final class Listener extends SilentEvents {
         private final CountDownLatch began = new CountDownLatch(1);
 
         @Override
         public void onRecordingBegin() {
             began.countDown();
         }
-
-        @Override
-        public void onSpeakingBegin() {}
-
-        @Override
-        public void onRecordingDone() {}
-
-        @Override
-        public void onPowerChanged(float power) {}
-
-        @Override
-        public void onBufferReceived(byte[] buffer) {}
-
-        @Override
-        public void onError(int code) {}
-
-        @Override
-        public void onResults(
-                int outcome, String[] texts, float[] confidences, String requestId) {}
     }
 
     private EndingProgram() {}

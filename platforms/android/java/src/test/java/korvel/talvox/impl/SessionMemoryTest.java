@@ -188,7 +188,7 @@ public class SessionMemoryTest extends EngineTestCase {
         final Set<Long> numbers = new HashSet<>();
         for (int index = 0; index < SESSIONS; index++) {
             final NativeHandle handle =
-                    Recognizer.start(Talvox.getHandle(), new Bundle(), new Silence());
+                    Recognizer.start(Talvox.getHandle(), new Bundle(), new SilentEvents());
             numbers.add(getNumber(handle));
             if (index % 2 == 0) {
                 Recognizer.cancel(handle);
@@ -202,29 +202,5 @@ public class SessionMemoryTest extends EngineTestCase {
                     assertThrows(IllegalStateException.class, () -> Recognizer.cancel(stale))
                             .getMessage());
         }
-    }
-
-    private static final class Silence implements Recognizer.Events {
-        @Override
-        public void onRecordingBegin() {}
-
-        @Override
-        public void onSpeakingBegin() {}
-
-        @Override
-        public void onRecordingDone() {}
-
-        @Override
-        public void onPowerChanged(float power) {}
-
-        @Override
-        public void onBufferReceived(byte[] buffer) {}
-
-        @Override
-        public void onError(int code) {}
-
-        @Override
-        public void onResults(
-                int outcome, String[] texts, float[] confidences, String requestId) {}
     }
 }
