@@ -37,6 +37,9 @@ public class SessionMemoryTest extends EngineTestCase {
     private static final int RECORDED_EVERY = 50;
     private static final int SPEED = 4;
     private static final long KIB_ALLOWED = 4 * 1024;
+    // The VM counts those of its own compiler, too, while that works. What the rarest kind of
+    // session left behind would be more.
+    private static final int REFERENCES_ALLOWED = SESSIONS / RECORDED_EVERY / 2;
     private static final int COLLECTIONS = 200;
     private static final int COLLECTION_WAIT_MS = 50;
 
@@ -174,7 +177,7 @@ public class SessionMemoryTest extends EngineTestCase {
         // 4 KiB for each session: less than what one of them holds while it runs.
         ResidentMemory.assertDoesNotGrow(KIB_ALLOWED, () -> runSessions(SESSIONS));
         final int more = globalReferences() - before;
-        assertTrue(more + " more references", more <= 0);
+        assertTrue(more + " more references", more <= REFERENCES_ALLOWED);
     }
 
     private static long getNumber(NativeHandle handle) {
