@@ -27,7 +27,9 @@ function(korvel_library target)
         -Wl,--version-script=${script}
         -Wl,-Bsymbolic-functions
         -Wl,-z,max-page-size=16384
-        -Wl,-z,relro,-z,now,-z,noexecstack)
+        -Wl,-z,relro,-z,now,-z,noexecstack
+        # Threads run their code to the end of the process: it must never be unmapped.
+        -Wl,-z,nodelete)
     # clang does not link the sanitizer run time into shared libraries.
     if(NOT (TALVOX_SANITIZERS AND CMAKE_CXX_COMPILER_ID MATCHES "Clang"))
         target_link_options(${target} PRIVATE -Wl,--no-undefined)

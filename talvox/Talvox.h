@@ -37,6 +37,9 @@ class TALVOX_API Talvox : public Util::Singleton<Talvox> {
         MechanismDummy = 2     /**< none is available */
     };
 
+    /** Recognizers point to the facade, and an application may have them in static objects. */
+    static constexpr bool STAYS_AT_PROCESS_END = true;
+
     /** The engine's version, "133". */
     static const std::string VERSION;
 

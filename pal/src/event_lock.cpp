@@ -1,6 +1,7 @@
 #include "event_lock.h"
 
 #include <mutex>
+#include <thread>
 
 #include "pal/kd_assert.h"
 
@@ -37,6 +38,19 @@ KDint kdHoldsEventLockKOR(void) {
 }
 
 namespace korvel_pal {
+
+// Not a timed mutex: this happens once, and ThreadSanitizer knows the plain one best.
+bool waitForEventLock(std::chrono::nanoseconds limit) {
+    const auto end = std::chrono::steady_clock::now() + limit;
+    while (!eventMutex().try_lock()) {
+        if (std::chrono::steady_clock::now() >= end) {
+            return false;
+        }
+        std::this_thread::yield();
+    }
+    eventMutex().unlock();
+    return true;
+}
 
 EventLockRelease::EventLockRelease() : levels(levelsHeld) {
     if (levels > 0) {

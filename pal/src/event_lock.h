@@ -1,5 +1,7 @@
 #pragma once
 
+#include <chrono>
+
 #include "pal/kd_event.h"
 
 namespace korvel_pal {
@@ -12,6 +14,9 @@ class EventLockGuard {
     EventLockGuard& operator=(const EventLockGuard&) = delete;
 };
 
+/** Waits until the event lock is free once, up to `limit`. @return whether it was */
+bool waitForEventLock(std::chrono::nanoseconds limit);
+
 /** Gives up all levels of the event lock that the calling thread holds, for its own lifetime. */
 class EventLockRelease {
   public:
@@ -19,6 +24,9 @@ class EventLockRelease {
     ~EventLockRelease();
     EventLockRelease(const EventLockRelease&) = delete;
     EventLockRelease& operator=(const EventLockRelease&) = delete;
+
+    /** Leaves the lock given up for good. */
+    void keepReleased() { levels = 0; }
 
   private:
     int levels;

@@ -1,6 +1,7 @@
 #include "event_loop.h"
 
 #include <chrono>
+#include <cstdlib>
 
 #include "event_lock.h"
 #include "pal/SignalsBlocked.h"
@@ -16,15 +17,9 @@ namespace {
 constexpr std::chrono::seconds STOP_LIMIT{2};
 constexpr std::int64_t NS_PER_MS = 1000000;
 
-struct StopAtExit {
-    StopAtExit() = default;
-    ~StopAtExit() { EventLoop::instance().stop(); }
-    StopAtExit(const StopAtExit&) = delete;
-    StopAtExit& operator=(const StopAtExit&) = delete;
-};
-
-// Made when the library is loaded, hence destroyed after all that depends on the library.
-const StopAtExit stopAtExit;
+void stopAtExit() {
+    EventLoop::instance().stop();
+}
 
 }  // namespace
 
@@ -60,33 +55,46 @@ bool EventLoop::drain() {
 void EventLoop::stop() {
     {
         const std::lock_guard<std::mutex> lock(mutex);
-        if (stopping.exchange(true) || !started) {
+        if (stopping.exchange(true)) {
             return;
         }
-        uv_async_send(&async);
+        if (started) {
+            uv_async_send(&async);
+        }
         changed.notify_all();
     }
     if (thread.get_id() == std::this_thread::get_id()) {
         return;  // a callback ends the process
     }
     // Whoever ends the process with the lock held must not make the event thread wait for it.
-    const EventLockRelease release;
+    EventLockRelease release;
+    if (!waitForCallbacks()) {
+        blocked = true;
+        release.keepReleased();
+    }
+}
+
+bool EventLoop::waitForCallbacks() {
     std::unique_lock<std::mutex> lock(mutex);
-    const bool ended = changed.wait_for(lock, STOP_LIMIT, [this] { return finished; });
+    const bool ended = changed.wait_for(lock, STOP_LIMIT, [this] { return finished || !started; });
     lock.unlock();
-    if (ended) {
-        thread.join();
-    } else {
+    if (!ended) {
         thread.detach();
         kdLogMessage("PAL: the event thread is blocked and was left behind");
+        return false;
     }
+    if (thread.joinable()) {
+        thread.join();
+    }
+    // Other threads deliver as well, under the lock and only while deliveries have not ended.
+    return waitForEventLock(STOP_LIMIT);
 }
 
 bool EventLoop::start() {
     if (started) {
         return true;
     }
-    const SignalsBlocked blocked;
+    const SignalsBlocked signalsBlocked;
     if (!KOR_ASSERT(uv_loop_init(&loop) == 0)) {
         return false;
     }
@@ -98,6 +106,7 @@ bool EventLoop::start() {
     timer.data = this;
     thread = std::thread(&EventLoop::run, this);
     started = true;
+    std::atexit(&stopAtExit);
     return true;
 }
 
@@ -162,6 +171,8 @@ void EventLoop::closeHandles() {
     WorkQueue::instance().cancelSubmitted();
     uv_close(reinterpret_cast<uv_handle_t*>(&timer), nullptr);
     uv_close(reinterpret_cast<uv_handle_t*>(&async), nullptr);
+    // Work that runs is not waited for here; then the loop stays open for its last signal.
+    uv_stop(&loop);
 }
 
 }  // namespace korvel_pal
@@ -182,4 +193,16 @@ KDint kdDrainEventsKOR(void) {
     // A timer's callback or a completion may be under way.
     const korvel_pal::EventLockGuard lock;
     return 0;
+}
+
+void kdEndEventsFirstKOR(void) {
+    std::atexit(&korvel_pal::stopAtExit);
+}
+
+KDint kdEventsHaveEndedKOR(void) {
+    const korvel_pal::EventLoop& loop = korvel_pal::EventLoop::instance();
+    if (!loop.isStopping()) {
+        return 0;
+    }
+    return loop.isBlocked() ? -1 : 1;
 }

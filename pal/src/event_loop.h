@@ -14,8 +14,8 @@
 namespace korvel_pal {
 
 /**
- * The event thread and its queue. Started by the first use, stopped when the process ends or the
- * library is unloaded; what is asked of it later is dropped. The object itself is never destroyed,
+ * The event thread and its queue. Started by the first use, stopped when the process ends; what is
+ * asked of it later is dropped. The object itself is never destroyed,
  * because other threads may still call it then.
  */
 class EventLoop {
@@ -30,10 +30,13 @@ class EventLoop {
     /** See `kdDrainEventsKOR`. */
     bool drain();
 
-    /** Ends the event thread; waits for it, but not for ever. */
+    /** Ends the event thread; waits for it and for any other callback, but not for ever. */
     void stop();
 
     bool isStopping() const { return stopping.load(std::memory_order_acquire); }
+
+    /** A callback did not return in time when deliveries ended. */
+    bool isBlocked() const { return blocked.load(std::memory_order_acquire); }
 
     /** For the event thread only. */
     uv_loop_t* uvLoop() { return &loop; }
@@ -47,6 +50,7 @@ class EventLoop {
     EventLoop() = default;
 
     bool start();
+    bool waitForCallbacks();
     void run();
     void runPosts();
     void serveTimers();
@@ -64,6 +68,7 @@ class EventLoop {
     std::uint64_t handledCount = 0;
 
     std::atomic<bool> stopping{false};
+    std::atomic<bool> blocked{false};
     std::thread thread;
 
     // Of the event thread, apart from sending to `async`, which the mutex guards.

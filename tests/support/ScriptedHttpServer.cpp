@@ -3,7 +3,9 @@
 #include <arpa/inet.h>
 #include <netinet/in.h>
 #include <netinet/tcp.h>
+#include <poll.h>
 #include <strings.h>
+#include <sys/ioctl.h>
 #include <sys/socket.h>
 #include <unistd.h>
 
@@ -17,7 +19,7 @@ namespace {
 
 /** Binds to a port, 0 for any; tells which. */
 int openLoopbackSocket(unsigned short& port) {
-    const int descriptor = ::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC, 0);
+    const int descriptor = ::socket(AF_INET, SOCK_STREAM | SOCK_CLOEXEC | SOCK_NONBLOCK, 0);
     sockaddr_in address{};
     address.sin_family = AF_INET;
     address.sin_addr.s_addr = htonl(INADDR_LOOPBACK);
@@ -37,6 +39,29 @@ int openLoopbackSocket(unsigned short& port) {
     }
     port = ntohs(address.sin_port);
     return descriptor;
+}
+
+/**
+ * The same, but bound to its port for good: where the system chose the port, a socket loses it when
+ * it stops listening.
+ */
+int openListener(unsigned short& port) {
+    const int first = openLoopbackSocket(port);
+    const int listener = openLoopbackSocket(port);
+    ::close(first);
+    return listener;
+}
+
+/** Makes `close` reset the connection instead of ending it in good order. */
+void resetOnClose(int socket) {
+    const linger abort{1, 0};
+    ::setsockopt(socket, SOL_SOCKET, SO_LINGER, &abort, sizeof(abort));
+}
+
+/** What `poll` says now. */
+short lookAt(int socket) {
+    pollfd entry{socket, POLLIN | POLLRDHUP, 0};
+    return ::poll(&entry, 1, 0) > 0 ? entry.revents : static_cast<short>(0);
 }
 
 std::string loopbackUrl(unsigned short port) {
@@ -124,6 +149,12 @@ Answer Answer::inPieces(std::size_t size) const {
     return copy;
 }
 
+Answer Answer::readingInPieces(std::size_t size) const {
+    Answer copy = *this;
+    copy.readAtOnce = size;
+    return copy;
+}
+
 std::string ScriptedHttpServer::Request::line() const {
     return head.substr(0, head.find("\r\n"));
 }
@@ -147,6 +178,7 @@ template <typename Change>
 void ScriptedHttpServer::changeRequest(std::size_t index, Change change) {
     const std::lock_guard<std::mutex> lock(mutex);
     change(requests[index]);
+    ++activity;
     changed.notify_all();
 }
 
@@ -173,7 +205,7 @@ class ScriptedHttpServer::Connection {
         acted = false;
         open = true;
         requestIndex = server.addRequest(index, head, answer);
-        if (answer.pauseReading && !server.waitForRelease()) {
+        if (answer.pauseReading && !server.waitForRelease(index)) {
             return false;
         }
         actIfDue(false);
@@ -210,10 +242,13 @@ class ScriptedHttpServer::Connection {
 
     bool readBody(std::size_t size) {
         while (open && size > 0) {
-            if (buffer.empty() && !receive()) {
+            if (!mayRead() || (buffer.empty() && !receive())) {
                 return false;
             }
-            const std::size_t part = std::min(size, buffer.size());
+            std::size_t part = std::min(size, buffer.size());
+            if (answer.readAtOnce > 0) {
+                part = std::min(part, answer.readAtOnce - bodySize % answer.readAtOnce);
+            }
             server.changeRequest(requestIndex, [this, part](Request& record) {
                 record.body.append(buffer, 0, part);
             });
@@ -223,6 +258,11 @@ class ScriptedHttpServer::Connection {
             actIfDue(false);
         }
         return open;
+    }
+
+    bool mayRead() {
+        const bool atPiece = answer.readAtOnce > 0 && bodySize % answer.readAtOnce == 0;
+        return !atPiece || server.waitForRelease(index);
     }
 
     bool readUntil(const std::string& mark, std::string& text) {
@@ -242,7 +282,15 @@ class ScriptedHttpServer::Connection {
 
     bool receive() {
         char bytes[16384];
-        const ssize_t count = ::recv(socket, bytes, sizeof(bytes), 0);
+        // In two steps: what has arrived stays visible to others until this thread is at work.
+        server.setListens(index, true);
+        pollfd entry{socket, POLLIN, 0};
+        ::poll(&entry, 1, -1);
+        server.setListens(index, false);
+        // Slow readers leave the rest with the system.
+        const std::size_t most =
+            answer.readAtOnce > 0 ? std::min(answer.readAtOnce, sizeof(bytes)) : sizeof(bytes);
+        const ssize_t count = ::recv(socket, bytes, most, 0);
         if (count > 0) {
             buffer.append(bytes, static_cast<std::size_t>(count));
         }
@@ -257,7 +305,7 @@ class ScriptedHttpServer::Connection {
         }
         acted = true;
         for (const std::string& piece : answer.pieces) {
-            if ((answer.needsRelease && !server.waitForRelease()) || !send(piece)) {
+            if ((answer.needsRelease && !server.waitForRelease(index)) || !send(piece)) {
                 open = false;
                 return;
             }
@@ -280,8 +328,7 @@ class ScriptedHttpServer::Connection {
 
     void finish() {
         if (answer.end == Answer::End::RESET) {
-            const linger abort{1, 0};
-            ::setsockopt(socket, SOL_SOCKET, SO_LINGER, &abort, sizeof(abort));
+            resetOnClose(socket);
             open = false;
         } else if (answer.end == Answer::End::CLOSE) {
             ::shutdown(socket, SHUT_WR);
@@ -305,7 +352,7 @@ class ScriptedHttpServer::Connection {
 };
 
 ScriptedHttpServer::ScriptedHttpServer(unsigned short fixedPort)
-    : port(fixedPort), listener(openLoopbackSocket(port)), defaultAnswer(Answer::status(200)) {
+    : port(fixedPort), listener(openListener(port)), defaultAnswer(Answer::status(200)) {
     if (::listen(listener, 64) != 0) {
         throw std::runtime_error("the test server cannot listen");
     }
@@ -317,8 +364,8 @@ ScriptedHttpServer::~ScriptedHttpServer() {
         const std::lock_guard<std::mutex> lock(mutex);
         stopping = true;
         ::shutdown(listener, SHUT_RDWR);
-        for (const auto& entry : openSockets) {
-            ::shutdown(entry.second, SHUT_RDWR);
+        for (const auto& entry : peers) {
+            ::shutdown(entry.second.socket, SHUT_RDWR);
         }
         changed.notify_all();
     }
@@ -347,6 +394,41 @@ void ScriptedHttpServer::release(std::size_t count) {
     const std::lock_guard<std::mutex> lock(mutex);
     released += count;
     changed.notify_all();
+}
+
+void ScriptedHttpServer::resetConnections(std::size_t count) {
+    const std::lock_guard<std::mutex> lock(mutex);
+    toReset = count;
+}
+
+void ScriptedHttpServer::goAway() {
+    const std::lock_guard<std::mutex> lock(mutex);
+    away = true;
+    ++activity;
+    // A listening socket is bound for good, but listens no longer.
+    ::shutdown(listener, SHUT_RDWR);
+    for (const auto& entry : peers) {
+        resetOnClose(entry.second.socket);
+        ::shutdown(entry.second.socket, SHUT_RD);
+    }
+    changed.notify_all();
+}
+
+void ScriptedHttpServer::comeBack() {
+    const std::lock_guard<std::mutex> lock(mutex);
+    away = false;
+    ++activity;
+    if (::listen(listener, 64) != 0) {
+        throw std::runtime_error("the test server cannot listen again");
+    }
+    changed.notify_all();
+}
+
+void ScriptedHttpServer::narrow() {
+    const int segment = 1000;
+    const int window = 4096;
+    ::setsockopt(listener, IPPROTO_TCP, TCP_MAXSEG, &segment, sizeof(segment));
+    ::setsockopt(listener, SOL_SOCKET, SO_RCVBUF, &window, sizeof(window));
 }
 
 std::size_t ScriptedHttpServer::getRequestCount() const {
@@ -394,32 +476,92 @@ bool ScriptedHttpServer::waitForClosed(std::size_t count, std::chrono::milliseco
     return waitUntil(timeout, [this, count] { return ended >= count; });
 }
 
-void ScriptedHttpServer::acceptLoop() {
-    for (;;) {
-        const int socket = ::accept4(listener, nullptr, nullptr, SOCK_CLOEXEC);
-        const std::lock_guard<std::mutex> lock(mutex);
-        if (socket < 0 || stopping) {
-            if (socket >= 0) {
-                ::close(socket);
-            }
-            return;
-        }
-        const int on = 1;
-        ::setsockopt(socket, IPPROTO_TCP, TCP_NODELAY, &on, sizeof(on));
-        const std::size_t index = accepted++;
-        openSockets[index] = socket;
-        workers.emplace_back([this, index, socket] { serve(index, socket); });
-        changed.notify_all();
+bool ScriptedHttpServer::isQuiet(const Peer& peer) const {
+    int unsent = 0;
+    const bool delivered = ::ioctl(peer.socket, TIOCOUTQ, &unsent) == 0 && unsent == 0;
+    const bool waits = peer.isHeld ? released == 0 : peer.listens && lookAt(peer.socket) == 0;
+    return delivered && waits;
+}
+
+bool ScriptedHttpServer::isIdle() const {
+    const std::lock_guard<std::mutex> lock(mutex);
+    return acceptorWaits && (away || lookAt(listener) == 0) &&
+           std::all_of(peers.begin(), peers.end(),
+                       [this](const auto& entry) { return isQuiet(entry.second); });
+}
+
+std::size_t ScriptedHttpServer::getActivity() const {
+    const std::lock_guard<std::mutex> lock(mutex);
+    return activity;
+}
+
+std::map<unsigned short, bool> ScriptedHttpServer::getPeers() const {
+    const std::lock_guard<std::mutex> lock(mutex);
+    std::map<unsigned short, bool> ports;
+    for (const auto& entry : peers) {
+        ports[entry.second.port] = entry.second.isHeld;
     }
+    return ports;
+}
+
+/** @return false when the server ends */
+bool ScriptedHttpServer::waitForConnection() {
+    std::unique_lock<std::mutex> lock(mutex);
+    acceptorWaits = true;
+    changed.wait(lock, [this] { return stopping || !away; });
+    lock.unlock();
+    pollfd entry{listener, POLLIN, 0};
+    ::poll(&entry, 1, -1);
+    lock.lock();
+    acceptorWaits = away;
+    return !stopping;
+}
+
+void ScriptedHttpServer::acceptLoop() {
+    while (waitForConnection()) {
+        sockaddr_in address{};
+        socklen_t length = sizeof(address);
+        const int socket =
+            ::accept4(listener, reinterpret_cast<sockaddr*>(&address), &length, SOCK_CLOEXEC);
+        if (socket >= 0) {
+            welcome(socket, ntohs(address.sin_port));
+        }
+    }
+}
+
+void ScriptedHttpServer::welcome(int socket, unsigned short peerPort) {
+    const std::lock_guard<std::mutex> lock(mutex);
+    const std::size_t index = accepted++;
+    ++activity;
+    changed.notify_all();
+    if (stopping || away || toReset > 0) {
+        toReset -= std::min<std::size_t>(toReset, 1);
+        resetOnClose(socket);
+        ::close(socket);
+        ++ended;
+        return;
+    }
+    const int on = 1;
+    ::setsockopt(socket, IPPROTO_TCP, TCP_NODELAY, &on, sizeof(on));
+    peers[index] = {socket, peerPort, false, false};
+    workers.emplace_back([this, index, socket] { serve(index, socket); });
 }
 
 void ScriptedHttpServer::serve(std::size_t index, int socket) {
     Connection(*this, index, socket).run();
     const std::lock_guard<std::mutex> lock(mutex);
-    openSockets.erase(index);
+    peers.erase(index);
     ::close(socket);
     ++ended;
+    ++activity;
     changed.notify_all();
+}
+
+void ScriptedHttpServer::setListens(std::size_t connection, bool value) {
+    const std::lock_guard<std::mutex> lock(mutex);
+    peers[connection].listens = value;
+    // Coming is no activity, going is: something has arrived.
+    activity += value ? 0 : 1;
 }
 
 std::size_t ScriptedHttpServer::addRequest(std::size_t connection, const std::string& head,
@@ -433,14 +575,18 @@ std::size_t ScriptedHttpServer::addRequest(std::size_t connection, const std::st
     request.connection = connection;
     request.head = head;
     requests.push_back(request);
+    ++activity;
     changed.notify_all();
     return requests.size() - 1;
 }
 
-bool ScriptedHttpServer::waitForRelease() {
+bool ScriptedHttpServer::waitForRelease(std::size_t connection) {
     std::unique_lock<std::mutex> lock(mutex);
-    changed.wait(lock, [this] { return stopping || released > 0; });
-    if (stopping) {
+    peers[connection].isHeld = true;
+    changed.wait(lock, [this] { return stopping || away || released > 0; });
+    peers[connection].isHeld = false;
+    ++activity;
+    if (stopping || away) {
         return false;
     }
     --released;

@@ -57,6 +57,8 @@ class Answer {
     Answer held() const;
     /** Cuts the bytes into pieces of `size` bytes, each of which waits for a `release`. */
     Answer inPieces(std::size_t size) const;
+    /** Reads the body in pieces of `size` bytes, each of which waits for a `release`. */
+    Answer readingInPieces(std::size_t size) const;
 
   private:
     friend class ScriptedHttpServer;
@@ -67,6 +69,7 @@ class Answer {
     std::size_t actAfter = WHOLE_BODY;
     bool needsRelease = false;
     bool pauseReading = false;
+    std::size_t readAtOnce = 0;
     End end = End::KEEP;
 };
 
@@ -111,12 +114,35 @@ class ScriptedHttpServer {
     /** Lets `count` held answers or pieces go, now or as soon as they come up. */
     void release(std::size_t count = 1);
 
+    /** Resets each of the next `count` connections as soon as it is there. */
+    void resetConnections(std::size_t count);
+
+    /** Resets all connections and refuses new ones until `comeBack`; the port stays taken. */
+    void goAway();
+    void comeBack();
+
+    /**
+     * Keeps the buffers of the system for connections small, which otherwise take megabytes that
+     * the server never reads. To be called before the first connection.
+     */
+    void narrow();
+
     /** Requests so far, in the order of their heads. */
     std::size_t getRequestCount() const;
     /** A copy of request `index` as far as it has arrived; an empty one beyond the last. */
     Request getRequest(std::size_t index) const;
     /** Connections accepted so far. */
     std::size_t getConnectionCount() const;
+
+    /**
+     * True when the server has nothing to do: every thread waits for the peer or for `release`,
+     * nothing has arrived that is not read, and all that was sent is in the peer's hands.
+     */
+    bool isIdle() const;
+    /** Changes with everything that the server does or sees. */
+    std::size_t getActivity() const;
+    /** The peers' ports of open connections, and whether each is held until `release`. */
+    std::map<unsigned short, bool> getPeers() const;
 
     /** Waits until `count` requests have arrived completely. */
     bool waitForRequest(std::size_t count,
@@ -133,12 +159,24 @@ class ScriptedHttpServer {
   private:
     class Connection;
 
+    /** One connection, as the other threads see it. */
+    struct Peer {
+        int socket = -1;
+        unsigned short port = 0;
+        bool listens = false; /**< its thread waits for bytes */
+        bool isHeld = false;  /**< its thread waits for `release` */
+    };
+
     void acceptLoop();
+    bool waitForConnection();
+    void welcome(int socket, unsigned short peerPort);
     void serve(std::size_t index, int socket);
+    void setListens(std::size_t connection, bool value);
     std::size_t addRequest(std::size_t connection, const std::string& head, Answer& answer);
     template <typename Change>
     void changeRequest(std::size_t index, Change change);
-    bool waitForRelease();
+    bool waitForRelease(std::size_t connection);
+    bool isQuiet(const Peer& peer) const;
     template <typename Condition>
     bool waitUntil(std::chrono::milliseconds timeout, Condition condition) const;
 
@@ -152,8 +190,12 @@ class ScriptedHttpServer {
     std::size_t accepted = 0;
     std::size_t ended = 0;
     std::size_t released = 0;
+    std::size_t toReset = 0;
+    std::size_t activity = 0;
     bool stopping = false;
-    std::map<std::size_t, int> openSockets;
+    bool away = false;
+    bool acceptorWaits = false;
+    std::map<std::size_t, Peer> peers;
     std::vector<std::thread> workers;
     std::thread acceptor;
 };

@@ -64,7 +64,7 @@ void Exchange::attempt() {
 boost::shared_ptr<Transfer> Exchange::makeTransfer() {
     const Util::EventLock lock;
     const boost::shared_ptr<NetworkTask> current = task;
-    if (!active || !prepareTask(current)) {
+    if (!isHeard() || !prepareTask(current)) {
         return nullptr;
     }
     ++attempts;
@@ -94,7 +94,8 @@ bool Exchange::prepareTask(const boost::shared_ptr<NetworkTask>& current) {
 
 void Exchange::onTransferHead(const boost::shared_ptr<HttpResponse>& response) {
     const Util::EventLock lock;
-    if (const boost::shared_ptr<NetworkTask> current = task) {
+    const boost::shared_ptr<NetworkTask> current = task;
+    if (isHeard()) {
         current->onResponseRecieved(response);
     }
 }
@@ -102,7 +103,7 @@ void Exchange::onTransferHead(const boost::shared_ptr<HttpResponse>& response) {
 bool Exchange::onTransferBytes(const unsigned char* bytes, std::size_t size) {
     const Util::EventLock lock;
     const boost::shared_ptr<NetworkTask> current = task;
-    if (!current) {
+    if (!isHeard()) {
         return false;
     }
     const bool byParts = current->recieveResponseBodyByParts();
@@ -128,7 +129,7 @@ bool Exchange::collect(const unsigned char* bytes, std::size_t size) {
 void Exchange::onTransferEnd(int code) {
     const Util::EventLock lock;
     const boost::shared_ptr<NetworkTask> current = task;
-    if (!active) {
+    if (!isHeard()) {
         return;
     }
     transfer.reset();
@@ -167,10 +168,16 @@ void Exchange::postEnd(int code) {
 }
 
 void Exchange::deliverEnd(int code) {
-    if (const boost::shared_ptr<NetworkTask> current = task) {
+    const boost::shared_ptr<NetworkTask> current = task;
+    if (isHeard()) {
         current->onFinished(code);
         cancel();
     }
+}
+
+// At the end of the process nothing is delivered any more, whatever becomes of the transfers.
+bool Exchange::isHeard() const {
+    return active && kdEventsHaveEndedKOR() == 0;
 }
 
 }  // namespace Network

@@ -47,6 +47,7 @@ class Exchange : public boost::enable_shared_from_this<Exchange>, public Transfe
     void finish(int code);
     void postEnd(int code);
     void deliverEnd(int code);
+    bool isHeard() const;
 
     const boost::shared_ptr<Transport> transport;
     boost::shared_ptr<NetworkTask> task;

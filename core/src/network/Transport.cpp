@@ -54,7 +54,7 @@ Transport::~Transport() = default;
 
 bool Transport::post(std::function<void()> command) {
     const std::lock_guard<std::mutex> lock(mutex);
-    if (closed || !multi) {
+    if (closed || !multi || kdEventsHaveEndedKOR() != 0) {
         return false;
     }
     launchThread();
@@ -85,8 +85,12 @@ void Transport::stop() {
         }
         curl_multi_wakeup(multi.get());
     }
-    // A task's callback must not end the thread that it runs on.
-    if (!KOR_ASSERT(thread.get_id() != std::this_thread::get_id())) {
+    // A task's callback must not end the thread that it runs on, unless it ends the process.
+    const bool isOwnThread = thread.get_id() == std::this_thread::get_id();
+    if (isOwnThread && kdEventsHaveEndedKOR() == 0) {
+        KOR_ASSERT(!isOwnThread);
+    }
+    if (isOwnThread) {
         thread.detach();
         return;
     }

@@ -15,7 +15,8 @@ namespace Sound {
 
 namespace {
 
-const std::chrono::seconds END_WAIT_MAX(1);
+// A thread that runs ends as soon as it is woken; one that hangs is not worth waiting for.
+const std::chrono::milliseconds END_WAIT_MAX(20);
 
 struct Running {
     std::mutex mutex;

@@ -10,8 +10,10 @@ namespace Sound {
 /** Runs captures, each on a thread of its own that nobody has to wait for. */
 class AudioThreads : public Util::Singleton<AudioThreads> {
   public:
-    /** Ends every capture that still runs and waits for their threads, but no longer than a
-     * second. */
+    /**
+     * Ends every capture that still runs and waits for their threads, but not longer than for a
+     * moment: a thread may hang in its device, and touches nothing then that ever goes.
+     */
     ~AudioThreads() override;
 
     /** @return false when there is no thread to be had */

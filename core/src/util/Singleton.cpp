@@ -3,6 +3,8 @@
 #include <algorithm>
 #include <vector>
 
+#include "pal/kd_event.h"
+
 namespace Util {
 
 namespace {
@@ -37,6 +39,18 @@ void SingletonStorage::destroyAll() {
     const EventLock lock;
     while (!singletons().empty()) {
         destroySingleton(singletons().back());
+    }
+}
+
+void SingletonStorage::endEventsFirst() {
+    kdEndEventsFirstKOR();
+}
+
+void SingletonStorage::endSingleton(SingletonBase* singleton, bool staysAtProcessEnd) {
+    const KDint ended = kdEventsHaveEndedKOR();
+    const bool lockIsLost = ended < 0;
+    if (!lockIsLost && !(ended != 0 && staysAtProcessEnd)) {
+        destroySingleton(singleton);
     }
 }
 

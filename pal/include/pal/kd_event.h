@@ -11,9 +11,11 @@
  * A callback may do: start, cancel and free timers (its own included), post, queue work, call any
  * function of this layer. It must not block, and must not let an exception escape.
  *
- * When the process ends or the library is unloaded, the event thread is stopped: a callback that
- * runs is waited for (two seconds at most), then nothing is delivered any more. Calls that come
- * later are harmless and have no effect beyond the handles that they return.
+ * When the process ends, deliveries end first: what existed when the event thread was started, or at
+ * the latest call of `kdEndEventsFirstKOR`, still exists when the last callback returns. A callback
+ * that runs is waited for (two seconds at most). Calls that come later are harmless and have no
+ * effect beyond the handles that they return. The library stays in the process once it is loaded:
+ * its threads must never lose the code that they run.
  */
 #ifndef KORVEL_PAL_KD_EVENT_H
 #define KORVEL_PAL_KD_EVENT_H
@@ -88,6 +90,21 @@ KD_API void kdPostKOR(void (*func)(void* user), void* user);
  * @return 0, or -1 at once when the lock is held or the event thread has been stopped.
  */
 KD_API KDint kdDrainEventsKOR(void);
+
+/**
+ * At the end of the process, deliveries are to end before the static objects that exist by now are
+ * destroyed. For whoever has static objects that callbacks use; cheap, but not to be called over and
+ * over. Any thread.
+ */
+KD_API void kdEndEventsFirstKOR(void);
+
+/**
+ * Whether the process ends and nothing is delivered any more. Under the event lock the answer holds
+ * until the lock is released.
+ * @return 0 before the end; 1 after it; -1 after it, when a callback blocks for ever and was left
+ *         behind: the event lock may never be had again then
+ */
+KD_API KDint kdEventsHaveEndedKOR(void);
 
 /** Background work in flight; see `kdQueueWorkKOR`. */
 typedef struct KDWork KDWork;

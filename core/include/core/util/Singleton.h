@@ -23,9 +23,9 @@ class KORVEL_CORE_API SingletonBase {
 };
 
 /**
- * Owns every singleton. When the process ends or a library is unloaded, the singletons of a library
- * are deleted in the reverse order of their making, under the event lock, before the library's
- * static objects go and before the platform layer stops its threads.
+ * Owns every singleton. When the process ends, the platform layer first ends all deliveries; then
+ * the singletons are deleted in the reverse order of their making, under the event lock, before the
+ * static objects that existed when they were made.
  */
 class KORVEL_CORE_API SingletonStorage {
   public:
@@ -40,12 +40,22 @@ class KORVEL_CORE_API SingletonStorage {
      * next use. For tests and for embedders that unload the library.
      */
     static void destroyAll();
+
+    /** Has deliveries end before what exists by now; for `Singleton`. */
+    static void endEventsFirst();
+
+    /** The end of a singleton's library: as `destroySingleton`, but never waits for ever. */
+    static void endSingleton(SingletonBase* singleton, bool staysAtProcessEnd);
 };
 
 /**
  * Base of a singleton class `T`, which derives from `Singleton<T>` and has a default constructor
  * that `Singleton<T>` may call. Classes that are used across library boundaries offer a
  * `getInstance` of their own that is not inline, so that there is one instance per process.
+ *
+ * A class whose objects are pointed to by what applications own hides `STAYS_AT_PROCESS_END` with
+ * true: its instance is then left alone at the end of the process, when static objects of an
+ * application may still use it.
  */
 template <typename T>
 class Singleton : public SingletonBase {
@@ -62,11 +72,15 @@ class Singleton : public SingletonBase {
             pointer.store(made, std::memory_order_release);
             SingletonStorage::addSingleton(made);
             static const EndOfLibrary endOfLibrary;
+            static const bool endsEvents = (SingletonStorage::endEventsFirst(), true);
+            static_cast<void>(endsEvents);
         }
         return *pointer.load(std::memory_order_relaxed);
     }
 
     ~Singleton() override { pointer.store(nullptr, std::memory_order_release); }
+
+    static constexpr bool STAYS_AT_PROCESS_END = false;
 
   protected:
     Singleton() = default;
@@ -76,8 +90,8 @@ class Singleton : public SingletonBase {
     struct EndOfLibrary {
         EndOfLibrary() = default;
         ~EndOfLibrary() {
-            const EventLock lock;
-            SingletonStorage::destroySingleton(pointer.load(std::memory_order_relaxed));
+            SingletonStorage::endSingleton(pointer.load(std::memory_order_acquire),
+                                           T::STAYS_AT_PROCESS_END);
         }
         EndOfLibrary(const EndOfLibrary&) = delete;
         EndOfLibrary& operator=(const EndOfLibrary&) = delete;
