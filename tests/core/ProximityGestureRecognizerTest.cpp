@@ -4,6 +4,7 @@
 #include <gtest/gtest.h>
 
 #include <boost/make_shared.hpp>
+#include <utility>
 
 #include "core/sensor/ManualProximitySource.h"
 #include "pal/kd_time.h"
@@ -166,6 +167,42 @@ TEST_F(ProximityGestures, MayStopTheRecognizerFromTheCallback) {
     recognizer->start();
     wave(10, 10);
     EXPECT_THAT(heard, ElementsAre("one"));
+}
+
+TEST_F(ProximityGestures, MayStartTheRecognizerAnewFromTheCallback) {
+    add("one", "near:1-1000");
+    add("two", "near:1-1000");
+    add("gone", "far:0-");
+    recognizer->setCallback([this](const std::string& name) {
+        heard.push_back(name);
+        recognizer->stop();
+        recognizer->start();
+    });
+    recognizer->start();
+    wave(10, 10);
+    // Nothing has been seen since the start: neither the second wave nor that the hand is gone.
+    EXPECT_THAT(heard, ElementsAre("one"));
+    wave(10, 10);
+    EXPECT_THAT(heard, ElementsAre("one", "one"));
+}
+
+TEST_F(ProximityGestures, MayStopTheRecognizerWhileItStarts) {
+    class EagerSource : public ManualProximitySource {
+      public:
+        bool start(Callback callback) override {
+            ManualProximitySource::start(std::move(callback));
+            feed(true);
+            return true;
+        }
+    };
+    const auto eager = boost::make_shared<EagerSource>();
+    const auto stopped = boost::make_shared<ProximityGestureRecognizer>(eager);
+    stopped->addGesture("there", "near:0-");
+    stopped->setCallback([&stopped](const std::string& /*name*/) { stopped->stop(); });
+    EXPECT_TRUE(stopped->start());
+    EXPECT_FALSE(eager->isStarted());
+    EXPECT_TRUE(stopped->start());
+    EXPECT_FALSE(eager->isStarted());
 }
 
 TEST_F(ProximityGestures, MayDropTheRecognizerFromTheCallback) {

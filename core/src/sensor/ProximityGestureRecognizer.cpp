@@ -41,11 +41,12 @@ bool ProximityGestureRecognizer::start() {
     seen = false;
     // Set before the source is started, which may tell its state at once.
     listening = true;
-    listening = source && source->start([this](bool isNear) { onSample(isNear); });
-    if (!listening) {
+    const bool started = source && source->start([this](bool isNear) { onSample(isNear); });
+    if (!started) {
+        listening = false;
         kdLogFormatMessage("ProximityGestureRecognizer: there is no proximity sensor");
     }
-    return listening;
+    return started;
 }
 
 void ProximityGestureRecognizer::stop() {
@@ -53,6 +54,7 @@ void ProximityGestureRecognizer::stop() {
     timer.cancel();
     if (listening) {
         listening = false;
+        ++stopCount;
         source->stop();
     }
 }
@@ -98,10 +100,13 @@ void ProximityGestureRecognizer::onSample(bool isNear) {
     for (Gesture& gesture : gestures) {
         gesture.reported = false;
     }
+    const unsigned stopsBefore = stopCount;
     if (hasEnded) {
         reportCompleted();
     }
-    reportHeld();
+    if (stopCount == stopsBefore) {
+        reportHeld();
+    }
 }
 
 void ProximityGestureRecognizer::endSpan() {
@@ -130,9 +135,6 @@ void ProximityGestureRecognizer::reportCompleted() {
 void ProximityGestureRecognizer::reportHeld() {
     const boost::shared_ptr<ProximityGestureRecognizer> self = weak_from_this().lock();
     timer.cancel();
-    if (!listening) {
-        return;
-    }
     std::vector<std::string> names;
     std::optional<int64_t> next;
     const int64_t lengthMs = getSpanMs();
@@ -155,10 +157,12 @@ void ProximityGestureRecognizer::reportHeld() {
 }
 
 void ProximityGestureRecognizer::report(const std::vector<std::string>& names) {
+    const unsigned stopsBefore = stopCount;
     for (const std::string& name : names) {
-        // Asked each time, because the callback may stop this object or replace itself.
+        // Asked each time, because the callback may stop this object, even to start it anew, or
+        // replace itself.
         const Callback callback = target;
-        if (listening && callback) {
+        if (stopCount == stopsBefore && callback) {
             callback(name);
         }
     }

@@ -77,6 +77,7 @@ class KORVEL_CORE_API ProximityGestureRecognizer
     Callback target;
     std::vector<Gesture> gestures;
     bool listening = false;
+    unsigned stopCount = 0;
 
     std::vector<ProximitySpan> history;  // spans that have ended, oldest first
     bool seen = false;                   // whether a span goes on
