@@ -99,18 +99,25 @@ std::vector<RecognizeRequest::Field> RecognizeRequest::makeFields() const {
                   "!recognizerSettings.getLanguage().empty()", SOURCE, 170);
     KOR_ASSERT_AT(!recognizerSettings.getModel().empty(), "!recognizerSettings.getModel().empty()",
                   SOURCE, 172);
-    return {{"uuid", engineSettings.getUuid()},
-            {"lang", recognizerSettings.getLanguage()},
-            {"topic", recognizerSettings.getModel()},
-            {"myll", formatLocation(recognizerSettings.getLatLon(Settings::RS_MY_LL))},
-            {"centerll", formatLocation(recognizerSettings.getLatLon(Settings::RS_CENTER_LL))}};
+    std::vector<Field> fields = {
+        {"uuid", engineSettings.getUuid()},
+        {"lang", recognizerSettings.getLanguage()},
+        {"topic", recognizerSettings.getModel()},
+        {"myll", formatLocation(recognizerSettings.getLatLon(Settings::RS_MY_LL))},
+        {"centerll", formatLocation(recognizerSettings.getLatLon(Settings::RS_CENTER_LL))}};
+    for (Field& field : fields) {
+        field.second = removeSeparators(field.first, field.second, multipart->getBoundary());
+    }
+    return fields;
 }
 
 void RecognizeRequest::addTranscripts(Network::HttpRequest::MultipartBuilder& builder) const {
     if (!results) {
         return;
     }
-    const std::string transcripts = makeTranscripts(*results, {source, defaultLanguage, topic});
+    const std::string transcripts =
+        removeSeparators("transcripts", makeTranscripts(*results, {source, defaultLanguage, topic}),
+                         builder.getBoundary());
     tvLogFormatMessage(LOG_LEVEL, "resultsXml: %s", transcripts.c_str());
     builder.addField("transcripts", transcripts, false, false, "");
 }

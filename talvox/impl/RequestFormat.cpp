@@ -67,6 +67,25 @@ std::string formatLocation(const Util::Bundle::LatLon& location) {
     return text.str();
 }
 
+std::string removeSeparators(const std::string& name, const std::string& value,
+                             const std::string& boundary) {
+    const std::string separator = "--" + boundary;
+    if (value.find(separator) == std::string::npos) {
+        return value;
+    }
+    kdLogFormatMessage("RecognizeRequest: %s holds the separator of the request, removing it",
+                       name.c_str());
+    std::string safe;
+    for (const char c : value) {
+        safe += c;
+        // What stood around a removed one may form another, which is at the end then as well.
+        if (endsWith(safe, separator)) {
+            safe.resize(safe.size() - separator.size());
+        }
+    }
+    return safe;
+}
+
 std::string makeTranscripts(const RecognitionResults& results, const TranscriptsOrigin& origin) {
     std::string xml = "<?xml version=\"1.0\" encoding=\"utf-8\"?>\n";
     xml += "<Transcripts source=\"" + origin.source + '"';

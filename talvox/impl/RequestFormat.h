@@ -27,6 +27,14 @@ std::string makeRequestUrl(const Settings& engineSettings, const Settings& recog
 /** "latitude,longitude", six decimals each, whatever the process's locale. */
 std::string formatLocation(const Util::Bundle::LatLon& location);
 
+/**
+ * The value without any separator of the body that it is to be a part of, so that it cannot end its
+ * part and begin one of its own. A value that has to be changed is logged.
+ * @param name  of the part, for the log
+ */
+std::string removeSeparators(const std::string& name, const std::string& value,
+                             const std::string& boundary);
+
 /** What a transcripts document says about where its hypotheses come from. */
 struct TranscriptsOrigin {
     std::string source;

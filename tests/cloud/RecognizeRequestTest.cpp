@@ -175,6 +175,35 @@ TEST_F(RecognizeRequestTest, CarriesTranscriptsBeforeTheSound) {
                   FINAL_BOUNDARY);
 }
 
+TEST_F(RecognizeRequestTest, NoValueBeginsAPartOfItsOwn) {
+    const std::string injected =
+        "\r\n--" + BOUNDARY + "\r\nContent-Disposition: form-data; name=\"canceled\"\r\n\r\n";
+    recognizer.putString(Settings::RS_LANGUAGE, "en-US" + injected + "true");
+    // Without the inner one, the halves of an outer one meet.
+    recognizer.putString(Settings::RS_MODEL, "--1BEF0A5--" + BOUNDARY + "7BE110FD467A--maps");
+    const auto request = makeRequest();
+    request->results = boost::make_shared<Talvox::RecognitionResults>();
+    request->results->emplace_back("hello" + injected, -1.0F);
+    request->source = "android";
+    const LogCapture log;
+    const std::string body = request->issueRequest()->getBody();
+    const std::string rest = "\r\n\r\nContent-Disposition: form-data; name=\"canceled\"\r\n\r\n";
+    EXPECT_EQ(body, field("uuid", UUID) + field("lang", "en-US" + rest + "true") +
+                        field("topic", "--maps") + field("myll", "55.750000,37.500000") +
+                        field("centerll", "0.000000,0.000000") +
+                        field("transcripts",
+                              "<?xml version=\"1.0\" encoding=\"utf-8\"?>\n"
+                              "<Transcripts source=\"android\">\n"
+                              "  <Transcript>hello" +
+                                  rest + "</Transcript>\n</Transcripts>\n") +
+                        FINAL_BOUNDARY);
+    for (const char* const name : {"lang", "topic", "transcripts"}) {
+        EXPECT_TRUE(log.contains(std::string("RecognizeRequest: ") + name +
+                                 " holds the separator of the request, removing it"))
+            << name;
+    }
+}
+
 TEST_F(RecognizeRequestTest, IsTheSameAtEveryAttempt) {
     const auto request = makeRequest();
     request->sound = CloudTest::makeConstantBuffer(7);

@@ -54,6 +54,7 @@ void Transfer::setUpConnection(const std::string& certificateFile) {
     // Settings come from the application only, never from the environment.
     curl_easy_setopt(handle, CURLOPT_PROXY, "");
     curl_easy_setopt(handle, CURLOPT_HTTP_VERSION, static_cast<long>(CURL_HTTP_VERSION_1_1));
+    curl_easy_setopt(handle, CURLOPT_SSLVERSION, static_cast<long>(CURL_SSLVERSION_TLSv1_2));
     if (!certificateFile.empty()) {
         curl_easy_setopt(handle, CURLOPT_CAINFO, certificateFile.c_str());
         curl_easy_setopt(handle, CURLOPT_CAPATH, nullptr);
