@@ -21,8 +21,11 @@ const int64_t NS_PER_MS = 1000000;
 const int64_t NO_VOICE_LIMIT_NS = 5000 * NS_PER_MS;
 const unsigned SOUND_LIMIT_MS = 20000;
 
-/** A recorder that neither delivers nor reports for so long has failed. */
+/** A recorder that neither delivers a millisecond nor reports for so long has failed. */
 const int64_t NO_SOUND_LIMIT_NS = 10000 * NS_PER_MS;
+
+/** So has one that needs so long for less sound than the limit. */
+const int64_t LISTENING_LIMIT_NS = 60000 * NS_PER_MS;
 
 unsigned getDurationMs(const Sound::SoundDataBuffer& buffer) {
     const int sampleRate = buffer.getInfo().getSampleRate();
@@ -120,7 +123,12 @@ bool KorvelRecognizer::startRecorder(int sampleRateHz) {
     // Starting may report an error at once, which ends the session.
     recorder = starting;
     starting->startRecording();
-    return !isOver();
+    if (isOver()) {
+        // It was stopped before it had started.
+        starting->stopRecording();
+        return false;
+    }
+    return true;
 }
 
 void KorvelRecognizer::startProtocol(bool streaming) {
@@ -145,14 +153,19 @@ void KorvelRecognizer::startDump(const Sound::SoundDataInfo& format) {
 }
 
 void KorvelRecognizer::startWatchdog() {
-    lastBufferTime = startTime;
-    watchdog = boost::make_shared<Util::Timer>([this] {
-        if (recorder && kdGetTimeUST() - lastBufferTime >= NO_SOUND_LIMIT_NS) {
-            kdLogFormatMessage("KorvelRecognizer: the recorder delivers nothing");
-            onRecorderError(recorder.get());
-        }
-    });
+    lastSoundTime = startTime;
+    watchdog = boost::make_shared<Util::Timer>([this] { checkRecorder(); });
     watchdog->start(KD_TIMER_PERIODIC_AVERAGE, NO_SOUND_LIMIT_NS);
+}
+
+void KorvelRecognizer::checkRecorder() {
+    const int64_t now = kdGetTimeUST();
+    const bool isSilent = now - lastSoundTime >= NO_SOUND_LIMIT_NS;
+    if (recorder && (isSilent || now - startTime >= LISTENING_LIMIT_NS)) {
+        kdLogFormatMessage("KorvelRecognizer: the recorder delivers %s",
+                           isSilent ? "nothing" : "too little");
+        onRecorderError(recorder.get());
+    }
 }
 
 void KorvelRecognizer::onRecorderDataReceived(
@@ -161,11 +174,12 @@ void KorvelRecognizer::onRecorderDataReceived(
     if (!isListening()) {
         return;
     }
-    lastBufferTime = kdGetTimeUST();
     if (wavDump) {
         wavDump->write(buffer->getData().data(), static_cast<int>(buffer->getData().size()));
     }
-    recordedMs += getDurationMs(*buffer);
+    const unsigned durationMs = getDurationMs(*buffer);
+    recordedMs += durationMs;
+    lastSoundTime = durationMs > 0 ? kdGetTimeUST() : lastSoundTime;
     protocol->handle(buffer);
     if (!leadingNoiseDone) {
         learnLeadingNoise(*buffer);
@@ -241,9 +255,9 @@ void KorvelRecognizer::cancel() {
 }
 
 void KorvelRecognizer::stopRecorder() {
-    if (recorder) {
-        recorder->stopRecording();
-        recorder.reset();
+    // Forgotten first: while it is being stopped, a recorder may deliver or fail once more.
+    if (const boost::shared_ptr<Sound::Recorder> stopped = std::move(recorder)) {
+        stopped->stopRecording();
     }
 }
 
@@ -263,7 +277,7 @@ void KorvelRecognizer::dropProtocol() {
 
 void KorvelRecognizer::stopWithError(SpeechError error) {
     const boost::shared_ptr<Recognizer> self = shared_from_this();
-    if (recorder) {
+    if (recorder || watchdog) {
         stopListening();
     }
     dropProtocol();
@@ -297,6 +311,8 @@ void KorvelRecognizer::onProtocolResults(boost::shared_ptr<const RecognitionResu
     if (isOver()) {
         return;
     }
+    // From here on nothing else is the end, not even a recorder that fails while it is stopped.
+    resultsReported = true;
     // The service may answer a streamed request before the user has finished.
     if (recorder) {
         stopListening();
@@ -304,7 +320,6 @@ void KorvelRecognizer::onProtocolResults(boost::shared_ptr<const RecognitionResu
     tvLogFormatMessage(LOG_LEVEL, "Request %s finished in %d msec", requestId.c_str(),
                        static_cast<int>((kdGetTimeUST() - listeningStoppedTime) / NS_PER_MS));
     dropProtocol();
-    resultsReported = true;
     getEngine()->unregisterRecognizer(this);
     callOnResults(results, requestId);
 }

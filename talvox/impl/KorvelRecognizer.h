@@ -64,6 +64,7 @@ class KorvelRecognizer : public Recognizer,
     void startDetector(const std::string& parameters, const Sound::SoundDataInfo& format);
     void startDump(const Sound::SoundDataInfo& format);
     void startWatchdog();
+    void checkRecorder();
 
     /** Calls every listener, until one of them ends the session. */
     template <typename Call>
@@ -94,7 +95,7 @@ class KorvelRecognizer : public Recognizer,
     boost::shared_ptr<Util::WavOutputStream> wavDump;
 
     bool recorderRefused = false;
-    int64_t lastBufferTime = 0;
+    int64_t lastSoundTime = 0;
     boost::shared_ptr<Util::Timer> watchdog;
 };
 

@@ -24,6 +24,12 @@ class ScriptedRecorder : public Sound::Recorder {
     }
     void stopRecording() override {
         ++stops;
+        if (failsWhenStopped) {
+            notifyError();
+        }
+        if (flushes) {
+            notifyData(flushes);
+        }
         Sound::Recorder::stopRecording();
     }
 
@@ -42,6 +48,9 @@ class ScriptedRecorder : public Sound::Recorder {
 
     bool works = true;
     bool failsAtStart = false;
+    bool failsWhenStopped = false;
+    /** Delivered from inside `stopRecording`. */
+    boost::shared_ptr<const Sound::SoundDataBuffer> flushes;
     bool initialised = false;
     int stops = 0;
 };
