@@ -1,0 +1,165 @@
+#include <sstream>
+
+#include "Plan.h"
+
+namespace Lifecycle {
+
+namespace {
+
+const char* nameOf(Action action) {
+    switch (action) {
+        case Action::CREATE:
+            return "create";
+        case Action::CREATE_AND_START:
+            return "create and start";
+        case Action::START:
+            return "start";
+        case Action::STOP:
+            return "stop";
+        case Action::CANCEL:
+            return "cancel";
+        case Action::RELEASE:
+            return "release";
+        case Action::UPDATE_SETTINGS:
+            return "update settings";
+        case Action::CALL_GETTERS:
+            return "call the getters";
+        case Action::SOUND:
+            return "sound";
+        case Action::LONG_SOUND:
+            return "long sound";
+        case Action::WHOLE_SOUND:
+            return "whole sound";
+        case Action::ODD_SOUND:
+            return "odd sound";
+        case Action::RUDE_SOUND:
+            return "rude sound";
+        case Action::RECORDER_FAILS:
+            return "the recorder fails";
+        case Action::WAIT:
+            return "wait";
+        case Action::JUMP:
+            return "jump";
+        case Action::CHANGE_REACHABILITY:
+            return "change reachability";
+    }
+    return "?";
+}
+
+const char* nameOf(Fate fate) {
+    switch (fate) {
+        case Fate::ANSWER:
+            return "answers";
+        case Fate::REFUSE_CONNECTION:
+            return "refuses the connection";
+        case Fate::RESET:
+            return "resets";
+        case Fate::RESET_AFTER_HEAD:
+            return "resets after the head of the answer";
+        case Fate::STALL:
+            return "takes nothing";
+        case Fate::SILENCE:
+            return "never answers";
+        case Fate::TOO_MUCH:
+            return "answers too much";
+    }
+    return "?";
+}
+
+const char* nameOf(Reply reply) {
+    switch (reply) {
+        case Reply::WORDS:
+            return "words";
+        case Reply::NOTHING_UNDERSTOOD:
+            return "nothing understood";
+        case Reply::NO_HEADER:
+            return "no header";
+        case Reply::NOT_BASE64:
+            return "not base64";
+        case Reply::NOT_XML:
+            return "not XML";
+        case Reply::REFUSAL:
+            return "404";
+        case Reply::FAILURE:
+            return "503";
+        case Reply::FAILURE_WITH_WORDS:
+            return "503 with words";
+    }
+    return "?";
+}
+
+std::string nameOfSession(int session) {
+    if (session == NEWEST) {
+        return "the newest";
+    }
+    return session == SELF ? "itself" : "session " + std::to_string(session);
+}
+
+void describe(const AttemptPlan& attempt, std::ostream& out) {
+    out << "    gateway " << nameOf(attempt.fate) << " (" << nameOf(attempt.reply) << ")";
+    if (attempt.afterBytes == AttemptPlan::WHOLE_BODY) {
+        out << " after the whole body";
+    } else {
+        out << " after " << attempt.afterBytes << " bytes";
+    }
+    out << " and " << attempt.delayMs << " ms"
+        << (attempt.pausesAfterHead ? ", the end apart from the head" : "") << "\n";
+}
+
+void describe(const SessionPlan& session, std::ostream& out) {
+    if (!session.recognises) {
+        out << "    is served by the stand-in\n";
+    }
+    const RecorderPlan& recorder = session.recorder;
+    if (recorder.refuses || recorder.failsAtStart || recorder.failsWhenStopped ||
+        recorder.flushesWhenStopped) {
+        out << "    recorder" << (recorder.refuses ? " refuses" : "")
+            << (recorder.failsAtStart ? " fails-at-start" : "")
+            << (recorder.failsWhenStopped ? " fails-when-stopped" : "")
+            << (recorder.flushesWhenStopped ? " delivers-when-stopped" : "") << "\n";
+    }
+    for (const AttemptPlan& attempt : session.attempts) {
+        describe(attempt, out);
+    }
+    for (const Reaction& reaction : session.reactions) {
+        out << "    in " << Lifecycle::nameOf(reaction.event) << " number " << reaction.nth + 1
+            << ": " << Lifecycle::describe(reaction) << "\n";
+    }
+}
+
+}  // namespace
+
+const char* nameOf(Event event) {
+    static const char* const NAMES[] = {
+        "recordingBegin", "speakingBegin", "recordingDone", "buffer", "power", "results", "error"};
+    return NAMES[static_cast<int>(event)];
+}
+
+std::string describe(const Step& step) {
+    std::ostringstream out;
+    out << nameOf(step.action) << " [" << step.amount << "] " << nameOfSession(step.session)
+        << (step.joined ? ", joined to the next" : "")
+        << (step.networkStands ? ", the network stands still" : "")
+        << (step.answersFirst ? ", answers first" : "");
+    return out.str();
+}
+
+std::string describe(const Reaction& reaction) {
+    return nameOf(reaction.action) + std::string(" [") + std::to_string(reaction.amount) + "] " +
+           nameOfSession(reaction.session);
+}
+
+std::string describe(const Sequence& sequence) {
+    std::ostringstream out;
+    out << "seed " << sequence.seed << ", settings " << sequence.settings << "\n";
+    for (std::size_t i = 0; i < sequence.sessions.size(); ++i) {
+        out << "  session " << i << ":\n";
+        describe(sequence.sessions[i], out);
+    }
+    for (std::size_t i = 0; i < sequence.steps.size(); ++i) {
+        out << "  step " << i << ": " << describe(sequence.steps[i]) << "\n";
+    }
+    return out.str();
+}
+
+}  // namespace Lifecycle
