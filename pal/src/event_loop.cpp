@@ -30,7 +30,11 @@ EventLoop& EventLoop::instance() {
 
 void EventLoop::post(void (*func)(void*), void* user) {
     const std::lock_guard<std::mutex> lock(mutex);
-    if (isStopping() || !start()) {
+    if (isStopping()) {
+        pending.push_back({func, user});  // never run; kept, so that nothing counts as lost
+        return;
+    }
+    if (!start()) {
         return;
     }
     pending.push_back({func, user});

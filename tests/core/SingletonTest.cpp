@@ -3,6 +3,7 @@
 #include <gmock/gmock.h>
 
 #include <cstdlib>
+#include <future>
 #include <string>
 #include <thread>
 #include <vector>
@@ -130,6 +131,56 @@ TEST(SingletonDeathTest, EndsWithTheProcessBeforeWhatWasThereWhenItWasMade) {
         },
         ::testing::ExitedWithCode(0),
         "^later singleton\nsingleton, before static object\nstatic object\n$");
+}
+
+class Staying : public Util::Singleton<Staying> {
+  public:
+    static constexpr bool STAYS_AT_PROCESS_END = true;
+    ~Staying() override { kdLogMessage("staying singleton"); }
+};
+
+TEST(SingletonDeathTest, StaysAtTheEndOfTheProcessWhereOthersMayPointToIt) {
+    GTEST_FLAG_SET(death_test_style, "threadsafe");
+    EXPECT_EXIT(
+        {
+            Staying::instance();
+            LastWord::instance();
+            std::exit(0);
+        },
+        ::testing::ExitedWithCode(0), "^later singleton\n$");
+}
+
+TEST(SingletonDeathTest, FindsDeliveriesEnded) {
+    GTEST_FLAG_SET(death_test_style, "threadsafe");
+    class Asking : public Util::Singleton<Asking> {
+      public:
+        ~Asking() override { kdLogFormatMessage("ended %d", kdEventsHaveEndedKOR()); }
+    };
+    EXPECT_EXIT(
+        {
+            kdPostKOR([](void*) {}, nullptr);
+            Asking::instance();
+            std::exit(0);
+        },
+        ::testing::ExitedWithCode(0), "^ended 1\n$");
+}
+
+TEST(SingletonDeathTest, IsLeftAloneWhereTheLockIsLostForEver) {
+    GTEST_FLAG_SET(death_test_style, "threadsafe");
+    EXPECT_EXIT(
+        {
+            LastWord::instance();
+            static std::promise<void> begun;
+            kdPostKOR(
+                [](void*) {
+                    begun.set_value();
+                    std::promise<void>().get_future().wait();
+                },
+                nullptr);
+            begun.get_future().wait();
+            std::exit(0);
+        },
+        ::testing::ExitedWithCode(0), "^PAL: the event thread is blocked and was left behind\n$");
 }
 
 TEST(SingletonDeathTest, EndsOnceWhenDestroyedBeforeTheProcess) {

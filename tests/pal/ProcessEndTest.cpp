@@ -133,8 +133,81 @@ TEST_F(ProcessEndDeathTest, WithWorkQueuedAndRunning) {
                 CLEANLY, "^$");
 }
 
+TEST_F(ProcessEndDeathTest, LosesNothingThatIsPostedTooLate) {
+    EXPECT_EXIT(endProcess([] {
+                    startEventThread();
+                    // Handlers run in the reverse order, this one after the end of deliveries.
+                    static const struct Late {
+                        Late() = default;
+                        ~Late() {
+                            kdPostKOR([](void* user) { free(user); }, malloc(10));
+                        }
+                        Late(const Late&) = delete;
+                        Late& operator=(const Late&) = delete;
+                    } late;
+                    kdEndEventsFirstKOR();
+                }),
+                CLEANLY, "^$");
+}
+
+/** Says when its end comes. */
+class Witness {
+  public:
+    Witness() = default;
+    ~Witness() { kdLogFormatMessage("witness: ended %d", kdEventsHaveEndedKOR()); }
+    Witness(const Witness&) = delete;
+    Witness& operator=(const Witness&) = delete;
+};
+
+TEST_F(ProcessEndDeathTest, EndsDeliveriesBeforeWhatWasThereWhenTheyBegan) {
+    EXPECT_EXIT(endProcess([] {
+                    static const Witness witness;
+                    startEventThread();
+                }),
+                CLEANLY, "^witness: ended 1\n$");
+}
+
+TEST_F(ProcessEndDeathTest, EndsDeliveriesBeforeLaterThingsOnlyWhenAsked) {
+    EXPECT_EXIT(endProcess([] {
+                    startEventThread();
+                    static const Witness witness;
+                }),
+                CLEANLY, "^witness: ended 0\n$");
+    EXPECT_EXIT(endProcess([] {
+                    startEventThread();
+                    static const Witness witness;
+                    kdEndEventsFirstKOR();
+                    kdLogFormatMessage("running: ended %d", kdEventsHaveEndedKOR());
+                }),
+                CLEANLY, "^running: ended 0\nwitness: ended 1\n$");
+}
+
+TEST_F(ProcessEndDeathTest, EndsDeliveriesWhileWorkRuns) {
+    EXPECT_EXIT(endProcess([] {
+                    static std::promise<void> begun;
+                    static auto* const finished = new std::promise<void>;
+                    static auto* const waiting = new std::future<void>(finished->get_future());
+                    static const struct Opener {
+                        Opener() = default;
+                        // After the end of deliveries, which must not have waited for the work.
+                        ~Opener() { finished->set_value(); }
+                        Opener(const Opener&) = delete;
+                        Opener& operator=(const Opener&) = delete;
+                    } opener;
+                    kdQueueWorkKOR(
+                        [](void*) {
+                            begun.set_value();
+                            waiting->wait();
+                        },
+                        nullptr, nullptr);
+                    begun.get_future().wait();
+                }),
+                CLEANLY, "^$");
+}
+
 TEST_F(ProcessEndDeathTest, DoesNotWaitForEverForABlockedCallback) {
     EXPECT_EXIT(endProcess([] {
+                    static const Witness witness;
                     static std::promise<void> begun;
                     kdPostKOR(
                         [](void*) {
@@ -144,7 +217,8 @@ TEST_F(ProcessEndDeathTest, DoesNotWaitForEverForABlockedCallback) {
                         nullptr);
                     begun.get_future().wait();
                 }),
-                CLEANLY, "^PAL: the event thread is blocked and was left behind\n$");
+                CLEANLY,
+                "^PAL: the event thread is blocked and was left behind\nwitness: ended -1\n$");
 }
 
 }  // namespace

@@ -6,6 +6,8 @@
 #include <cstdlib>
 #include <fstream>
 
+#include "support/Threads.h"
+
 // The client library keeps objects of all its connections in lock-free lists. It is not
 // instrumented, so ThreadSanitizer does not see what orders the threads that pass such an object
 // on. Frames of the library stand in a report only where the library itself calls a function of the
@@ -45,6 +47,8 @@ PulseEnvironment::PulseEnvironment(const ScratchDirectory& home, const std::stri
 }
 
 PulseEnvironment::~PulseEnvironment() {
+    // Those that are over soon still read the environment.
+    waitForThreads([] { return countThreads("talvox-audio") == 0; });
     for (const auto& variable : before) {
         if (variable.second) {
             setenv(variable.first.c_str(), variable.second->c_str(), 1);
@@ -118,6 +122,12 @@ void PulseServer::kill() {
 void PulseServer::freeze() {
     if (process) {
         process->sendSignal(SIGSTOP);
+    }
+}
+
+void PulseServer::thaw() {
+    if (process) {
+        process->sendSignal(SIGCONT);
     }
 }
 

@@ -64,6 +64,9 @@ class PulseServer {
     /** Stops the server without ending it: it keeps its connections and says nothing. */
     void freeze();
 
+    /** Lets a frozen server go on. */
+    void thaw();
+
   private:
     void drain();
 

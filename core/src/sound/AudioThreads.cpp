@@ -1,5 +1,7 @@
 #include "sound/AudioThreads.h"
 
+#include <pthread.h>
+
 #include <algorithm>
 #include <chrono>
 #include <condition_variable>
@@ -35,6 +37,7 @@ Running& running() {
 }
 
 void runCapture(const boost::shared_ptr<PulseCapture>& capture) {
+    pthread_setname_np(pthread_self(), AudioThreads::NAME);
     capture->run();
     std::unique_lock<std::mutex> lock(running().mutex);
     running().remove(capture);

@@ -10,6 +10,9 @@ namespace Sound {
 /** Runs captures, each on a thread of its own that nobody has to wait for. */
 class AudioThreads : public Util::Singleton<AudioThreads> {
   public:
+    /** What the system's list of threads calls them. */
+    static constexpr const char* NAME = "talvox-audio";
+
     /**
      * Ends every capture that still runs and waits for their threads, but not longer than for a
      * moment: a thread may hang in its device, and touches nothing then that ever goes.

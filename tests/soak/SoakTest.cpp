@@ -1,0 +1,283 @@
+#include <gtest/gtest.h>
+
+#include <boost/make_shared.hpp>
+#include <chrono>
+#include <cstdio>
+#include <cstdlib>
+#include <map>
+#include <memory>
+#include <random>
+#include <string>
+
+#include "MemoryCurve.h"
+#include "cloud/EngineTest.h"
+#include "cloud/EventRecorder.h"
+#include "cloud/GatewayAnswers.h"
+#include "cloud/Sounds.h"
+#include "pal/kd.h"
+#include "support/ScratchDirectory.h"
+#include "support/Threads.h"
+
+namespace {
+
+using Soak::MemoryCurve;
+using Talvox::Settings;
+using TestSupport::Answer;
+using TestSupport::ScriptedHttpServer;
+
+const int SESSIONS_DFLT = 2000;
+const int SESSIONS_PER_POINT = 100;
+const unsigned SEED_DFLT = 20240611;
+
+/** Points before the caches have what they keep: connections, arenas, tables. */
+const std::size_t WARM_UP_POINTS = 5;
+
+/**
+ * The smallest thing that a session could leave behind is an entry of some list: more than 24
+ * bytes. What only the sessions with a certain fault leave must not hide among the others, so that
+ * the bound is a fraction of it.
+ */
+const double BYTES_PER_SESSION_MAX = 4;
+
+enum class Course {
+    PLAIN,
+    SLOW,
+    CANCELLED,
+    DROPPED,
+    CLOSED,
+    RESET,
+    FAILED_ONCE,
+    FAILED,
+    BAD_HEADER,
+    NEVER_ANSWERED,
+};
+
+const std::map<Course, std::string> NAMES = {
+    {Course::PLAIN, "plain"},
+    {Course::SLOW, "slow answer"},
+    {Course::CANCELLED, "cancelled"},
+    {Course::DROPPED, "released"},
+    {Course::CLOSED, "closed without answer"},
+    {Course::RESET, "reset in mid-body"},
+    {Course::FAILED_ONCE, "500, then an answer"},
+    {Course::FAILED, "500 twice"},
+    {Course::BAD_HEADER, "bad header"},
+    {Course::NEVER_ANSWERED, "never answered"},
+};
+
+unsigned readNumber(const char* variable, unsigned fallback) {
+    const char* const text = std::getenv(variable);
+    return text != nullptr ? static_cast<unsigned>(std::strtoul(text, nullptr, 10)) : fallback;
+}
+
+/** One session after the other on one engine. */
+class SoakTest : public CloudTest::EngineTest {
+  protected:
+    SoakTest() {
+        kdSetLogSinkKOR([](const char* /*message*/, void* /*user*/) {}, nullptr);
+        configureText(Settings::SKS_VAD_SETTINGS, CloudTest::SHORT_SPEECH);
+    }
+    ~SoakTest() override {
+        kdMountKOR("/removable", nullptr);
+        kdSetLogSinkKOR(nullptr, nullptr);
+    }
+
+    /** Four in a hundred sessions are cancelled or released, ten meet a fault. */
+    Course chooseCourse() {
+        const unsigned dice = random() % 100;
+        if (dice >= 14) {
+            return Course::PLAIN;
+        }
+        static const Course OTHERS[] = {
+            Course::CANCELLED,      Course::CANCELLED,   Course::DROPPED, Course::DROPPED,
+            Course::SLOW,           Course::SLOW,        Course::CLOSED,  Course::RESET,
+            Course::RESET,          Course::FAILED_ONCE, Course::FAILED,  Course::BAD_HEADER,
+            Course::NEVER_ANSWERED, Course::CLOSED};
+        return OTHERS[dice];
+    }
+
+    void configureSession() {
+        const bool streaming = number % 2 == 1;
+        const bool speex = random() % 2 == 1;
+        configure([&](Settings& settings) {
+            settings.putString(Settings::SKS_URL, server->getUrl());
+            settings.putBoolean(Settings::SKS_STREAMING, streaming);
+            settings.putString(Settings::SKS_SOUND_FORMAT,
+                               speex ? Settings::SOUND_FORMAT_SPEEX : Settings::SOUND_FORMAT_PCM);
+        });
+        const bool dumps = random() % 8 == 0;
+        kdMountKOR("/removable", dumps ? directory.path().c_str() : nullptr);
+    }
+
+    Answer makeAnswer(Course course) const {
+        const Answer own =
+            CloudTest::answerDocument(CloudTest::makeDocument({{getOwnWords(), "0.95"}}));
+        switch (course) {
+            case Course::SLOW:
+                return own.inPieces(100);
+            case Course::CLOSED:
+                return Answer::closing();
+            case Course::RESET:
+                return Answer::resetAfter(5000);
+            case Course::FAILED:
+                return Answer::status(500);
+            case Course::BAD_HEADER:
+                return Answer::status(200, {{"x-asrgw-recognition-results", "%%%"}});
+            case Course::CANCELLED:
+            case Course::DROPPED:
+            case Course::NEVER_ANSWERED:
+                return Answer::never();
+            case Course::PLAIN:
+            case Course::FAILED_ONCE:
+                break;
+        }
+        return own;
+    }
+
+    std::string getOwnWords() const { return "words of session " + std::to_string(number); }
+
+    void play(int buffers) {
+        for (int i = 0; i < buffers; ++i) {
+            advanceMs(100);
+            recorder->deliver(buffer);
+        }
+    }
+
+    /** The answer of a server that works comes without any time of the clock. */
+    void waitForAnswer() const { events->waitForEnds(); }
+
+    /** Moves the clock to the second attempt, but not near the end of the wait for an answer. */
+    void waitForSecondAttempt(std::size_t heads) {
+        for (int i = 0; i < 30 && !server->waitForHead(heads, std::chrono::milliseconds(50)); ++i) {
+            advanceMs(500);
+        }
+        waitForAnswer();
+    }
+
+    /** Half a minute in a few milliseconds: the session fails, by whatever comes first. */
+    void waitForFailure() {
+        for (int i = 0; i < 60 && !events->waitForEnds(1, std::chrono::milliseconds(1)); ++i) {
+            advanceMs(500);
+        }
+    }
+
+    void waitForEnd(Course course, std::size_t requestsBefore) {
+        switch (course) {
+            case Course::DROPPED:
+            case Course::CANCELLED:
+                break;
+            case Course::PLAIN:
+                waitForAnswer();
+                break;
+            case Course::SLOW:
+                advanceMs(5000);
+                server->release(10);
+                waitForAnswer();
+                break;
+            case Course::FAILED_ONCE:
+                waitForSecondAttempt(requestsBefore + 2);
+                break;
+            default:
+                waitForFailure();
+                break;
+        }
+    }
+
+    void runSession(Course course) {
+        ++number;
+        ++courses[course];
+        configureSession();
+        server->setDefaultAnswer(makeAnswer(course));
+        if (course == Course::FAILED_ONCE) {
+            server->script({Answer::status(500)});
+        }
+        events = boost::make_shared<CloudTest::EventRecorder>();
+        auto session = engine().createRecognizer(events, boost::make_shared<Settings>());
+        const std::size_t requestsBefore = server->getRequestCount();
+        session->start();
+        const bool isBroken = course == Course::CANCELLED || course == Course::DROPPED;
+        play(isBroken ? static_cast<int>(random() % 12) : 11);
+        if (course == Course::CANCELLED) {
+            session->cancel();
+        }
+        waitForEnd(course, requestsBefore);
+        session.reset();
+        checkEnd(course);
+    }
+
+    void checkEnd(Course course) {
+        const auto texts = events->texts();
+        const std::string context = "session " + std::to_string(number) + ", " + NAMES.at(course);
+        if (course == Course::DROPPED) {
+            EXPECT_EQ(events->countEnds(), 0U) << context;
+            return;
+        }
+        ASSERT_EQ(events->countEnds(), 1U) << context;
+        const bool hasAnswer =
+            course == Course::PLAIN || course == Course::SLOW || course == Course::FAILED_ONCE;
+        const std::string error = course == Course::CANCELLED ? "Canceled" : "Network";
+        EXPECT_EQ(texts.back(), hasAnswer ? "results" : "error Error" + error) << context;
+        if (hasAnswer && texts.back() == "results") {
+            EXPECT_EQ(events->recognition()->getResults()->front().getText(), getOwnWords())
+                << context;
+        }
+    }
+
+    /** A hundred sessions with a server of their own; then only what the engine keeps is left. */
+    void runPoint() {
+        server = std::make_unique<ScriptedHttpServer>(port);
+        port = server->getPort();
+        for (int i = 1; i < SESSIONS_PER_POINT; ++i) {
+            runSession(chooseCourse());
+        }
+        runSession(Course::PLAIN);
+        events.reset();
+        recorder.reset();
+        kdDrainEventsKOR();
+        server.reset();
+    }
+
+    std::mt19937 random{readNumber("SOAK_SEED", SEED_DFLT)};
+    TestSupport::ScratchDirectory directory;
+    std::unique_ptr<ScriptedHttpServer> server;
+    boost::shared_ptr<CloudTest::EventRecorder> events;
+    const CloudTest::BufferPtr buffer = CloudTest::makeConstantBuffer(7);
+    std::map<Course, int> courses;
+    unsigned short port = 0;
+    int number = 0;
+};
+
+TEST_F(SoakTest, LeavesNothingBehind) {
+    const int sessions = static_cast<int>(readNumber("SOAK_SESSIONS", SESSIONS_DFLT));
+    std::printf("seed %u, %d sessions\n", readNumber("SOAK_SEED", SEED_DFLT), sessions);
+    std::printf("| sessions | live bytes | resident KiB | descriptors | threads |\n");
+    MemoryCurve live(SESSIONS_PER_POINT);
+    std::size_t descriptors = 0;
+    std::size_t threads = 0;
+    for (std::size_t point = 0; number < sessions && !HasFatalFailure(); ++point) {
+        runPoint();
+        if (point == 0) {
+            descriptors = TestSupport::countEntries("/proc/self/fd");
+            threads = TestSupport::countThreads();
+        }
+        live.add(Soak::countLiveBytes());
+        std::printf("| %d | %zu | %zu | %zu | %zu |\n", number, Soak::countLiveBytes(),
+                    Soak::countResidentBytes() / 1024, TestSupport::countEntries("/proc/self/fd"),
+                    TestSupport::countThreads());
+        EXPECT_TRUE(TestSupport::waitForThreads([&] {
+            return TestSupport::countEntries("/proc/self/fd") == descriptors &&
+                   TestSupport::countThreads() == threads;
+        })) << "after session "
+            << number;
+    }
+    for (const auto& entry : courses) {
+        std::printf("%s: %d\n", NAMES.at(entry.first).c_str(), entry.second);
+    }
+    const double rise = live.getBytesPerSession(WARM_UP_POINTS);
+    std::printf("bytes left by each session: %.2f\n", rise);
+    EXPECT_LT(rise, BYTES_PER_SESSION_MAX);
+    // The bound would see what a single session leaves.
+    EXPECT_GT(live.withLeak(24).getBytesPerSession(WARM_UP_POINTS), BYTES_PER_SESSION_MAX);
+}
+
+}  // namespace
