@@ -477,10 +477,12 @@ bool ScriptedHttpServer::waitForClosed(std::size_t count, std::chrono::milliseco
 }
 
 bool ScriptedHttpServer::isQuiet(const Peer& peer) const {
+    const short seen = lookAt(peer.socket);
     int unsent = 0;
-    const bool delivered = ::ioctl(peer.socket, TIOCOUTQ, &unsent) == 0 && unsent == 0;
-    const bool waits = peer.isHeld ? released == 0 : peer.listens && lookAt(peer.socket) == 0;
-    return delivered && waits;
+    // What a reset has stopped stays unsent.
+    const bool delivered = (seen & (POLLERR | POLLHUP)) != 0 ||
+                           (::ioctl(peer.socket, TIOCOUTQ, &unsent) == 0 && unsent == 0);
+    return delivered && (peer.isHeld ? released == 0 : peer.listens && seen == 0);
 }
 
 bool ScriptedHttpServer::isIdle() const {
