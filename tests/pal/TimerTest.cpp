@@ -118,9 +118,14 @@ TEST(KdTimer, FiresInOrderOnTheRealClock) {
     Ticker second([&order](const KDEvent&) { order += '2'; });
     Ticker first([&order](const KDEvent&) { order += '1'; });
     kdEventLockKOR();
-    last.start(6 * MS);
-    second.start(4 * MS);
-    first.start(2 * MS);
+    KDust begun = 0;
+    // Each counts from its own start, so these must not be further apart than the times.
+    do {
+        begun = kdGetTimeUST();
+        last.start(6 * MS);
+        second.start(4 * MS);
+        first.start(2 * MS);
+    } while (kdGetTimeUST() - begun >= 2 * MS);
     kdEventUnlockKOR();
     done.get_future().get();
     EXPECT_EQ(order, "12");
