@@ -8,11 +8,22 @@ namespace TearDown {
 
 namespace {
 
-/** The search at the end of a process takes its time, which is none of ours. */
-TestSupport::ChildProcess::Environment searchForLeaks(bool wanted) {
-    const char* const options = std::getenv("ASAN_OPTIONS");
-    return {{"ASAN_OPTIONS", (options != nullptr ? std::string(options) + ":" : "") +
-                                 "detect_leaks=" + (wanted ? "1" : "0")}};
+std::string addOptions(const char* variable, const std::string& more) {
+    const char* const options = std::getenv(variable);
+    return (options != nullptr ? std::string(options) + ":" : "") + more;
+}
+
+/**
+ * What the sanitizers do at the end of a process takes its time, which is none of ours: one
+ * searches for leaks, the other sleeps for a second in the hope of a race. That threads of the
+ * application's own server still run then is no fault.
+ */
+TestSupport::ChildProcess::Environment makeEnvironment(bool searches) {
+    return {
+        {"ASAN_OPTIONS",
+         addOptions("ASAN_OPTIONS", searches ? "detect_leaks=1" : "detect_leaks=0")},
+        {"TSAN_OPTIONS", addOptions("TSAN_OPTIONS", std::string("report_thread_leaks=0") +
+                                                        (searches ? "" : ":atexit_sleep_ms=0"))}};
 }
 
 /** The clock on which the application tells when its end began. */
@@ -25,7 +36,7 @@ double nowMs() {
 }  // namespace
 
 Application::Application(const Words& command, Leaks leaks)
-    : process(command, searchForLeaks(leaks == Leaks::SEARCHED)) {}
+    : process(command, makeEnvironment(leaks == Leaks::SEARCHED)) {}
 
 Words Application::makeCommand(const Words& words) {
     Words command = {TEARDOWN_APP};

@@ -17,6 +17,7 @@ using Words = std::vector<std::string>;
 /** One run of it. */
 class Application {
   public:
+    /** Whether the sanitizers search for what is left at the end. */
     enum class Leaks { IGNORED, SEARCHED };
 
     /** @param command the program and its arguments */

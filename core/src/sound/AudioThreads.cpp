@@ -18,7 +18,7 @@ namespace Sound {
 namespace {
 
 // A thread that runs ends as soon as it is woken; one that hangs is not worth waiting for.
-const std::chrono::milliseconds END_WAIT_MAX(20);
+const std::chrono::milliseconds END_WAIT_MAX(10);
 
 struct Running {
     std::mutex mutex;
