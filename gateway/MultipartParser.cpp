@@ -45,7 +45,7 @@ std::size_t MultipartParser::stepData(const char* data, std::size_t size) {
             found == nullptr ? size
                              : static_cast<std::size_t>(static_cast<const char*>(found) - data);
         if (run > 0) {
-            check(listener.onPartData(data, run));
+            giveData(data, run);
             return run;
         }
     }
@@ -58,8 +58,13 @@ std::size_t MultipartParser::stepData(const char* data, std::size_t size) {
     // Only the delimiter's first byte is a CR, so no shorter match can begin inside this one.
     const std::size_t given = matched;
     matched = 0;
-    check(listener.onPartData(delimiter.data(), given));
+    giveData(delimiter.data(), given);
     return 0;
+}
+
+// Where the listener refuses data depends on how the body was cut; where the data began does not.
+void MultipartParser::giveData(const char* data, std::size_t size) {
+    check(listener.onPartData(data, size), dataBegin);
 }
 
 void MultipartParser::stepByte(char c) {
@@ -187,6 +192,7 @@ void MultipartParser::beginPart() {
     state = State::DATA;
     // A part without data ends with a delimiter whose CR LF is its own, not that of the headers.
     matched = 0;
+    dataBegin = position + 1;
     check(listener.onPartBegin(part));
 }
 
@@ -196,9 +202,13 @@ void MultipartParser::endPart() {
 }
 
 void MultipartParser::check(const std::string& reason) {
+    check(reason, position);
+}
+
+void MultipartParser::check(const std::string& reason, std::size_t at) {
     if (!reason.empty() && state != State::FAILED) {
         state = State::FAILED;
-        error = "at byte " + std::to_string(position) + " of the body: " + reason;
+        error = "at byte " + std::to_string(at) + " of the body: " + reason;
     }
 }
 

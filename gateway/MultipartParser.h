@@ -48,7 +48,10 @@ class MultipartParser {
     /** Tells that the body is over. @return false when it was not complete */
     bool finish();
 
-    /** Why the body was refused and at which byte; empty while all is well. */
+    /**
+     * Why the body was refused and at which byte, that where the part's data begins where the
+     * listener refused some of it; empty while all is well.
+     */
     const std::string& getError() const { return error; }
 
   private:
@@ -77,7 +80,9 @@ class MultipartParser {
     void storeHeader(const std::string& name, const std::string& value);
     void beginPart();
     void endPart();
+    void giveData(const char* data, std::size_t size);
     void check(const std::string& reason);
+    void check(const std::string& reason, std::size_t at);
 
     /** CR LF, two dashes and the boundary: what ends the data of a part. */
     const std::string delimiter;
@@ -91,6 +96,8 @@ class MultipartParser {
     MultipartPart part;
     unsigned parts = 0;
     std::size_t position = 0;
+    /** Where the data of the part began. */
+    std::size_t dataBegin = 0;
     std::string error;
 };
 

@@ -2,6 +2,7 @@
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <string>
 #include <vector>
 
@@ -195,6 +196,21 @@ TEST(MultipartParser, SaysWhatIsWrongAndWhere) {
     EXPECT_EQ("at byte 7 of the body: bytes follow the final boundary", refusalOf("--B--\r\nx"));
     EXPECT_EQ("at byte 5 of the body: bytes follow the final boundary", refusalOf("--B--x"));
     EXPECT_EQ("at byte 6 of the body: bytes follow the final boundary", refusalOf("--B--\rx"));
+}
+
+TEST(MultipartParser, NamesThePlaceOfRefusedDataHoweverItArrives) {
+    const std::string body =
+        "--B\r\nContent-Disposition: form-data; name=a\r\n\r\nabcdef\r\n--B--\r\n";
+    const std::size_t place = body.find("\r\n\r\n") + 4;
+    for (const std::size_t piece : {std::size_t{1}, std::size_t{7}, body.size()}) {
+        Recorder recorder;
+        recorder.refusedData = "abcdef";
+        MultipartParser parser("B", recorder);
+        for (std::size_t at = 0; at < body.size(); at += piece) {
+            parser.feed(body.data() + at, std::min(piece, body.size() - at));
+        }
+        EXPECT_EQ("at byte " + std::to_string(place) + " of the body: not this", parser.getError());
+    }
 }
 
 TEST(MultipartParser, RefusesMalformedHeaders) {
