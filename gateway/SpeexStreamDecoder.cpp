@@ -3,7 +3,9 @@
 #include <speex/speex_header.h>
 
 #include <algorithm>
+#include <cmath>
 #include <cstring>
+#include <iterator>
 
 namespace Gateway {
 
@@ -40,6 +42,14 @@ std::size_t encoderDelay(int mode) {
     speex_encoder_ctl(encoder, SPEEX_GET_LOOKAHEAD, &delay);
     speex_encoder_destroy(encoder);
     return static_cast<std::size_t>(delay);
+}
+
+/** The nearest sample; silence for what is no number. */
+int16_t toSample(float value) {
+    if (std::isnan(value)) {
+        return 0;
+    }
+    return static_cast<int16_t>(std::floor(std::clamp(value, -32768.0F, 32767.0F) + 0.5));
 }
 
 }  // namespace
@@ -165,7 +175,6 @@ std::string SpeexStreamDecoder::readHead(const ogg_packet& packet) {
 }
 
 void SpeexStreamDecoder::decodePacket(const ogg_packet& packet, std::vector<int16_t>& samples) {
-    int16_t frame[MAX_FRAME_SIZE];
     if (frameSize > MAX_FRAME_SIZE || packet.bytes <= 0) {
         ++damagedPackets;
         return;
@@ -173,7 +182,10 @@ void SpeexStreamDecoder::decodePacket(const ogg_packet& packet, std::vector<int1
     speex_bits_read_from(&bits, reinterpret_cast<const char*>(packet.packet),
                          static_cast<int>(packet.bytes));
     for (int i = 0; i < framesPerPacket; ++i) {
-        const int status = speex_decode_int(decoder, &bits, frame);
+        // The library's own conversion decodes into memory that it does not set before, and of some
+        // damaged packets it reads samples that it has not written.
+        float frame[MAX_FRAME_SIZE] = {};
+        const int status = speex_decode(decoder, &bits, frame);
         if (status == -1) {
             return;
         }
@@ -185,7 +197,7 @@ void SpeexStreamDecoder::decodePacket(const ogg_packet& packet, std::vector<int1
     }
 }
 
-void SpeexStreamDecoder::append(const int16_t* frame, std::size_t count,
+void SpeexStreamDecoder::append(const float* frame, std::size_t count,
                                 std::vector<int16_t>& samples) {
     const std::size_t skipped = std::min(skip, count);
     skip -= skipped;
@@ -196,7 +208,7 @@ void SpeexStreamDecoder::append(const int16_t* frame, std::size_t count,
         count = static_cast<std::size_t>(std::min<int64_t>(left, static_cast<int64_t>(count)));
     }
     decoded += static_cast<int64_t>(count);
-    samples.insert(samples.end(), frame, frame + count);
+    std::transform(frame, frame + count, std::back_inserter(samples), toSample);
 }
 
 }  // namespace Gateway

@@ -43,7 +43,7 @@ class SpeexStreamDecoder {
     std::string readPage(ogg_page& page, std::vector<int16_t>& samples);
     std::string readHead(const ogg_packet& packet);
     void decodePacket(const ogg_packet& packet, std::vector<int16_t>& samples);
-    void append(const int16_t* frame, std::size_t count, std::vector<int16_t>& samples);
+    void append(const float* frame, std::size_t count, std::vector<int16_t>& samples);
 
     ogg_sync_state sync;
     ogg_stream_state stream;

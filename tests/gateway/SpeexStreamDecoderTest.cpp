@@ -66,6 +66,36 @@ std::string headPage(void (*spoil)(SpeexHeader&)) {
     return text;
 }
 
+/** Pages with a right check sum around packets that no encoder made. */
+std::string noisePages(int count) {
+    std::string stream;
+    ogg_stream_state state;
+    ogg_stream_init(&state, 7);
+    state.pageno = 1;
+    uint32_t random = 5;
+    for (int i = 0; i < count; ++i) {
+        std::vector<unsigned char> noise(static_cast<std::size_t>(1 + i % 100));
+        for (unsigned char& byte : noise) {
+            random = random * 1664525U + 1013904223U;
+            byte = static_cast<unsigned char>(random >> 16U);
+        }
+        ogg_packet packet{};
+        packet.packet = noise.data();
+        packet.bytes = static_cast<long>(noise.size());
+        packet.packetno = i + 1;
+        ogg_stream_packetin(&state, &packet);
+        ogg_page page;
+        while (ogg_stream_flush(&state, &page) != 0) {
+            stream.append(reinterpret_cast<char*>(page.header),
+                          static_cast<std::size_t>(page.header_len));
+            stream.append(reinterpret_cast<char*>(page.body),
+                          static_cast<std::size_t>(page.body_len));
+        }
+    }
+    ogg_stream_clear(&state);
+    return stream;
+}
+
 }  // namespace
 
 TEST(SpeexStreamDecoder, GivesWhatSpeexdecGives) {
@@ -169,34 +199,26 @@ TEST(SpeexStreamDecoder, SurvivesDamageAnywhere) {
 }
 
 TEST(SpeexStreamDecoder, SurvivesPacketsOfNoise) {
-    // Valid pages with a right check sum around packets that no encoder made.
-    std::string stream = headPage([](SpeexHeader& header) { header.frames_per_packet = 16; });
-    ogg_stream_state state;
-    ogg_stream_init(&state, 7);
-    state.pageno = 1;
-    uint32_t random = 5;
-    for (int i = 0; i < 300; ++i) {
-        std::vector<unsigned char> noise(static_cast<std::size_t>(1 + i % 100));
-        for (unsigned char& byte : noise) {
-            random = random * 1664525U + 1013904223U;
-            byte = static_cast<unsigned char>(random >> 16U);
-        }
-        ogg_packet packet{};
-        packet.packet = noise.data();
-        packet.bytes = static_cast<long>(noise.size());
-        packet.packetno = i + 1;
-        ogg_stream_packetin(&state, &packet);
-        ogg_page page;
-        while (ogg_stream_flush(&state, &page) != 0) {
-            stream.append(reinterpret_cast<char*>(page.header),
-                          static_cast<std::size_t>(page.header_len));
-            stream.append(reinterpret_cast<char*>(page.body),
-                          static_cast<std::size_t>(page.body_len));
-        }
-    }
-    ogg_stream_clear(&state);
+    const std::string stream =
+        headPage([](SpeexHeader& header) { header.frames_per_packet = 16; }) + noisePages(300);
     const Decoded decoded = decode(stream);
     EXPECT_EQ("", decoded.reason);
     EXPECT_GT(decoded.damaged, 0U);
     EXPECT_LE(decoded.samples.size(), 300U * 16 * 320);
+}
+
+TEST(SpeexStreamDecoder, MakesTheSameOfTheSameDamage) {
+    const std::string stream = headPage([](SpeexHeader& header) {
+                                   header.mode = SPEEX_MODEID_UWB;
+                                   header.rate = 32000;
+                                   header.frames_per_packet = 4;
+                               }) +
+                               noisePages(300);
+    const Decoded first = decode(stream);
+    EXPECT_GT(first.damaged, 0U);
+    EXPECT_FALSE(first.samples.empty());
+    // What another stream has left behind in memory must not be heard.
+    EXPECT_FALSE(decode(wideStream()).samples.empty());
+    EXPECT_EQ(first.samples, decode(stream).samples);
+    EXPECT_EQ(first.samples, decode(stream, 1).samples);
 }
