@@ -48,17 +48,12 @@ void EventRecorder::onResults(Talvox::Recognizer* recognizer,
     {
         const std::lock_guard<std::mutex> lock(mutex);
         lastRecognition = recognition;
-        ++ends;
     }
-    add("results", recognizer);
+    addEnd("results", recognizer);
 }
 
 void EventRecorder::onError(Talvox::Recognizer* recognizer, Talvox::SpeechError error) {
-    {
-        const std::lock_guard<std::mutex> lock(mutex);
-        ++ends;
-    }
-    add("error " + error.getErrorString(), recognizer);
+    addEnd("error " + error.getErrorString(), recognizer);
 }
 
 bool EventRecorder::waitForEnds(std::size_t count) const {
@@ -110,12 +105,21 @@ boost::shared_ptr<Talvox::Recognition> EventRecorder::recognition() const {
 }
 
 void EventRecorder::add(const std::string& text, Talvox::Recognizer* recognizer) {
-    {
-        const std::lock_guard<std::mutex> lock(mutex);
-        events.push_back({text, (kdGetTimeUST() - startTime) / 1000000});
-        changed.notify_all();
-    }
+    append(text, 0);
     callHook(text, recognizer);
+}
+
+void EventRecorder::addEnd(const std::string& text, Talvox::Recognizer* recognizer) {
+    append(text, 1);
+    callHook(text, recognizer);
+}
+
+// Whoever waits for an end finds its text.
+void EventRecorder::append(const std::string& text, std::size_t newEnds) {
+    const std::lock_guard<std::mutex> lock(mutex);
+    events.push_back({text, (kdGetTimeUST() - startTime) / 1000000});
+    ends += newEnds;
+    changed.notify_all();
 }
 
 void EventRecorder::callHook(const std::string& text, Talvox::Recognizer* recognizer) const {

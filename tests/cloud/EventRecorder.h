@@ -62,6 +62,8 @@ class EventRecorder : public Talvox::RecognizerListener {
 
   private:
     void add(const std::string& text, Talvox::Recognizer* recognizer);
+    void addEnd(const std::string& text, Talvox::Recognizer* recognizer);
+    void append(const std::string& text, std::size_t newEnds);
     void callHook(const std::string& text, Talvox::Recognizer* recognizer) const;
 
     const int64_t startTime;

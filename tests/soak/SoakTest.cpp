@@ -154,9 +154,9 @@ class SoakTest : public CloudTest::EngineTest {
         waitForAnswer();
     }
 
-    /** Half a minute in a few milliseconds: the session fails, by whatever comes first. */
+    /** Lets time fly until the session fails, by whatever comes first. */
     void waitForFailure() {
-        for (int i = 0; i < 60 && !events->waitForEnds(1, std::chrono::milliseconds(1)); ++i) {
+        for (int i = 0; i < 20000 && !events->waitForEnds(1, std::chrono::milliseconds(1)); ++i) {
             advanceMs(500);
         }
     }
