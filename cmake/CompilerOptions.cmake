@@ -34,7 +34,8 @@ if(TALVOX_SANITIZERS)
     target_compile_options(korvel_options INTERFACE
         -fsanitize=${TALVOX_SANITIZERS} -fno-omit-frame-pointer -fno-sanitize-recover=all
         # Sanitizers slow down less what is optimised; tests themselves are compiled quicker without.
-        $<$<NOT:$<BOOL:$<TARGET_PROPERTY:KORVEL_UNOPTIMISED>>>:-O1>)
+        # The fuzzers' build is optimised in full.
+        $<$<AND:$<CONFIG:Debug>,$<NOT:$<BOOL:$<TARGET_PROPERTY:KORVEL_UNOPTIMISED>>>>:-O1>)
     target_link_options(korvel_options INTERFACE -fsanitize=${TALVOX_SANITIZERS})
 else()
     # Needs the optimiser, and hides errors from the sanitizers.
