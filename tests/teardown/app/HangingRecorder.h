@@ -50,10 +50,13 @@ class HangingRecorder : public Sound::QueuedRecorder {
             target->push(sound.data(), sound.size());
         }
         std::array<int, 2> ends = {-1, -1};
-        static_cast<void>(::pipe(ends.data()));
+        if (::pipe(ends.data()) != 0) {
+            return;
+        }
         reached->set_value();
         unsigned char byte = 0;
-        static_cast<void>(::read(ends[0], &byte, 1));
+        while (::read(ends[0], &byte, 1) > 0) {
+        }
     }
 
     const std::shared_ptr<std::promise<void>> hanging = std::make_shared<std::promise<void>>();
