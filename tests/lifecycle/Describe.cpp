@@ -1,50 +1,11 @@
-#include <sstream>
+#include <ostream>
+#include <string>
 
 #include "Plan.h"
 
 namespace Lifecycle {
 
 namespace {
-
-const char* nameOf(Action action) {
-    switch (action) {
-        case Action::CREATE:
-            return "create";
-        case Action::CREATE_AND_START:
-            return "create and start";
-        case Action::START:
-            return "start";
-        case Action::STOP:
-            return "stop";
-        case Action::CANCEL:
-            return "cancel";
-        case Action::RELEASE:
-            return "release";
-        case Action::UPDATE_SETTINGS:
-            return "update settings";
-        case Action::CALL_GETTERS:
-            return "call the getters";
-        case Action::SOUND:
-            return "sound";
-        case Action::LONG_SOUND:
-            return "long sound";
-        case Action::WHOLE_SOUND:
-            return "whole sound";
-        case Action::ODD_SOUND:
-            return "odd sound";
-        case Action::RUDE_SOUND:
-            return "rude sound";
-        case Action::RECORDER_FAILS:
-            return "the recorder fails";
-        case Action::WAIT:
-            return "wait";
-        case Action::JUMP:
-            return "jump";
-        case Action::CHANGE_REACHABILITY:
-            return "change reachability";
-    }
-    return "?";
-}
 
 const char* nameOf(Fate fate) {
     switch (fate) {
@@ -106,9 +67,19 @@ void describe(const AttemptPlan& attempt, std::ostream& out) {
         << (attempt.pausesAfterHead ? ", the end apart from the head" : "") << "\n";
 }
 
+void describe(const DevicePlan& device, std::ostream& out) {
+    out << "    is served by the platform" << (device.throwsWhenMade ? ", throws when made" : "")
+        << (device.throwsAtStart ? ", throws at start" : "") << "; says inside start "
+        << static_cast<int>(device.insideStart) << ", stop " << static_cast<int>(device.insideStop)
+        << ", cancel " << static_cast<int>(device.insideCancel) << "; logging " << device.logging
+        << "\n";
+}
+
 void describe(const SessionPlan& session, std::ostream& out) {
-    if (!session.recognises) {
+    if (session.kind == Kind::STAND_IN) {
         out << "    is served by the stand-in\n";
+    } else if (session.kind == Kind::PLATFORM) {
+        describe(session.device, out);
     }
     const RecorderPlan& recorder = session.recorder;
     if (recorder.refuses || recorder.failsAtStart || recorder.failsWhenStopped ||
@@ -123,11 +94,53 @@ void describe(const SessionPlan& session, std::ostream& out) {
     }
     for (const Reaction& reaction : session.reactions) {
         out << "    in " << Lifecycle::nameOf(reaction.event) << " number " << reaction.nth + 1
-            << ": " << Lifecycle::describe(reaction) << "\n";
+            << ": " << reaction << "\n";
     }
 }
 
 }  // namespace
+
+const char* nameOf(Action action) {
+    switch (action) {
+        case Action::CREATE:
+            return "create";
+        case Action::CREATE_AND_START:
+            return "create and start";
+        case Action::START:
+            return "start";
+        case Action::STOP:
+            return "stop";
+        case Action::CANCEL:
+            return "cancel";
+        case Action::RELEASE:
+            return "release";
+        case Action::UPDATE_SETTINGS:
+            return "update settings";
+        case Action::CALL_GETTERS:
+            return "call the getters";
+        case Action::SOUND:
+            return "sound";
+        case Action::LONG_SOUND:
+            return "long sound";
+        case Action::WHOLE_SOUND:
+            return "whole sound";
+        case Action::ODD_SOUND:
+            return "odd sound";
+        case Action::RUDE_SOUND:
+            return "rude sound";
+        case Action::RECORDER_FAILS:
+            return "the recorder fails";
+        case Action::DEVICE_SAYS:
+            return "the device says";
+        case Action::WAIT:
+            return "wait";
+        case Action::JUMP:
+            return "jump";
+        case Action::CHANGE_REACHABILITY:
+            return "change reachability";
+    }
+    return "?";
+}
 
 const char* nameOf(Event event) {
     static const char* const NAMES[] = {
@@ -135,31 +148,28 @@ const char* nameOf(Event event) {
     return NAMES[static_cast<int>(event)];
 }
 
-std::string describe(const Step& step) {
-    std::ostringstream out;
-    out << nameOf(step.action) << " [" << step.amount << "] " << nameOfSession(step.session)
-        << (step.joined ? ", joined to the next" : "")
-        << (step.networkStands ? ", the network stands still" : "")
-        << (step.answersFirst ? ", answers first" : "");
-    return out.str();
+std::ostream& operator<<(std::ostream& out, const Step& step) {
+    return out << nameOf(step.action) << " [" << step.amount << "] " << nameOfSession(step.session)
+               << (step.joined ? ", joined to the next" : "")
+               << (step.networkStands ? ", the network stands still" : "")
+               << (step.answersFirst ? ", answers first" : "");
 }
 
-std::string describe(const Reaction& reaction) {
-    return nameOf(reaction.action) + std::string(" [") + std::to_string(reaction.amount) + "] " +
-           nameOfSession(reaction.session);
+std::ostream& operator<<(std::ostream& out, const Reaction& reaction) {
+    return out << nameOf(reaction.action) << " [" << reaction.amount << "] "
+               << nameOfSession(reaction.session);
 }
 
-std::string describe(const Sequence& sequence) {
-    std::ostringstream out;
+std::ostream& operator<<(std::ostream& out, const Sequence& sequence) {
     out << "seed " << sequence.seed << ", settings " << sequence.settings << "\n";
     for (std::size_t i = 0; i < sequence.sessions.size(); ++i) {
         out << "  session " << i << ":\n";
         describe(sequence.sessions[i], out);
     }
     for (std::size_t i = 0; i < sequence.steps.size(); ++i) {
-        out << "  step " << i << ": " << describe(sequence.steps[i]) << "\n";
+        out << "  step " << i << ": " << sequence.steps[i] << "\n";
     }
-    return out.str();
+    return out;
 }
 
 }  // namespace Lifecycle

@@ -68,13 +68,31 @@ Reaction makeReaction(Dice& dice) {
     return reaction;
 }
 
+Saying pickSaying(Dice& dice) {
+    return static_cast<Saying>(dice.pick(SAYING_COUNT));
+}
+
+DevicePlan makeDevice(Dice& dice) {
+    DevicePlan device;
+    device.throwsWhenMade = dice.oneIn(20);
+    device.throwsAtStart = dice.oneIn(20);
+    device.insideStart = dice.oneIn(8) ? pickSaying(dice) : Saying::NOTHING;
+    device.insideStop = dice.oneIn(4) ? pickSaying(dice) : Saying::NOTHING;
+    device.insideCancel = dice.oneIn(4) ? pickSaying(dice) : Saying::NOTHING;
+    device.logging = dice.pick(8);
+    return device;
+}
+
 SessionPlan makeSession(Dice& dice) {
     SessionPlan session;
-    session.recognises = !dice.oneIn(16);
-    session.recorder.refuses = dice.oneIn(20);
-    session.recorder.failsAtStart = dice.oneIn(20);
-    session.recorder.failsWhenStopped = dice.oneIn(20);
-    session.recorder.flushesWhenStopped = dice.oneIn(20);
+    session.kind = dice.of({Kind::CLOUD, Kind::CLOUD, Kind::CLOUD, Kind::CLOUD, Kind::CLOUD,
+                            Kind::CLOUD, Kind::CLOUD, Kind::CLOUD, Kind::CLOUD, Kind::CLOUD,
+                            Kind::PLATFORM, Kind::PLATFORM, Kind::STAND_IN});
+    session.device = makeDevice(dice);
+    session.recorder.refuses = dice.oneIn(40);
+    session.recorder.failsAtStart = dice.oneIn(40);
+    session.recorder.failsWhenStopped = dice.oneIn(30);
+    session.recorder.flushesWhenStopped = dice.oneIn(30);
     for (int left = dice.pick(4); left > 0; --left) {
         session.attempts.push_back(makeAttempt(dice));
     }
@@ -86,7 +104,8 @@ SessionPlan makeSession(Dice& dice) {
 
 class StepMaker {
   public:
-    explicit StepMaker(Dice& source) : dice(source) {}
+    StepMaker(Dice& source, const std::vector<SessionPlan>& plans)
+        : dice(source), sessions(plans) {}
 
     std::vector<Step> make() {
         const std::size_t wanted = 5 + static_cast<std::size_t>(dice.pick(20));
@@ -113,7 +132,7 @@ class StepMaker {
     }
 
     void addAnything() {
-        const auto action = static_cast<Action>(dice.pick(17));
+        const auto action = static_cast<Action>(dice.pick(ACTION_COUNT));
         add(action, pickAmount(action),
             dice.oneIn(2) ? NEWEST : dice.pick(static_cast<int>(MOST_SESSIONS)));
     }
@@ -128,6 +147,8 @@ class StepMaker {
                 return 1 + dice.pick(2);
             case Action::ODD_SOUND:
                 return dice.pick(ODD_SOUND_COUNT);
+            case Action::DEVICE_SAYS:
+                return dice.pick(SAYING_COUNT);
             case Action::WAIT:
             case Action::JUMP:
                 return pickTimeMs(dice);
@@ -145,17 +166,37 @@ class StepMaker {
         }
         add(Action::CREATE_AND_START);
         disturb();
+        // Roughly: listeners create sessions as well.
+        if (created < sessions.size() && sessions[created++].kind == Kind::PLATFORM) {
+            addDevice();
+            return;
+        }
         add(Action::SOUND, 3);
         disturb();
-        add(Action::SOUND, 1 + dice.pick(9));
+        if (dice.oneIn(4)) {
+            add(Action::LONG_SOUND, 3 + dice.pick(20));
+        } else {
+            add(Action::SOUND, 1 + dice.pick(9));
+        }
         disturb();
-        if (dice.oneIn(2)) {
-            add(Action::STOP);
+        if (!dice.oneIn(4)) {
+            add(dice.oneIn(8) ? Action::CANCEL : Action::STOP);
             disturb();
         }
         add(Action::WAIT, pickTimeMs(dice));
         if (dice.oneIn(2)) {
             add(Action::WAIT, pickTimeMs(dice));
+        }
+    }
+
+    /** What a device says, in good order. */
+    void addDevice() {
+        for (const Saying saying : {Saying::READY, Saying::BEGINNING, Saying::SOUND, Saying::LEVEL,
+                                    Saying::END, Saying::RESULTS}) {
+            if (!dice.oneIn(6)) {
+                add(Action::DEVICE_SAYS, static_cast<int>(saying));
+                disturb();
+            }
         }
     }
 
@@ -166,6 +207,8 @@ class StepMaker {
     }
 
     Dice& dice;
+    const std::vector<SessionPlan>& sessions;
+    std::size_t created = 0;
     std::vector<Step> steps;
 };
 
@@ -179,7 +222,7 @@ Sequence makeSequence(std::uint64_t seed) {
     for (std::size_t i = 0; i < MOST_SESSIONS; ++i) {
         sequence.sessions.push_back(makeSession(dice));
     }
-    sequence.steps = StepMaker(dice).make();
+    sequence.steps = StepMaker(dice, sequence.sessions).make();
     return sequence;
 }
 

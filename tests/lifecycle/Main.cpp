@@ -6,6 +6,7 @@
 #include <optional>
 
 #include "Runner.h"
+#include "World.h"
 
 namespace {
 
@@ -22,9 +23,15 @@ std::optional<Lifecycle::Range> readArguments(int argc, char** argv) {
     return range;
 }
 
+const std::string& nameOfEnd(std::size_t code) {
+    static const std::string RESULTS = "results";
+    return code < Talvox::SpeechError::ErrorMax ? Talvox::SpeechError::errorStrings[code] : RESULTS;
+}
+
 int runRange(const Lifecycle::Range& range) {
     const auto start = std::chrono::steady_clock::now();
-    const std::string found = Lifecycle::run(range);
+    Lifecycle::World world;
+    const std::string found = Lifecycle::run(world, range);
     const std::chrono::duration<double> time = std::chrono::steady_clock::now() - start;
     if (!found.empty()) {
         std::cout << found;
@@ -32,6 +39,15 @@ int runRange(const Lifecycle::Range& range) {
     }
     std::cout << range.count << " sequences from seed " << range.first << " on: all well, "
               << time.count() << " s\n";
+    for (std::size_t code = 0; code < world.getEnds().size(); ++code) {
+        std::cout << "  " << nameOfEnd(code) << ": " << world.getEnds()[code] << "\n";
+    }
+    std::cout << "calls in microseconds: half of them, 999 of 1000, the longest\n";
+    for (const auto& [action, times] : world.getCallTimes()) {
+        std::cout << "  " << nameOf(action) << ": " << times.quantile(500) << ", "
+                  << times.quantile(999) << ", " << times.quantile(1000) << " (" << times.count()
+                  << " calls)\n";
+    }
     return 0;
 }
 

@@ -6,6 +6,7 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <iosfwd>
 #include <string>
 #include <vector>
 
@@ -31,11 +32,13 @@ enum class Action {
     ODD_SOUND,          /**< one buffer; the amount says what is odd about it */
     RUDE_SOUND,         /**< one buffer, whether the recorder was stopped or not */
     RECORDER_FAILS,     /**< an error in mid-session, or after it */
+    DEVICE_SAYS,        /**< a `Saying` of the device's own recogniser */
     WAIT,               /**< so many ms, in which everything else goes on */
     JUMP,               /**< so many ms at once: timers run, nothing else does */
     CHANGE_REACHABILITY /**< to the amount */
 };
 constexpr int LISTENER_ACTION_COUNT = static_cast<int>(Action::SOUND);
+constexpr int ACTION_COUNT = static_cast<int>(Action::CHANGE_REACHABILITY) + 1;
 constexpr int ODD_SOUND_COUNT = 8;
 
 /** Whose session an action is for. */
@@ -102,9 +105,37 @@ struct AttemptPlan {
     bool pausesAfterHead = false;        /**< the end of the answer comes a turn later */
 };
 
+/** What the device's own recogniser tells the platform recognizer. */
+enum class Saying {
+    NOTHING,
+    READY,
+    BEGINNING,
+    LEVEL,
+    SOUND,
+    END,
+    PARTIAL,
+    RESULTS,
+    NO_HYPOTHESIS,
+    ERROR
+};
+constexpr int SAYING_COUNT = 10;
+
+struct DevicePlan {
+    bool throwsWhenMade = false;
+    bool throwsAtStart = false;
+    Saying insideStart = Saying::NOTHING; /**< what it says before the call returns */
+    Saying insideStop = Saying::NOTHING;
+    Saying insideCancel = Saying::NOTHING;
+    int logging = 0; /**< which policy of uploads, see `World` */
+};
+
+/** What serves a session, by its policy. */
+enum class Kind { CLOUD, STAND_IN, PLATFORM };
+
 struct SessionPlan {
-    bool recognises = true; /**< false: by its policy the stand-in serves */
+    Kind kind = Kind::CLOUD;
     RecorderPlan recorder;
+    DevicePlan device;
     std::vector<AttemptPlan> attempts; /**< those beyond are answered at once */
     std::vector<Reaction> reactions;
 };
@@ -123,9 +154,10 @@ constexpr int SETTINGS_COUNT = 24;
 Sequence makeSequence(std::uint64_t seed);
 
 /** For people. */
-std::string describe(const Step& step);
-std::string describe(const Reaction& reaction);
-std::string describe(const Sequence& sequence);
+std::ostream& operator<<(std::ostream& out, const Step& step);
+std::ostream& operator<<(std::ostream& out, const Reaction& reaction);
+std::ostream& operator<<(std::ostream& out, const Sequence& sequence);
 const char* nameOf(Event event);
+const char* nameOf(Action action);
 
 }  // namespace Lifecycle

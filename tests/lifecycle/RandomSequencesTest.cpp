@@ -1,8 +1,11 @@
 #include <gtest/gtest.h>
 
 #include "Runner.h"
+#include "World.h"
 
 namespace {
+
+using Talvox::SpeechError;
 
 const std::uint64_t SEQUENCES_PER_PART = 2500;
 
@@ -11,8 +14,17 @@ class RandomSequencesTest : public ::testing::TestWithParam<int> {};
 
 TEST_P(RandomSequencesTest, KeepTheContract) {
     const auto part = static_cast<std::uint64_t>(GetParam());
-    const std::string found = Lifecycle::run({1 + SEQUENCES_PER_PART * part, SEQUENCES_PER_PART});
+    Lifecycle::World world;
+    const std::string found =
+        Lifecycle::run(world, {1 + SEQUENCES_PER_PART * part, SEQUENCES_PER_PART});
     EXPECT_TRUE(found.empty()) << found;
+    // The sequences reach what they are made for: each way in which a session can end.
+    for (const int code :
+         {SpeechError::ErrorAudio, SpeechError::ErrorNetwork, SpeechError::ErrorCanceled,
+          SpeechError::ErrorNoVoice, SpeechError::ErrorNotAvailable, SpeechError::ErrorBusy,
+          SpeechError::ErrorMax}) {
+        EXPECT_GT(world.getEnds()[static_cast<std::size_t>(code)], 0) << code;
+    }
 }
 
 INSTANTIATE_TEST_SUITE_P(Seeds, RandomSequencesTest, ::testing::Range(0, 8));

@@ -83,7 +83,7 @@ std::string report(World& world, const Sequence& sequence, const std::string& wr
     std::ostringstream out;
     out << "seed " << sequence.seed << ": " << wrong << "\n";
     writeCommand(out, sequence.seed);
-    out << "shortened to\n" << describe(shortest) << "what happens in it\n";
+    out << "shortened to\n" << shortest << "what happens in it\n";
     kdSetLogSinkKOR(&writeLog, &out);
     world.run(shortest, &out);
     kdSetLogSinkKOR(&ignoreLog, nullptr);
@@ -92,8 +92,7 @@ std::string report(World& world, const Sequence& sequence, const std::string& wr
 
 }  // namespace
 
-std::string run(const Range& range) {
-    World world;
+std::string run(World& world, const Range& range) {
 #ifdef LIFECYCLE_TELLS_SEED_AT_DEATH
     __sanitizer_set_death_callback(&tellSeed);
 #endif

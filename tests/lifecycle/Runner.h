@@ -9,6 +9,8 @@
 
 namespace Lifecycle {
 
+class World;
+
 /** Seeds one after the other. */
 struct Range {
     std::uint64_t first;
@@ -20,6 +22,6 @@ struct Range {
  * @return empty, or all that helps to find the fault: the seed, the sequence without what does not
  *         matter, and what happens in it
  */
-std::string run(const Range& range);
+std::string run(World& world, const Range& range);
 
 }  // namespace Lifecycle

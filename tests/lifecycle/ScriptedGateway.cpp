@@ -97,7 +97,7 @@ std::string ScriptedGateway::makeSessionId(int session) {
 }
 
 void ScriptedGateway::begin(const std::vector<SessionPlan>& plans, GatewayObserver* watcher) {
-    sessions = plans;
+    sessions = &plans;
     attempts.assign(plans.size(), 0);
     observer = watcher;
     connections.clear();
@@ -105,12 +105,9 @@ void ScriptedGateway::begin(const std::vector<SessionPlan>& plans, GatewayObserv
 
 AttemptPlan ScriptedGateway::takePlan(int session) {
     const auto index = static_cast<std::size_t>(session);
-    if (index >= sessions.size()) {
-        return {};
-    }
+    const std::vector<AttemptPlan>& plans = (*sessions)[index].attempts;
     const std::size_t attempt = attempts[index]++;
-    return attempt < sessions[index].attempts.size() ? sessions[index].attempts[attempt]
-                                                     : AttemptPlan();
+    return attempt < plans.size() ? plans[attempt] : AttemptPlan();
 }
 
 void ScriptedGateway::connect(Link link) {

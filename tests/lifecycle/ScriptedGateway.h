@@ -52,7 +52,7 @@ class ScriptedGateway {
 
     static ScriptedGateway& instance();
 
-    /** Forgets the sequence before. */
+    /** Forgets the sequence before. The plans must stay where they are. */
     void begin(const std::vector<SessionPlan>& plans, GatewayObserver* watcher);
 
     /**
@@ -107,7 +107,7 @@ class ScriptedGateway {
     void finish(const Connection& connection, int code);
 
     std::function<bool()> runCommands;
-    std::vector<SessionPlan> sessions;
+    const std::vector<SessionPlan>* sessions = nullptr;
     std::vector<std::size_t> attempts;
     GatewayObserver* observer = nullptr;
     Connections connections;

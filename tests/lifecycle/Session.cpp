@@ -7,6 +7,32 @@
 
 namespace Lifecycle {
 
+namespace {
+
+std::unique_ptr<SessionModel> makeModel(Kind kind) {
+    switch (kind) {
+        case Kind::CLOUD:
+            return std::make_unique<CloudModel>();
+        case Kind::PLATFORM:
+            return std::make_unique<RelayModel>();
+        case Kind::STAND_IN:
+            break;
+    }
+    return std::make_unique<StandInModel>();
+}
+
+}  // namespace
+
+Session::Session(SessionHost& owner, int number, const SessionPlan& what, Kind served)
+    : index(number),
+      plan(what),
+      kind(served),
+      model(makeModel(served)),
+      cloud(dynamic_cast<CloudModel*>(model.get())),
+      relay(dynamic_cast<RelayModel*>(model.get())),
+      listener(boost::make_shared<SessionListener>(owner, *this)),
+      witness(boost::make_shared<Witness>(owner, served == Kind::STAND_IN)) {}
+
 void Session::own(const boost::shared_ptr<Talvox::Recognizer>& made) {
     recognizer = made;
     object = made;
@@ -23,7 +49,7 @@ void Session::release() {
 void Session::leave() {
     --frames;
     if (frames == 0 && isReleased()) {
-        model.onGone();
+        model->onGone();
     }
 }
 
@@ -55,7 +81,9 @@ void SessionListener::onResults(Talvox::Recognizer* recognizer,
         (results.size() > 1 || results[0].getText() != ScriptedGateway::makeWords(session.index))) {
         host.onWrong("the words of another session: " + results[0].getText());
     }
-    if (recognition->getRequestId() != ScriptedGateway::makeRequestId(session.index)) {
+    const bool hasRequest = session.kind == Kind::CLOUD;
+    if (recognition->getRequestId() !=
+        (hasRequest ? ScriptedGateway::makeRequestId(session.index) : std::string())) {
         host.onWrong("the request of another session: " + recognition->getRequestId());
     }
     hear(recognizer, Event::RESULTS);
@@ -70,7 +98,7 @@ void SessionListener::hear(const Talvox::Recognizer* recognizer, Event event, in
         host.onWrong("the event names another recognizer");
     }
     session.enter();
-    host.onWrong(session.model.onEvent(event, host.now(), errorCode));
+    host.onWrong(session.model->onEvent(event, host.now(), errorCode));
     host.onEvent(session, event, errorCode);
     session.leave();
 }

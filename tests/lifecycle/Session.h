@@ -9,11 +9,13 @@
 #include <boost/shared_ptr.hpp>
 #include <boost/weak_ptr.hpp>
 #include <cstdint>
+#include <memory>
 #include <string>
 
+#include "CloudModel.h"
 #include "Plan.h"
 #include "RecorderDouble.h"
-#include "SessionModel.h"
+#include "RelayModel.h"
 #include "talvox/Recognizer.h"
 #include "talvox/RecognizerListener.h"
 
@@ -93,13 +95,8 @@ class Witness : public Talvox::RecognizerListener {
 /** The application's references, the model and the recorder. */
 class Session {
   public:
-    Session(SessionHost& owner, int number, const SessionPlan& what)
-        : index(number),
-          plan(what),
-          host(owner),
-          model(!what.recognises),
-          listener(boost::make_shared<SessionListener>(owner, *this)),
-          witness(boost::make_shared<Witness>(owner, !what.recognises)) {}
+    /** @param served what serves it, which is the stand-in where the platform does not */
+    Session(SessionHost& owner, int number, const SessionPlan& what, Kind served);
 
     /** Takes the application's reference to a recognizer that has the listener already. */
     void own(const boost::shared_ptr<Talvox::Recognizer>& made);
@@ -118,8 +115,10 @@ class Session {
 
     const int index;
     const SessionPlan& plan;
-    SessionHost& host;
-    SessionModel model;
+    const Kind kind;
+    std::unique_ptr<SessionModel> model;
+    CloudModel* cloud = nullptr; /**< the model, if it is one */
+    RelayModel* relay = nullptr; /**< the model, if it is one */
     boost::shared_ptr<SessionListener> listener;
     boost::shared_ptr<Witness> witness;
     boost::shared_ptr<Talvox::Recognizer> recognizer;
@@ -128,6 +127,7 @@ class Session {
     std::string spoken; /**< what the recorder delivered while the session listened */
     int attempts = 0;
     bool gotWords = false;
+    int64_t deviceHandle = 0;
 
   private:
     boost::weak_ptr<Talvox::Recognizer> object;

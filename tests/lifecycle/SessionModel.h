@@ -1,6 +1,6 @@
 /**
  * @file
- * What a session may do: the contract of docs/LIFECYCLE.md as a machine.
+ * What a session may do: what every kind of session has in common.
  */
 #pragma once
 
@@ -14,85 +14,82 @@
 namespace Lifecycle {
 
 /**
- * The states of one session and the events that each allows. It is told what is done to the session
- * and hears what the listener hears; every operation returns what is wrong, empty for nothing.
- * Times are in milliseconds on the platform clock.
+ * Is told what is done to the session and hears what its listener hears. Operations that return a
+ * text return what is wrong, empty for nothing. Times are in milliseconds on the platform clock.
+ * Calls may be nested.
  */
 class SessionModel {
   public:
-    enum class State {
-        IDLE,
-        LEARNING, /**< started; the background noise is being learned */
-        READY,    /**< recordingBegin was heard */
-        SPEAKING, /**< speakingBegin was heard */
-        SENDING,  /**< recordingDone was heard */
-        OVER      /**< the one end was heard */
-    };
-    enum class Request {
-        RUNNING,
-        UNSENDABLE, /**< fails as soon as it is made */
-        ANSWERED,
-        FAILED
-    };
+    SessionModel() = default;
+    virtual ~SessionModel() = default;
+    SessionModel(const SessionModel&) = delete;
+    SessionModel& operator=(const SessionModel&) = delete;
 
-    /** @param standIn a session without a recogniser: every call is answered with one error */
-    explicit SessionModel(bool standIn = false) : isStandIn(standIn) {}
-
-    State getState() const { return state; }
-    bool isListening() const {
-        return state == State::LEARNING || state == State::READY || state == State::SPEAKING;
-    }
     /** Whether it is the one that is registered with the engine. */
-    bool isActive() const { return isListening() || state == State::SENDING; }
+    virtual bool isActive() const = 0;
+    /** Whether its recorder runs. */
+    virtual bool isListening() const { return false; }
+    virtual bool isOver() const = 0;
 
-    /** Begin and end of calls, which may be nested. `refusal`: what is against starting now. */
-    void beginStart(int64_t now, std::optional<int> refusal);
-    std::string endStart();
-    void beginStop() { ++stops; }
-    std::string endStop();
-    void beginCancel() { ++cancels; }
-    std::string endCancel();
-    /** A buffer that the recorder delivers, of so many whole milliseconds. */
-    void beginSound(int64_t now, int64_t durationMs);
-    std::string endSound(int64_t now);
-    void onRecorderFailed() { recorderFailed = true; }
-    void onRequest(Request what) { request = what; }
+    /** @param refusal the error that is due when the session starts now */
+    virtual void beginStart(int64_t now, std::optional<int> refusal) = 0;
+    virtual std::string endStart() = 0;
+    virtual void beginStop() = 0;
+    virtual std::string endStop() = 0;
+    virtual void beginCancel() = 0;
+    virtual std::string endCancel() = 0;
 
-    std::string onEvent(Event event, int64_t now, int errorCode = -1);
+    /** @param errorCode of an error */
+    virtual std::string onEvent(Event event, int64_t now, int errorCode) = 0;
 
     /** Everything that was to happen at this time has happened. */
-    std::string checkSettled(int64_t now);
+    virtual std::string checkSettled(int64_t now) = 0;
 
     /** The application let go of it, and no call of it is under way any more. */
     void onGone() { gone = true; }
     bool isGone() const { return gone; }
 
+  protected:
+    static std::string nameOf(Event event, int errorCode) {
+        return Lifecycle::nameOf(event) +
+               (event == Event::ERROR
+                    ? " " + Talvox::SpeechError::errorStrings[static_cast<std::size_t>(errorCode)]
+                    : std::string());
+    }
+
   private:
-    std::string onEnd(Event event, int64_t now, int errorCode);
-    bool isPossible(int errorCode, int64_t now) const;
-    std::string expectOver(const char* after) const;
-
-    const bool isStandIn;
-    State state = State::IDLE;
     bool gone = false;
+};
 
-    // Calls that are under way.
-    int stops = 0;
-    int cancels = 0;
-    int sounds = 0;
-    std::optional<int> refusalOfStart;
-    int answersOfStandIn = 0;
+/** A session without a recogniser: every call is answered with one error. */
+class StandInModel : public SessionModel {
+  public:
+    bool isActive() const override { return false; }
+    bool isOver() const override { return false; }
 
-    // What the end may come from.
-    bool recorderFailed = false;
-    bool heardAnything = false;
-    bool wasReady = false;
-    int64_t heardMs = 0;
-    Request request = Request::RUNNING;
-    int64_t startTime = 0;
-    int64_t lastSound = 0;
-    int64_t doneTime = 0;
-    std::optional<int64_t> answerDue;
+    void beginStart(int64_t /*now*/, std::optional<int> /*refusal*/) override {
+        expect(Talvox::SpeechError::ErrorNotAvailable);
+    }
+    std::string endStart() override { return expectAnswered(); }
+    void beginStop() override { expect(Talvox::SpeechError::ErrorNotAvailable); }
+    std::string endStop() override { return expectAnswered(); }
+    void beginCancel() override { expect(Talvox::SpeechError::ErrorCanceled); }
+    std::string endCancel() override { return expectAnswered(); }
+
+    std::string onEvent(Event event, int64_t /*now*/, int errorCode) override {
+        const bool isExpected = event == Event::ERROR && expected == errorCode && !isGone();
+        expected.reset();
+        return isExpected ? "" : nameOf(event, errorCode) + " from a stand-in";
+    }
+    std::string checkSettled(int64_t /*now*/) override { return ""; }
+
+  private:
+    void expect(int errorCode) { expected = errorCode; }
+    std::string expectAnswered() const {
+        return expected ? "the stand-in did not answer a call" : "";
+    }
+
+    std::optional<int> expected;
 };
 
 }  // namespace Lifecycle

@@ -40,7 +40,7 @@ boost::shared_ptr<Settings> makeSettings(int index) {
     auto settings = boost::make_shared<Settings>();
     settings->putString(Settings::SKS_URL, URL);
     settings->putString(Settings::SKS_UUID, UUID);
-    settings->putString(Settings::SKS_VAD_SETTINGS, DETECTORS[index % 8 < 4 ? 0 : index % 3]);
+    settings->putString(Settings::SKS_VAD_SETTINGS, DETECTORS[index % 8 < 4 ? 0 : 1 + index % 2]);
     settings->putBoolean(Settings::SKS_STREAMING, index % 2 == 1);
     settings->putString(Settings::SKS_SOUND_FORMAT, index % 6 == 5 ? Settings::SOUND_FORMAT_SPEEX
                                                     : index % 6 == 4
@@ -68,6 +68,25 @@ boost::shared_ptr<Settings> makeSettings(int index) {
             break;
     }
     return settings;
+}
+
+boost::shared_ptr<Settings> makeSessionSettings(const SessionPlan& plan, int index) {
+    static const std::string* const LOGGING[] = {
+        &Settings::LOG_DISABLED, &Settings::LOG_WITH_SOUND_ALWAYS,
+        &Settings::LOG_WITH_SOUND_IF_WIFI, &Settings::LOG_WITHOUT_SOUND_ALWAYS};
+    static const auto base = boost::make_shared<Settings>();
+    const boost::shared_ptr<Settings> own = base->clone();
+    own->putString(Settings::RS_SESSION_ID, ScriptedGateway::makeSessionId(index));
+    if (plan.kind == Kind::STAND_IN) {
+        own->putString(Settings::RS_ASR_POLICY, Settings::ASRP_DISABLED);
+    } else if (plan.kind == Kind::PLATFORM) {
+        own->putString(Settings::RS_ASR_POLICY, Settings::ASRP_PLATFORM_ONLY);
+        own->putString(Settings::SKS_LOGGING_POLICY, *LOGGING[plan.device.logging % 4]);
+        own->putString(Settings::SKS_SOUND_FORMAT, plan.device.logging < 4
+                                                       ? Settings::SOUND_FORMAT_PCM
+                                                       : Settings::SOUND_FORMAT_SPEEX);
+    }
+    return own;
 }
 
 bool isSendable(const Settings& settings) {
@@ -105,10 +124,11 @@ World::World() {
     Sound::Recorder::setFactory([this]() -> boost::shared_ptr<Sound::Recorder> {
         Session& session = *starting.back();
         session.recorder = boost::make_shared<RecorderDouble>(
-            session.plan.recorder, [&session] { session.model.onRecorderFailed(); });
+            session.plan.recorder, [&session] { session.cloud->onRecorderFailed(); });
         return session.recorder;
     });
     Network::NetworkManager::getInstance().getTransport();
+    device = Device::make(*this);
 }
 
 World::~World() {
@@ -136,6 +156,7 @@ std::string World::run(const Sequence& what, std::ostream* trace) {
 
 void World::begin(const Sequence& what) {
     wrong.clear();
+    expectedAsserts = 0;
     sequence = &what;
     networkStands = false;
     kdUseManualClockKOR(CLOCK_START);
@@ -163,7 +184,7 @@ std::size_t World::performTogether(std::size_t index) {
 }
 
 void World::perform(const Step& step) {
-    note("- " + describe(step));
+    note("- ", step);
     networkStands = step.networkStands;
     ScriptedGateway::instance().setAnswersFirst(step.answersFirst);
     Session* const session = find(step.session);
@@ -182,6 +203,11 @@ void World::perform(const Step& step) {
                 failRecorder(*session);
             }
             break;
+        case Action::DEVICE_SAYS:
+            if (session != nullptr) {
+                sayAsDevice(*session, static_cast<Saying>(step.amount));
+            }
+            break;
         case Action::WAIT:
             wait(step.amount);
             break;
@@ -192,9 +218,11 @@ void World::perform(const Step& step) {
             reachability = step.amount;
             Network::NetworkManager::getInstance().overrideReachability(reachability);
             break;
-        default:
+        default: {
+            const CallTimes::Stopwatch stopwatch(callTimes[step.action]);
             act(step.action, session, step.amount);
             break;
+        }
     }
 }
 
@@ -220,14 +248,14 @@ void World::call(Action action, Session& session) {
             start(session, *recognizer);
             break;
         case Action::STOP:
-            session.model.beginStop();
+            session.model->beginStop();
             recognizer->stop();
-            onWrong(session.model.endStop());
+            onWrong(session.model->endStop());
             break;
         case Action::CANCEL:
-            session.model.beginCancel();
+            session.model->beginCancel();
             recognizer->cancel();
-            onWrong(session.model.endCancel());
+            onWrong(session.model->endCancel());
             break;
         case Action::RELEASE:
             session.release();
@@ -244,42 +272,42 @@ void World::create(bool starts) {
     }
     const auto index = static_cast<int>(sessions.size());
     const SessionPlan& plan = sequence->sessions[sessions.size()];
-    sessions.push_back(std::make_unique<Session>(*this, index, plan));
+    const bool isServed = plan.kind != Kind::PLATFORM || device != nullptr;
+    sessions.push_back(
+        std::make_unique<Session>(*this, index, plan, isServed ? plan.kind : Kind::STAND_IN));
     Session& session = *sessions.back();
-    const boost::shared_ptr<Settings> own = settings[0]->clone();
-    own->putString(Settings::RS_SESSION_ID, ScriptedGateway::makeSessionId(index));
-    if (!plan.recognises) {
-        own->putString(Settings::RS_ASR_POLICY, Settings::ASRP_DISABLED);
-    }
-    session.own(engine().createRecognizer(session.listener, own));
+    session.own(engine().createRecognizer(session.listener, makeSessionSettings(plan, index)));
     if (starts) {
         call(Action::START, session);
     }
 }
 
 void World::start(Session& session, Talvox::Recognizer& recognizer) {
-    const bool wasIdle = session.model.getState() == SessionModel::State::IDLE;
-    session.model.beginStart(now(), findRefusal(session));
-    if (wasIdle && session.model.isListening()) {
+    const bool wasActive = session.model->isActive();
+    session.model->beginStart(now(), findRefusal(session));
+    if (!wasActive && session.cloud != nullptr && session.model->isActive()) {
         const Settings& current = *settings[static_cast<std::size_t>(settingsInUse)];
         const std::string& format = current.getString(Settings::SKS_SOUND_FORMAT);
         session.sendsPcm =
             format == Settings::SOUND_FORMAT_PCM || (format == Settings::SOUND_FORMAT_PCM_IF_WIFI &&
                                                      reachability == Network::NetworkManager::WIFI);
         if (!isSendable(current)) {
-            session.model.onRequest(SessionModel::Request::UNSENDABLE);
+            session.cloud->onRequest(CloudModel::Request::UNSENDABLE);
         }
     }
     starting.push_back(&session);
     recognizer.start();
     starting.pop_back();
-    onWrong(session.model.endStart());
+    onWrong(session.model->endStart());
 }
 
 std::optional<int> World::findRefusal(const Session& session) const {
     const Settings& current = *settings[static_cast<std::size_t>(settingsInUse)];
     if (isAnyActive()) {
         return SpeechError::ErrorBusy;
+    }
+    if (session.kind != Kind::CLOUD) {
+        return std::nullopt;
     }
     if (reachability == Network::NetworkManager::UNREACHABLE || current.getUrl().empty() ||
         current.getUuid().empty()) {
@@ -339,13 +367,13 @@ void World::deliver(Session& session, const BufferPtr& buffer, bool rude) {
     if (!recorder || (!recorder->isRecording() && !rude)) {
         return;
     }
-    if (recorder->isRecording() && session.model.isListening()) {
+    if (recorder->isRecording() && session.model->isListening()) {
         session.spoken.append(buffer->getData().begin(), buffer->getData().end());
     }
     session.enter();
-    session.model.beginSound(now(), getDurationMs(*buffer));
+    session.cloud->beginSound(now(), getDurationMs(*buffer));
     recorder->deliver(buffer, rude);
-    onWrong(session.model.endSound(now()));
+    onWrong(session.cloud->endSound(now()));
     session.leave();
 }
 
@@ -356,6 +384,29 @@ void World::failRecorder(Session& session) {
         session.recorder->fail();
         session.leave();
     }
+}
+
+void World::sayAsDevice(Session& session, Saying what) {
+    static const std::map<Saying, Event> EVENTS = {{Saying::READY, Event::RECORDING_BEGIN},
+                                                   {Saying::BEGINNING, Event::SPEAKING_BEGIN},
+                                                   {Saying::LEVEL, Event::POWER},
+                                                   {Saying::END, Event::RECORDING_DONE},
+                                                   {Saying::RESULTS, Event::RESULTS},
+                                                   {Saying::NO_HYPOTHESIS, Event::RESULTS},
+                                                   {Saying::ERROR, Event::ERROR}};
+    const Util::EventLock lock;
+    if (session.deviceHandle == 0) {
+        return;
+    }
+    note("      the device says ", static_cast<int>(what));
+    session.enter();
+    const auto event = EVENTS.find(what);
+    if (event != EVENTS.end()) {
+        session.relay->beginSaying(event->second, DEVICE_ERROR);
+    }
+    device->say(session.deviceHandle, what, session.index);
+    session.relay->endSaying();
+    session.leave();
 }
 
 void World::wait(int64_t milliseconds) {
@@ -393,18 +444,18 @@ void World::settle() {
 
 void World::check() {
     for (const std::unique_ptr<Session>& session : sessions) {
-        onWrong(session->model.checkSettled(now()));
+        onWrong(session->model->checkSettled(now()));
         if (session->isLeftBehind()) {
             onWrong("a released recognizer lives on");
         }
         if (session->recorder && session->recorder->isRecording() &&
-            !session->model.isListening()) {
+            !session->model->isListening()) {
             onWrong("the recorder goes on");
         }
     }
     checkEngine();
-    if (asserts.count() > 0) {
-        onWrong("assertion " + asserts.reports().front().condition);
+    if (asserts.count() > expectedAsserts) {
+        onWrong("assertion " + asserts.reports().back().condition);
     }
 }
 
@@ -418,25 +469,36 @@ void World::checkEngine() {
 
 bool World::isAnyActive() const {
     return std::any_of(sessions.begin(), sessions.end(), [](const auto& session) {
-        return !session->model.isGone() && session->model.isActive();
+        return !session->model->isGone() && session->model->isActive();
     });
 }
 
-// Whatever happened, time alone ends every session, and nothing is left.
+/** A device may be silent for ever. */
+void World::cancelRelays() {
+    for (std::size_t i = 0; i < sessions.size(); ++i) {
+        if (sessions[i]->relay != nullptr && sessions[i]->model->isActive()) {
+            act(Action::CANCEL, sessions[i].get(), 0);
+        }
+    }
+}
+
+// Whatever happened, time alone ends every session and every upload, and nothing is left.
 void World::end() {
     networkStands = false;
     ScriptedGateway::instance().setAnswersFirst(false);
     note("- the end");
     settle();
-    for (int64_t waited = 0; waited < ALL_OVER_MS && isAnyActive() && wrong.empty();
+    for (int64_t waited = 0; waited < ALL_OVER_MS && wrong.empty() &&
+                             (isAnyActive() || ScriptedGateway::instance().countTransfers() > 0);
          waited += LONGEST_PIECE_MS) {
+        cancelRelays();
         wait(LONGEST_PIECE_MS);
     }
     checkNothingIsLeft();
     for (const std::unique_ptr<Session>& session : sessions) {
-        const int ends = session->witness->countEnds();
-        if (session->plan.recognises && !session->isReleased() &&
-            (session->model.getState() == SessionModel::State::OVER) != (ends == 1)) {
+        const int heardEnds = session->witness->countEnds();
+        if (session->kind != Kind::STAND_IN && !session->isReleased() &&
+            session->model->isOver() != (heardEnds == 1)) {
             onWrong("the second listener heard another number of ends");
         }
         const Util::EventLock lock;
@@ -444,6 +506,9 @@ void World::end() {
     }
     settle();
     checkNothingIsLeft();
+    if (device && device->countReferences() != 0) {
+        onWrong("references to Java objects are left");
+    }
     sessions.clear();
 }
 
@@ -457,6 +522,9 @@ void World::checkNothingIsLeft() {
         onWrong("left: " + std::to_string(after.timers - before.timers) + " timers, " +
                 std::to_string(after.callbacks - before.callbacks) + " callbacks, " +
                 std::to_string(after.works - before.works) + " tasks");
+    }
+    if (!engine().runningTaskHolders.empty()) {
+        onWrong("an upload is left");
     }
     for (const std::unique_ptr<Session>& session : sessions) {
         if (session->recorder && session->recorder.use_count() > 1) {
@@ -477,13 +545,17 @@ Session* World::find(int index) {
 }
 
 void World::onEvent(Session& session, Event event, int errorCode) {
-    note("    session " + std::to_string(session.index) + " " + nameOf(event) +
-         (errorCode >= 0 ? " " + std::to_string(errorCode) : ""));
+    note("    session ", session.index, " ", nameOf(event), errorCode >= 0 ? " " : "",
+         errorCode >= 0 ? SpeechError::errorStrings[errorCode] : "");
     checkEngine();
+    if (event == Event::RESULTS || event == Event::ERROR) {
+        ++ends[static_cast<std::size_t>(event == Event::RESULTS ? SpeechError::ErrorMax
+                                                                : errorCode)];
+    }
     const int nth = session.count(event);
     for (const Reaction& reaction : session.plan.reactions) {
         if (reaction.event == event && reaction.nth == nth && wrong.empty()) {
-            note("      reacts: " + describe(reaction));
+            note("      reacts: ", reaction);
             act(reaction.action, reaction.session == SELF ? &session : find(reaction.session),
                 reaction.amount);
         }
@@ -493,7 +565,7 @@ void World::onEvent(Session& session, Event event, int errorCode) {
 void World::onWrong(const std::string& what) {
     if (!what.empty() && wrong.empty()) {
         wrong = what;
-        note("WRONG: " + what);
+        note("WRONG: ", what);
     }
 }
 
@@ -505,24 +577,53 @@ void World::onBody(int session, const std::string& body) {
 }
 
 void World::onHead(int session, bool words) {
-    note("    gateway: head for session " + std::to_string(session));
+    note("    gateway: head for session ", session);
     Session& asker = *sessions[static_cast<std::size_t>(session)];
     asker.gotWords = asker.gotWords || words;
 }
 
 void World::onAttemptEnd(int session, int code) {
-    note("    gateway: end " + std::to_string(code) + " for session " + std::to_string(session));
+    note("    gateway: end ", code, " for session ", session);
     Session& asker = *sessions[static_cast<std::size_t>(session)];
     const bool canBeMended = code < 0 || code >= 500;
-    if (!canBeMended || ++asker.attempts >= ATTEMPTS_MAX) {
-        asker.model.onRequest(asker.gotWords ? SessionModel::Request::ANSWERED
-                                             : SessionModel::Request::FAILED);
+    if (asker.cloud != nullptr && (!canBeMended || ++asker.attempts >= ATTEMPTS_MAX)) {
+        asker.cloud->onRequest(asker.gotWords ? CloudModel::Request::ANSWERED
+                                              : CloudModel::Request::FAILED);
     }
 }
 
-void World::note(const std::string& line) {
+bool World::onDeviceMade(int64_t handle) {
+    Session& session = *starting.back();
+    session.deviceHandle = handle;
+    if (session.plan.device.throwsWhenMade) {
+        session.relay->onThrown();
+        // That is reported to crash reports as well.
+        ++expectedAsserts;
+    }
+    return !session.plan.device.throwsWhenMade;
+}
+
+bool World::onDeviceAsked(int64_t handle, const std::string& what) {
+    const auto found =
+        std::find_if(sessions.begin(), sessions.end(),
+                     [handle](const auto& session) { return session->deviceHandle == handle; });
+    Session& session = **found;
+    const DevicePlan& plan = session.plan.device;
+    sayAsDevice(session, what == "start"  ? plan.insideStart
+                         : what == "stop" ? plan.insideStop
+                                          : plan.insideCancel);
+    const bool throws = what == "start" && plan.throwsAtStart;
+    if (throws) {
+        session.relay->onThrown();
+    }
+    return !throws;
+}
+
+template <typename... Parts>
+void World::note(const Parts&... parts) {
     if (out != nullptr) {
-        *out << now() - CLOCK_START / NS_PER_MS << " " << line << "\n";
+        *out << now() - CLOCK_START / NS_PER_MS << " ";
+        (*out << ... << parts) << "\n";
     }
 }
 

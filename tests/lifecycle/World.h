@@ -4,14 +4,18 @@
  */
 #pragma once
 
+#include <array>
 #include <boost/shared_ptr.hpp>
 #include <cstdint>
 #include <iosfwd>
+#include <map>
 #include <memory>
 #include <optional>
 #include <string>
 #include <vector>
 
+#include "CallTimes.h"
+#include "Device.h"
 #include "Plan.h"
 #include "PlatformLedger.h"
 #include "ScriptedGateway.h"
@@ -22,7 +26,7 @@
 namespace Lifecycle {
 
 /** Runs sequences, one after the other. One at a time; the main thread is the application's. */
-class World : public GatewayObserver, public SessionHost {
+class World : public GatewayObserver, public SessionHost, public DeviceHost {
   public:
     World();
     ~World() override;
@@ -35,6 +39,12 @@ class World : public GatewayObserver, public SessionHost {
      */
     std::string run(const Sequence& what, std::ostream* trace = nullptr);
 
+    /** How often a session ended with results (index `ErrorMax`) or with an error, so far. */
+    const std::array<long, Talvox::SpeechError::ErrorMax + 1>& getEnds() const { return ends; }
+
+    /** Of the calls that came from outside of every event. */
+    const std::map<Action, CallTimes>& getCallTimes() const { return callTimes; }
+
     // The session's and the gateway's side.
     void onEvent(Session& session, Event event, int errorCode) override;
     void onWrong(const std::string& what) override;
@@ -42,6 +52,8 @@ class World : public GatewayObserver, public SessionHost {
     void onBody(int session, const std::string& body) override;
     void onHead(int session, bool words) override;
     void onAttemptEnd(int session, int code) override;
+    bool onDeviceMade(int64_t handle) override;
+    bool onDeviceAsked(int64_t handle, const std::string& what) override;
 
   private:
     static Talvox::Talvox& engine() { return Talvox::Talvox::getInstance(); }
@@ -59,6 +71,7 @@ class World : public GatewayObserver, public SessionHost {
     void playSound(const Step& step, Session& session);
     void deliver(Session& session, const BufferPtr& buffer, bool rude);
     static void failRecorder(Session& session);
+    void sayAsDevice(Session& session, Saying what);
 
     void wait(int64_t milliseconds);
     static void jump(int64_t milliseconds);
@@ -66,23 +79,29 @@ class World : public GatewayObserver, public SessionHost {
     void check();
     void checkEngine();
     void end();
+    void cancelRelays();
     void checkNothingIsLeft();
 
     Session* find(int index);
     bool isAnyActive() const;
-    void note(const std::string& line);
+    template <typename... Parts>
+    void note(const Parts&... parts);
 
     TestSupport::AssertCapture asserts;
     std::vector<boost::shared_ptr<Talvox::Settings>> settings;
     boost::shared_ptr<Talvox::Recognizer> probe;
+    std::unique_ptr<Device> device;
     const Sequence* sequence = nullptr;
     int settingsInUse = 0;
     int reachability = 1;
     bool networkStands = false;
+    std::size_t expectedAsserts = 0;
     PlatformLedger before;
     std::vector<std::unique_ptr<Session>> sessions;
     std::vector<Session*> starting;
+    std::map<Action, CallTimes> callTimes;
     std::string wrong;
+    std::array<long, Talvox::SpeechError::ErrorMax + 1> ends{};
     std::ostream* out = nullptr;
 };
 

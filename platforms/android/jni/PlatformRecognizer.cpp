@@ -151,7 +151,8 @@ void PlatformRecognizer::start() {
         }
     } catch (const Jni::PendingException&) {
         Jni::logAndClear(env, "PlatformRecognizer.start");
-        KOR_ASSERT_AT(jobj, "jobj", ASSERT_PATH, __LINE__);
+        // A listener may have cancelled meanwhile.
+        KOR_ASSERT_AT(jobj || over, "jobj", ASSERT_PATH, __LINE__);
         endWithError(SpeechError::ErrorNotAvailable);
     }
 }
@@ -183,8 +184,12 @@ void PlatformRecognizer::stop() {
 void PlatformRecognizer::cancel() {
     const Util::EventLock lock;
     const boost::shared_ptr<Recognizer> self = shared_from_this();
+    // What Java says while it is cancelled does not count.
+    const bool wasOver = std::exchange(over, true);
     cancelSilently();
-    endWithError(SpeechError::ErrorCanceled);
+    if (!wasOver) {
+        reportError(SpeechError::ErrorCanceled);
+    }
 }
 
 void PlatformRecognizer::cancelSilently() {
@@ -202,10 +207,12 @@ void PlatformRecognizer::cancelSilently() {
 }
 
 void PlatformRecognizer::endWithError(int code) {
-    if (over) {
-        return;
+    if (!std::exchange(over, true)) {
+        reportError(code);
     }
-    over = true;
+}
+
+void PlatformRecognizer::reportError(int code) {
     encoder.reset();
     getEngine()->unregisterRecognizer(this);
     callOnError(SpeechError(code));

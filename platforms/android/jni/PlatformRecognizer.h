@@ -61,6 +61,7 @@ class PlatformRecognizer : public Talvox::Recognizer {
     void createJavaObject();
     void cancelSilently();
     void endWithError(int code);
+    void reportError(int code);
     template <typename Call>
     void announce(Call call);
 

@@ -1,4 +1,4 @@
-#include "SessionModel.h"
+#include "CloudModel.h"
 
 namespace Lifecycle {
 
@@ -14,17 +14,15 @@ const int64_t NO_SOUND_MS = 10000;
 /** Nobody listens longer, however slowly the sound comes. */
 const int64_t LISTENING_MS = 60000;
 
-const char* const STATE_NAMES[] = {"idle", "learning", "ready", "speaking", "sending", "over"};
-
-std::string nameOf(int code) {
-    return code >= 0 && code < SpeechError::ErrorMax ? SpeechError::errorStrings[code]
-                                                     : std::to_string(code);
+std::string nameOfState(CloudModel::State state) {
+    static const char* const NAMES[] = {"idle", "learning", "ready", "speaking", "sending", "over"};
+    return NAMES[static_cast<int>(state)];
 }
 
 }  // namespace
 
-void SessionModel::beginStart(int64_t now, std::optional<int> refusal) {
-    if (state == State::OVER || isStandIn) {
+void CloudModel::beginStart(int64_t now, std::optional<int> refusal) {
+    if (state == State::OVER) {
         return;
     }
     refusalOfStart = isActive() ? SpeechError::ErrorBusy : refusal;
@@ -35,25 +33,25 @@ void SessionModel::beginStart(int64_t now, std::optional<int> refusal) {
     }
 }
 
-std::string SessionModel::endStart() {
+std::string CloudModel::endStart() {
     const bool refused = refusalOfStart.has_value();
     refusalOfStart.reset();
     return refused || recorderFailed ? expectOver("a start that could not succeed") : "";
 }
 
-std::string SessionModel::endStop() {
+std::string CloudModel::endStop() {
     --stops;
     return isListening() ? "goes on listening after stop" : "";
 }
 
-std::string SessionModel::endCancel() {
+std::string CloudModel::endCancel() {
     --cancels;
     return expectOver("cancel");
 }
 
-void SessionModel::beginSound(int64_t now, int64_t durationMs) {
+void CloudModel::beginSound(int64_t now, int64_t durationMs) {
     ++sounds;
-    wasReady = state == State::READY;
+    stateBeforeSound = state;
     if (isListening()) {
         heardAnything = true;
         heardMs += durationMs;
@@ -61,26 +59,22 @@ void SessionModel::beginSound(int64_t now, int64_t durationMs) {
     }
 }
 
-std::string SessionModel::endSound(int64_t now) {
+std::string CloudModel::endSound(int64_t now) {
     --sounds;
-    if (gone) {
+    // What comes while the noise is learned decides nothing.
+    if (isGone() || !isDetecting() || stateBeforeSound == State::LEARNING) {
         return "";
     }
-    if (heardMs > SOUND_MS && (state == State::READY || state == State::SPEAKING) && wasReady) {
+    if (heardMs > SOUND_MS) {
         return "goes on listening after too much sound";
     }
-    return wasReady && state == State::READY && now - startTime >= NO_VOICE_MS
-               ? "goes on waiting for a voice"
-               : "";
+    return state == State::READY && now - startTime >= NO_VOICE_MS ? "goes on waiting for a voice"
+                                                                   : "";
 }
 
-std::string SessionModel::onEvent(Event event, int64_t now, int errorCode) {
-    if (gone) {
+std::string CloudModel::onEvent(Event event, int64_t now, int errorCode) {
+    if (isGone()) {
         return "an event after the release";
-    }
-    if (isStandIn) {
-        return event == Event::ERROR && isPossible(errorCode, now) ? ""
-                                                                   : "not what a stand-in says";
     }
     const State before = state;
     bool allowed = false;
@@ -95,7 +89,7 @@ std::string SessionModel::onEvent(Event event, int64_t now, int errorCode) {
             break;
         case Event::BUFFER:
         case Event::POWER:
-            allowed = (before == State::READY || before == State::SPEAKING) && sounds > 0;
+            allowed = isDetecting() && sounds > 0;
             break;
         case Event::RECORDING_DONE:
             allowed = isListening() && (sounds > 0 || stops > 0);
@@ -106,12 +100,10 @@ std::string SessionModel::onEvent(Event event, int64_t now, int errorCode) {
         case Event::ERROR:
             return onEnd(event, now, errorCode);
     }
-    return allowed ? ""
-                   : std::string(Lifecycle::nameOf(event)) + " while " +
-                         STATE_NAMES[static_cast<int>(before)];
+    return allowed ? "" : nameOf(event, errorCode) + " while " + nameOfState(before);
 }
 
-std::string SessionModel::onEnd(Event event, int64_t now, int errorCode) {
+std::string CloudModel::onEnd(Event event, int64_t now, int errorCode) {
     const State before = state;
     if (before == State::OVER) {
         return "a second end";
@@ -120,12 +112,11 @@ std::string SessionModel::onEnd(Event event, int64_t now, int errorCode) {
                                                   : isPossible(errorCode, now);
     state = State::OVER;
     return possible ? ""
-                    : std::string(Lifecycle::nameOf(event)) + " " +
-                          (event == Event::ERROR ? nameOf(errorCode) : "") + " while " +
-                          STATE_NAMES[static_cast<int>(before)] + ", without a reason for it";
+                    : nameOf(event, errorCode) + " while " + nameOfState(before) +
+                          ", without a reason for it";
 }
 
-bool SessionModel::isPossible(int errorCode, int64_t now) const {
+bool CloudModel::isPossible(int errorCode, int64_t now) const {
     if (refusalOfStart && errorCode == *refusalOfStart) {
         return true;
     }
@@ -141,15 +132,13 @@ bool SessionModel::isPossible(int errorCode, int64_t now) const {
         case SpeechError::ErrorNetwork:
             return isActive() && (request == Request::FAILED || request == Request::UNSENDABLE ||
                                   (state == State::SENDING && now - doneTime >= ANSWER_MS));
-        case SpeechError::ErrorNotAvailable:
-            return isStandIn;
         default:
             return false;
     }
 }
 
-std::string SessionModel::checkSettled(int64_t now) {
-    if (gone || !isActive()) {
+std::string CloudModel::checkSettled(int64_t now) {
+    if (isGone() || !isActive()) {
         return "";
     }
     if (request == Request::ANSWERED || request == Request::FAILED) {
@@ -168,8 +157,8 @@ std::string SessionModel::checkSettled(int64_t now) {
     return now - startTime >= LISTENING_MS + NO_SOUND_MS ? "listens for too long" : "";
 }
 
-std::string SessionModel::expectOver(const char* after) const {
-    return state == State::OVER || isStandIn || gone ? "" : std::string("not over after ") + after;
+std::string CloudModel::expectOver(const char* after) const {
+    return state == State::OVER || isGone() ? "" : std::string("not over after ") + after;
 }
 
 }  // namespace Lifecycle
