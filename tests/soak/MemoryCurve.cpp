@@ -4,6 +4,8 @@
 #include <unistd.h>
 
 #include <algorithm>
+#include <cstdlib>
+#include <cstring>
 #include <fstream>
 
 #if defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__)
@@ -20,6 +22,20 @@ std::size_t countLiveBytes() {
     const struct mallinfo2 now = mallinfo2();
     return now.uordblks + now.hblkhd;
 #endif
+}
+
+bool isSanitized() {
+#if defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__)
+    return true;
+#else
+    return false;
+#endif
+}
+
+bool isExact() {
+    const char* const tunables = std::getenv("GLIBC_TUNABLES");
+    return isSanitized() ||
+           (tunables != nullptr && std::strstr(tunables, "malloc.tcache_count=0") != nullptr);
 }
 
 std::size_t countResidentBytes() {

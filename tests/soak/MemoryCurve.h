@@ -12,6 +12,15 @@ namespace Soak {
 /** Bytes that the program has allocated and not freed; a sanitizer's quarantine does not count. */
 std::size_t countLiveBytes();
 
+/**
+ * Whether `countLiveBytes` tells the truth. The C library counts what its threads keep for later as
+ * allocated, unless it is told on the start of the program to keep nothing.
+ */
+bool isExact();
+
+/** Whether a sanitizer's own memory is resident as well. */
+bool isSanitized();
+
 /** Resident memory as the system counts it. */
 std::size_t countResidentBytes();
 
