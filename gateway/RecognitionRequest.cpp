@@ -63,13 +63,15 @@ RecognitionRequest::RecognitionRequest(const RequestHead& requestHead, const std
       requestId(makeRequestId()) {}
 
 bool RecognitionRequest::write(const char* data, std::size_t size) {
+    // What the limit allows is read first: a mistake in it comes before the one of its length.
+    const std::size_t allowed = std::min(size, maxBytes - std::min(bodyBytes, maxBytes));
     bodyBytes += size;
+    if (refusedStatus == 0 && !parser.feed(data, allowed)) {
+        refuse(400, parser.getError());
+    }
     if (bodyBytes > maxBytes) {
         refuse(413, "the body is longer than " + std::to_string(maxBytes) + " bytes");
         return bodyBytes / 2 <= maxBytes;
-    }
-    if (refusedStatus == 0 && !parser.feed(data, size)) {
-        refuse(400, parser.getError());
     }
     return true;
 }

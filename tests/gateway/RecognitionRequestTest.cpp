@@ -281,6 +281,17 @@ TEST(RecognitionRequest, RefusesBodiesThatAreTooLong) {
     EXPECT_EQ("the body is longer than 1000 bytes\n", answer.body);
 }
 
+TEST(RecognitionRequest, NamesTheFirstMistakeOfABodyThatIsTooLongHoweverItArrives) {
+    for (const std::size_t piece : {1U, 100U, 1500U}) {
+        RecognitionRequest request(usualHead(), BOUNDARY, sharedPool(), 1000);
+        const std::string body(1500, 'x');
+        for (std::size_t at = 0; at < body.size(); at += piece) {
+            EXPECT_TRUE(request.write(body.data() + at, piece));
+        }
+        EXPECT_EQ(400U, request.finish().status) << piece;
+    }
+}
+
 TEST(RecognitionRequest, RefusesSoundThatIsTooLong) {
     for (const char* language : {"en-US", "ru-RU"}) {
         RecognitionRequest request(usualHead(), BOUNDARY, sharedPool(), 16 * MAX_BODY);
