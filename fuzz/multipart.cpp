@@ -14,7 +14,7 @@ namespace {
 
 using Fuzz::require;
 
-constexpr std::size_t MAX_BODY_BYTES = 6000;
+constexpr std::size_t MAX_BODY_BYTES = 1500;
 
 /** How a body arrives. */
 class Cut {
@@ -69,7 +69,7 @@ class Transcript : public Gateway::MultipartListener {
 };
 
 std::string parse(const std::string& boundary, const std::string& body, Cut cut) {
-    Transcript transcript(2000);
+    Transcript transcript(500);
     Gateway::MultipartParser parser(boundary, transcript);
     for (std::size_t at = 0; at < body.size();) {
         const std::size_t count = cut.next(body.size() - at);

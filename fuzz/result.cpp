@@ -1,4 +1,7 @@
 /* The service's answer: a header in base64, or the document inside it. */
+#include <algorithm>
+#include <boost/make_shared.hpp>
+#include <boost/shared_ptr.hpp>
 #include <cmath>
 #include <string>
 #include <vector>
@@ -8,6 +11,7 @@
 #include "core/util/Base64Coder.h"
 #include "talvox/Recognition.h"
 #include "talvox/Settings.h"
+#include "talvox/impl/RecognizeRequest.h"
 #include "talvox/impl/RequestFormat.h"
 #include "talvox/impl/ResultDocument.h"
 
@@ -18,6 +22,7 @@ using Talvox::Recognition;
 using Util::Base64Coder;
 
 const char* const HEADER = "X-ASRGW-Recognition-Results";
+const char* const IDENTIFIER = "abc";
 
 /** The length of the character of UTF-8 that stands at `at`; 0 where there is none. */
 std::size_t lengthOfCharacter(const std::string& text, std::size_t at) {
@@ -66,6 +71,26 @@ std::vector<unsigned char> toBytes(const std::string& text) {
     return {text.begin(), text.end()};
 }
 
+/** A request takes the results over from the response, or none and no identifier either. */
+void requireTaken(const Network::HttpResponse& response,
+                  const boost::shared_ptr<Talvox::RecognitionResults>& results) {
+    static const Talvox::Settings settings;
+    Talvox::RecognizeRequest request(settings, settings);
+    request.onResponseRecieved(boost::make_shared<Network::HttpResponse>(response));
+    require(request.resultsReceived == static_cast<bool>(results), "results are received");
+    require(request.requestId == (results ? IDENTIFIER : ""), "the identifier comes with results");
+    if (results) {
+        requireUsable(*results);
+        require(std::equal(results->begin(), results->end(), request.results->begin(),
+                           request.results->end(),
+                           [](const auto& left, const auto& right) {
+                               return left.getText() == right.getText() &&
+                                      left.getConfidence() == right.getConfidence();
+                           }),
+                "the same header gives the same results");
+    }
+}
+
 }  // namespace
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, std::size_t size) {
@@ -80,14 +105,13 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, std::size_t size) {
     }
     Network::HttpResponse response(200);
     response.addHeader(HEADER, isDocument ? Base64Coder::encode(toBytes(input)) : input);
+    response.addHeader("x-kvrequestid", IDENTIFIER);
     const std::string header = response.getHeader(HEADER).value_or("none");
     if (Base64Coder::decode(header, bytes)) {
         require(Base64Coder::encode(bytes) == header, "bytes have one base64 only");
     } else {
         require(bytes.empty(), "bad base64 gives no bytes");
     }
-    if (const auto results = Talvox::parseResultHeader(header)) {
-        requireUsable(*results);
-    }
+    requireTaken(response, Talvox::parseResultHeader(header));
     return 0;
 }
