@@ -1,5 +1,6 @@
 #include "NetworkFixture.h"
 #include "support/LogCapture.h"
+#include "support/Threads.h"
 
 using Network::HttpRequest;
 using Network::NetworkTaskHolder;
@@ -294,6 +295,34 @@ TEST_F(NetworkTaskTest, LogsWhyARequestFailed) {
     const TestSupport::LogCapture log;
     EXPECT_EQ("finished -1", run(makeTask(port.getUrl())));
     EXPECT_TRUE(log.containsPart("Network: a request failed: Failed to connect"));
+}
+
+// It would be taken for the answer to the next request, and the next one's for the one after that.
+TEST_F(NetworkTaskTest, LeavesAKeptConnectionOnWhichSomethingCameUnasked) {
+    const std::string first = "HTTP/1.1 200 OK\r\nContent-Length: 9\r\n\r\nthe first";
+    const std::string unasked = "HTTP/1.1 408 Late\r\nContent-Length: 0\r\n\r\n";
+    server.script({Answer::raw(first + unasked).inPieces(first.size()),
+                   Answer::status(200, {}, "the second")});
+    server.release();
+    const auto task = makeTask(server.getUrl());
+    holder.submitNoRetries(task);
+    ASSERT_EQ("finished 200", task->waitForEnd());
+    server.release();
+    ASSERT_TRUE(TestSupport::waitForThreads([this] { return server.isIdle(); }));
+
+    const auto next = makeUpload(server.getUrl(), "body");
+    holder.submitNoRetries(next);
+    EXPECT_EQ("finished 200", next->waitForEnd());
+    EXPECT_THAT(next->getEvents(),
+                ElementsAre("ready?", "issue", "response 200", "bytes 10", "finished 200"));
+    EXPECT_EQ("the second", next->getBody());
+    EXPECT_EQ("body", server.getRequest(1).body);
+    EXPECT_EQ(2U, server.getConnectionCount());
+    // That one is kept again.
+    const auto last = makeTask(server.getUrl());
+    holder.submitNoRetries(last);
+    EXPECT_EQ("finished 200", last->waitForEnd());
+    EXPECT_EQ(2U, server.getConnectionCount());
 }
 
 }  // namespace

@@ -55,6 +55,9 @@ void Transfer::setUpConnection(const std::string& certificateFile) {
     curl_easy_setopt(handle, CURLOPT_PROXY, "");
     curl_easy_setopt(handle, CURLOPT_HTTP_VERSION, static_cast<long>(CURL_HTTP_VERSION_1_1));
     curl_easy_setopt(handle, CURLOPT_SSLVERSION, static_cast<long>(CURL_SSLVERSION_TLSv1_2));
+    transport->getSockets().attach(handle);
+    curl_easy_setopt(handle, CURLOPT_PREREQFUNCTION, &Transfer::onConnection);
+    curl_easy_setopt(handle, CURLOPT_PREREQDATA, this);
     if (!certificateFile.empty()) {
         curl_easy_setopt(handle, CURLOPT_CAINFO, certificateFile.c_str());
         curl_easy_setopt(handle, CURLOPT_CAPATH, nullptr);
@@ -233,6 +236,30 @@ void Transfer::handleHeadEnd() {
         wake();
     }
     listener->onTransferHead(head.makeResponse(static_cast<int>(status)));
+}
+
+// On a kept connection something may have arrived since the last answer: whatever it is, it would
+// be taken for the answer to this request. libcurl looks at that only since late versions.
+bool Transfer::canUseConnection(int ownPort) {
+    long connectionsMade = 0;
+    curl_easy_getinfo(easy.get(), CURLINFO_NUM_CONNECTS, &connectionsMade);
+    needsNewConnection = connectionsMade == 0 && transport->getSockets().hasArrivals(ownPort);
+    return !needsNewConnection;
+}
+
+bool Transfer::takeNewConnection() {
+    const bool needed = needsNewConnection;
+    if (needed) {
+        needsNewConnection = false;
+        kdLogMessage("Network: there is something unasked on a kept connection, taking a new one");
+        curl_easy_setopt(easy.get(), CURLOPT_FRESH_CONNECT, 1L);
+    }
+    return needed;
+}
+
+int Transfer::onConnection(void* self, char*, char*, int, int ownPort) {
+    return static_cast<Transfer*>(self)->canUseConnection(ownPort) ? CURL_PREREQFUNC_OK
+                                                                   : CURL_PREREQFUNC_ABORT;
 }
 
 std::size_t Transfer::onRead(char* data, std::size_t size, std::size_t count, void* self) {

@@ -54,6 +54,12 @@ class Transfer : public boost::enable_shared_from_this<Transfer> {
 
     bool hasExpired() const { return watchdog.hasExpired(); }
 
+    /**
+     * True, once, when the transfer was given up before anything was sent because of what waited on
+     * the kept connection. It can be started again then, and will make a connection of its own.
+     */
+    bool takeNewConnection();
+
     /** Frees the handle, which is in no multi handle any more; tells the listener. */
     void end(int code);
 
@@ -79,8 +85,11 @@ class Transfer : public boost::enable_shared_from_this<Transfer> {
     bool isAnswered() const;
     long getStatus() const;
     void noteProgress();
+    bool canUseConnection(int ownPort);
 
     std::size_t readBody(char* data, std::size_t size);
+    static int onConnection(void* self, char* peerAddress, char* ownAddress, int peerPort,
+                            int ownPort);
     static std::size_t onRead(char* data, std::size_t size, std::size_t count, void* self);
     static int onSeek(void* self, curl_off_t offset, int origin);
     static std::size_t onHeader(char* data, std::size_t size, std::size_t count, void* self);
@@ -101,6 +110,7 @@ class Transfer : public boost::enable_shared_from_this<Transfer> {
     ResponseHead head;
     bool paused = false;
     bool headDelivered = false;
+    bool needsNewConnection = false;
     curl_off_t receivedBytes = 0;
     curl_off_t movedBytes = 0;
 };

@@ -197,8 +197,12 @@ void Transport::check(const boost::shared_ptr<Transfer>& transfer) {
 
 void Transport::finish(Transfers::iterator entry, CURLcode result) {
     const boost::shared_ptr<Transfer> transfer = entry->second;
-    const int code = transfer->judge(result);
     curl_multi_remove_handle(multi.get(), entry->first);
+    if (transfer->takeNewConnection() &&
+        curl_multi_add_handle(multi.get(), entry->first) == CURLM_OK) {
+        return;
+    }
+    const int code = transfer->judge(result);
     transfers.erase(entry);
     transfer->end(code);
 }

@@ -13,6 +13,8 @@
 #include <thread>
 #include <vector>
 
+#include "network/OpenSockets.h"
+
 namespace Network {
 
 class Transfer;
@@ -57,6 +59,9 @@ class Transport : public boost::enable_shared_from_this<Transport> {
     /** Takes back a handle, to be used again. Network thread only. */
     void giveBack(CURL* handle);
 
+    /** Network thread only. */
+    OpenSockets& getSockets() { return sockets; }
+
     /** Network thread only; a transfer that is over or was never started is accepted. */
     void abandon(const boost::shared_ptr<Transfer>& transfer);
 
@@ -87,7 +92,8 @@ class Transport : public boost::enable_shared_from_this<Transport> {
 
     std::atomic<bool> stopping{false};
 
-    // Network thread.
+    // Network thread. The sockets are the last to go.
+    OpenSockets sockets;
     std::unique_ptr<CURLM, MultiDeleter> multi;
     std::unique_ptr<CURL, EasyDeleter> spareHandle;
     Transfers transfers;

@@ -1,0 +1,64 @@
+#include "network/OpenSockets.h"
+
+#include <netinet/in.h>
+#include <poll.h>
+#include <sys/socket.h>
+#include <unistd.h>
+
+#include <algorithm>
+
+namespace Network {
+
+namespace {
+
+/** The port that a socket is bound to, 0 for none. */
+int getOwnPort(curl_socket_t socket) {
+    sockaddr_storage address{};
+    socklen_t length = sizeof(address);
+    if (::getsockname(socket, reinterpret_cast<sockaddr*>(&address), &length) != 0) {
+        return 0;
+    }
+    if (address.ss_family == AF_INET6) {
+        return ntohs(reinterpret_cast<const sockaddr_in6*>(&address)->sin6_port);
+    }
+    return address.ss_family == AF_INET
+               ? ntohs(reinterpret_cast<const sockaddr_in*>(&address)->sin_port)
+               : 0;
+}
+
+}  // namespace
+
+void OpenSockets::attach(CURL* handle) {
+    curl_easy_setopt(handle, CURLOPT_OPENSOCKETFUNCTION, &OpenSockets::onOpen);
+    curl_easy_setopt(handle, CURLOPT_OPENSOCKETDATA, this);
+    curl_easy_setopt(handle, CURLOPT_CLOSESOCKETFUNCTION, &OpenSockets::onClose);
+    curl_easy_setopt(handle, CURLOPT_CLOSESOCKETDATA, this);
+}
+
+bool OpenSockets::hasArrivals(int ownPort) const {
+    const auto found = std::find_if(
+        sockets.begin(), sockets.end(),
+        [ownPort](curl_socket_t socket) { return ownPort > 0 && getOwnPort(socket) == ownPort; });
+    if (found == sockets.end()) {
+        return false;
+    }
+    pollfd entry{*found, POLLIN, 0};
+    return ::poll(&entry, 1, 0) > 0;
+}
+
+curl_socket_t OpenSockets::onOpen(void* self, curlsocktype, curl_sockaddr* address) {
+    const curl_socket_t socket =
+        ::socket(address->family, address->socktype | SOCK_CLOEXEC, address->protocol);
+    if (socket >= 0) {
+        static_cast<OpenSockets*>(self)->sockets.insert(socket);
+        return socket;
+    }
+    return CURL_SOCKET_BAD;
+}
+
+int OpenSockets::onClose(void* self, curl_socket_t socket) {
+    static_cast<OpenSockets*>(self)->sockets.erase(socket);
+    return ::close(socket);
+}
+
+}  // namespace Network
