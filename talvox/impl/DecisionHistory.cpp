@@ -30,6 +30,7 @@ void DecisionHistory::resize(std::size_t newLength) {
     words.swap(resized);
     length = newLength;
     oldest = 0;
+    decided = decided > 0 ? length : 0;
 }
 
 void DecisionHistory::push(bool decision) {
@@ -37,6 +38,7 @@ void DecisionHistory::push(bool decision) {
         return;
     }
     assignBit(words, oldest, decision);
+    decided = std::min(decided + 1, length);
     oldest = oldest + 1 == length ? 0 : oldest + 1;
 }
 
@@ -47,7 +49,7 @@ bool DecisionHistory::at(std::size_t index) const {
 }
 
 std::size_t DecisionHistory::countNewest(std::size_t count) const {
-    const std::size_t span = std::min(count, length);
+    const std::size_t span = std::min(count, decided);
     // The newest decision stands before the oldest one, in a circle.
     if (span <= oldest) {
         return countStored(oldest - span, oldest);

@@ -13,7 +13,8 @@ namespace Talvox {
 
 /**
  * A fixed number of bits; each new one pushes out the oldest. Pushing costs the same whatever the
- * length, so that an absurdly long history does not slow a session down.
+ * length, and counting looks at no more than was pushed, so that an absurdly long history does not
+ * slow a session down.
  */
 class DecisionHistory {
   public:
@@ -41,6 +42,8 @@ class DecisionHistory {
     std::vector<uint64_t> words;
     std::size_t length = 0;
     std::size_t oldest = 0;
+    /** How many of the newest may be true; those before them have never been set. */
+    std::size_t decided = 0;
 };
 
 }  // namespace Talvox

@@ -88,4 +88,20 @@ TEST(DecisionHistory, CountsTheNewestOfAnyLengthAtAnyTurn) {
     }
 }
 
+TEST(DecisionHistory, CountsWhatIsLeftAfterAChangeOfLength) {
+    DecisionHistory history = makeHistory("0110");
+    history.push(true);
+    history.resize(100);
+    EXPECT_EQ(3U, history.countNewest(100));
+    EXPECT_EQ(0U, history.countNewest(96));
+    history.push(true);
+    EXPECT_EQ(3U, history.countNewest(100));
+    EXPECT_EQ(1U, history.countNewest(1));
+    history.resize(2);
+    EXPECT_EQ(1U, history.countNewest(2));
+    history.resize(0);
+    history.resize(3);
+    EXPECT_EQ(0U, history.countNewest(3));
+}
+
 }  // namespace
