@@ -158,8 +158,7 @@ class NetworkFixture : public ::testing::Test {
     static boost::shared_ptr<RecordingTask> makeUpload(const std::string& url,
                                                        const std::string& body) {
         return boost::make_shared<RecordingTask>([url, body] {
-            const auto request =
-                Network::HttpRequest::create(url, "POST", REQUEST_TIMEOUT_MS, false);
+            auto request = Network::HttpRequest::create(url, "POST", REQUEST_TIMEOUT_MS, false);
             request->setBody("BOUNDARY", body);
             return request;
         });
@@ -168,8 +167,7 @@ class NetworkFixture : public ::testing::Test {
     static boost::shared_ptr<RecordingTask> makeStream(
         const std::string& url, const boost::shared_ptr<Network::NetworkTaskWriter>& writer) {
         return boost::make_shared<RecordingTask>([url, writer] {
-            const auto request =
-                Network::HttpRequest::create(url, "POST", REQUEST_TIMEOUT_MS, false);
+            auto request = Network::HttpRequest::create(url, "POST", REQUEST_TIMEOUT_MS, false);
             request->setChunked(true);
             request->setWriter(writer);
             return request;

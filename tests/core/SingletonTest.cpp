@@ -55,6 +55,7 @@ TEST_F(Singleton, IsMadeOnceAndKept) {
 TEST_F(Singleton, IsMadeOnceForAllThreads) {
     std::vector<First*> seen(4);
     std::vector<std::thread> threads;
+    threads.reserve(seen.size());
     for (First*& one : seen) {
         threads.emplace_back([&one] { one = &First::instance(); });
     }

@@ -113,8 +113,7 @@ class SoakTest : public CloudTest::EngineTest {
     }
 
     Answer makeAnswer(Course course) const {
-        const Answer own =
-            CloudTest::answerDocument(CloudTest::makeDocument({{getOwnWords(), "0.95"}}));
+        Answer own = CloudTest::answerDocument(CloudTest::makeDocument({{getOwnWords(), "0.95"}}));
         switch (course) {
             case Course::SLOW:
                 return own.inPieces(100);
