@@ -28,9 +28,10 @@ class KORVEL_CORE_API NetworkManager : public Util::Singleton<NetworkManager> {
 
     /**
      * Ends all transfers and the network thread; bounded, whatever the peers do. Their tasks end
-     * with `NO_RESPONSE` and without a retry. The event lock, under which singletons are deleted,
-     * is lent to the network thread meanwhile. Must not happen inside a callback of a task that
-     * runs on the network thread.
+     * with `NO_RESPONSE` and without a retry; at the end of the process they hear nothing. The
+     * event lock, under which singletons are deleted, is lent to the network thread meanwhile. Must
+     * not happen inside a callback of a task that runs on the network thread, unless that callback
+     * ends the process.
      */
     ~NetworkManager() override;
 
