@@ -14,8 +14,8 @@
 namespace Tasking {
 
 /**
- * Runs tasks on the platform layer's workers. All operations take the event lock. The process cannot
- * end while a task runs, so that tasks are to be short.
+ * Runs tasks on the platform layer's workers. All operations take the event lock. The process
+ * cannot end while a task runs, so that tasks are to be short.
  */
 class KORVEL_CORE_API TaskManager : public Util::Singleton<TaskManager> {
   public:
