@@ -67,4 +67,9 @@ public class EndOfProcessTest {
     public void exitsWhileItRecords() throws Exception {
         assertEquals(EndingProgram.EXIT_STATUS, run("exit"));
     }
+
+    @Test
+    public void exitsWhileTheMicrophoneHangs() throws Exception {
+        assertEquals(EndingProgram.EXIT_STATUS, run("hang"));
+    }
 }
