@@ -44,12 +44,14 @@ class Transcript : public Gateway::MultipartListener {
         require(!isInPart, "parts do not overlap");
         require(!part.name.empty(), "a part has a name");
         isInPart = true;
+        contents.emplace_back();
         text += "\n[" + part.name + "|" + part.contentType + "]";
         return part.name == "refused" ? "a refused part" : "";
     }
     std::string onPartData(const char* data, std::size_t size) override {
         require(isInPart && size > 0, "data belongs to a part");
         text.append(data, std::min(size, bytesLeft));
+        contents.back().append(data, size);
         const bool isTooMuch = size > bytesLeft;
         bytesLeft -= std::min(size, bytesLeft);
         return isTooMuch ? "too much data" : "";
@@ -62,11 +64,26 @@ class Transcript : public Gateway::MultipartListener {
     }
 
     std::string text;
+    std::vector<std::string> contents;
 
   private:
     std::size_t bytesLeft;
     bool isInPart = false;
 };
+
+/** What stands in the parts of a body that is known to be whole. */
+std::vector<std::string> readContents(const std::string& boundary, const std::string& body) {
+    const std::string delimiter = "\r\n--" + boundary;
+    const std::string text = "\r\n" + body;
+    std::vector<std::string> contents;
+    for (std::size_t at = delimiter.size(); text.compare(at, 2, "\r\n") == 0;) {
+        const std::size_t begin = text.find("\r\n\r\n", at) + 4;
+        const std::size_t end = text.find(delimiter, begin);
+        contents.push_back(text.substr(begin, end - begin));
+        at = end + delimiter.size();
+    }
+    return contents;
+}
 
 std::string parse(const std::string& boundary, const std::string& body, Cut cut) {
     Transcript transcript(500);
@@ -78,6 +95,8 @@ std::string parse(const std::string& boundary, const std::string& body, Cut cut)
     }
     const bool isComplete = parser.finish();
     require(isComplete == parser.getError().empty(), "what is not complete has an error");
+    require(!isComplete || transcript.contents == readContents(boundary, body),
+            "parts hold what stands between the boundaries");
     return transcript.text + "\n" + parser.getError();
 }
 

@@ -2,6 +2,7 @@
 #include "talvox/Settings.h"
 
 #include <algorithm>
+#include <cmath>
 #include <initializer_list>
 #include <string>
 
@@ -79,6 +80,23 @@ bool isPlain(const std::string& text) {
     return !hasMarkup && !hasControls && !hasLooseBlanks;
 }
 
+/** Floats are written with six digits. */
+bool isClose(float left, float right) {
+    return std::fabs(left - right) <= std::fabs(left) * 1e-5F + 1e-44F;
+}
+
+bool isSameValue(const Settings::Elem& left, const Settings::Elem& right) {
+    switch (left.type) {
+        case Settings::FLOAT:
+            return isClose(left.asFloat(), right.asFloat());
+        case Settings::LATLON:
+            return isClose(left.latLon.lat, right.latLon.lat) &&
+                   isClose(left.latLon.lon, right.latLon.lon);
+        default:
+            return left.scalar == right.scalar && left.text == right.text;
+    }
+}
+
 void requireSameAfterReading(const Settings& settings) {
     for (const std::string& key : settings.getKeys()) {
         if (settings.getType(key) == Settings::STRING && !isPlain(settings.getString(key))) {
@@ -89,7 +107,11 @@ void requireSameAfterReading(const Settings& settings) {
     Settings read;
     read.updateFromXml("<startup><features>" + written + "</features></startup>",
                        Settings::XML_PATH_DFLT, Settings::bundleSpecs);
-    require(read.toXmlString("voice") == written, "what was written is read as it was");
+    require(read.toXmlString("voice") == written, "what was read is written as it was");
+    for (const std::string& key : settings.getKeys()) {
+        require(isSameValue(settings.get(key), read.get(key)),
+                "what was written is read as it was");
+    }
 }
 
 }  // namespace
