@@ -235,6 +235,18 @@ TEST_F(NetworkTaskTest, RefusesUrlsThatCouldSplitTheRequest) {
     EXPECT_EQ(0U, server.getConnectionCount());
 }
 
+TEST_F(NetworkTaskTest, RefusesUrlsThatWouldNotBeSentAsTheyStand) {
+    const std::string host = server.getUrl().substr(7);
+    for (const std::string& url :
+         {"http://user:password@" + host, "http://@" + host, "http:///user@" + host,
+          "http://" + host + "/?uuid=a#b", "http://" + host + "#", "http://a\\@" + host,
+          "http://a%0d%0aX-Injected:@" + host}) {
+        EXPECT_NE("finished 200", run(makeTask(url))) << url;
+    }
+    EXPECT_EQ(0U, server.getConnectionCount());
+    EXPECT_EQ("finished 200", run(makeTask("http://" + host + "/a@b?c=d@e")));
+}
+
 TEST_F(NetworkTaskTest, RefusesOtherSchemesAndTextThatIsNoUrl) {
     for (const char* const url : {"ftp://127.0.0.1/", "file:///etc/hostname", "127.0.0.1", "",
                                   "http://", "http://[::1", "http://127.0.0.1:99999/"}) {
