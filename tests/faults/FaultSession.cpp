@@ -4,6 +4,7 @@
 #include <boost/make_shared.hpp>
 #include <boost/weak_ptr.hpp>
 #include <cstdio>
+#include <future>
 #include <utility>
 
 #include "Stillness.h"
@@ -39,6 +40,15 @@ std::string inSeconds(int64_t ms) {
     return seconds;
 }
 
+/** The event thread and the workers are started by the first who needs them. */
+void startThreadsThatStay() {
+    std::promise<void> done;
+    kdQueueWorkKOR([](void*) {},
+                   [](void* user) { static_cast<std::promise<void>*>(user)->set_value(); }, &done);
+    done.get_future().wait();
+    kdDrainEventsKOR();
+}
+
 std::size_t countAttempts(const TestSupport::LogCapture& log) {
     const std::vector<std::string> messages = log.messages();
     return static_cast<std::size_t>(
@@ -62,10 +72,8 @@ TestSupport::Samples makeUtterance(int sentences) {
 }
 
 FaultSession::FaultSession() {
-    // The event thread is started by the first who needs it and stays.
-    kdPostKOR([](void*) {}, nullptr);
-    kdDrainEventsKOR();
-    before = LiveCounts::now();
+    startThreadsThatStay();
+    countsBefore = LiveCounts::now();
     server = std::make_unique<TestSupport::ScriptedHttpServer>();
     log = std::make_unique<TestSupport::LogCapture>();
     server->setDefaultAnswer(CloudTest::answerGoForward());
@@ -89,7 +97,7 @@ void FaultSession::TearDown() {
     log.reset();
     // One was there before, without its thread.
     Network::NetworkManager::getInstance();
-    EXPECT_EQ(before, waitForCounts(before));
+    EXPECT_EQ(countsBefore, waitForCounts(countsBefore));
 }
 
 void FaultSession::setChunked(bool chunked) {
@@ -103,7 +111,8 @@ void FaultSession::start() {
     attemptsBefore = countAttempts(*log);
     requestsBefore = server->getRequestCount();
     events = boost::make_shared<CloudTest::EventRecorder>();
-    session = engine().createRecognizer(events, boost::make_shared<Settings>());
+    session = engine().createRecognizer(
+        events, recognizerSettings ? recognizerSettings : boost::make_shared<Settings>());
     session->start();
     rest();
 }

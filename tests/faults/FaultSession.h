@@ -75,6 +75,8 @@ class FaultSession : public CloudTest::EngineTest {
     std::unique_ptr<TestSupport::LogCapture> log;
     boost::shared_ptr<CloudTest::EventRecorder> events;
     boost::shared_ptr<Talvox::Recognizer> session;
+    /** The recognizer's own; the engine's are `configure`d. */
+    boost::shared_ptr<Talvox::Settings> recognizerSettings;
     TestSupport::Samples sound = makeUtterance();
     /** Called at the end of each step. */
     std::function<void()> onStep;
@@ -83,7 +85,7 @@ class FaultSession : public CloudTest::EngineTest {
     void deliverNext();
     Course describe() const;
 
-    LiveCounts before;
+    LiveCounts countsBefore;
     int64_t elapsed = 0;
     std::size_t attemptsBefore = 0;
     std::size_t requestsBefore = 0;

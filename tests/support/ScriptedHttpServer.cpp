@@ -401,17 +401,28 @@ void ScriptedHttpServer::resetConnections(std::size_t count) {
     toReset = count;
 }
 
+// Their threads find the end of what they read, and close.
+void ScriptedHttpServer::resetAll() {
+    for (const auto& entry : peers) {
+        resetOnClose(entry.second.socket);
+        ::shutdown(entry.second.socket, SHUT_RD);
+    }
+    changed.notify_all();
+}
+
+void ScriptedHttpServer::dropConnections() {
+    const std::lock_guard<std::mutex> lock(mutex);
+    ++activity;
+    resetAll();
+}
+
 void ScriptedHttpServer::goAway() {
     const std::lock_guard<std::mutex> lock(mutex);
     away = true;
     ++activity;
     // A listening socket is bound for good, but listens no longer.
     ::shutdown(listener, SHUT_RDWR);
-    for (const auto& entry : peers) {
-        resetOnClose(entry.second.socket);
-        ::shutdown(entry.second.socket, SHUT_RD);
-    }
-    changed.notify_all();
+    resetAll();
 }
 
 void ScriptedHttpServer::comeBack() {

@@ -117,6 +117,9 @@ class ScriptedHttpServer {
     /** Resets each of the next `count` connections as soon as it is there. */
     void resetConnections(std::size_t count);
 
+    /** Resets the connections that are open; new ones are welcome. */
+    void dropConnections();
+
     /** Resets all connections and refuses new ones until `comeBack`; the port stays taken. */
     void goAway();
     void comeBack();
@@ -177,6 +180,7 @@ class ScriptedHttpServer {
     void changeRequest(std::size_t index, Change change);
     bool waitForRelease(std::size_t connection);
     bool isQuiet(const Peer& peer) const;
+    void resetAll();
     template <typename Condition>
     bool waitUntil(std::chrono::milliseconds timeout, Condition condition) const;
 
