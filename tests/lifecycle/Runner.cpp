@@ -1,5 +1,6 @@
 #include "Runner.h"
 
+#include <csignal>
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
@@ -25,12 +26,16 @@ void writeCommand(std::ostream& out, std::uint64_t seed) {
     out << "repeat: build/PRESET/tests/tests_lifecycle --seed " << seed << " --sequences 1\n";
 }
 
-/** A sanitizer ends the process: the seed must be told before. */
+/** The process ends: the seed must be told before. */
 void tellSeed() {
     std::fprintf(stderr,
                  "lifecycle: died in the sequence of seed %llu (--seed %llu --sequences 1)\n",
                  static_cast<unsigned long long>(seedThatRuns),
                  static_cast<unsigned long long>(seedThatRuns));
+}
+
+void onAbort(int /*signal*/) {
+    tellSeed();
 }
 
 void ignoreLog(const char* /*message*/, void* /*user*/) {}
@@ -96,6 +101,7 @@ std::string run(World& world, const Range& range) {
 #ifdef LIFECYCLE_TELLS_SEED_AT_DEATH
     __sanitizer_set_death_callback(&tellSeed);
 #endif
+    std::signal(SIGABRT, &onAbort);
     kdSetLogSinkKOR(&ignoreLog, nullptr);
     std::string found;
     for (std::uint64_t i = 0; i < range.count && found.empty(); ++i) {
@@ -107,6 +113,7 @@ std::string run(World& world, const Range& range) {
         }
     }
     kdSetLogSinkKOR(nullptr, nullptr);
+    std::signal(SIGABRT, SIG_DFL);
     return found;
 }
 

@@ -7,10 +7,10 @@
 #include <array>
 #include <boost/shared_ptr.hpp>
 #include <cstdint>
-#include <iosfwd>
 #include <map>
 #include <memory>
 #include <optional>
+#include <ostream>
 #include <string>
 #include <vector>
 
@@ -28,6 +28,8 @@ namespace Lifecycle {
 /** Runs sequences, one after the other. One at a time; the main thread is the application's. */
 class World : public GatewayObserver, public SessionHost, public DeviceHost {
   public:
+    static constexpr int64_t CLOCK_START_MS = 1000000;
+
     World();
     ~World() override;
     World(const World&) = delete;
@@ -85,7 +87,12 @@ class World : public GatewayObserver, public SessionHost, public DeviceHost {
     Session* find(int index);
     bool isAnyActive() const;
     template <typename... Parts>
-    void note(const Parts&... parts);
+    void note(const Parts&... parts) {
+        if (out != nullptr) {
+            *out << now() - CLOCK_START_MS << " ";
+            (*out << ... << parts) << "\n";
+        }
+    }
 
     TestSupport::AssertCapture asserts;
     std::vector<boost::shared_ptr<Talvox::Settings>> settings;
