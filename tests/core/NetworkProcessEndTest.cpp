@@ -39,11 +39,13 @@ void logEvents(const RecordingTask& task) {
 TEST_F(NetworkProcessEndDeathTest, SilencesTheTasksThatRun) {
     EXPECT_EXIT(
         {
-            server.setDefaultAnswer(Answer::never());
-            const auto task = makeTask(server.getUrl());
+            // Ends, with its threads, after the network thread.
+            static TestSupport::ScriptedHttpServer peer;
+            peer.setDefaultAnswer(Answer::never());
+            const auto task = makeTask(peer.getUrl());
             static const AtItsEnd last([task] { logEvents(*task); });
             holder.submit(task, retry(0, 10));
-            server.waitForRequest(1);
+            peer.waitForRequest(1);
             std::exit(0);
         },
         CLEANLY, "events: ready\\? issue\n$");
@@ -52,17 +54,19 @@ TEST_F(NetworkProcessEndDeathTest, SilencesTheTasksThatRun) {
 TEST_F(NetworkProcessEndDeathTest, SilencesAnAnswerThatComesAfterTheEndOfDeliveries) {
     EXPECT_EXIT(
         {
-            server.setDefaultAnswer(
+            // Ends, with its threads, after the network thread.
+            static TestSupport::ScriptedHttpServer peer;
+            peer.setDefaultAnswer(
                 Answer::raw("HTTP/1.1 200 OK\r\n\r\nuntil the end").thenClose().held());
-            const auto task = makeTask(server.getUrl());
+            const auto task = makeTask(peer.getUrl());
             static const AtItsEnd last([task] { logEvents(*task); });
             holder.submit(task, retry(0, 10));
-            server.waitForRequest(1);
+            peer.waitForRequest(1);
             // While the network thread runs, but deliveries have ended. The connection is closed
             // when the client has read all.
-            static const AtItsEnd first([this] {
-                server.release();
-                kdLogMessage(server.waitForClosed(1) ? "all was read" : "too late");
+            static const AtItsEnd first([] {
+                peer.release();
+                kdLogMessage(peer.waitForClosed(1) ? "all was read" : "too late");
             });
             kdEndEventsFirstKOR();
             std::exit(0);
