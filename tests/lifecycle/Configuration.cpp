@@ -61,7 +61,7 @@ boost::shared_ptr<Settings> makeSessionSettings(const SessionPlan& plan, int ind
         &Settings::LOG_DISABLED, &Settings::LOG_WITH_SOUND_ALWAYS,
         &Settings::LOG_WITH_SOUND_IF_WIFI, &Settings::LOG_WITHOUT_SOUND_ALWAYS};
     static const auto base = boost::make_shared<Settings>();
-    const boost::shared_ptr<Settings> own = base->clone();
+    boost::shared_ptr<Settings> own = base->clone();
     own->putString(Settings::RS_SESSION_ID, ScriptedGateway::makeSessionId(index));
     if (plan.kind == Kind::STAND_IN) {
         own->putString(Settings::RS_ASR_POLICY, Settings::ASRP_DISABLED);

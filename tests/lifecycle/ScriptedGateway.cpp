@@ -18,7 +18,7 @@ namespace {
 const int64_t NS_PER_MS = 1000000;
 const int64_t NEVER = std::numeric_limits<int64_t>::max();
 const int64_t PAUSE_AFTER_HEAD_NS = 100 * NS_PER_MS;
-const std::size_t TOO_MANY_BYTES = 2 * 1024 * 1024;
+const std::size_t TOO_MANY_BYTES = std::size_t{2} * 1024 * 1024;
 
 const int STATUS_OK = 200;
 const int STATUS_REFUSAL = 404;
