@@ -150,7 +150,7 @@ Course FaultSession::finish() {
     while (events->countEnds() == 0 && elapsed < LONGEST_SESSION_MS) {
         step();
     }
-    const Course course = describe();
+    Course course = describe();
     EXPECT_TRUE(isEngineFree());
     advanceMs(LONGEST_SESSION_MS);
     rest();

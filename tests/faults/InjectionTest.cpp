@@ -17,6 +17,7 @@ using Names = std::vector<std::string>;
 const std::string SEPARATOR = "--1BEF0A57BE110FD467A";
 /** Of a body: uuid, lang, topic, myll, centerll, Content-Type and audio. */
 constexpr std::size_t PARTS = 7;
+constexpr std::size_t LONG_TEXT = 102400;
 const std::string REFUSAL = "Network: a request cannot be sent: ";
 
 /** Texts that would do harm if they went into the head of a request as they are. */
@@ -39,8 +40,8 @@ std::vector<std::string> makeHostileTexts() {
             "?a=1&uuid=2#/../..//\\",
             "\r\n--1BEF0A57BE110FD467A\r\nContent-Disposition: form-data; name=\"evil\"\r\n\r\n1",
             "\"; name=\"evil",
-            std::string(100 * 1024, 'a'),
-            std::string(100 * 1024, '\n')};
+            std::string(LONG_TEXT, 'a'),
+            std::string(LONG_TEXT, '\n')};
 }
 
 /** What cannot be in an address. */

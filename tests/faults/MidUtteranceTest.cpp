@@ -113,6 +113,16 @@ TEST_F(MidUtteranceTest, LostRightAfterTheEndOfSpeechItIsSentAgainFromTheFirstFr
     EXPECT_TRUE(server->getRequest(0).complete);
 }
 
+// An end in good order shows with one of the next two pieces of sound: when exactly, is libcurl's.
+TEST_F(MidUtteranceTest, ClosedInGoodOrderItIsSentAgainFromTheFirstFrame) {
+    server->script({Answer::closing().afterBodyBytes(40000)});
+    const Course course = run();
+    expectWholeSound(course);
+    EXPECT_EQ(2U, course.requests);
+    EXPECT_GE(course.endMs, 3300);
+    EXPECT_LE(course.endMs, 3600);
+}
+
 TEST_F(MidUtteranceTest, WhatIsSaidInThePauseIsSentAsWell) {
     cutAt(700);
     start();
