@@ -271,6 +271,24 @@ TEST_F(PulseRecorderWithoutServer, RecordersThatAreGoneReportNothing) {
     EXPECT_EQ(listener->getErrorCount(), 0);
 }
 
+TEST_F(PulseRecorderWithoutServer, ProcessMayEndWhileAudioThreadsEnd) {
+    GTEST_FLAG_SET(death_test_style, "threadsafe");
+    for (int i = 0; i < 5; ++i) {
+        EXPECT_EXIT(
+            {
+                // One of them at least is between its last step and its end when the process ends.
+                for (int n = 0; n < 50; ++n) {
+                    make();
+                    init();
+                }
+                alarm(20);
+                std::filesystem::remove_all(directory.path(""));
+                std::exit(0);
+            },
+            ::testing::ExitedWithCode(0), "");
+    }
+}
+
 // With a server that accepts the connection and never says a word.
 
 class PulseRecorderWithMuteServer : public PulseRecorderTest {

@@ -8,7 +8,6 @@
 #include <mutex>
 #include <system_error>
 #include <thread>
-#include <utility>
 #include <vector>
 
 #include "pal/SignalsBlocked.h"
@@ -39,9 +38,11 @@ Running& running() {
 void runCapture(const boost::shared_ptr<PulseCapture>& capture) {
     pthread_setname_np(pthread_self(), AudioThreads::NAME);
     capture->run();
-    std::unique_lock<std::mutex> lock(running().mutex);
+    // Not at the thread's very end: the C++ library forgets such duties, and keeps the lock, when
+    // the process ends first.
+    const std::lock_guard<std::mutex> lock(running().mutex);
     running().remove(capture);
-    std::notify_all_at_thread_exit(running().changed, std::move(lock));
+    running().changed.notify_all();
 }
 
 }  // namespace
