@@ -1,5 +1,7 @@
 #include "event_loop.h"
 
+#include <pthread.h>
+
 #include <chrono>
 #include <cstdlib>
 
@@ -115,6 +117,10 @@ bool EventLoop::start() {
 }
 
 void EventLoop::run() {
+#if defined(__linux__)
+    // Else it would bear the name of whichever thread was the first to post.
+    pthread_setname_np(pthread_self(), "talvox-events");
+#endif
     uv_run(&loop, UV_RUN_DEFAULT);
     uv_loop_close(&loop);
     const std::lock_guard<std::mutex> lock(mutex);

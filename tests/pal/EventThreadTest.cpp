@@ -1,7 +1,9 @@
 #include <gmock/gmock.h>
+#include <pthread.h>
 
 #include <functional>
 #include <future>
+#include <string>
 #include <thread>
 #include <vector>
 
@@ -19,6 +21,13 @@ void post(std::function<void()> function) {
             delete call;
         },
         new std::function<void()>(std::move(function)));
+}
+
+TEST(EventThread, BearsItsOwnName) {
+    std::string name(16, '\0');
+    post([&] { pthread_getname_np(pthread_self(), name.data(), name.size()); });
+    EXPECT_EQ(kdDrainEventsKOR(), 0);
+    EXPECT_STREQ(name.c_str(), "talvox-events");
 }
 
 TEST(EventThread, RunsPostsInOrderOnOneThreadUnderTheLock) {
