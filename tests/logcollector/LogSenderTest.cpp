@@ -4,6 +4,7 @@
 
 #include "LogFixture.h"
 #include "core/network/NetworkManager.h"
+#include "core/util/EventLock.h"
 #include "logcollector/impl/LogCollectorNetworkTask.h"
 
 using LogCollector::LogSender;
@@ -25,7 +26,9 @@ class LogSenderTest : public LogFixture {
     }
     ~LogSenderTest() override { sender.reset(); }
 
+    /** In one go: until the last is there, none is found to have been the last one. */
     void send(const std::vector<std::string>& texts) {
+        const Util::EventLock lock;
         for (const std::string& text : texts) {
             sender->sendLogRecord(text);
         }
