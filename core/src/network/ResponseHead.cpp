@@ -15,9 +15,9 @@ bool ResponseHead::hasRoom(std::size_t size) const {
     return size <= MOST_BYTES - bytes;
 }
 
-bool ResponseHead::addLine(const std::string& line) {
+bool ResponseHead::addLine(std::string_view line) {
     bytes += line.size();
-    const std::string text = line.substr(0, line.find_last_not_of("\r\n") + 1);
+    const std::string_view text = line.substr(0, line.find_last_not_of("\r\n") + 1);
     if (text.empty()) {
         return true;
     }

@@ -3,6 +3,7 @@
 #include <boost/shared_ptr.hpp>
 #include <cstddef>
 #include <string>
+#include <string_view>
 #include <utility>
 #include <vector>
 
@@ -17,7 +18,7 @@ class ResponseHead {
     bool hasRoom(std::size_t size) const;
 
     /** Takes the next line, with its end. @return true when it was the empty line */
-    bool addLine(const std::string& line);
+    bool addLine(std::string_view line);
 
     bool has(const std::string& name) const;
 

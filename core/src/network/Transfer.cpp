@@ -2,6 +2,7 @@
 
 #include <boost/weak_ptr.hpp>
 #include <limits>
+#include <string_view>
 #include <utility>
 
 #include "core/network/NetworkTask.h"
@@ -282,7 +283,7 @@ std::size_t Transfer::onHeader(char* data, std::size_t size, std::size_t count, 
         kdLogMessage("Network: the head of a response is too large");
         return 0;
     }
-    if (transfer.head.addLine(std::string(data, bytes))) {
+    if (transfer.head.addLine(std::string_view(data, bytes))) {
         transfer.handleHeadEnd();
     }
     return bytes;

@@ -28,18 +28,20 @@ int hexValue(char c) {
 }  // namespace
 
 std::string UrlCoder::urlEncodeString(const std::string& text) {
-    std::string encoded;
-    encoded.reserve(text.size());
+    // Most of what a usage record costs besides its request: so not one character at a time.
+    std::string encoded(text.size() * 3, '\0');
+    auto end = encoded.begin();
     for (const char c : text) {
         if (isUnreserved(c)) {
-            encoded += c;
+            *end++ = c;
         } else {
             const auto byte = static_cast<unsigned char>(c);
-            encoded += '%';
-            encoded += HEX_DIGITS[byte >> 4];
-            encoded += HEX_DIGITS[byte & 0x0F];
+            *end++ = '%';
+            *end++ = HEX_DIGITS[byte >> 4];
+            *end++ = HEX_DIGITS[byte & 0x0F];
         }
     }
+    encoded.erase(end, encoded.end());
     return encoded;
 }
 
