@@ -96,9 +96,12 @@ void WorkQueue::onWork(uv_work_t* request) {
 
 void WorkQueue::onWorkDone(uv_work_t* request, int /*status*/) {
     const EventLockGuard lock;
+    Work& work = *static_cast<Work*>(request->data);
+    // Libuv must not be asked for it any more.
+    work.submitted = false;
     // At the end of the process the owner may be gone already; the entry then stays in the table.
     if (!EventLoop::instance().isStopping()) {
-        instance().finish(static_cast<Work*>(request->data)->handle);
+        instance().finish(work.handle);
     }
 }
 
