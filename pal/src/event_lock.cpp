@@ -40,10 +40,9 @@ KDint kdHoldsEventLockKOR(void) {
 namespace korvel_pal {
 
 // Not a timed mutex: this happens once, and ThreadSanitizer knows the plain one best.
-bool waitForEventLock(std::chrono::nanoseconds limit) {
-    const auto end = std::chrono::steady_clock::now() + limit;
+bool waitForEventLock(std::chrono::steady_clock::time_point limit) {
     while (!eventMutex().try_lock()) {
-        if (std::chrono::steady_clock::now() >= end) {
+        if (std::chrono::steady_clock::now() >= limit) {
             return false;
         }
         std::this_thread::yield();

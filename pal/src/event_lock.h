@@ -14,8 +14,8 @@ class EventLockGuard {
     EventLockGuard& operator=(const EventLockGuard&) = delete;
 };
 
-/** Waits until the event lock is free once, up to `limit`. @return whether it was */
-bool waitForEventLock(std::chrono::nanoseconds limit);
+/** Waits until the event lock is free once, not beyond `limit`. @return whether it was */
+bool waitForEventLock(std::chrono::steady_clock::time_point limit);
 
 /** Gives up all levels of the event lock that the calling thread holds, for its own lifetime. */
 class EventLockRelease {

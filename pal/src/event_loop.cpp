@@ -81,8 +81,9 @@ void EventLoop::stop() {
 }
 
 bool EventLoop::waitForCallbacks() {
+    const auto limit = std::chrono::steady_clock::now() + STOP_LIMIT;
     std::unique_lock<std::mutex> lock(mutex);
-    const bool ended = changed.wait_for(lock, STOP_LIMIT, [this] { return finished || !started; });
+    const bool ended = changed.wait_until(lock, limit, [this] { return finished || !started; });
     lock.unlock();
     if (!ended) {
         thread.detach();
@@ -93,7 +94,7 @@ bool EventLoop::waitForCallbacks() {
         thread.join();
     }
     // Other threads deliver as well, under the lock and only while deliveries have not ended.
-    return waitForEventLock(STOP_LIMIT);
+    return waitForEventLock(limit);
 }
 
 bool EventLoop::start() {

@@ -15,8 +15,8 @@ namespace korvel_pal {
 
 /**
  * The event thread and its queue. Started by the first use, stopped when the process ends; what is
- * asked of it later is dropped. The object itself is never destroyed,
- * because other threads may still call it then.
+ * asked of it later is dropped. The object itself is never destroyed, because other threads may
+ * still call it then.
  */
 class EventLoop {
   public:

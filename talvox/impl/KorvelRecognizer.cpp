@@ -114,18 +114,23 @@ bool KorvelRecognizer::startRecorder(int sampleRateHz) {
     starting->addListener(boost::static_pointer_cast<KorvelRecognizer>(shared_from_this()));
     starting->setBufferLength(BUFFER_LENGTH_MS);
     starting->setSampleRate(sampleRateHz);
-    if (!starting->init()) {
+    const bool works = starting->init();
+    if (isOver()) {
+        return false;
+    }
+    if (!works) {
         recorderRefused = true;
         getEngine()->unregisterRecognizer(this);
         callOnError(SpeechError(SpeechError::ErrorAudio));
         return false;
     }
-    // Starting may report an error at once, which ends the session.
     recorder = starting;
     starting->startRecording();
-    if (isOver()) {
-        // It was stopped before it had started.
+    if (!recorder) {
+        // It failed, or somebody stopped the session, before it had started. Without any sound that
+        // is a failure, too.
         starting->stopRecording();
+        stopWithError(SpeechError(SpeechError::ErrorAudio));
         return false;
     }
     return true;
@@ -314,7 +319,7 @@ void KorvelRecognizer::onProtocolResults(boost::shared_ptr<const RecognitionResu
     // From here on nothing else is the end, not even a recorder that fails while it is stopped.
     resultsReported = true;
     // The service may answer a streamed request before the user has finished.
-    if (recorder) {
+    if (recorder || watchdog) {
         stopListening();
     }
     tvLogFormatMessage(LOG_LEVEL, "Request %s finished in %d msec", requestId.c_str(),

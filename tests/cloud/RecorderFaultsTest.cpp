@@ -88,6 +88,36 @@ TEST_F(RecorderFaultsTest, FailureAtStartEndsTheRecording) {
     expectOneEnd("error ErrorAudio");
 }
 
+TEST_F(RecorderFaultsTest, FailureInsideAnInitThatFails) {
+    prepareRecorder = [](ScriptedRecorder& made) {
+        made.works = false;
+        made.insideInit = [&made] { made.fail(); };
+    };
+    startSession(ENDLESS_SPEECH);
+    EXPECT_EQ(events->texts(), Texts{"error ErrorAudio"});
+    expectOneEnd("error ErrorAudio");
+}
+
+TEST_F(RecorderFaultsTest, CancelInsideInit) {
+    prepareRecorder = [this](ScriptedRecorder& made) {
+        made.insideInit = [this] { session->cancel(); };
+    };
+    startSession(ENDLESS_SPEECH);
+    EXPECT_FALSE(recorder->isRecording());
+    EXPECT_EQ(events->texts(), Texts{"error ErrorCanceled"});
+    expectOneEnd("error ErrorCanceled");
+}
+
+TEST_F(RecorderFaultsTest, StopInsideTheStartOfTheRecorder) {
+    prepareRecorder = [this](ScriptedRecorder& made) {
+        made.insideStart = [this] { session->stop(); };
+    };
+    startSession(ENDLESS_SPEECH);
+    EXPECT_FALSE(recorder->isRecording());
+    EXPECT_EQ(events->texts(), Texts{"error ErrorAudio"});
+    expectOneEnd("error ErrorAudio");
+}
+
 TEST_F(RecorderFaultsTest, EmptyBuffersAreNoSound) {
     startSession(ENDLESS_SPEECH);
     play(500);

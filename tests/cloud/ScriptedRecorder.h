@@ -4,6 +4,8 @@
  */
 #pragma once
 
+#include <functional>
+
 #include "core/sound/Recorder.h"
 #include "core/util/EventLock.h"
 
@@ -14,9 +16,15 @@ class ScriptedRecorder : public Sound::Recorder {
   public:
     bool init() override {
         initialised = true;
+        if (insideInit) {
+            insideInit();
+        }
         return works;
     }
     void startRecording() override {
+        if (insideStart) {
+            insideStart();
+        }
         if (failsAtStart) {
             notifyError();
         }
@@ -46,6 +54,8 @@ class ScriptedRecorder : public Sound::Recorder {
         notifyError();
     }
 
+    std::function<void()> insideInit;
+    std::function<void()> insideStart;
     bool works = true;
     bool failsAtStart = false;
     bool failsWhenStopped = false;

@@ -24,7 +24,7 @@ class CatalogueTest : public FaultSession,
   protected:
     void TearDown() override {
         if (asksNameServer) {
-            ::TearDown::waitForQuestions(static_cast<int>(questions));
+            EXPECT_TRUE(::TearDown::waitForQuestions(static_cast<int>(questions)));
             ::TearDown::answerQuestions();
         }
         FaultSession::TearDown();

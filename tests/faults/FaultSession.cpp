@@ -3,8 +3,10 @@
 #include <algorithm>
 #include <boost/make_shared.hpp>
 #include <boost/weak_ptr.hpp>
+#include <chrono>
 #include <cstdio>
 #include <future>
+#include <memory>
 #include <utility>
 
 #include "Stillness.h"
@@ -20,6 +22,7 @@ using Talvox::Settings;
 namespace {
 
 constexpr int64_t LONGEST_SESSION_MS = 120000;
+constexpr std::chrono::seconds LONGEST_START{30};
 constexpr std::size_t SAMPLES_PER_BUFFER = SAMPLE_RATE_HZ / (1000 / BUFFER_MS);
 
 TestSupport::Samples makeSilence(int milliseconds) {
@@ -42,10 +45,15 @@ std::string inSeconds(int64_t ms) {
 
 /** The event thread and the workers are started by the first who needs them. */
 void startThreadsThatStay() {
-    std::promise<void> done;
-    kdQueueWorkKOR([](void*) {},
-                   [](void* user) { static_cast<std::promise<void>*>(user)->set_value(); }, &done);
-    done.get_future().wait();
+    // Freed by the callback, which may come when nobody waits any more.
+    auto* const done = new std::promise<void>;
+    std::future<void> future = done->get_future();
+    const auto tell = [](void* user) {
+        const std::unique_ptr<std::promise<void>> told(static_cast<std::promise<void>*>(user));
+        told->set_value();
+    };
+    kdQueueWorkKOR([](void*) {}, tell, done);
+    EXPECT_EQ(std::future_status::ready, future.wait_for(LONGEST_START)) << "no worker runs";
     kdDrainEventsKOR();
 }
 

@@ -40,17 +40,17 @@ class BarrierTask : public Network::NetworkTask {
     void onBytesReceived(const std::vector<unsigned char>&) override {}
     void onFinished(int) override { passed.set_value(); }
 
-    void wait() { passed.get_future().wait(); }
+    bool wait() { return passed.get_future().wait_for(LONGEST_WAIT) == std::future_status::ready; }
 
   private:
     std::promise<void> passed;
 };
 
-void passNetworkThread() {
+bool passNetworkThread() {
     const auto barrier = boost::make_shared<BarrierTask>();
     Network::NetworkTaskHolder holder(Network::NetworkTaskHolder::EndThread::NETWORK);
     holder.submitNoRetries(barrier);
-    barrier->wait();
+    return barrier->wait();
 }
 
 unsigned short portOf(int (*ask)(int, sockaddr*, socklen_t*), int descriptor) {
@@ -115,11 +115,12 @@ bool isStill(const ScriptedHttpServer& server) {
     }
     // The two threads give each other work.
     for (int round = 0; round < 2; ++round) {
-        passNetworkThread();
+        if (!passNetworkThread()) {
+            return false;
+        }
         kdDrainEventsKOR();
     }
-    passNetworkThread();
-    return server.isIdle() && areAllSettled(server) && LiveCounts::countTasks() == 0 &&
+    return passNetworkThread() && server.isIdle() && areAllSettled(server) && LiveCounts::countTasks() == 0 &&
            server.getActivity() == before;
 }
 

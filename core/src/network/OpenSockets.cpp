@@ -36,14 +36,11 @@ void OpenSockets::attach(CURL* handle) {
 }
 
 bool OpenSockets::hasArrivals(int ownPort) const {
-    const auto found = std::find_if(
-        sockets.begin(), sockets.end(),
-        [ownPort](curl_socket_t socket) { return ownPort > 0 && getOwnPort(socket) == ownPort; });
-    if (found == sockets.end()) {
-        return false;
-    }
-    pollfd entry{*found, POLLIN, 0};
-    return ::poll(&entry, 1, 0) > 0;
+    // Connections to different hosts may share a port; then one of the others costs a new one.
+    return std::any_of(sockets.begin(), sockets.end(), [ownPort](curl_socket_t socket) {
+        pollfd entry{socket, POLLIN, 0};
+        return ownPort > 0 && getOwnPort(socket) == ownPort && ::poll(&entry, 1, 0) > 0;
+    });
 }
 
 curl_socket_t OpenSockets::onOpen(void* self, curlsocktype, curl_sockaddr* address) {

@@ -76,9 +76,10 @@ void Transport::setCertificateFile(const std::string& path) {
 }
 
 void Transport::stop() {
-    stopping = true;
     {
         const std::lock_guard<std::mutex> lock(mutex);
+        // Not earlier: the thread could end, and free what is woken here.
+        stopping = true;
         if (!thread.joinable()) {
             closed = true;
             return;

@@ -41,7 +41,15 @@ bool ProximityGestureRecognizer::start() {
     seen = false;
     // Set before the source is started, which may tell its state at once.
     listening = true;
+    const unsigned stopsBefore = stopCount;
     const bool started = source && source->start([this](bool isNear) { onSample(isNear); });
+    if (stopCount != stopsBefore) {
+        // The callback has stopped it meanwhile, and may have started it anew.
+        if (!listening && started) {
+            source->stop();
+        }
+        return started || listening;
+    }
     if (!started) {
         listening = false;
         kdLogFormatMessage("ProximityGestureRecognizer: there is no proximity sensor");

@@ -11,11 +11,11 @@
  * A callback may do: start, cancel and free timers (its own included), post, queue work, call any
  * function of this layer. It must not block, and must not let an exception escape.
  *
- * When the process ends, deliveries end first: what existed when the event thread was started, or at
- * the latest call of `kdEndEventsFirstKOR`, still exists when the last callback returns. A callback
- * that runs is waited for (two seconds at most). Calls that come later are harmless and have no
- * effect beyond the handles that they return. The library stays in the process once it is loaded:
- * its threads must never lose the code that they run.
+ * When the process ends, deliveries end first: what existed when the event thread was started, or
+ * at the latest call of `kdEndEventsFirstKOR`, still exists when the last callback returns. A
+ * callback that runs is waited for (two seconds at most). Calls that come later are harmless and
+ * have no effect beyond the handles that they return. The library stays in the process once it is
+ * loaded: its threads must never lose the code that they run.
  */
 #ifndef KORVEL_PAL_KD_EVENT_H
 #define KORVEL_PAL_KD_EVENT_H
@@ -93,8 +93,8 @@ KD_API KDint kdDrainEventsKOR(void);
 
 /**
  * At the end of the process, deliveries are to end before the static objects that exist by now are
- * destroyed. For whoever has static objects that callbacks use; cheap, but not to be called over and
- * over. Any thread.
+ * destroyed. For whoever has static objects that callbacks use; cheap, but not to be called over
+ * and over. Any thread.
  */
 KD_API void kdEndEventsFirstKOR(void);
 
@@ -113,7 +113,8 @@ typedef struct KDWork KDWork;
  * Runs `work(user)` on a worker thread without any lock, then `done(user)` (unless null) on the
  * event thread under the event lock. Work begins in the order of queueing; the number of workers,
  * four unless the environment sets UV_THREADPOOL_SIZE, bounds how much of it runs at a time.
- * `work` may block, but must come to an end: the process cannot end before.
+ * `work` may block, but must come to an end: the process cannot end before. It must not end the
+ * process itself.
  * @return a handle that is valid until `done` is called or the work has been cancelled; null when
  *         `work` is null, which asserts.
  */

@@ -40,9 +40,13 @@ void enterUnlocked(Body body) noexcept {
 /** The same under the event lock. */
 template <typename Body>
 void enter(Body body) noexcept {
-    enterUnlocked([&body](JNIEnv* env) {
+    enterUnlocked([&body](JNIEnv*) {
         const Util::EventLock lock;
-        body(env);
+        // Asked again: the VM is taken away under the lock, perhaps while this thread waited for
+        // it.
+        if (JNIEnv* const env = kdGetJNIEnvKOR()) {
+            body(env);
+        }
     });
 }
 

@@ -154,7 +154,7 @@ void Scene::reachStage() {
         return;
     }
     if (gateway == "name") {
-        waitForQuestions(++questions);
+        require(waitForQuestions(++questions), "the question for the gateway's name");
     } else if (gateway == "real") {
         std::array<char, 512> question{};
         require(::recv(nameServer, question.data(), question.size(), 0) > 0, "a question");

@@ -3,6 +3,7 @@
 #include <dlfcn.h>
 #include <netdb.h>
 
+#include <chrono>
 #include <condition_variable>
 #include <cstring>
 #include <mutex>
@@ -12,6 +13,8 @@ namespace TearDown {
 const char* const SILENT_HOST = "silent.invalid";
 
 namespace {
+
+constexpr std::chrono::seconds LONGEST_WAIT{30};
 
 struct State {
     std::mutex mutex;
@@ -35,9 +38,10 @@ void hang() {
 
 }  // namespace
 
-void waitForQuestions(int count) {
+bool waitForQuestions(int count) {
     std::unique_lock<std::mutex> lock(state().mutex);
-    state().changed.wait(lock, [count] { return state().asked >= count; });
+    return state().changed.wait_for(lock, LONGEST_WAIT,
+                                    [count] { return state().asked >= count; });
 }
 
 void answerQuestions() {

@@ -37,7 +37,9 @@ int main(int argc, char** argv) {
     find<void (*)(const char*)>(plugin, "begin")(url.c_str());
     // Returns when the recorder's thread has opened the other side, from which it then reads.
     const int settings = ::open(argv[2], O_WRONLY | O_CLOEXEC);
-    TearDown::waitForQuestions(1);
+    if (!TearDown::waitForQuestions(1)) {
+        return 1;
+    }
     const std::size_t threads = TestSupport::countThreads();
     find<void (*)()>(plugin, "end")();
     const auto begin = std::chrono::steady_clock::now();

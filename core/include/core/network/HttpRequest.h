@@ -61,9 +61,9 @@ class KORVEL_CORE_API HttpRequest {
     };
 
     /**
-     * @param url       used as it stands. A URL with control characters, blanks, a fragment ("#") or
-     *                  a user name before the host, or of another scheme than http and https, makes
-     *                  the attempt fail without being sent.
+     * @param url       used as it stands. A URL with control characters, blanks, a fragment ("#")
+     * or a user name before the host, or of another scheme than http and https, makes the attempt
+     * fail without being sent.
      * @param method    "GET" or "POST"
      * @param timeoutMs bounds each wait for the peer, on the platform clock: for the connection,
      *                  for taking bytes that are ready, and for the answer after the last of them.

@@ -37,14 +37,17 @@ class KORVEL_CORE_API SingletonStorage {
 
     /**
      * Deletes all singletons now, the newest first, under the event lock; each is made anew at its
-     * next use. For tests and for embedders that unload the library.
+     * next use. For tests, and for embedders that do not need the engine any more.
      */
     static void destroyAll();
 
     /** Has deliveries end before what exists by now; for `Singleton`. */
     static void endEventsFirst();
 
-    /** The end of a singleton's library: as `destroySingleton`, but never waits for ever. */
+    /**
+     * The end of the process: as `destroySingleton`, unless a callback that never returned has kept
+     * the event lock; then the singleton stays.
+     */
     static void endSingleton(SingletonBase* singleton, bool staysAtProcessEnd);
 };
 
