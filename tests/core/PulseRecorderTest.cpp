@@ -119,6 +119,14 @@ class Collector : public Sound::RecorderListener {
     steady_clock::time_point errorTime;
 };
 
+/** Removes a directory to which an audio thread may add while that is done. */
+void remove(const TestSupport::ScratchDirectory& directory) {
+    std::error_code ignored;
+    while (std::filesystem::exists(directory.path(""), ignored)) {
+        std::filesystem::remove_all(directory.path(""), ignored);
+    }
+}
+
 /** A recorder of the platform's kind. Every use of it is under the event lock. */
 class PulseRecorderTest : public ::testing::Test {
   protected:
@@ -283,7 +291,7 @@ TEST_F(PulseRecorderWithoutServer, ProcessMayEndWhileAudioThreadsEnd) {
                     init();
                 }
                 alarm(20);
-                std::filesystem::remove_all(directory.path(""));
+                remove(directory);
                 std::exit(0);
             },
             ::testing::ExitedWithCode(0), "");
@@ -360,12 +368,8 @@ TEST_F(PulseRecorderWithMuteServer, ProcessMayEndWhileItRecords) {
             static const boost::shared_ptr<Recorder> kept = recorder;
             // Asked before the address goes, to which the audio thread may not have come yet.
             const bool records = isRecording();
-            // The end of the process leaves the fixture as it is; the audio thread may add to the
-            // directory while it is removed.
-            std::error_code ignored;
-            while (std::filesystem::exists(directory.path(""), ignored)) {
-                std::filesystem::remove_all(directory.path(""), ignored);
-            }
+            // The end of the process leaves the fixture as it is.
+            remove(directory);
             std::exit(records ? 0 : 1);
         },
         ::testing::ExitedWithCode(0), "");
