@@ -120,8 +120,8 @@ bool isStill(const ScriptedHttpServer& server) {
         }
         kdDrainEventsKOR();
     }
-    return passNetworkThread() && server.isIdle() && areAllSettled(server) && LiveCounts::countTasks() == 0 &&
-           server.getActivity() == before;
+    return passNetworkThread() && server.isIdle() && areAllSettled(server) &&
+           LiveCounts::countTasks() == 0 && server.getActivity() == before;
 }
 
 }  // namespace

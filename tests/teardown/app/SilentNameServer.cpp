@@ -40,8 +40,7 @@ void hang() {
 
 bool waitForQuestions(int count) {
     std::unique_lock<std::mutex> lock(state().mutex);
-    return state().changed.wait_for(lock, LONGEST_WAIT,
-                                    [count] { return state().asked >= count; });
+    return state().changed.wait_for(lock, LONGEST_WAIT, [count] { return state().asked >= count; });
 }
 
 void answerQuestions() {
