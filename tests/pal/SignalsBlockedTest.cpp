@@ -1,8 +1,12 @@
 #include "pal/SignalsBlocked.h"
 
 #include <gtest/gtest.h>
+#include <unistd.h>
 
+#include <csignal>
 #include <thread>
+
+#include "pal/kd_event.h"
 
 namespace {
 
@@ -29,6 +33,39 @@ TEST(SignalsBlocked, KeepsSignalsFromThreadsThatAreStartedMeanwhile) {
         const SignalsBlocked blocked;
         EXPECT_TRUE(isBlockedInNewThread(signal)) << signal;
     }
+}
+
+TEST(SignalsBlocked, LeavesFaultsToACrashReporter) {
+    const SignalsBlocked blocked;
+    for (const int signal : {SIGSEGV, SIGBUS, SIGFPE, SIGILL, SIGABRT, SIGTRAP, SIGSYS}) {
+        EXPECT_FALSE(isBlockedInNewThread(signal)) << signal;
+    }
+}
+
+TEST(SignalsBlocked, KeepsAFaultBlockedThatTheCallerBlocks) {
+    sigset_t fault;
+    sigset_t before;
+    sigemptyset(&fault);
+    sigaddset(&fault, SIGBUS);
+    pthread_sigmask(SIG_BLOCK, &fault, &before);
+    {
+        const SignalsBlocked blocked;
+        EXPECT_TRUE(isBlocked(SIGBUS));
+    }
+    EXPECT_TRUE(isBlocked(SIGBUS));
+    pthread_sigmask(SIG_SETMASK, &before, nullptr);
+}
+
+// The handler of an application's crash reporter runs on the thread that faults.
+TEST(SignalsBlockedDeathTest, CrashReporterSeesAFaultOnTheEventThread) {
+    GTEST_FLAG_SET(death_test_style, "threadsafe");
+    EXPECT_EXIT(
+        {
+            std::signal(SIGSEGV, [](int) { _exit(17); });
+            kdPostKOR([](void*) { std::raise(SIGSEGV); }, nullptr);
+            kdDrainEventsKOR();
+        },
+        testing::ExitedWithCode(17), "");
 }
 
 TEST(SignalsBlocked, LeavesTheCallersOwnChoiceAsItWas) {

@@ -7,19 +7,25 @@
 #include <pthread.h>
 #include <signal.h>
 
+#include <initializer_list>
+
 namespace korvel_pal {
 
 /**
- * Blocks all signals on the calling thread while it lives. Threads inherit that: signals belong to
- * the application's threads, and one that is started meanwhile is never the one that a handler
- * interrupts. To be destroyed on the thread that made it.
+ * Blocks asynchronous signals on the calling thread while it lives. Threads started meanwhile
+ * inherit the mask, so a signal sent to the process interrupts the application's threads, never
+ * ours. Signals that a fault raises on the faulting thread stay open: the application's crash
+ * reporter must see them on our threads, too. Destroy it on the thread that made it.
  */
 class SignalsBlocked {
   public:
     SignalsBlocked() {
-        sigset_t all;
-        sigfillset(&all);
-        pthread_sigmask(SIG_SETMASK, &all, &before);
+        sigset_t asynchronous;
+        sigfillset(&asynchronous);
+        for (const int fault : {SIGSEGV, SIGBUS, SIGFPE, SIGILL, SIGABRT, SIGTRAP, SIGSYS}) {
+            sigdelset(&asynchronous, fault);
+        }
+        pthread_sigmask(SIG_BLOCK, &asynchronous, &before);
     }
     ~SignalsBlocked() { pthread_sigmask(SIG_SETMASK, &before, nullptr); }
     SignalsBlocked(const SignalsBlocked&) = delete;
