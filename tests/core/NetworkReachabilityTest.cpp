@@ -39,9 +39,10 @@ TEST(NetworkReachability, IsMeteredOverMobileLinksAlone) {
 
 TEST(NetworkReachability, KnowsTheInterfacesOfThisHost) {
     const auto interfaces = listNetworkInterfaces();
-    EXPECT_TRUE(std::any_of(interfaces.begin(), interfaces.end(),
+    ASSERT_TRUE(interfaces);
+    EXPECT_TRUE(std::any_of(interfaces->begin(), interfaces->end(),
                             [](const NetworkInterface& each) { return each.loopback; }));
-    EXPECT_EQ(judgeReachability(interfaces), NetworkManager::getInstance().getReachability());
+    EXPECT_EQ(judgeReachability(*interfaces), NetworkManager::getInstance().getReachability());
 }
 
 TEST(NetworkReachability, TakesTheEmbeddersWord) {

@@ -49,12 +49,12 @@ NetworkInterface& findOrAdd(std::vector<NetworkInterface>& interfaces, const std
 
 }  // namespace
 
-std::vector<NetworkInterface> listNetworkInterfaces() {
-    std::vector<NetworkInterface> interfaces;
+std::optional<std::vector<NetworkInterface>> listNetworkInterfaces() {
     ifaddrs* list = nullptr;
     if (getifaddrs(&list) != 0) {
-        return interfaces;
+        return std::nullopt;
     }
+    std::vector<NetworkInterface> interfaces;
     const std::unique_ptr<ifaddrs, void (*)(ifaddrs*)> owner(list, &freeifaddrs);
     for (const ifaddrs* entry = list; entry != nullptr; entry = entry->ifa_next) {
         constexpr unsigned WORKING = IFF_UP | IFF_RUNNING;

@@ -28,7 +28,11 @@ NetworkManager::~NetworkManager() {
 
 int NetworkManager::getReachability() const {
     const int word = impl->override;
-    return word != Impl::NO_OVERRIDE ? word : judgeReachability(listNetworkInterfaces());
+    if (word != Impl::NO_OVERRIDE) {
+        return word;
+    }
+    const auto interfaces = listNetworkInterfaces();
+    return interfaces ? judgeReachability(*interfaces) : METERED;
 }
 
 void NetworkManager::overrideReachability(int value) {

@@ -4,6 +4,7 @@
  */
 #pragma once
 
+#include <optional>
 #include <string>
 #include <vector>
 
@@ -18,8 +19,11 @@ struct NetworkInterface {
     bool usable = false; /**< up and running, with an address that reaches further than the link */
 };
 
-/** The host's interfaces now. Asks the kernel, never the network; any thread. */
-KORVEL_CORE_API std::vector<NetworkInterface> listNetworkInterfaces();
+/**
+ * The host's interfaces now. Asks the kernel, never the network; any thread.
+ * @return nothing when the kernel does not answer, for example without a free descriptor
+ */
+KORVEL_CORE_API std::optional<std::vector<NetworkInterface>> listNetworkInterfaces();
 
 /**
  * The reachability over these interfaces: 1 when one that is not metered is usable, 2 when only

@@ -37,8 +37,9 @@ class KORVEL_CORE_API NetworkManager : public Util::Singleton<NetworkManager> {
 
     /**
      * How the network can be reached now: the embedder's word if there is one, else what the
-     * system says. A host that has only its loopback interface counts as 1. Any thread; never
-     * waits for the network.
+     * system says. A host that has only its loopback interface counts as 1. Where the system
+     * cannot be asked, the network counts as metered, so that the attempt itself decides. Any
+     * thread; never waits for the network.
      */
     int getReachability() const;
 
