@@ -30,9 +30,10 @@ void NetworkTaskHolder::submit(const boost::shared_ptr<NetworkTask>& task,
     Transport& transport = NetworkManager::getInstance().getTransport();
     const auto next = boost::make_shared<Exchange>(transport.shared_from_this(), task, policy,
                                                    thread == EndThread::NETWORK);
-    const boost::shared_ptr<Exchange> previous = std::move(exchange);
-    exchange = next;
+    // Nothing of it is delivered before the event lock is free. A start that throws changes
+    // nothing.
     next->start();
+    const boost::shared_ptr<Exchange> previous = std::exchange(exchange, next);
     if (previous) {
         previous->cancel();
     }

@@ -1,12 +1,15 @@
 #include "network/Transport.h"
 
 #include <algorithm>
+#include <chrono>
+#include <system_error>
 #include <utility>
 
 #include "network/Transfer.h"
 #include "pal/SignalsBlocked.h"
 #include "pal/kd_assert.h"
 #include "pal/kd_event.h"
+#include "pal/kd_log.h"
 
 namespace Network {
 
@@ -14,6 +17,7 @@ namespace {
 
 // Nothing is polled for: the thread is woken by sockets, by libcurl's own timers and by commands.
 constexpr int LONGEST_SLEEP_MS = 60 * 60 * 1000;
+constexpr std::chrono::seconds STOP_LIMIT{2};
 
 void initialiseCurl() {
     static std::once_flag once;
@@ -46,23 +50,25 @@ class EventLockLoan {
 
 Transport::Transport() {
     initialiseCurl();
-    multi.reset(curl_multi_init());
-    KOR_ASSERT(multi != nullptr);
 }
 
 Transport::~Transport() = default;
 
 bool Transport::post(std::function<void()> command) {
     const std::lock_guard<std::mutex> lock(mutex);
-    if (closed || !multi || kdEventsHaveEndedKOR() != 0) {
+    if (closed || kdEventsHaveEndedKOR() != 0 || !launchThread()) {
         return false;
     }
-    launchThread();
     commands.push_back(std::move(command));
-    if (commands.size() == 1 && thread.get_id() != std::this_thread::get_id()) {
-        curl_multi_wakeup(multi.get());
+    if (thread.get_id() != std::this_thread::get_id()) {
+        wake();
     }
     return true;
+}
+
+// A wake-up that fails is tried again with the next command.
+void Transport::wake() {
+    awake = awake || curl_multi_wakeup(multi.get()) == CURLM_OK;
 }
 
 void Transport::requestCheck(const boost::shared_ptr<Transfer>& transfer) {
@@ -84,7 +90,7 @@ void Transport::stop() {
             closed = true;
             return;
         }
-        curl_multi_wakeup(multi.get());
+        wake();
     }
     // A task's callback must not end the thread that it runs on, unless it ends the process.
     const bool isOwnThread = thread.get_id() == std::this_thread::get_id();
@@ -96,16 +102,40 @@ void Transport::stop() {
         return;
     }
     const EventLockLoan loan;
-    thread.join();
+    if (waitForEnd()) {
+        thread.join();
+    } else {
+        kdLogMessage("Network: the network thread hangs and is left behind");
+        thread.detach();
+    }
 }
 
-void Transport::launchThread() {
+bool Transport::waitForEnd() {
+    std::unique_lock<std::mutex> lock(mutex);
+    return changed.wait_for(lock, STOP_LIMIT, [this] { return finished; });
+}
+
+// Without free descriptors libcurl makes a handle that cannot be woken: it is not kept.
+bool Transport::launchThread() {
     if (thread.joinable()) {
-        return;
+        return true;
+    }
+    multi.reset(curl_multi_init());
+    if (!multi || curl_multi_wakeup(multi.get()) != CURLM_OK) {
+        multi.reset();
+        kdLogMessage("Network: no descriptors or memory for the network thread");
+        return false;
     }
     const korvel_pal::SignalsBlocked signalsBlocked;
     const boost::shared_ptr<Transport> self = shared_from_this();
-    thread = std::thread([self] { self->run(); });
+    try {
+        thread = std::thread([self] { self->run(); });
+    } catch (const std::system_error& error) {
+        kdLogFormatMessage("Network: the network thread cannot start: %s", error.what());
+        multi.reset();
+        return false;
+    }
+    return true;
 }
 
 void Transport::run() {
@@ -118,6 +148,9 @@ void Transport::run() {
     finishAll();
     // Closes the connections that were kept.
     multi.reset();
+    const std::lock_guard<std::mutex> lock(mutex);
+    finished = true;
+    changed.notify_all();
 }
 
 bool Transport::hasCommands() {
@@ -131,6 +164,7 @@ bool Transport::runCommands() {
         std::vector<std::function<void()>> current;
         {
             const std::lock_guard<std::mutex> lock(mutex);
+            awake = false;
             current.swap(commands);
             if (current.empty()) {
                 closed = stopping;
@@ -168,7 +202,7 @@ void Transport::start(const boost::shared_ptr<Transfer>& transfer) {
     }
 }
 
-// Making one costs as much as all that a small request does besides.
+// Making a handle costs as much as the rest of a small request.
 CURL* Transport::takeHandle() {
     return spareHandle ? spareHandle.release() : curl_easy_init();
 }

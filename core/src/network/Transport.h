@@ -5,6 +5,7 @@
 #include <atomic>
 #include <boost/enable_shared_from_this.hpp>
 #include <boost/shared_ptr.hpp>
+#include <condition_variable>
 #include <functional>
 #include <map>
 #include <memory>
@@ -32,7 +33,8 @@ class Transport : public boost::enable_shared_from_this<Transport> {
 
     /**
      * Has a command run on the network thread. Any thread; does not block.
-     * @return false when the transport is closed: the command is not run
+     * @return false when the command will not run: the transport is closed, or the system has no
+     *         thread or descriptors for it at the moment; the next call tries again
      */
     bool post(std::function<void()> command);
 
@@ -40,8 +42,9 @@ class Transport : public boost::enable_shared_from_this<Transport> {
     void requestCheck(const boost::shared_ptr<Transfer>& transfer);
 
     /**
-     * Ends all transfers and the thread, and waits for that. The event lock, where the caller holds
-     * it, is lent to the network thread meanwhile.
+     * Ends all transfers and the thread, and waits for that, two seconds at most: a thread that
+     * hangs is left behind. The event lock, where the caller holds it, is lent to the network
+     * thread meanwhile.
      */
     void stop();
 
@@ -74,7 +77,9 @@ class Transport : public boost::enable_shared_from_this<Transport> {
     };
     using Transfers = std::map<CURL*, boost::shared_ptr<Transfer>>;
 
-    void launchThread();
+    bool launchThread();
+    void wake();
+    bool waitForEnd();
     void run();
     bool hasCommands();
     bool runCommands();
@@ -85,8 +90,12 @@ class Transport : public boost::enable_shared_from_this<Transport> {
     Transfers::iterator find(const boost::shared_ptr<Transfer>& transfer);
 
     std::mutex mutex;
+    std::condition_variable changed;
+    // Guarded by the mutex.
     std::vector<std::function<void()>> commands;
+    bool awake = false;  // a wake-up is on its way to the thread
     bool closed = false;
+    bool finished = false;
     std::string certificateFile;
     std::thread thread;
 
