@@ -44,10 +44,19 @@ std::vector<std::string> readLanguages(JNIEnv* env) {
         Jni::callStaticObject(env, type.get(), "getAvailableLanguages", "()Ljava/util/ArrayList;");
     std::vector<std::string> languages;
     const jint count = list ? Jni::callInt(env, list.get(), "size", "()I") : 0;
+    int ignored = 0;
     for (jint index = 0; index < count; ++index) {
-        const Jni::LocalRef<jstring> tag =
-            Jni::callObject(env, list.get(), "get", "(I)Ljava/lang/Object;", index).as<jstring>();
-        languages.push_back(Jni::toUtf8(env, tag.get()));
+        Jni::LocalRef<jobject> tag =
+            Jni::callObject(env, list.get(), "get", "(I)Ljava/lang/Object;", index);
+        if (Jni::isText(env, tag.get())) {
+            languages.push_back(Jni::toUtf8(env, std::move(tag).as<jstring>().get()));
+        } else {
+            ++ignored;
+        }
+    }
+    if (ignored > 0) {
+        kdLogFormatMessage("PlatformRecognizer: %d of %d languages are not texts, ignored", ignored,
+                           static_cast<int>(count));
     }
     return languages;
 }

@@ -8,6 +8,11 @@
 
 namespace Jni {
 
+bool isText(JNIEnv* env, jobject object) {
+    const LocalRef<jclass> type = findClass(env, "java/lang/String");
+    return object != nullptr && env->IsInstanceOf(object, type.get()) != JNI_FALSE;
+}
+
 std::string toUtf8(JNIEnv* env, jstring text) {
     if (text == nullptr) {
         return {};

@@ -13,6 +13,9 @@
 
 namespace Jni {
 
+/** Whether the object is a string; null is none. */
+bool isText(JNIEnv* env, jobject object);
+
 /** UTF-8 of a string; empty for null. */
 std::string toUtf8(JNIEnv* env, jstring text);
 

@@ -17,7 +17,9 @@ import android.content.ContextWrapper;
 import android.content.Intent;
 import android.content.IntentFilter;
 import android.os.Bundle;
+import android.os.Parcel;
 import android.speech.RecognizerIntent;
+import android.speech.SpeechRecognizer;
 import java.util.ArrayList;
 import java.util.Arrays;
 import java.util.Collections;
@@ -28,6 +30,7 @@ import korvel.talvox.support.Events;
 import org.junit.After;
 import org.junit.Before;
 import org.junit.Test;
+import org.robolectric.shadows.ShadowLog;
 
 /** Recognitions by the device's own recogniser. */
 public class PlatformRecognizerTest extends EngineTestCase {
@@ -152,6 +155,75 @@ public class PlatformRecognizerTest extends EngineTestCase {
                         events.getRecognition().getHypotheses().get(0).getText(),
                         events.getRecognition().getHypotheses().get(1).getText()));
         assertFalse(events.getRecognition().getHypotheses().get(0).hasConfidence());
+    }
+
+    @SuppressWarnings("unchecked")
+    private static <T> ArrayList<T> mixed(Object... entries) {
+        return (ArrayList<T>) new ArrayList<>(Arrays.asList(entries));
+    }
+
+    /** What arrives in this process when another one sends the bundle. */
+    private static Bundle sent(Bundle bundle) {
+        final Parcel parcel = Parcel.obtain();
+        try {
+            parcel.writeBundle(bundle);
+            parcel.setDataPosition(0);
+            return parcel.readBundle(PlatformRecognizerTest.class.getClassLoader());
+        } finally {
+            parcel.recycle();
+        }
+    }
+
+    private static Bundle mixedResults() {
+        final Bundle results = new Bundle();
+        results.putStringArrayList(
+                SpeechRecognizer.RESULTS_RECOGNITION, mixed(null, "one", 2, new Bundle(), "three"));
+        results.putFloatArray(
+                SpeechRecognizer.CONFIDENCE_SCORES, new float[] {0.1f, 0.95f, 0.2f, 0.3f, 0.5f});
+        return results;
+    }
+
+    @Test
+    public void hypothesesThatAreNotTextsAreLeftOutWithTheirScores() throws Exception {
+        for (Bundle results : new Bundle[] {mixedResults(), sent(mixedResults())}) {
+            ShadowLog.reset();
+            final Events heard = new Events();
+            try (TalvoxRecognizer one = engine.createRecognizer(ON_DEVICE, heard)) {
+                one.start();
+                DeviceRecognizer.callBack(device -> device.onPartialResults(results));
+                DeviceRecognizer.callBack(device -> device.onResults(results));
+                assertEquals("results", heard.end());
+                assertEquals(
+                        Recognition.fromNative(
+                                1,
+                                new String[] {"one", "three"},
+                                new float[] {0.95f, 0.5f},
+                                ""),
+                        heard.getRecognition());
+            }
+            final String line = "3 of 5 entries of results_recognition are not texts, ignored";
+            assertLogged(line);
+            assertEquals("logged once", log().indexOf(line), log().lastIndexOf(line));
+        }
+    }
+
+    @Test
+    public void resultsWithoutAnyTextAreEmptyResults() throws Exception {
+        final Bundle numbers = new Bundle();
+        numbers.putIntegerArrayList(
+                SpeechRecognizer.RESULTS_RECOGNITION, new ArrayList<>(Arrays.asList(1, 2)));
+        final Bundle noList = new Bundle();
+        noList.putString(SpeechRecognizer.RESULTS_RECOGNITION, "words");
+        noList.putString(SpeechRecognizer.CONFIDENCE_SCORES, "0.5");
+        for (Bundle results : new Bundle[] {numbers, sent(numbers), noList}) {
+            final Events heard = new Events();
+            try (TalvoxRecognizer one = engine.createRecognizer(ON_DEVICE, heard)) {
+                one.start();
+                DeviceRecognizer.callBack(device -> device.onResults(results));
+                assertEquals("results", heard.end());
+                assertTrue(heard.getRecognition().getHypotheses().isEmpty());
+            }
+        }
     }
 
     @Test
@@ -359,7 +431,7 @@ public class PlatformRecognizerTest extends EngineTestCase {
     }
 
     @Test
-    public void anotherLanguageOfTheDeviceJoinsTheLanguages() {
+    public void otherLanguagesOfTheDeviceJoinTheLanguages() {
         application.registerReceiver(
                 new BroadcastReceiver() {
                     @Override
@@ -367,7 +439,7 @@ public class PlatformRecognizerTest extends EngineTestCase {
                         final Bundle answer = new Bundle();
                         answer.putStringArrayList(
                                 RecognizerIntent.EXTRA_SUPPORTED_LANGUAGES,
-                                new ArrayList<>(Arrays.asList("uk-UA", "de-DE")));
+                                mixed(7, "uk-UA", null, new Bundle(), "de-DE"));
                         answer.putString(RecognizerIntent.EXTRA_LANGUAGE_PREFERENCE, "de-DE");
                         setResult(Activity.RESULT_OK, null, answer);
                     }
@@ -380,6 +452,7 @@ public class PlatformRecognizerTest extends EngineTestCase {
         }
         assertEquals(
                 Arrays.asList("de-DE", "ru-RU", "tr-TR", "uk-UA"), engine.getAvailableLanguages());
+        assertLogged("3 of 5 entries of android.speech.extra.SUPPORTED_LANGUAGES are not texts");
         start(
                 TalvoxSettings.builder()
                         .set(TalvoxSettings.ASR_POLICY, AsrPolicy.PLATFORM_ONLY)

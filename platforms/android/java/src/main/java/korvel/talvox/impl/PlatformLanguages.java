@@ -10,6 +10,7 @@ import android.os.Looper;
 import android.speech.RecognizerIntent;
 import android.util.Log;
 import java.util.ArrayList;
+import java.util.Collections;
 
 /**
  * The languages of the device's recogniser: asked for by an ordered broadcast, kept from then on.
@@ -56,14 +57,13 @@ final class PlatformLanguages {
     }
 
     private synchronized void keep(Bundle answer) {
-        final ArrayList<String> supported =
-                answer.getStringArrayList(RecognizerIntent.EXTRA_SUPPORTED_LANGUAGES);
+        final ReceivedBundle received = new ReceivedBundle(answer);
+        final ReceivedBundle.Texts supported =
+                received.getTexts(RecognizerIntent.EXTRA_SUPPORTED_LANGUAGES);
+        supported.logOmitted();
         languages.clear();
-        if (supported != null) {
-            languages.addAll(supported);
-        }
-        final String preferred = answer.getString(RecognizerIntent.EXTRA_LANGUAGE_PREFERENCE);
-        preference = preferred == null ? "" : preferred;
+        Collections.addAll(languages, supported.toArray());
+        preference = received.getText(RecognizerIntent.EXTRA_LANGUAGE_PREFERENCE);
         if (languages.isEmpty()) {
             asker = null;
         }

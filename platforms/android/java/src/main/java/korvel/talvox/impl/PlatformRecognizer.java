@@ -233,17 +233,22 @@ public final class PlatformRecognizer {
 
         @Override
         public void onPartialResults(Bundle results) {
-            final String[] texts = texts(results);
-            report(() -> onPartialResultsInternal(recognizer, texts, scores(results, texts)));
+            final ReceivedBundle received = new ReceivedBundle(results);
+            final ReceivedBundle.Texts texts = texts(received);
+            final float[] scores = scores(received, texts);
+            report(() -> onPartialResultsInternal(recognizer, texts.toArray(), scores));
         }
 
         @Override
         public void onResults(Bundle results) {
-            final String[] texts = texts(results);
-            if (texts.length == 0) {
+            final ReceivedBundle received = new ReceivedBundle(results);
+            final ReceivedBundle.Texts texts = texts(received);
+            final float[] scores = scores(received, texts);
+            texts.logOmitted();
+            if (texts.toArray().length == 0) {
                 finish(() -> onErrorInternal(recognizer, PlatformErrors.NO_HYPOTHESIS));
             } else {
-                finish(() -> onResultsInternal(recognizer, texts, scores(results, texts)));
+                finish(() -> onResultsInternal(recognizer, texts.toArray(), scores));
             }
         }
 
@@ -261,19 +266,12 @@ public final class PlatformRecognizer {
         }
     }
 
-    private static String[] texts(Bundle results) {
-        final ArrayList<String> texts =
-                results == null
-                        ? null
-                        : results.getStringArrayList(SpeechRecognizer.RESULTS_RECOGNITION);
-        return texts == null ? new String[0] : texts.toArray(new String[0]);
+    private static ReceivedBundle.Texts texts(ReceivedBundle results) {
+        return results.getTexts(SpeechRecognizer.RESULTS_RECOGNITION);
     }
 
-    /** The confidences, or null if there is not one for each text. */
-    private static float[] scores(Bundle results, String[] texts) {
-        final float[] scores =
-                results == null ? null : results.getFloatArray(SpeechRecognizer.CONFIDENCE_SCORES);
-        return scores != null && scores.length == texts.length ? scores : null;
+    private static float[] scores(ReceivedBundle results, ReceivedBundle.Texts texts) {
+        return texts.align(results.getFloats(SpeechRecognizer.CONFIDENCE_SCORES));
     }
 
     private static native void onReadyForSpeechInternal(long recognizer);
