@@ -11,13 +11,23 @@ import java.util.Objects;
  * @param <T> the type of the values
  */
 public abstract class SettingKey<T> {
+    /** Where a setting may be set. */
+    enum Level {
+        ENGINE,
+        ENGINE_AND_RECOGNITION
+    }
+
     /** The provider that the engine's own locations name. */
     private static final String PROVIDER = "Talvox";
 
     private final String name;
+    private final Level level;
+    private final SettingChecks.Check<T> check;
 
-    private SettingKey(String name) {
+    private SettingKey(String name, Level level, SettingChecks.Check<T> check) {
         this.name = Objects.requireNonNull(name);
+        this.level = level;
+        this.check = check;
     }
 
     /** The name in the engine's settings, in bundles and in XML. */
@@ -25,9 +35,26 @@ public abstract class SettingKey<T> {
         return name;
     }
 
+    /**
+     * Whether the setting is the engine's alone. One recognition cannot have a value of its own
+     * then: it uses the engine's.
+     */
+    public final boolean isEngineOnly() {
+        return level == Level.ENGINE;
+    }
+
     @Override
     public final String toString() {
         return name;
+    }
+
+    /** Puts a value that is not null; an IllegalArgumentException if it is not a good one. */
+    final void checkAndPut(Bundle bundle, T value) {
+        final String fault = check.findFault(value);
+        if (fault != null) {
+            throw new IllegalArgumentException(name + " " + fault);
+        }
+        put(bundle, value);
     }
 
     abstract void put(Bundle bundle, T value);
@@ -35,25 +62,29 @@ public abstract class SettingKey<T> {
     /** The value in the bundle, which has the key; null if it is of another type. */
     abstract T get(Bundle bundle);
 
-    static SettingKey<Boolean> ofBoolean(String name) {
-        return ofType(name, Boolean.class, Bundle::putBoolean);
+    static SettingKey<Boolean> ofBoolean(
+            String name, Level level, SettingChecks.Check<Boolean> check) {
+        return ofType(name, level, check, Boolean.class, Bundle::putBoolean);
     }
 
-    static SettingKey<Integer> ofInteger(String name) {
-        return ofType(name, Integer.class, Bundle::putInt);
+    static SettingKey<Integer> ofInteger(
+            String name, Level level, SettingChecks.Check<Integer> check) {
+        return ofType(name, level, check, Integer.class, Bundle::putInt);
     }
 
-    static SettingKey<Float> ofFloat(String name) {
-        return ofType(name, Float.class, Bundle::putFloat);
+    static SettingKey<Float> ofFloat(
+            String name, Level level, SettingChecks.Check<Float> check) {
+        return ofType(name, level, check, Float.class, Bundle::putFloat);
     }
 
-    static SettingKey<String> ofText(String name) {
-        return ofType(name, String.class, Bundle::putString);
+    static SettingKey<String> ofText(
+            String name, Level level, SettingChecks.Check<String> check) {
+        return ofType(name, level, check, String.class, Bundle::putString);
     }
 
     static <E extends Enum<E> & SettingValue> SettingKey<E> ofChoice(
-            String name, Class<E> values) {
-        return new SettingKey<E>(name) {
+            String name, Level level, Class<E> values) {
+        return new SettingKey<E>(name, level, SettingChecks.none()) {
             @Override
             void put(Bundle bundle, E value) {
                 bundle.putString(getName(), value.getText());
@@ -72,8 +103,8 @@ public abstract class SettingKey<T> {
         };
     }
 
-    static SettingKey<LatLon> ofPosition(String name) {
-        return new SettingKey<LatLon>(name) {
+    static SettingKey<LatLon> ofPosition(String name, Level level) {
+        return new SettingKey<LatLon>(name, level, SettingChecks::position) {
             @Override
             void put(Bundle bundle, LatLon value) {
                 final Location location = new Location(PROVIDER);
@@ -97,8 +128,13 @@ public abstract class SettingKey<T> {
         void put(Bundle bundle, String name, V value);
     }
 
-    private static <V> SettingKey<V> ofType(String name, Class<V> type, Writer<V> writer) {
-        return new SettingKey<V>(name) {
+    private static <V> SettingKey<V> ofType(
+            String name,
+            Level level,
+            SettingChecks.Check<V> check,
+            Class<V> type,
+            Writer<V> writer) {
+        return new SettingKey<V>(name, level, check) {
             @Override
             void put(Bundle bundle, V value) {
                 writer.put(bundle, getName(), value);

@@ -60,7 +60,11 @@ public final class TalvoxEngine {
         return TalvoxSettings.fromBundle(Talvox.getSettings(handle));
     }
 
-    /** Changes the engine's settings: those that are set here. Recognitions under way keep theirs. */
+    /**
+     * Changes the engine's settings: those that are set here. They count for what starts from then
+     * on; a recognition under way keeps its own, but for the confidences, which are read when its
+     * results arrive, and the verbosity.
+     */
     public void updateSettings(TalvoxSettings settings) {
         Talvox.updateSettings(handle, settings.toBundle());
     }
@@ -73,7 +77,11 @@ public final class TalvoxEngine {
         Talvox.updateSettingsFromXml(handle, xml);
     }
 
-    /** Whether a recognition with these settings would find a recogniser. */
+    /**
+     * Whether a recognition with these settings would find a recogniser: only {@link
+     * TalvoxSettings#ASR_POLICY} and {@link TalvoxSettings#ASR_OVERRIDE} count. Neither the network
+     * nor the gateway is asked.
+     */
     public boolean isRecognitionAvailable(TalvoxSettings settings) {
         return Talvox.isRecognitionAvailable(handle, settings.toBundle());
     }
@@ -88,7 +96,10 @@ public final class TalvoxEngine {
         return new ArrayList<>(languages);
     }
 
-    /** A recognition whose events are delivered on the main looper. */
+    /**
+     * A recognition whose events are delivered on the main looper; otherwise as {@link
+     * #createRecognizer(TalvoxSettings, RecognitionListener, Executor)}.
+     */
     public TalvoxRecognizer createRecognizer(
             TalvoxSettings settings, RecognitionListener listener) {
         final Handler main = new Handler(Looper.getMainLooper());
@@ -98,16 +109,20 @@ public final class TalvoxEngine {
     /**
      * A recognition, not started yet.
      *
-     * @param settings what differs from the engine's settings
+     * @param settings what differs from the engine's settings, see {@link
+     *     TalvoxSettings#forRecognition}
      * @param listener hears the events
      * @param executor runs the listener. One that runs it at once, on the calling thread, has it run
      *     on the engine's event thread: then the listener must not block at all
+     * @throws IllegalArgumentException if a setting is {@linkplain SettingKey#isEngineOnly of the
+     *     engine only}
      */
     public TalvoxRecognizer createRecognizer(
             TalvoxSettings settings, RecognitionListener listener, Executor executor) {
+        Objects.requireNonNull(settings, "settings").checkForRecognition();
         return new TalvoxRecognizer(
                 this,
-                Objects.requireNonNull(settings, "settings"),
+                settings,
                 Objects.requireNonNull(listener, "listener"),
                 Objects.requireNonNull(executor, "executor"));
     }

@@ -62,11 +62,12 @@ public class PlatformLoggingTest extends EngineTestCase {
 
     private Events recognize(LoggingPolicy logging, SoundFormat format) throws Exception {
         final Events events = new Events();
+        engine.updateSettings(
+                TalvoxSettings.builder().set(TalvoxSettings.SOUND_FORMAT, format).build());
         final TalvoxSettings settings =
-                TalvoxSettings.builder()
+                TalvoxSettings.forRecognition()
                         .set(TalvoxSettings.ASR_POLICY, AsrPolicy.PLATFORM_ONLY)
                         .set(TalvoxSettings.LOGGING, logging)
-                        .set(TalvoxSettings.SOUND_FORMAT, format)
                         .build();
         final byte[] sound = tone();
         try (TalvoxRecognizer recognizer = engine.createRecognizer(settings, events)) {

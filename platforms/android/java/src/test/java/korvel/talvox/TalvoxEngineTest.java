@@ -127,6 +127,28 @@ public class TalvoxEngineTest extends EngineTestCase {
     }
 
     @Test
+    public void aRecognitionCannotHaveSettingsOfTheEngine() {
+        final Events events = new Events();
+        final TalvoxSettings mixed =
+                TalvoxSettings.builder()
+                        .set(TalvoxSettings.STREAMING, true)
+                        .set(TalvoxSettings.LANGUAGE, "en-US")
+                        .set(TalvoxSettings.URL, "http://example.org")
+                        .build();
+        assertEquals(
+                "url, streaming: of the engine only, without effect on one recognition;"
+                        + " set it with TalvoxEngine.updateSettings",
+                assertThrows(
+                                IllegalArgumentException.class,
+                                () -> engine.createRecognizer(mixed, events))
+                        .getMessage());
+        final TalvoxSettings.Builder own = mixed.toBuilder();
+        own.unset(TalvoxSettings.STREAMING).unset(TalvoxSettings.URL);
+        engine.createRecognizer(own.build(), events).close();
+        assertTrue(engine.isRecognitionAvailable(mixed));
+    }
+
+    @Test
     public void refusesNull() {
         final TalvoxSettings settings = TalvoxSettings.builder().build();
         final Events events = new Events();

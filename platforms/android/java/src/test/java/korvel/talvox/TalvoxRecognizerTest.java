@@ -91,7 +91,7 @@ public class TalvoxRecognizerTest extends EngineTestCase {
     }
 
     @Test
-    public void recognisesStreamedSpeexWithSettingsOfItsOwn() throws Exception {
+    public void recognisesStreamedSpeexInALanguageOfItsOwn() throws Exception {
         engine.updateSettingsFromXml(
                 "<startup><features><voice><url>" + gateway.getUrl() + "</url><uuid>" + UUID
                         + "</uuid><streaming>yes</streaming><soundformat>speex</soundformat>"
@@ -371,7 +371,7 @@ public class TalvoxRecognizerTest extends EngineTestCase {
         for (int i = 0; i < 10; i++) {
             engine.updateSettings(
                     TalvoxSettings.builder()
-                            .set(TalvoxSettings.SESSION_ID, "thread " + number + " " + i)
+                            .set(TalvoxSettings.SESSION_ID, "thread-" + number + "-" + i)
                             .build());
             assertEquals(UUID, engine.getSettings().get(TalvoxSettings.UUID));
             final Events events = new Events();

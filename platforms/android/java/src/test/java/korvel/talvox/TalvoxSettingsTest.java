@@ -7,6 +7,10 @@ import static org.junit.Assert.assertThrows;
 import static org.junit.Assert.assertTrue;
 
 import android.os.Bundle;
+import java.util.Arrays;
+import java.util.HashSet;
+import java.util.Set;
+import java.util.stream.Collectors;
 import korvel.talvox.support.KitTest;
 import org.junit.Test;
 
@@ -80,5 +84,88 @@ public class TalvoxSettingsTest extends KitTest {
         assertTrue(settings.has(TalvoxSettings.ASR_OVERRIDE));
         assertNull(settings.get(TalvoxSettings.ASR_OVERRIDE));
         assertNull(settings.get(TalvoxSettings.SAMPLE_RATE));
+    }
+
+    @Test
+    public void theKeysOfTheEngineOnly() {
+        final Set<SettingKey<?>> engineOnly =
+                new HashSet<>(
+                        Arrays.<SettingKey<?>>asList(
+                                TalvoxSettings.URL,
+                                TalvoxSettings.UUID,
+                                TalvoxSettings.EVENTS_LOGGING,
+                                TalvoxSettings.SOUND_FORMAT,
+                                TalvoxSettings.SPEEX_QUALITY,
+                                TalvoxSettings.SAMPLE_RATE,
+                                TalvoxSettings.VAD,
+                                TalvoxSettings.SESSION_MODE,
+                                TalvoxSettings.STREAMING,
+                                TalvoxSettings.UPPER_CONFIDENCE,
+                                TalvoxSettings.WINNER_LEAD_CONFIDENCE,
+                                TalvoxSettings.LOWER_CONFIDENCE));
+        assertEquals(
+                engineOnly,
+                TalvoxSettings.keys().stream()
+                        .filter(SettingKey::isEngineOnly)
+                        .collect(Collectors.toSet()));
+    }
+
+    private static <T> void setAsItIs(
+            TalvoxSettings.Builder builder, SettingKey<T> key, TalvoxSettings values) {
+        builder.set(key, values.get(key));
+    }
+
+    @Test
+    public void aBuilderForRecognitionsRefusesExactlyTheKeysOfTheEngine() {
+        final TalvoxSettings values = everything();
+        for (SettingKey<?> key : TalvoxSettings.keys()) {
+            setAsItIs(TalvoxSettings.builder(), key, values);
+            if (key.isEngineOnly()) {
+                assertEquals(
+                        key
+                                + ": of the engine only, without effect on one recognition;"
+                                + " set it with TalvoxEngine.updateSettings",
+                        assertThrows(
+                                        IllegalArgumentException.class,
+                                        () ->
+                                                setAsItIs(
+                                                        TalvoxSettings.forRecognition(),
+                                                        key,
+                                                        values))
+                                .getMessage());
+            } else {
+                setAsItIs(TalvoxSettings.forRecognition(), key, values);
+            }
+        }
+    }
+
+    /** Every key with a good value. */
+    static TalvoxSettings everything() {
+        final TalvoxSettings settings =
+                TalvoxSettings.builder()
+                        .set(TalvoxSettings.URL, "http://one")
+                        .set(TalvoxSettings.UUID, "0123456789abcdef0123456789abcdef")
+                        .set(TalvoxSettings.ASR_OVERRIDE, AsrOverride.DISABLED)
+                        .set(TalvoxSettings.LOGGING, LoggingPolicy.WITHOUT_SOUND_ALWAYS)
+                        .set(TalvoxSettings.EVENTS_LOGGING, EventsLogging.ENABLED)
+                        .set(TalvoxSettings.SOUND_FORMAT, SoundFormat.SPEEX)
+                        .set(TalvoxSettings.SAMPLE_RATE, 8000)
+                        .set(TalvoxSettings.VAD, "activityon=0.5")
+                        .set(TalvoxSettings.SESSION_MODE, SessionMode.GENERAL)
+                        .set(TalvoxSettings.STREAMING, true)
+                        .set(TalvoxSettings.UPPER_CONFIDENCE, 0.8f)
+                        .set(TalvoxSettings.WINNER_LEAD_CONFIDENCE, 0.1f)
+                        .set(TalvoxSettings.LOWER_CONFIDENCE, 0.3f)
+                        .set(TalvoxSettings.SPEEX_QUALITY, 4)
+                        .set(TalvoxSettings.VERBOSITY, 1)
+                        .set(TalvoxSettings.LANGUAGE, "tr-TR")
+                        .set(TalvoxSettings.MODEL, RecognitionModel.MAPS)
+                        .set(TalvoxSettings.ASR_POLICY, AsrPolicy.PLATFORM_FIRST)
+                        .set(TalvoxSettings.MY_POSITION, new LatLon(1, 2))
+                        .set(TalvoxSettings.MAP_CENTER, new LatLon(3, 4))
+                        .set(TalvoxSettings.SESSION_ID, "s1")
+                        .build();
+        assertEquals(TalvoxSettings.keys().size(), settings.toBundle().size());
+        return settings;
     }
 }

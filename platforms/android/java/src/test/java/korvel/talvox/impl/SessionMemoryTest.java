@@ -110,7 +110,7 @@ public class SessionMemoryTest extends EngineTestCase {
     }
 
     private void failWithoutAddress() throws InterruptedException {
-        useGateway("");
+        forgetGateway();
         fail(NOTHING, "error NETWORK");
         useGateway(gateway.getUrl());
     }

@@ -34,4 +34,11 @@ public abstract class EngineTestCase extends KitTest {
                         .set(TalvoxSettings.LANGUAGE, "en-US")
                         .build());
     }
+
+    /** Takes the gateway's address from the engine. */
+    protected static void forgetGateway() {
+        final Bundle nowhere = new Bundle();
+        nowhere.putString(TalvoxSettings.URL.getName(), "");
+        Talvox.updateSettings(Talvox.getHandle(), nowhere);
+    }
 }
