@@ -199,9 +199,10 @@ float clampFloat(float value) {
 }
 
 /** The elements that an update makes of plain text; none where the row has no text form. */
-std::vector<Model::Elem> readText(ElemType type, const std::string& text) {
+std::vector<Model::Elem> readText(ElemType type, const std::string& text, const Model::Elem& old) {
     Model::Elem elem;
     elem.type = type;
+    const uint32_t kept = old.type == type ? old.scalar : 0;
     const char* const begin = text.c_str();
     char* end = nullptr;
     switch (type) {
@@ -215,10 +216,12 @@ std::vector<Model::Elem> readText(ElemType type, const std::string& text) {
         case Bundle::INT: {
             const long long value = std::strtoll(begin, &end, 0);
             elem.scalar = static_cast<uint32_t>(std::clamp<long long>(value, INT32_MIN, INT32_MAX));
+            elem.scalar = end == begin ? kept : elem.scalar;
             break;
         }
         case Bundle::FLOAT:
             elem.scalar = toBits(clampFloat(std::strtof(begin, &end)));
+            elem.scalar = end == begin ? kept : elem.scalar;
             break;
         case Bundle::LATLON:
             elem.lat = clampFloat(std::strtof(begin, &end));
@@ -269,7 +272,9 @@ void makeUpdate(Input& input, const ElemSpec* table, Model& model, std::string& 
         const std::string text = takePlainText(input);
         xml += text;
         if (isKnown) {
-            for (const Model::Elem& elem : readText(row->type, text)) {
+            const auto found = model.elems.find(key);
+            const Model::Elem old = found == model.elems.end() ? Model::Elem() : found->second;
+            for (const Model::Elem& elem : readText(row->type, text, old)) {
                 model.elems[key] = elem;
             }
         }

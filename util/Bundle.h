@@ -122,9 +122,18 @@ class TALVOX_API Bundle {
      * Updates the bundle from the children of one XML element: a child's name is the key (in any
      * spelling that normalises to it), its text the value.
      *
-     * Only keys of the table are stored, each with its row's type; nothing is ever removed. What
-     * cannot be used is logged and skipped, a number out of range is brought to the nearest end of
-     * the range, and a text that is no number counts as 0.
+     * Only keys of the table are stored, each with its row's type; nothing is ever removed. Each of
+     * these repairs is logged:
+     * - a name that is not in the table, or whose old value is not a bundle where the table wants
+     *   one, is skipped;
+     * - a number out of range, infinity included, becomes the nearest number of its type, so that
+     *   validation finds it where the range is narrower;
+     * - what follows a number is ignored ("12abc" is 12, and "0,5" is 0: the decimal mark is ".");
+     * - a text that does not begin with a number ("nan", "abc", none at all) leaves the old number
+     *   as it is; where there is none, it stores 0;
+     * - of a position, the part that is not a number is 0, and so is the part behind it;
+     * - a boolean is false for "", "0", "false" and "no" in any case, and true for any other text,
+     *   so also for "off".
      *
      * @param node  where the path starts
      * @param path  names of nested elements, separated by "/"; empty pieces are skipped

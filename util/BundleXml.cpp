@@ -16,6 +16,7 @@ namespace {
 
 const char* const UPDATE_FROM_XML = "updateFromXml";
 const char* const TO_XML_STRING = "toXmlString";
+const char* const BLANKS = " \t\n\v\f\r";
 
 std::vector<std::string> splitPath(const std::string& path) {
     std::vector<std::string> pieces;
@@ -49,39 +50,67 @@ std::string bodyOf(const TiXmlElement& element) {
     return child->Value();
 }
 
-bool isFalseText(const std::string& text) {
+bool readBoolean(const std::string& key, const std::string& text) {
     std::string lower;
     for (const char c : text) {
         lower += toLowerAscii(c);
     }
-    return lower.empty() || lower == "0" || lower == "false" || lower == "no";
+    if (lower.empty() || lower == "0" || lower == "false" || lower == "no") {
+        return false;
+    }
+    if (lower != "1" && lower != "true" && lower != "yes" && lower != "on") {
+        kdLogFormatMessage("%s: value of %s not a boolean: %.64s, taking true", UPDATE_FROM_XML,
+                           key.c_str(), text.c_str());
+    }
+    return true;
 }
 
-/** Takes the number, after a line in the log where it is not what the text says. */
+/** Takes the number; logs a line when it is not all that the text says. */
 template <typename Number>
 Number accept(const NumberText::Reading<Number>& reading, const std::string& key,
               const std::string& text) {
     if (reading.status == NumberText::OUT_OF_RANGE) {
         kdLogFormatMessage("%s: value of %s out of range: %.64s, taking the nearest",
                            UPDATE_FROM_XML, key.c_str(), text.c_str());
-    } else if (reading.status == NumberText::NOT_A_NUMBER && !text.empty()) {
-        kdLogFormatMessage("%s: value of %s not a number: %.64s, taking 0", UPDATE_FROM_XML,
-                           key.c_str(), text.c_str());
+    } else if (text.find_first_not_of(BLANKS, reading.end) != std::string::npos) {
+        kdLogFormatMessage("%s: value of %s not only a number: %.64s, ignoring what follows it",
+                           UPDATE_FROM_XML, key.c_str(), text.c_str());
     }
     return reading.value;
 }
 
+/** The value of a text, or the old one when the text is not a number. */
+template <typename Number>
+Number acceptOrKeep(const NumberText::Reading<Number>& reading, const std::string& key,
+                    const std::string& text, Number old) {
+    if (reading.status != NumberText::NOT_A_NUMBER) {
+        return accept(reading, key, text);
+    }
+    kdLogFormatMessage("%s: value of %s not a number: %.64s, keeping the old value",
+                       UPDATE_FROM_XML, key.c_str(), text.c_str());
+    return old;
+}
+
+/** A part that is not a number counts as 0, and so does the part behind it. */
 Bundle::LatLon readLatLon(const std::string& key, const std::string& text) {
     Bundle::LatLon latLon;
     const NumberText::Reading<float> lat = NumberText::readFloat(text);
-    latLon.lat = accept(lat, key, text);
+    NumberText::Reading<float> lon;
     if (lat.status != NumberText::NOT_A_NUMBER) {
-        NumberText::Reading<float> lon;
+        latLon.lat = lat.value;
         if (lat.end < text.size() && text[lat.end] == ',') {
             lon = NumberText::readFloat(text, lat.end + 1);
         }
-        latLon.lon = accept(lon, key, text);
     }
+    if (lon.status == NumberText::NOT_A_NUMBER) {
+        kdLogFormatMessage("%s: value of %s not a position: %.64s, taking 0 for what is missing",
+                           UPDATE_FROM_XML, key.c_str(), text.c_str());
+        return latLon;
+    }
+    if (lat.status == NumberText::OUT_OF_RANGE) {
+        lon.status = NumberText::OUT_OF_RANGE;
+    }
+    latLon.lon = accept(lon, key, text);
     return latLon;
 }
 
@@ -167,15 +196,18 @@ void Bundle::updateElement(const TiXmlElement& element, const ElemSpec* spec) {
         kdLogFormatMessage("%s: unknown element name %s, ignoring", UPDATE_FROM_XML, key.c_str());
         return;
     }
+    const Elem none;
+    const auto found = rep.find(key);
+    const Elem& old = found != rep.end() && found->second.type == row->type ? found->second : none;
     switch (row->type) {
         case BOOLEAN:
-            putBoolean(key, !isFalseText(text));
+            putBoolean(key, readBoolean(key, text));
             break;
         case INT:
-            putInt(key, accept(NumberText::readInt(text), key, text));
+            putInt(key, acceptOrKeep(NumberText::readInt(text), key, text, old.asInt()));
             break;
         case FLOAT:
-            putFloat(key, accept(NumberText::readFloat(text), key, text));
+            putFloat(key, acceptOrKeep(NumberText::readFloat(text), key, text, old.asFloat()));
             break;
         case LATLON:
             putLatLon(key, readLatLon(key, text));

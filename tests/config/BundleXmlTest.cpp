@@ -154,15 +154,46 @@ TEST(BundleFromXml, ReadsNumbers) {
     EXPECT_TRUE(flagOf("on"));
 }
 
-TEST(BundleFromXml, ANumberThatDoesNotParseCountsAsZeroAndIsLogged) {
+TEST(BundleFromXml, ATextThatIsNotANumberKeepsTheOldValueAndIsLogged) {
+    for (const std::string text : {"nan", "-NAN", "many", "infinite", "<![CDATA[]]>", "<x/>"}) {
+        Bundle bundle;
+        bundle.putInt("number", 7);
+        bundle.putFloat("ratio", 0.5F);
+        const LogCapture log;
+        bundle.updateFromXml("<r><number>" + text + "</number><ratio>" + text + "</ratio></r>", "r",
+                             SPEC);
+        EXPECT_EQ(7, bundle.getInt("number")) << text;
+        EXPECT_EQ(0.5F, bundle.getFloat("ratio")) << text;
+        const std::string value = text[0] != '<' ? text : text[1] == 'x' ? "x" : "";
+        EXPECT_THAT(log.messages(),
+                    ElementsAre("updateFromXml: value of number not a number: " + value +
+                                    ", keeping the old value",
+                                "updateFromXml: value of ratio not a number: " + value +
+                                    ", keeping the old value"));
+    }
+}
+
+TEST(BundleFromXml, AnElementWithoutTextKeepsTheOldNumber) {
+    Bundle bundle;
+    bundle.putInt("number", 7);
     const LogCapture log;
+    bundle.updateFromXml("<r><number/></r>", "r", SPEC);
+    EXPECT_EQ(7, bundle.getInt("number"));
+    EXPECT_THAT(
+        log.messages(),
+        ElementsAre("number: no body",
+                    "updateFromXml: value of number not a number: , keeping the old value"));
+}
+
+TEST(BundleFromXml, ATextThatIsNotANumberStoresZeroWhereThereIsNoOldNumber) {
     EXPECT_EQ(0, numberOf("many"));
     EXPECT_EQ(0.0F, ratioOf("nan"));
-    EXPECT_EQ(0.0F, ratioOf("inf"));
-    EXPECT_THAT(log.messages(),
-                ElementsAre("updateFromXml: value of number not a number: many, taking 0",
-                            "updateFromXml: value of ratio not a number: nan, taking 0",
-                            "updateFromXml: value of ratio not a number: inf, taking 0"));
+    Bundle bundle;
+    bundle.putFloat("number", 0.5F);
+    bundle.putInt("ratio", 7);
+    bundle.updateFromXml("<r><number>x</number><ratio>x</ratio></r>", "r", SPEC);
+    EXPECT_EQ(0, bundle.getInt("number"));
+    EXPECT_EQ(0.0F, bundle.getFloat("ratio"));
 }
 
 TEST(BundleFromXml, ANumberBeyondTheRangeBecomesItsNearestEndAndIsLogged) {
@@ -171,12 +202,56 @@ TEST(BundleFromXml, ANumberBeyondTheRangeBecomesItsNearestEndAndIsLogged) {
     EXPECT_EQ(-2147483647 - 1, numberOf("-99999999999"));
     EXPECT_EQ(FLT_MAX, ratioOf("1e999"));
     EXPECT_EQ(-FLT_MAX, ratioOf("-1e999"));
+    EXPECT_EQ(FLT_MAX, ratioOf("inf"));
+    EXPECT_EQ(-FLT_MAX, ratioOf("-Infinity"));
     EXPECT_THAT(
         log.messages(),
         ElementsAre("updateFromXml: value of number out of range: 99999999999, taking the nearest",
                     "updateFromXml: value of number out of range: -99999999999, taking the nearest",
                     "updateFromXml: value of ratio out of range: 1e999, taking the nearest",
-                    "updateFromXml: value of ratio out of range: -1e999, taking the nearest"));
+                    "updateFromXml: value of ratio out of range: -1e999, taking the nearest",
+                    "updateFromXml: value of ratio out of range: inf, taking the nearest",
+                    "updateFromXml: value of ratio out of range: -Infinity, taking the nearest"));
+}
+
+TEST(BundleFromXml, InfinityInAThresholdIsFoundByValidation) {
+    for (const std::string text : {"inf", "-inf", "INFINITY", "1e999", "-1e999"}) {
+        Settings settings;
+        settings.updateFromXml("<v><upperconfidence>" + text +
+                                   "</upperconfidence><lowerconfidence>" + text +
+                                   "</lowerconfidence></v>",
+                               "v", Settings::bundleSpecs);
+        settings.validate();
+        EXPECT_EQ(0.9F, settings.getFloat(Settings::SKS_UPPER_CONFIDENCE)) << text;
+        EXPECT_EQ(0.4F, settings.getFloat(Settings::SKS_LOWER_CONFIDENCE)) << text;
+    }
+}
+
+TEST(BundleFromXml, WhatFollowsANumberIsIgnoredAndLogged) {
+    const LogCapture log;
+    EXPECT_EQ(12, numberOf("12abc"));
+    EXPECT_EQ(1, numberOf("1e99"));
+    EXPECT_EQ(0.0F, ratioOf("0,5"));
+    EXPECT_EQ(2.0F, placeOf("1,2,3").lon);
+    EXPECT_EQ(5, numberOf("<![CDATA[5 \n]]>"));
+    EXPECT_THAT(
+        log.messages(),
+        ElementsAre(
+            "updateFromXml: value of number not only a number: 12abc, ignoring what follows it",
+            "updateFromXml: value of number not only a number: 1e99, ignoring what follows it",
+            "updateFromXml: value of ratio not only a number: 0,5, ignoring what follows it",
+            "updateFromXml: value of place not only a number: 1,2,3, ignoring what follows it"));
+}
+
+TEST(BundleFromXml, ATextThatIsNeitherYesNorNoIsTrueAndLogged) {
+    const LogCapture log;
+    for (const char* text : {"yes", "TRUE", "On", "1"}) {
+        EXPECT_TRUE(flagOf(text));
+    }
+    EXPECT_THAT(log.messages(), IsEmpty());
+    EXPECT_TRUE(flagOf("off"));
+    EXPECT_THAT(log.messages(),
+                ElementsAre("updateFromXml: value of flag not a boolean: off, taking true"));
 }
 
 TEST(BundleFromXml, ReadsPositions) {
@@ -185,15 +260,36 @@ TEST(BundleFromXml, ReadsPositions) {
     EXPECT_EQ(-37.5F, placeOf("55.75, -37.5").lon);
 }
 
-TEST(BundleFromXml, APartOfAPositionThatDoesNotParseStaysZero) {
-    EXPECT_EQ(1.0F, placeOf("1,x").lat);
-    EXPECT_EQ(0.0F, placeOf("1,x").lon);
-    EXPECT_EQ(1.0F, placeOf("1").lat);
-    EXPECT_EQ(0.0F, placeOf("1").lon);
-    EXPECT_EQ(0.0F, placeOf("1 ,2").lon);
-    EXPECT_EQ(0.0F, placeOf("x,2").lat);
-    EXPECT_EQ(0.0F, placeOf("x,2").lon);
-    EXPECT_EQ(0.0F, placeOf(",2").lon);
+TEST(BundleFromXml, APartOfAPositionThatDoesNotParseIsZeroAndLogged) {
+    const struct {
+        std::string text;
+        float lat;
+    } cases[] = {{"1,x", 1}, {"1", 1},   {"1 ,2", 1},  {"x,2", 0},
+                 {",2", 0},  {"nan", 0}, {"nan,2", 0}, {"1,nan", 1}};
+    for (const auto& each : cases) {
+        Bundle bundle;
+        bundle.putLatLon("place", {5, 6});
+        const LogCapture log;
+        bundle.updateFromXml("<r><place>" + each.text + "</place></r>", "r", SPEC);
+        EXPECT_EQ(each.lat, bundle.getLatLon("place").lat) << each.text;
+        EXPECT_EQ(0.0F, bundle.getLatLon("place").lon) << each.text;
+        EXPECT_THAT(log.messages(), ElementsAre("updateFromXml: value of place not a position: " +
+                                                each.text + ", taking 0 for what is missing"));
+    }
+}
+
+TEST(BundleFromXml, APartOfAPositionBeyondTheRangeBecomesTheNearestAndIsLogged) {
+    for (const std::string text : {"inf,2", "1e999,2"}) {
+        const LogCapture log;
+        EXPECT_EQ(FLT_MAX, placeOf(text).lat);
+        EXPECT_THAT(log.messages(), ElementsAre("updateFromXml: value of place out of range: " +
+                                                text + ", taking the nearest"));
+    }
+    const LogCapture log;
+    EXPECT_EQ(-FLT_MAX, placeOf("1,-inf").lon);
+    EXPECT_THAT(
+        log.messages(),
+        ElementsAre("updateFromXml: value of place out of range: 1,-inf, taking the nearest"));
 }
 
 TEST(BundleFromXml, ReadsTextsWithEntitiesResolved) {

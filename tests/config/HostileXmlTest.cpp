@@ -93,13 +93,13 @@ TEST(HostileXml, WrongTypesAndNumbersBeyondRangeAreRepairedAndTheRestApplied) {
     EXPECT_EQ("uk-UA", settings.getLanguage());
     EXPECT_EQ(1, settings.getInt(Settings::SKS_SPEEX_QUALITY));
     EXPECT_TRUE(settings.conformsTo(Settings::bundleSpecs));
-    EXPECT_THAT(log.messages(), SizeIs(6));
+    EXPECT_THAT(log.messages(), SizeIs(7));
 
     settings.validate();
     EXPECT_EQ(16000, settings.getSampleRate());
     EXPECT_EQ(0, settings.getInt(Settings::SKS_VERBOSE_LEVEL));
     EXPECT_EQ(0.9F, settings.getFloat(Settings::SKS_UPPER_CONFIDENCE));
-    EXPECT_EQ(0.0F, settings.getFloat(Settings::SKS_LOWER_CONFIDENCE));
+    EXPECT_EQ(0.4F, settings.getFloat(Settings::SKS_LOWER_CONFIDENCE));
 }
 
 TEST(HostileXml, TextCutInsideACharacterIsRefused) {

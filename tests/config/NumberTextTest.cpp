@@ -141,9 +141,25 @@ TEST(NumberText, BringsFloatsBeyondTheRangeToItsEnds) {
     }
 }
 
+TEST(NumberText, TakesInfinityForANumberBeyondTheRange) {
+    for (const std::string text : {"inf", "INF", "Infinity", "iNFiNiTY"}) {
+        const auto positive = NumberText::readFloat(text);
+        EXPECT_EQ(NumberText::OUT_OF_RANGE, positive.status) << text;
+        EXPECT_EQ(FLT_MAX, positive.value) << text;
+        EXPECT_EQ(text.size(), positive.end) << text;
+        EXPECT_EQ(FLT_MAX, NumberText::readFloat(" +" + text).value) << text;
+        const auto negative = NumberText::readFloat("-" + text + ",5");
+        EXPECT_EQ(NumberText::OUT_OF_RANGE, negative.status) << text;
+        EXPECT_EQ(-FLT_MAX, negative.value) << text;
+        EXPECT_EQ(text.size() + 1, negative.end) << text;
+    }
+}
+
 TEST(NumberText, TellsWhatIsNoFloat) {
-    for (const char* text : {"", " ", "abc", "-", ".", "-.", ".e5", "e5", "nan", "NAN", "inf",
-                             "-inf", "infinity", "- 1", "--1"}) {
+    for (const char* text :
+         {"",     " ",    "abc",  "-",      ".",   "-.",      ".e5",      "e5",
+          "nan",  "NAN",  "-nan", "nan(1)", "in",  "infinit", "infinite", "infinityx",
+          "inf1", "inf_", "infZ", "- inf",  "- 1", "--1"}) {
         const auto reading = NumberText::readFloat(text);
         EXPECT_EQ(NumberText::NOT_A_NUMBER, reading.status) << text;
         EXPECT_EQ(0.0F, reading.value) << text;

@@ -89,6 +89,17 @@ TEST(RecognitionOutcome, AConfidenceThatIsNotANumberIsNeverAccepted) {
     EXPECT_EQ(Recognition::OutcomeUncertain, outcomeOf({std::numeric_limits<float>::quiet_NaN()}));
 }
 
+TEST(RecognitionOutcome, AThresholdThatIsNotAFiniteNumberAcceptsNothing) {
+    const float nan = std::numeric_limits<float>::quiet_NaN();
+    const float infinity = std::numeric_limits<float>::infinity();
+    for (const float odd : {nan, infinity}) {
+        EXPECT_EQ(Recognition::OutcomeUncertain, outcomeOf({1.0F}, thresholds(odd, 0.2F, 0.4F)));
+        EXPECT_EQ(Recognition::OutcomeUncertain, outcomeOf({1.0F}, thresholds(0.9F, odd, 0.4F)));
+    }
+    EXPECT_EQ(Recognition::OutcomeUncertain, outcomeOf({0.0F}, thresholds(0.9F, 0.2F, nan)));
+    EXPECT_EQ(Recognition::OutcomeUncertain, outcomeOf({1.0F}, thresholds(nan, nan, nan)));
+}
+
 TEST(Recognition, HoldsWhatItWasGiven) {
     const auto results = boost::make_shared<const RecognitionResults>(
         RecognitionResults{RecognitionResult("one", 0.5F), RecognitionResult("two", 0.25F)});

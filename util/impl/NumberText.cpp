@@ -10,6 +10,8 @@
 #include <locale>
 #include <sstream>
 
+#include "util/impl/Ascii.h"
+
 namespace Util {
 
 namespace {
@@ -65,6 +67,22 @@ class Cursor {
             skip(1 + sign);
             skipDigits();
         }
+    }
+
+    /** Skips a word (in lower case) if it stands here in any case and ends here. */
+    bool skipWord(const char* word) {
+        std::size_t length = 0;
+        for (; word[length] != '\0'; ++length) {
+            if (toLowerAscii(peek(length)) != word[length]) {
+                return false;
+            }
+        }
+        const char next = toLowerAscii(peek(length));
+        if (isDigit(next) || next == '_' || (next >= 'a' && next <= 'z')) {
+            return false;
+        }
+        skip(length);
+        return true;
     }
 
     bool isAtHexadecimal() const {
@@ -161,6 +179,8 @@ NumberText::Reading<float> NumberText::readFloat(const std::string& text, std::s
     if (cursor.isAtHexadecimal()) {
         cursor.skip(2);
         value = readHexadecimal(cursor);
+    } else if (cursor.skipWord("inf") || cursor.skipWord("infinity")) {
+        value = HUGE_VAL;
     } else {
         const std::size_t first = cursor.position();
         if (!skipDecimal(cursor)) {

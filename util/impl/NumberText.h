@@ -10,9 +10,10 @@
 namespace Util {
 
 /**
- * Reads numbers as the `%i` and `%g` conversions of C's `scanf` do in the "C" locale, but for
- * these: a number out of range becomes the nearest end of the range, and the words for infinity
- * and not-a-number are no numbers. What follows the number in the text does not matter.
+ * Reads numbers as the `%i` and `%g` conversions of C's `scanf` do in the "C" locale, with three
+ * exceptions: a number out of range becomes the nearest end of the range, infinity ("inf" or
+ * "infinity" in any case, as a whole word) is such a number, and "nan" is not a number. Text
+ * behind the number is left unread.
  */
 class NumberText {
   public:
