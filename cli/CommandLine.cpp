@@ -185,7 +185,9 @@ CLI::App* addSettingsCommand(CLI::App& app, SettingsOptions& options) {
 CLI::App* addLogCommand(CLI::App& app, LogOptions& options) {
     CLI::App* command =
         app.add_subcommand("log", "Send a usage event to a log collection endpoint");
-    command->add_option("--url", options.url, "Address of the endpoint [http://127.0.0.1:8090/log]")
+    command
+        ->add_option("--url", options.url,
+                     "Address of the endpoint [" + LogCollector::LogCollector::URL_DFLT + "]")
         ->type_name("URL");
     command->add_option("--uuid", options.uuid, "Identifier of this installation, as it is [empty]")
         ->type_name("TEXT");

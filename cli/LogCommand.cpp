@@ -4,12 +4,12 @@
 #include <map>
 #include <mutex>
 
+#include "Address.h"
 #include "ExitStatus.h"
 #include "Interrupts.h"
 #include "UsageError.h"
 #include "core/Logger.h"
 #include "core/util/Timer.h"
-#include "logcollector/LogCollector.h"
 #include "pal/kd_event.h"
 
 namespace Cli {
@@ -46,11 +46,7 @@ class End {
 };
 
 void submit(const LogOptions& options, const std::map<std::string, std::string>& params) {
-    if (options.url.empty()) {
-        LogCollector::configure(options.uuid);
-    } else {
-        LogCollector::configure(options.uuid, options.url);
-    }
+    LogCollector::configure(options.uuid, options.url);
     LogCollector::setLoggingEnabled(true);
     LogCollector::startSession(options.session);
     const auto log = options.error ? &LogCollector::logError : &LogCollector::logEvent;
@@ -61,6 +57,8 @@ void submit(const LogOptions& options, const std::map<std::string, std::string>&
 
 int runLog(const LogOptions& options, Console& console, LogOutput& log) {
     const std::map<std::string, std::string> params = readParams(options.params);
+    checkUrl(options.url);
+    checkQueryValue("uuid", options.uuid);
     Logger::setLevel(options.verbosity);
     log.show(options.verbosity > 0);
     End end;

@@ -5,6 +5,7 @@
 
 #include "LogOutput.h"
 #include "RecognizeCommand.h"
+#include "logcollector/LogCollector.h"
 
 namespace Cli {
 
@@ -15,7 +16,7 @@ const int LOG_VERBOSITY_MAX = 2;
 
 /** What `talvox log` was asked for. */
 struct LogOptions {
-    std::string url; /**< empty for the collector's default */
+    std::string url = LogCollector::LogCollector::URL_DFLT;
     std::string uuid;
     std::string session;
     std::string name;

@@ -10,6 +10,7 @@
 #include <memory>
 #include <random>
 
+#include "Address.h"
 #include "ExitStatus.h"
 #include "HumanEvents.h"
 #include "Interrupts.h"
@@ -128,6 +129,7 @@ int runRecognize(const RecognizeOptions& options, Console& console, LogOutput& l
     // What is wrong in a settings document is the user's to know in any case.
     log.show(true);
     const boost::shared_ptr<Talvox::Settings> settings = buildSettings(options.settings);
+    checkRequestSettings(*settings);
     log.show(settings->getInt(Talvox::Settings::SKS_VERBOSE_LEVEL) > 0);
     if (!options.dumpDirectory.empty()) {
         mountDump(options.dumpDirectory);

@@ -179,13 +179,6 @@ TEST(ToolRecognize, EndsWithStatus1WhenTheGatewayIsNotThere) {
                               port.getUrl() + "?)\n");
 }
 
-TEST(ToolRecognize, EndsAtOnceWithoutAnAddress) {
-    const ToolResult result = runTalvox(recognize("", {"--json"}), voice());
-    EXPECT_EQ(result.status, 1);
-    EXPECT_THAT(result.out, MatchesRegex("\\{\"event\":\"error\",\"ms\":[0-9]+,\"code\":3,"
-                                         "\"name\":\"ErrorNetwork\"\\}\n"));
-}
-
 TEST(ToolRecognize, EndsWithStatus1WhenNoMechanismMayServe) {
     const ToolResult result =
         runTalvox(recognize("http://127.0.0.1:1", {"--json", "--set", "asr=disabled"}), voice());

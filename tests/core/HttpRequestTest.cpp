@@ -9,6 +9,7 @@ using Network::HttpRequest;
 using Network::HttpResponse;
 using ::testing::ElementsAre;
 using ::testing::Pair;
+using ::testing::StartsWith;
 
 namespace {
 
@@ -53,6 +54,28 @@ TEST(HttpRequest, RefusesMalformedHeaders) {
     EXPECT_TRUE(request->getHeaders().empty());
     request->addHeader("X-Name", "\xD1\x8F; a: b");
     EXPECT_THAT(request->getHeaders(), ElementsAre(Pair("X-Name", "\xD1\x8F; a: b")));
+}
+
+TEST(HttpRequest, SaysWhyNothingCanBeSentToAUrl) {
+    const auto fault = [](const std::string& url) { return HttpRequest::findUrlFault(url); };
+    EXPECT_EQ("", fault("http://127.0.0.1:8090"));
+    EXPECT_EQ("", fault("HTTPS://host/a@b?c=d@e"));
+    EXPECT_EQ("", fault("http://[::1]:65535/"));
+    for (const char* const url : {"http://a b", "http://a/\n", "http://a/\x7F", "http://a/\t"}) {
+        EXPECT_EQ("has a blank or control character", fault(url)) << url;
+    }
+    EXPECT_EQ("has a blank or control character", fault(std::string("http://a/\0", 10)));
+    for (const char* const url : {"", "foo", "ftp://host/", "file:///etc/hostname", "127.0.0.1"}) {
+        EXPECT_EQ("is neither http nor https", fault(url)) << url;
+    }
+    for (const char* const url : {"http://ann@host", "http://a:b@host", "http:///ann@host"}) {
+        EXPECT_EQ("has a user name", fault(url)) << url;
+    }
+    EXPECT_EQ("has a #, after which nothing is sent", fault("http://host/?uuid=a#b"));
+    for (const char* const url :
+         {"http://", "http://[::1", "http://host:99999/", "http://host:port/", "http://?a=b"}) {
+        EXPECT_THAT(fault(url), StartsWith("is not well-formed (")) << url;
+    }
 }
 
 TEST(MultipartBuilder, BuildsABodyByteForByte) {

@@ -61,9 +61,8 @@ class KORVEL_CORE_API HttpRequest {
     };
 
     /**
-     * @param url       used as it stands. A URL with control characters, blanks, a fragment ("#")
-     * or a user name before the host, or of another scheme than http and https, makes the attempt
-     * fail without being sent.
+     * @param url       used as it stands. A URL that `findUrlFault` objects to makes the attempt
+     *                  fail without being sent.
      * @param method    "GET" or "POST"
      * @param timeoutMs bounds each wait for the peer, on the platform clock: for the connection,
      *                  for taking bytes that are ready, and for the answer after the last of them.
@@ -73,6 +72,15 @@ class KORVEL_CORE_API HttpRequest {
      */
     static boost::shared_ptr<HttpRequest> create(const std::string& url, const std::string& method,
                                                  int timeoutMs, bool followRedirects);
+
+    /**
+     * Why no request can be sent to a URL: blanks, control characters, another scheme than http
+     * and https, a user name, a fragment ("#"), no host, a port out of range. Resolves no name and
+     * opens no connection. Any thread.
+     * @return the rest of a sentence that begins with the URL, such as "has a user name"; empty if
+     *         requests can be sent
+     */
+    static std::string findUrlFault(const std::string& url);
 
     /**
      * True: the body is what `setWriter` gives, sent with chunked transfer coding. When the final
