@@ -319,7 +319,7 @@ void record(Input& input) {
     const std::string sound = input.takeRest();
     kdUseManualClockKOR(0);
     const Util::EventLock lock;
-    const auto recorder = boost::make_shared<Sound::FileRecorder>(toSamples(sound));
+    const auto recorder = boost::make_shared<Sound::FileRecorder>(toSamples(sound), 0);
     const auto collector = boost::make_shared<Collector>();
     recorder->setSampleRate(rate);
     recorder->setBufferLength(lengthMs);
@@ -327,11 +327,13 @@ void record(Input& input) {
     const bool isUsable = recorder->init();
     require(isUsable == format.isUsable(), "a recorder is usable as its format is");
     recorder->startRecording();
-    for (std::size_t i = 0; i < count; ++i) {
-        kdAdvanceClockKOR(int64_t{std::clamp(lengthMs, 1, 10000)} * 1000000);
-    }
+    const int64_t playedMs = static_cast<int64_t>(count) * int64_t{std::clamp(lengthMs, 1, 10000)};
+    kdAdvanceClockKOR(playedMs * 1000000);
     recorder->stopRecording();
-    require(collector->buffers.size() == (isUsable ? count : 0), "one buffer comes per length");
+    // The length of a buffer is rounded down to whole samples.
+    const int64_t due = isUsable ? playedMs * rate / (int64_t{1000} * format.getSampleCount()) : 0;
+    require(static_cast<int64_t>(collector->buffers.size()) == due,
+            "a buffer comes with its last sample");
     std::string delivered;
     for (const auto& buffer : collector->buffers) {
         require(buffer->getData().size() == format.getByteCount(), "a buffer has its length");

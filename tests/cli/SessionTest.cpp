@@ -94,25 +94,25 @@ TEST_F(SessionTest, TellsEveryEventWithItsTime) {
     EXPECT_EQ(last.get().kind, SessionEvent::FAILURE);
     EXPECT_EQ(recording.events.back().errorCode, 3);
     EXPECT_EQ(recording.events.back().ms, 6000);
-    EXPECT_EQ(recording.firstMs(SessionEvent::RECORDING_BEGIN), 300);
-    EXPECT_EQ(recording.firstMs(SessionEvent::POWER), 400);
+    EXPECT_EQ(recording.firstMs(SessionEvent::RECORDING_BEGIN), 220);
+    EXPECT_EQ(recording.firstMs(SessionEvent::POWER), 320);
     const int64_t began = recording.firstMs(SessionEvent::SPEAKING_BEGIN);
     EXPECT_GE(began, 500);
     EXPECT_LE(began, 900);
     const int64_t done = recording.firstMs(SessionEvent::RECORDING_DONE);
     EXPECT_GE(done, 1700);
     EXPECT_LE(done, 2500);
-    EXPECT_EQ(done % 100, 0);
+    EXPECT_EQ(done % 100, 20);
 }
 
 TEST_F(SessionTest, EndsWithNoVoiceAfterFiveSeconds) {
     Cli::Session session(makeSettings());
     std::future<SessionEvent> last = start(session, {});
-    playTo(5000);
+    playTo(5100);
     const SessionEvent event = last.get();
     EXPECT_EQ(event.kind, SessionEvent::FAILURE);
     EXPECT_EQ(event.errorCode, 6);
-    EXPECT_EQ(event.ms, 5000);
+    EXPECT_EQ(event.ms, 5020);
     EXPECT_TRUE(log.contains("Recognizer error: 6, ErrorNoVoice"));
 }
 

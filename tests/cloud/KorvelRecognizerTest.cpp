@@ -87,7 +87,7 @@ TEST_F(KorvelRecognizerTest, HearsRealSoundWithTheDefaultDetector) {
     ASSERT_TRUE(events->waitForEnds());
     EXPECT_EQ(events->texts(),
               (Texts{"recordingBegin", "speakingBegin", "recordingDone", "results"}));
-    EXPECT_EQ(events->timeOf("recordingBegin"), 300);
+    EXPECT_EQ(events->timeOf("recordingBegin"), 220);
     EXPECT_GE(events->timeOf("speakingBegin"), 600);
     EXPECT_LE(events->timeOf("speakingBegin"), 1500);
     EXPECT_GE(events->timeOf("recordingDone"), 1900);

@@ -5,6 +5,7 @@
 #include <boost/make_shared.hpp>
 #include <climits>
 #include <functional>
+#include <future>
 #include <vector>
 
 #include "core/util/EventLock.h"
@@ -46,8 +47,13 @@ class FileRecorderTest : public ::testing::Test {
         kdUseRealClockKOR();
     }
 
-    void make(const Samples& samples) {
-        recorder = boost::make_shared<FileRecorder>(samples);
+    /** A recorder whose buffers arrive with their last sample, unless a delay is given. */
+    void make(const Samples& samples, int deviceDelayMs = 0) {
+        add(boost::make_shared<FileRecorder>(samples, deviceDelayMs));
+    }
+
+    void add(const boost::shared_ptr<FileRecorder>& made) {
+        recorder = made;
         recorder->addListener(listener);
     }
 
@@ -90,6 +96,83 @@ TEST_F(FileRecorderTest, IsPacedByThePlatformClock) {
     EXPECT_EQ(listener->buffers.size(), 1U);
     kdAdvanceClockKOR(1000 * NS_PER_MS);
     EXPECT_EQ(listener->buffers.size(), 51U);
+}
+
+TEST_F(FileRecorderTest, BuffersArriveTheDelayAfterTheirLastSample) {
+    make(Samples(), 7);
+    ASSERT_TRUE(recorder->init());
+    recorder->startRecording();
+    for (std::size_t i = 1; i <= 3; ++i) {
+        kdAdvanceClockKOR((i == 1 ? 107 : 100) * NS_PER_MS - 1);
+        EXPECT_EQ(listener->buffers.size(), i - 1);
+        kdAdvanceClockKOR(1);
+        EXPECT_EQ(listener->buffers.size(), i);
+    }
+}
+
+TEST_F(FileRecorderTest, TheDelayIs20MsUnlessAskedForOtherwise) {
+    add(boost::make_shared<FileRecorder>(Samples()));
+    ASSERT_TRUE(recorder->init());
+    recorder->startRecording();
+    kdAdvanceClockKOR(120 * NS_PER_MS - 1);
+    EXPECT_TRUE(listener->buffers.empty());
+    kdAdvanceClockKOR(1);
+    EXPECT_EQ(listener->buffers.size(), 1U);
+}
+
+TEST_F(FileRecorderTest, ADelayBelowZeroIsNone) {
+    for (const int delay : {-1, INT_MIN}) {
+        make(Samples(), delay);
+        ASSERT_TRUE(recorder->init());
+        recorder->startRecording();
+        kdAdvanceClockKOR(100 * NS_PER_MS);
+        EXPECT_EQ(listener->buffers.size(), 1U) << delay;
+        listener->buffers.clear();
+    }
+}
+
+TEST_F(FileRecorderTest, PlaysAtTheRateWhereABufferHasNoWholeNumberOfSamples) {
+    make(Samples(), 20);
+    recorder->setSampleRate(11025);
+    ASSERT_TRUE(recorder->init());
+    recorder->startRecording();
+    // 1102 samples a buffer, so the second one ends 199.909 ms after the beginning.
+    const KDint64 secondEndNs = KDint64{2204} * 1000000000 / 11025;
+    kdAdvanceClockKOR(secondEndNs + 20 * NS_PER_MS - 1);
+    EXPECT_EQ(listener->buffers.size(), 1U);
+    kdAdvanceClockKOR(1);
+    EXPECT_EQ(listener->buffers.size(), 2U);
+    // Ten minutes later no time is lost.
+    kdAdvanceClockKOR(600 * KDint64{1000000000} - secondEndNs - 20 * NS_PER_MS);
+    EXPECT_EQ(listener->buffers.size(), 600U * 11025U / 1102U);
+}
+
+TEST_F(FileRecorderTest, NoBufferArrivesWhileTheStarterHoldsTheEventLock) {
+    // On the real clock, since moving the other one by hand fires timers at once.
+    kdUseRealClockKOR();
+    make(Samples(), 20);
+    recorder->setBufferLength(10);
+    std::promise<KDint64> secondArrived;
+    listener->reaction = [this, &secondArrived](Recorder* notified) {
+        if (listener->buffers.size() == 2) {
+            secondArrived.set_value(kdGetTimeUST());
+            notified->stopRecording();
+        }
+    };
+    KDint64 startTime = 0;
+    {
+        const Util::EventLock lock;
+        ASSERT_TRUE(recorder->init());
+        const KDint64 begun = kdGetTimeUST();
+        recorder->startRecording();
+        // A start that takes longer than delay and buffers together.
+        while (kdGetTimeUST() < begun + 80 * NS_PER_MS) {
+        }
+        startTime = kdGetTimeUST();
+        EXPECT_TRUE(listener->buffers.empty());
+    }
+    EXPECT_GE(secondArrived.get_future().get() - startTime, 40 * NS_PER_MS);
+    const Util::EventLock untilTheListenerReturns;
 }
 
 TEST_F(FileRecorderTest, ExtremeSamplesKeepTheirValues) {
@@ -164,6 +247,7 @@ TEST_F(FileRecorderTest, RateChangedToAnAbsurdOneWhileRecordingIsHarmless) {
     make(Samples(100, 1));
     ASSERT_TRUE(recorder->init());
     recorder->startRecording();
+    kdAdvanceClockKOR(50 * NS_PER_MS);
     recorder->setSampleRate(-5);
     kdAdvanceClockKOR(1000 * NS_PER_MS);
     EXPECT_TRUE(listener->buffers.empty());

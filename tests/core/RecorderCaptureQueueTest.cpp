@@ -145,6 +145,14 @@ TEST(RecorderFormat, RoundsTheBufferDownToWholeSamples) {
     EXPECT_EQ(RecorderFormat(1000, 1).getSampleCount(), 1);
 }
 
+TEST(RecorderFormat, TellsHowLongSamplesLast) {
+    EXPECT_EQ(RecorderFormat(16000, 100).getDurationNs(1600), 100000000);
+    EXPECT_EQ(RecorderFormat(11025, 100).getDurationNs(2204), 199909297);
+    EXPECT_EQ(RecorderFormat(11025, 100).getDurationNs(0), 0);
+    // A year and a sample.
+    EXPECT_EQ(RecorderFormat(44100, 100).getDurationNs(31536000LL * 44100 + 1), 31536000000022675);
+}
+
 SoundDataBuffer makeBuffer(int sampleCount, unsigned char lastByte) {
     Bytes bytes(static_cast<std::size_t>(sampleCount) * 2, 0);
     bytes.back() = lastByte;

@@ -6,6 +6,7 @@
 
 #include "core/sound/RecorderFormat.h"
 #include "pal/kd_event.h"
+#include "pal/kd_time.h"
 
 namespace Sound {
 
@@ -13,10 +14,15 @@ namespace {
 
 const int64_t NS_PER_MS = 1000000;
 
+/** The shortest time of a timer: it fires as soon as the event lock is free. */
+const int64_t SOONEST_NS = 1;
+
 }  // namespace
 
-FileRecorder::FileRecorder(std::vector<int16_t> samples)
-    : sound(std::move(samples)), timer([this] { deliver(); }) {}
+FileRecorder::FileRecorder(std::vector<int16_t> samples, int deviceDelayMs)
+    : sound(std::move(samples)),
+      deviceDelayNs(std::max(deviceDelayMs, 0) * NS_PER_MS),
+      timer([this] { onTimer(); }) {}
 
 FileRecorder::~FileRecorder() = default;
 
@@ -26,7 +32,8 @@ bool FileRecorder::init() {
 
 void FileRecorder::startRecording() {
     if (init()) {
-        timer.start(KD_TIMER_PERIODIC_AVERAGE, getBufferLength() * NS_PER_MS);
+        isOpen = false;
+        timer.start(KD_TIMER_ONESHOT, SOONEST_NS);
     }
     Recorder::startRecording();
 }
@@ -36,11 +43,33 @@ void FileRecorder::stopRecording() {
     Recorder::stopRecording();
 }
 
-void FileRecorder::deliver() {
-    const RecorderFormat format(getSampleRate(), getBufferLength());
-    if (!format.isUsable()) {
+void FileRecorder::onTimer() {
+    if (!RecorderFormat(getSampleRate(), getBufferLength()).isUsable()) {
         return;
     }
+    if (isOpen) {
+        deliver();
+    } else {
+        open();
+    }
+}
+
+void FileRecorder::open() {
+    isOpen = true;
+    openTime = kdGetTimeUST() - SOONEST_NS;
+    samplesDelivered = 0;
+    awaitBuffer();
+}
+
+void FileRecorder::awaitBuffer() {
+    const RecorderFormat format(getSampleRate(), getBufferLength());
+    const int64_t due =
+        openTime + deviceDelayNs + format.getDurationNs(samplesDelivered + format.getSampleCount());
+    timer.start(KD_TIMER_ONESHOT, due - kdGetTimeUST());
+}
+
+void FileRecorder::deliver() {
+    const RecorderFormat format(getSampleRate(), getBufferLength());
     std::vector<unsigned char> bytes(format.getByteCount());
     const std::size_t count =
         std::min(sound.size() - position, static_cast<std::size_t>(format.getSampleCount()));
@@ -50,6 +79,9 @@ void FileRecorder::deliver() {
         bytes[2 * i + 1] = static_cast<unsigned char>(sample >> 8);
     }
     position += count;
+    samplesDelivered += format.getSampleCount();
+    // First, since a listener may stop or drop this recorder.
+    awaitBuffer();
     notifyData(boost::make_shared<SoundDataBuffer>(format.getInfo(), std::move(bytes)));
 }
 

@@ -1,7 +1,5 @@
 #include "core/sound/RecorderFormat.h"
 
-#include <cstdint>
-
 namespace Sound {
 
 namespace {
@@ -12,6 +10,7 @@ const int BUFFER_LENGTH_MS_MIN = 1;
 const int BUFFER_LENGTH_MS_MAX = 10000;
 const int BYTES_PER_SAMPLE = 2;
 const int MS_PER_SECOND = 1000;
+const int64_t NS_PER_SECOND = 1000000000;
 
 }  // namespace
 
@@ -29,6 +28,11 @@ int RecorderFormat::getSampleCount() const {
 
 std::size_t RecorderFormat::getByteCount() const {
     return static_cast<std::size_t>(getSampleCount()) * BYTES_PER_SAMPLE;
+}
+
+int64_t RecorderFormat::getDurationNs(int64_t sampleCount) const {
+    return sampleCount / sampleRate * NS_PER_SECOND +
+           sampleCount % sampleRate * NS_PER_SECOND / sampleRate;
 }
 
 SoundDataInfo RecorderFormat::getInfo() const {

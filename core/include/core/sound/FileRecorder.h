@@ -14,13 +14,27 @@
 namespace Sound {
 
 /**
- * Delivers the given samples, then silence without end, paced by the platform clock: one buffer
- * per buffer length. A recorder that was stopped and is started again goes on where it was.
+ * Delivers the given samples, then silence without end, paced by the platform clock as a microphone
+ * is: each buffer arrives the device's delay after its last sample. A recorder that was stopped and
+ * is started again goes on where it was.
+ *
+ * The first sample counts from when the caller of `startRecording` releases the event lock. So what
+ * it does under that lock after the call, however long it takes, does not change how old a buffer
+ * is for it: it takes the time of its start before the first sample, and the k-th buffer is then at
+ * least its own length k times plus the delay old.
  */
 class KORVEL_CORE_API FileRecorder : public Recorder {
   public:
-    /** @param samples mono samples at the rate that will be asked for */
-    explicit FileRecorder(std::vector<int16_t> samples);
+    /** In milliseconds. */
+    static constexpr int DEVICE_DELAY_MS_DFLT = 20;
+
+    /**
+     * @param samples       mono samples at the rate that will be asked for
+     * @param deviceDelayMs milliseconds from a buffer's last sample to its delivery; values below 0
+     *                      count as 0. Without any delay a buffer arrives exactly when a time limit
+     *                      of the same length ends, and on the real clock either may come first.
+     */
+    explicit FileRecorder(std::vector<int16_t> samples, int deviceDelayMs = DEVICE_DELAY_MS_DFLT);
     ~FileRecorder() override;
 
     bool init() override;
@@ -28,10 +42,17 @@ class KORVEL_CORE_API FileRecorder : public Recorder {
     void stopRecording() override;
 
   private:
+    void onTimer();
+    void open();
+    void awaitBuffer();
     void deliver();
 
     std::vector<int16_t> sound;
+    const int64_t deviceDelayNs;
     std::size_t position = 0;
+    bool isOpen = false;
+    int64_t openTime = 0;
+    int64_t samplesDelivered = 0;
     Util::Timer timer;
 };
 

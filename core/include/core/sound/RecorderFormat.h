@@ -5,6 +5,7 @@
 #pragma once
 
 #include <cstddef>
+#include <cstdint>
 
 #include "core/Export.h"
 #include "core/sound/SoundDataInfo.h"
@@ -25,6 +26,9 @@ class KORVEL_CORE_API RecorderFormat {
 
     /** Bytes per buffer. */
     std::size_t getByteCount() const;
+
+    /** How long this many samples last, in nanoseconds, rounded down. */
+    int64_t getDurationNs(int64_t sampleCount) const;
 
     /** The format of each buffer. */
     SoundDataInfo getInfo() const;
