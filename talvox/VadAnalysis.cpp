@@ -6,14 +6,18 @@
 #include <limits>
 #include <utility>
 
+#include "core/sound/RecorderFormat.h"
 #include "talvox/impl/BufferedVAD.h"
 #include "talvox/impl/FrameVAD.h"
+#include "talvox/impl/ListeningRules.h"
 #include "talvox/impl/VoiceActivityDetector.h"
 #include "talvox/impl/VoicePowerEstimator.h"
 
 namespace Talvox {
 
 namespace {
+
+const int64_t NS_PER_MS = 1000000;
 
 /** Stands before a frame detector and notes its decisions. */
 class NotingFrameVAD : public FrameVAD {
@@ -65,20 +69,27 @@ struct VadAnalyzer::Impl {
     boost::shared_ptr<VoiceActivityDetector> vad;
     VoicePowerEstimator powerEstimator;
     int sampleRate = 0;
+    int64_t deviceDelayNs = 0;
     int64_t samplesSeen = 0;
+    unsigned recordedMs = 0;
     bool leadingNoiseDone = false;
     std::vector<VadSegment> segments;
 
-    int64_t nowMs() const { return sampleRate > 0 ? samplesSeen * 1000 / sampleRate : 0; }
+    int64_t soundTimeNs() const {
+        const Sound::RecorderFormat format(sampleRate, ListeningRules::BUFFER_LENGTH_MS);
+        return sampleRate > 0 ? format.getDurationNs(samplesSeen) : 0;
+    }
+
+    int64_t sinceStartNs() const { return soundTimeNs() + deviceDelayNs; }
 
     void learnNoise(const Sound::SoundDataBuffer& buffer, VadBufferAnalysis& analysis) {
         powerEstimator.learnNoise(buffer);
         vad->processNoise(buffer);
         analysis.learningNoise = true;
         analysis.level = powerEstimator.getNoiseLevel();
-        // A session asks whether more than the leading noise has passed on the clock. A buffer
-        // reaches it a moment after its last sample, so at its end the answer is yes already.
-        leadingNoiseDone = analysis.endMs >= vad->getLeadingNoiseMS();
+        leadingNoiseDone = ListeningRules::isNoiseLearned(
+            sinceStartNs(), static_cast<unsigned>(vad->getLeadingNoiseMS()));
+        analysis.step = leadingNoiseDone ? ListeningStep::RECORDING_BEGINS : ListeningStep::GO_ON;
     }
 
     void detect(const Sound::SoundDataBuffer& buffer, VadBufferAnalysis& analysis) {
@@ -87,6 +98,8 @@ struct VadAnalyzer::Impl {
         const bool wasSpeech = vad->isSpeech();
         vad->process(buffer);
         analysis.isSpeech = vad->isSpeech();
+        analysis.step =
+            ListeningRules::decide(wasSpeech, analysis.isSpeech, recordedMs, sinceStartNs());
         analysis.decisions = frameVad->takeDecisions();
         const auto buffered = boost::dynamic_pointer_cast<const BufferedVAD>(vad);
         analysis.activity = buffered != nullptr ? buffered->getActivity(wasSpeech)
@@ -100,10 +113,11 @@ struct VadAnalyzer::Impl {
 };
 
 VadAnalyzer::VadAnalyzer(const std::string& vadParameters, int sampleRateHz,
-                         Sound::Recorder::Mode mode)
+                         Sound::Recorder::Mode mode, int deviceDelayMs)
     : impl(std::make_unique<Impl>()) {
     Impl& self = *impl;
     self.sampleRate = sampleRateHz;
+    self.deviceDelayNs = deviceDelayMs * NS_PER_MS;
     self.powerEstimator.setMode(mode);
     self.vad = VoiceActivityDetector::create(
         vadParameters, [&self](const boost::shared_ptr<FrameVAD>& frameDetector) {
@@ -120,9 +134,11 @@ VadAnalyzer::~VadAnalyzer() = default;
 
 VadBufferAnalysis VadAnalyzer::analyze(const Sound::SoundDataBuffer& buffer) {
     VadBufferAnalysis analysis;
-    analysis.startMs = impl->nowMs();
+    analysis.startMs = impl->soundTimeNs() / NS_PER_MS;
     impl->samplesSeen += buffer.getSampleCount();
-    analysis.endMs = impl->nowMs();
+    impl->recordedMs += ListeningRules::getDurationMs(buffer);
+    analysis.endMs = impl->soundTimeNs() / NS_PER_MS;
+    analysis.arrivalMs = impl->sinceStartNs() / NS_PER_MS;
     if (impl->leadingNoiseDone) {
         impl->detect(buffer, analysis);
     } else {

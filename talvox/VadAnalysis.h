@@ -9,16 +9,36 @@
 #include <string>
 #include <vector>
 
+#include "core/sound/FileRecorder.h"
 #include "core/sound/Recorder.h"
 #include "core/sound/SoundDataBuffer.h"
 #include "talvox/Export.h"
 
 namespace Talvox {
 
-/** What the detector made of one buffer. Times are sound time in ms from the first buffer. */
+/** What a session that hears the same sound does after a buffer. */
+enum class ListeningStep {
+    /** Nothing; it goes on listening. */
+    GO_ON,
+    /** The noise is learnt: `onRecordingBegin`. */
+    RECORDING_BEGINS,
+    /** `onSpeakingBegin` */
+    SPEECH_BEGINS,
+    /** Speech has ended, or there were more than 20 s of sound: the recording ends and is sent. */
+    LISTENING_ENDS,
+    /** 5 s without speech: the session ends with `ErrorNoVoice`. */
+    NO_VOICE
+};
+
+/** What the detector made of one buffer. */
 struct VadBufferAnalysis {
+    /** Where the buffer begins and ends: sound time in ms from the first buffer, rounded down. */
     int64_t startMs = 0;
     int64_t endMs = 0;
+    /** When the buffer arrives: ms since the session's start, rounded down. */
+    int64_t arrivalMs = 0;
+    /** After `LISTENING_ENDS` or `NO_VOICE` a session listens no longer; the analysis goes on. */
+    ListeningStep step = ListeningStep::GO_ON;
     /** The buffer belongs to the leading noise: there are no decisions, and no speech. */
     bool learningNoise = false;
     /** One per frame of the buffer that was looked at, in order; true for speech. */
@@ -35,7 +55,9 @@ struct VadBufferAnalysis {
     bool isSpeech = false;
 };
 
-/** A stretch of speech, from the end of the buffer that began it to the end of that which ended it.
+/**
+ * A stretch of speech in sound time, from the end of the buffer that began it to the end of that
+ * which ended it.
  */
 struct VadSegment {
     int64_t startMs = 0;
@@ -43,8 +65,16 @@ struct VadSegment {
 };
 
 /**
- * Runs a detector over sound just as a recognition session does, and goes on where a session would
- * stop listening. Used by one thread at a time; never blocks, needs no event thread.
+ * Runs a detector over sound and shows what a session does that hears it through a
+ * `Sound::FileRecorder`, by the session's own rules. Goes on where a session stops listening.
+ *
+ * Each buffer arrives the device's delay after its last sample. The first buffer that arrives more
+ * than the detector's leading noise (200 ms) after the start is the last one that is learnt from:
+ * with buffers of 100 ms and a delay of 2 to 100 ms the second, at every rate. At 11,025 Hz a
+ * buffer has 1102 samples, so that two of them last 199 whole ms and arrive, with a delay of 20 ms,
+ * after 219 ms; there the 203rd buffer, not the 201st, exceeds 20 s, since each counts as 99 ms.
+ *
+ * Used by one thread at a time; never blocks, needs no event thread.
  */
 class TALVOX_API VadAnalyzer {
   public:
@@ -53,9 +83,11 @@ class TALVOX_API VadAnalyzer {
      *                      also raises an assertion
      * @param sampleRateHz  rate of the sound; real decisions need 8000, 16000 or 32000
      * @param mode          as a session's, decides between relative (general) and absolute level
+     * @param deviceDelayMs milliseconds from a buffer's last sample to its arrival
      */
     VadAnalyzer(const std::string& vadParameters, int sampleRateHz,
-                Sound::Recorder::Mode mode = Sound::Recorder::MODE_VOICE_RECOGNITION);
+                Sound::Recorder::Mode mode = Sound::Recorder::MODE_VOICE_RECOGNITION,
+                int deviceDelayMs = Sound::FileRecorder::DEVICE_DELAY_MS_DFLT);
     ~VadAnalyzer();
     VadAnalyzer(const VadAnalyzer&) = delete;
     VadAnalyzer& operator=(const VadAnalyzer&) = delete;

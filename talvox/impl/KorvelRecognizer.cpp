@@ -8,30 +8,22 @@
 #include "pal/kd.h"
 #include "talvox/Log.h"
 #include "talvox/Talvox.h"
+#include "talvox/impl/ListeningRules.h"
 
 namespace Talvox {
 
 namespace {
 
 const int LOG_LEVEL = 2;
-const int BUFFER_LENGTH_MS = 100;
 const char* const DUMP_PATH = "/removable/in.wav";
 
 const int64_t NS_PER_MS = 1000000;
-const int64_t NO_VOICE_LIMIT_NS = 5000 * NS_PER_MS;
-const unsigned SOUND_LIMIT_MS = 20000;
 
 /** A recorder that neither delivers a millisecond nor reports for so long has failed. */
 const int64_t NO_SOUND_LIMIT_NS = 10000 * NS_PER_MS;
 
 /** So has one that needs so long for less sound than the limit. */
 const int64_t LISTENING_LIMIT_NS = 60000 * NS_PER_MS;
-
-unsigned getDurationMs(const Sound::SoundDataBuffer& buffer) {
-    const int sampleRate = buffer.getInfo().getSampleRate();
-    const int64_t samples = buffer.getSampleCount();
-    return sampleRate > 0 && samples > 0 ? static_cast<unsigned>(samples * 1000 / sampleRate) : 0;
-}
 
 }  // namespace
 
@@ -112,7 +104,7 @@ bool KorvelRecognizer::startRecorder(int sampleRateHz) {
     const boost::shared_ptr<Sound::Recorder> starting = Sound::Recorder::createRecorder();
     starting->setMode(sessionMode);
     starting->addListener(boost::static_pointer_cast<KorvelRecognizer>(shared_from_this()));
-    starting->setBufferLength(BUFFER_LENGTH_MS);
+    starting->setBufferLength(ListeningRules::BUFFER_LENGTH_MS);
     starting->setSampleRate(sampleRateHz);
     const bool works = starting->init();
     if (isOver()) {
@@ -182,7 +174,7 @@ void KorvelRecognizer::onRecorderDataReceived(
     if (wavDump) {
         wavDump->write(buffer->getData().data(), static_cast<int>(buffer->getData().size()));
     }
-    const unsigned durationMs = getDurationMs(*buffer);
+    const unsigned durationMs = ListeningRules::getDurationMs(*buffer);
     recordedMs += durationMs;
     lastSoundTime = durationMs > 0 ? kdGetTimeUST() : lastSoundTime;
     protocol->handle(buffer);
@@ -210,7 +202,7 @@ void KorvelRecognizer::announce(Call call) {
 void KorvelRecognizer::learnLeadingNoise(const Sound::SoundDataBuffer& buffer) {
     powerEstimator.learnNoise(buffer);
     vad->processNoise(buffer);
-    if ((kdGetTimeUST() - startTime) / NS_PER_MS > static_cast<int64_t>(leadingNoiseMs)) {
+    if (ListeningRules::isNoiseLearned(kdGetTimeUST() - startTime, leadingNoiseMs)) {
         leadingNoiseDone = true;
         announce([this](RecognizerListener& listener) { listener.onRecordingBegin(this); });
     }
@@ -232,15 +224,20 @@ void KorvelRecognizer::reportSound(const Sound::SoundDataBuffer& buffer) {
 void KorvelRecognizer::detectVoice(const Sound::SoundDataBuffer& buffer) {
     const bool wasSpeech = vad->isSpeech();
     vad->process(buffer);
-    const bool isSpeech = vad->isSpeech();
-    if ((wasSpeech && !isSpeech) || recordedMs > SOUND_LIMIT_MS) {
-        stop();
-    } else if (!isSpeech) {
-        if (kdGetTimeUST() - startTime >= NO_VOICE_LIMIT_NS) {
+    switch (ListeningRules::decide(wasSpeech, vad->isSpeech(), recordedMs,
+                                   kdGetTimeUST() - startTime)) {
+        case ListeningStep::LISTENING_ENDS:
+            stop();
+            return;
+        case ListeningStep::NO_VOICE:
             onProtocolError(SpeechError(SpeechError::ErrorNoVoice));
-        }
-    } else if (!wasSpeech) {
-        onProtocolVoiceBegin();
+            return;
+        case ListeningStep::SPEECH_BEGINS:
+            onProtocolVoiceBegin();
+            return;
+        case ListeningStep::RECORDING_BEGINS:
+        case ListeningStep::GO_ON:
+            return;
     }
 }
 

@@ -5,6 +5,7 @@
 #include <algorithm>
 #include <cmath>
 #include <string>
+#include <utility>
 #include <vector>
 
 #include "support/AssertCapture.h"
@@ -15,6 +16,7 @@
 
 namespace {
 
+using Talvox::ListeningStep;
 using Talvox::VadAnalyzer;
 using Talvox::VadBufferAnalysis;
 using Talvox::VadSegment;
@@ -54,6 +56,80 @@ TEST(VadAnalysis, LearnsFromTheLeadingNoiseFirst) {
         EXPECT_EQ(i < 2 ? 0U : 10U, analyses[i].decisions.size());
     }
     EXPECT_NEAR(10 * std::log10(2 * 250000.0) - 45, analyses[1].level, 0.001);
+}
+
+/** How many buffers of the sound the detector learns from. */
+std::ptrdiff_t countLearnt(int rate, int deviceDelayMs) {
+    VadAnalyzer analyzer("", rate, Sound::Recorder::MODE_VOICE_RECOGNITION, deviceDelayMs);
+    const Samples second(static_cast<std::size_t>(rate), 100);
+    const auto analyses = analyzeAll(analyzer, second, rate);
+    return std::count_if(analyses.begin(), analyses.end(),
+                         [](const VadBufferAnalysis& analysis) { return analysis.learningNoise; });
+}
+
+TEST(VadAnalysis, LearnsFromTheBuffersThatArriveUntilMoreThanTheLeadingNoiseHasPassed) {
+    for (const int rate : {8000, 11025, 16000, 44100}) {
+        EXPECT_EQ(countLearnt(rate, 20), 2) << rate;
+        EXPECT_EQ(countLearnt(rate, 100), 2) << rate;
+        EXPECT_EQ(countLearnt(rate, 0), 3) << rate;
+        EXPECT_EQ(countLearnt(rate, 102), 1) << rate;
+    }
+    EXPECT_EQ(countLearnt(16000, 1), 2);
+    EXPECT_EQ(countLearnt(16000, 101), 1);
+}
+
+TEST(VadAnalysis, ArrivalIsTheDelayAfterTheLastSample) {
+    VadAnalyzer analyzer("", 11025);
+    const auto analyses = analyzeAll(analyzer, Samples(11025, 0), 11025);
+    ASSERT_EQ(analyses.size(), 10U);
+    EXPECT_EQ(analyses[1].endMs, 199);
+    EXPECT_EQ(analyses[1].arrivalMs, 219);
+    EXPECT_EQ(analyses[1].step, ListeningStep::RECORDING_BEGINS);
+    EXPECT_EQ(analyses[9].endMs, 999);
+    EXPECT_EQ(analyses[9].arrivalMs, 1019);
+}
+
+/** When a session's listening ends for the first time, and by which step. */
+std::pair<int64_t, ListeningStep> findEnd(const std::string& parameters, int rate) {
+    const LogCapture log;
+    VadAnalyzer analyzer(parameters, rate);
+    for (const VadBufferAnalysis& analysis :
+         analyzeAll(analyzer, Samples(static_cast<std::size_t>(rate) * 25, 0), rate)) {
+        if (analysis.step == ListeningStep::LISTENING_ENDS ||
+            analysis.step == ListeningStep::NO_VOICE) {
+            return {analysis.arrivalMs, analysis.step};
+        }
+    }
+    return {-1, ListeningStep::GO_ON};
+}
+
+TEST(VadAnalysis, ShowsTheLimitsOfASession) {
+    const char* const never = "activityon=2";
+    const char* const endless = "activityon=-1;activityoff=-1";
+    EXPECT_EQ(findEnd(never, 16000), std::make_pair(int64_t{5020}, ListeningStep::NO_VOICE));
+    EXPECT_EQ(findEnd(never, 11025), std::make_pair(int64_t{5017}, ListeningStep::NO_VOICE));
+    EXPECT_EQ(findEnd(endless, 16000),
+              std::make_pair(int64_t{20120}, ListeningStep::LISTENING_ENDS));
+    // 203 buffers of 1102 samples: each counts as 99 ms.
+    EXPECT_EQ(findEnd(endless, 11025),
+              std::make_pair(int64_t{20310}, ListeningStep::LISTENING_ENDS));
+}
+
+TEST(VadAnalysis, StepsFollowTheStateOfTheBuffers) {
+    VadAnalyzer analyzer("", 16000);
+    bool wasSpeech = false;
+    int begins = 0;
+    for (const VadBufferAnalysis& analysis :
+         analyzeAll(analyzer, betweenPauses(speechLike(16000, 1500), 16000), 16000)) {
+        if (analysis.learningNoise) {
+            continue;
+        }
+        EXPECT_EQ(analysis.step == ListeningStep::SPEECH_BEGINS, analysis.isSpeech && !wasSpeech);
+        EXPECT_EQ(analysis.step == ListeningStep::LISTENING_ENDS, !analysis.isSpeech && wasSpeech);
+        begins += analysis.step == ListeningStep::SPEECH_BEGINS ? 1 : 0;
+        wasSpeech = analysis.isSpeech;
+    }
+    EXPECT_EQ(begins, 1);
 }
 
 TEST(VadAnalysis, FindsWhatTheSessionsDetectorFinds) {
