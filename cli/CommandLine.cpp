@@ -60,6 +60,15 @@ CLI::Option* addVad(CLI::App& command, SettingsOptions& settings) {
         ->type_name("TEXT");
 }
 
+void addLeadInOption(CLI::App& command, int& leadInMs) {
+    command
+        .add_option("--lead-in", leadInMs,
+                    "Silence before a file that begins with speech at once, in milliseconds [" +
+                        std::to_string(LEAD_IN_MS_DFLT) + "]")
+        ->type_name("MS")
+        ->check(CLI::Range(0, LEAD_IN_MS_MAX).description(""));
+}
+
 void addSettingsSources(CLI::App& command, SettingsOptions& settings) {
     command
         .add_option(
@@ -118,12 +127,7 @@ CLI::App* addRecognize(CLI::App& app, RecognizeOptions& options) {
         ->add_flag("--mic", options.microphone,
                    "Record from the default input device instead of playing a file")
         ->excludes(file);
-    command
-        ->add_option("--lead-in", options.leadInMs,
-                     "Silence before a file that begins with speech at once, in milliseconds [" +
-                         std::to_string(LEAD_IN_MS_DFLT) + "]")
-        ->type_name("MS")
-        ->check(CLI::Range(0, LEAD_IN_MS_MAX).description(""));
+    addLeadInOption(*command, options.leadInMs);
     addRequestOptions(*command, options.settings);
     addVad(*command, options.settings);
     addRate(*command, options.settings);
@@ -164,6 +168,11 @@ CLI::App* addVadCommand(CLI::App& app, VadOptions& options) {
                      "input")
         ->type_name("FILE")
         ->required();
+    addLeadInOption(*command, options.leadInMs);
+    command->add_flag("--as-session", options.asSession,
+                      "End where a recognition of this sound stops listening (end of speech, 5 s "
+                      "without speech, 20 s of sound), with silence behind a file that is shorter, "
+                      "and print what it reports, and when");
     addVad(*command, options.settings);
     addRate(*command, options.settings);
     addSettingsSources(*command, options.settings);

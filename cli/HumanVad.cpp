@@ -4,6 +4,7 @@
 
 #include "LevelBar.h"
 #include "Text.h"
+#include "talvox/SpeechError.h"
 
 namespace Cli {
 
@@ -26,6 +27,19 @@ std::string activityText(const Talvox::VadBufferAnalysis& buffer) {
     return fixed(static_cast<double>(buffer.activity), 5, 3);
 }
 
+std::string sessionText(const SessionEvent& event) {
+    switch (event.kind) {
+        case SessionEvent::RECORDING_BEGIN:
+            return "recording begins";
+        case SessionEvent::SPEAKING_BEGIN:
+            return "speech begins";
+        case SessionEvent::RECORDING_DONE:
+            return "recording is done";
+        default:
+            return std::string("error: ") + Talvox::SpeechError(event.errorCode).getErrorString();
+    }
+}
+
 }  // namespace
 
 void HumanVad::printBuffer(const Talvox::VadBufferAnalysis& buffer) {
@@ -38,6 +52,10 @@ void HumanVad::printBuffer(const Talvox::VadBufferAnalysis& buffer) {
         << fixed(static_cast<double>(buffer.level), 6, 1) << " dB"
         << "   " << activityText(buffer) << "  " << padded(stateName(buffer), STATE_COLUMNS)
         << decisionText(buffer) << '\n';
+}
+
+void HumanVad::printSessionEvent(const SessionEvent& event) {
+    out << "       -> session, after " << event.ms << " ms: " << sessionText(event) << '\n';
 }
 
 void HumanVad::printSegments(const std::vector<Talvox::VadSegment>& segments, bool lastIsOpen) {

@@ -11,6 +11,7 @@ class HumanVad : public VadPrinter {
   public:
     explicit HumanVad(std::ostream& output) : out(output) {}
     void printBuffer(const Talvox::VadBufferAnalysis& buffer) override;
+    void printSessionEvent(const SessionEvent& event) override;
     void printSegments(const std::vector<Talvox::VadSegment>& segments, bool lastIsOpen) override;
 
   private:

@@ -17,6 +17,10 @@ void JsonVad::printBuffer(const Talvox::VadBufferAnalysis& buffer) {
     out << toJsonLine(object) << '\n';
 }
 
+void JsonVad::printSessionEvent(const SessionEvent& event) {
+    JsonEvents(out).print(event);
+}
+
 void JsonVad::printSegments(const std::vector<Talvox::VadSegment>& segments, bool lastIsOpen) {
     for (const Talvox::VadSegment& segment : segments) {
         Json object;

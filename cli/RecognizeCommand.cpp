@@ -67,10 +67,7 @@ void mountDump(const std::string& directory) {
 void installPlayer(const RecognizeOptions& options, int sampleRateHz, std::istream& input) {
     std::vector<int16_t> samples =
         loadSound(options.file, input, sampleRateHz, STANDARD_INPUT_MAX_SECONDS);
-    samples.insert(
-        samples.begin(),
-        static_cast<std::size_t>(sampleRateHz) * static_cast<std::size_t>(options.leadInMs) / 1000,
-        0);
+    addLeadIn(samples, sampleRateHz, options.leadInMs);
     Sound::Recorder::setFactory(
         [samples] { return boost::make_shared<Sound::FileRecorder>(samples); });
 }

@@ -29,4 +29,10 @@ std::vector<int16_t> loadSound(const std::string& path, std::istream& input, int
     return toSamples(readRawAudio(input, sampleRateHz, maxSamples), sampleRateHz);
 }
 
+void addLeadIn(std::vector<int16_t>& samples, int sampleRateHz, int milliseconds) {
+    const std::size_t count =
+        static_cast<std::size_t>(sampleRateHz) * static_cast<std::size_t>(milliseconds) / 1000;
+    samples.insert(samples.begin(), count, 0);
+}
+
 }  // namespace Cli

@@ -19,4 +19,7 @@ extern const char* const STANDARD_INPUT;
 std::vector<int16_t> loadSound(const std::string& path, std::istream& input, int sampleRateHz,
                                int maxSeconds);
 
+/** Puts silence before the sound. @param milliseconds 0 or more */
+void addLeadIn(std::vector<int16_t>& samples, int sampleRateHz, int milliseconds);
+
 }  // namespace Cli

@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <cstdint>
 #include <memory>
+#include <optional>
 #include <vector>
 
 #include "AudioFile.h"
@@ -12,6 +13,7 @@
 #include "SoundInput.h"
 #include "core/sound/Recorder.h"
 #include "core/sound/SoundDataBuffer.h"
+#include "talvox/SpeechError.h"
 #include "talvox/VadAnalysis.h"
 
 namespace Cli {
@@ -44,6 +46,34 @@ Sound::Recorder::Mode sessionMode(const Talvox::Settings& settings) {
                : Sound::Recorder::MODE_VOICE_RECOGNITION;
 }
 
+/** What a session reports by the step; nothing when it goes on listening. */
+std::optional<SessionEvent> toSessionEvent(const Talvox::VadBufferAnalysis& buffer) {
+    SessionEvent event;
+    event.ms = buffer.arrivalMs;
+    switch (buffer.step) {
+        case Talvox::ListeningStep::GO_ON:
+            return std::nullopt;
+        case Talvox::ListeningStep::RECORDING_BEGINS:
+            event.kind = SessionEvent::RECORDING_BEGIN;
+            break;
+        case Talvox::ListeningStep::SPEECH_BEGINS:
+            event.kind = SessionEvent::SPEAKING_BEGIN;
+            break;
+        case Talvox::ListeningStep::LISTENING_ENDS:
+            event.kind = SessionEvent::RECORDING_DONE;
+            break;
+        case Talvox::ListeningStep::NO_VOICE:
+            event.kind = SessionEvent::FAILURE;
+            event.errorCode = Talvox::SpeechError::ErrorNoVoice;
+            break;
+    }
+    return event;
+}
+
+bool endsListening(Talvox::ListeningStep step) {
+    return step == Talvox::ListeningStep::LISTENING_ENDS || step == Talvox::ListeningStep::NO_VOICE;
+}
+
 std::unique_ptr<VadPrinter> makePrinter(bool json, std::ostream& out) {
     if (json) {
         return std::make_unique<JsonVad>(out);
@@ -57,19 +87,27 @@ int runVad(const VadOptions& options, Console& console, LogOutput& log) {
     log.show(true);
     const boost::shared_ptr<Talvox::Settings> settings = buildSettings(options.settings);
     const int rate = settings->getSampleRate();
-    const std::vector<int16_t> samples =
-        loadSound(options.file, console.in, rate, MAX_CLIP_SECONDS);
+    std::vector<int16_t> samples = loadSound(options.file, console.in, rate, MAX_CLIP_SECONDS);
+    addLeadIn(samples, rate, options.leadInMs);
     const std::size_t length = static_cast<std::size_t>(rate) * BUFFER_MS / 1000;
 
     const std::unique_ptr<VadPrinter> printer = makePrinter(options.json, console.out);
     Talvox::VadAnalyzer analyzer(settings->getString(Talvox::Settings::SKS_VAD_SETTINGS), rate,
                                  sessionMode(*settings));
     bool isSpeech = false;
-    for (std::size_t position = 0; position < samples.size(); position += length) {
+    bool isListening = true;
+    // A session goes on behind the sound, in silence, until one of its limits ends it.
+    for (std::size_t position = 0; options.asSession ? isListening : position < samples.size();
+         position += length) {
         const Talvox::VadBufferAnalysis analysis =
             analyzer.analyze(bufferAt(samples, position, length, rate));
         printer->printBuffer(analysis);
+        const std::optional<SessionEvent> event = toSessionEvent(analysis);
+        if (options.asSession && event) {
+            printer->printSessionEvent(*event);
+        }
         isSpeech = analysis.isSpeech;
+        isListening = !endsListening(analysis.step);
     }
     printer->printSegments(analyzer.segments(), isSpeech);
     return EXIT_OK;

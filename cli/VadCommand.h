@@ -12,12 +12,14 @@ namespace Cli {
 struct VadOptions {
     SettingsOptions settings;
     std::string file; /**< path or `STANDARD_INPUT` */
+    int leadInMs = LEAD_IN_MS_DFLT;
+    bool asSession = false; /**< end where a session ends, and print what it reports */
     bool json = false;
 };
 
 /**
- * `talvox vad`: runs the detector over the sound as a session would, and prints what it decides
- * for every buffer, then the segments of speech.
+ * `talvox vad`: runs the detector over the sound by the rules of a session, and prints what it
+ * decides for every buffer, then the segments of speech.
  * @return the exit status
  * @throws UsageError
  */

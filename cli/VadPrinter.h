@@ -3,6 +3,7 @@
 #include <string>
 #include <vector>
 
+#include "EventPrinter.h"
 #include "talvox/VadAnalysis.h"
 
 namespace Cli {
@@ -12,6 +13,8 @@ class VadPrinter {
   public:
     virtual ~VadPrinter() = default;
     virtual void printBuffer(const Talvox::VadBufferAnalysis& buffer) = 0;
+    /** @param event what a session reports after the buffer that was printed last */
+    virtual void printSessionEvent(const SessionEvent& event) = 0;
     /** @param lastIsOpen speech still went on at the end of the sound */
     virtual void printSegments(const std::vector<Talvox::VadSegment>& segments,
                                bool lastIsOpen) = 0;
