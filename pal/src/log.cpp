@@ -1,3 +1,4 @@
+#include <clocale>
 #include <cstdio>
 #include <memory>
 #include <mutex>
@@ -38,6 +39,15 @@ void writeToStandardError(const char* message) {
     std::fwrite(line.data(), 1, line.size(), stderr);
 }
 
+/** Formats as in the "C" locale, in whichever the host application has set. */
+int formatText(char* buffer, std::size_t size, const char* format, va_list args) {
+    static const locale_t plain = newlocale(LC_ALL_MASK, "C", locale_t{});
+    const locale_t before = uselocale(plain);
+    const int length = std::vsnprintf(buffer, size, format, args);
+    uselocale(before);
+    return length;
+}
+
 }  // namespace
 
 void kdLogMessage(const char* string) {
@@ -71,7 +81,7 @@ void kdLogFormatMessageVargs(const char* format, va_list args) {
     char buffer[SHORT_MESSAGE];
     va_list again;
     va_copy(again, args);
-    const int length = std::vsnprintf(buffer, sizeof buffer, format, args);
+    const int length = formatText(buffer, sizeof buffer, format, args);
     if (length < 0) {
         kdLogMessage(format);  // cannot be formatted; better than nothing
     } else if (static_cast<std::size_t>(length) < sizeof buffer) {
@@ -80,7 +90,7 @@ void kdLogFormatMessageVargs(const char* format, va_list args) {
         const std::size_t size = static_cast<std::size_t>(length) + 1;
         const std::unique_ptr<char[]> longBuffer(new (std::nothrow) char[size]);
         if (longBuffer != nullptr) {
-            std::vsnprintf(longBuffer.get(), size, format, again);
+            formatText(longBuffer.get(), size, format, again);
         }
         kdLogMessage(longBuffer != nullptr ? longBuffer.get() : buffer);
     }
@@ -106,7 +116,7 @@ KDint kdSprintf_s(char* buf, KDsize bufsize, const char* format, ...) {
     }
     va_list args;
     va_start(args, format);
-    const int length = std::vsnprintf(buf, bufsize, format, args);
+    const int length = formatText(buf, bufsize, format, args);
     va_end(args);
     if (length < 0) {
         buf[0] = '\0';

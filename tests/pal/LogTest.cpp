@@ -1,11 +1,13 @@
 #include <gmock/gmock.h>
 
 #include <algorithm>
+#include <cstdio>
 #include <string>
 #include <thread>
 #include <vector>
 
 #include "pal/kd_log.h"
+#include "support/CommaLocale.h"
 #include "support/LogCapture.h"
 
 using ::testing::ElementsAre;
@@ -114,6 +116,23 @@ TEST(Log, GoesToStandardErrorByDefault) {
     ::testing::internal::CaptureStderr();
     kdLogMessage("a line");
     EXPECT_EQ(::testing::internal::GetCapturedStderr(), "a line\n");
+}
+
+TEST(Log, NumbersHaveAPointInALocaleWithCommas) {
+    const TestSupport::CommaLocale german;
+    if (!TestSupport::CommaLocale::isAvailable()) {
+        GTEST_SKIP() << "the sources of locales are not installed";
+    }
+    ASSERT_TRUE(german.isSet());
+    const TestSupport::LogCapture log;
+    kdLogFormatMessage("%f", 0.5);
+    EXPECT_TRUE(log.contains("0.500000"));
+    char buffer[8];
+    EXPECT_EQ(kdSprintf_s(buffer, sizeof buffer, "%.1f", 2.5), 3);
+    EXPECT_STREQ(buffer, "2.5");
+    // The application's own texts keep their form.
+    std::snprintf(buffer, sizeof buffer, "%.1f", 2.5);
+    EXPECT_STREQ(buffer, "2,5");
 }
 
 TEST(Sprintf, WritesWhatFitsAndReportsIt) {

@@ -14,7 +14,7 @@ KD_EXTERN_C_BEGIN
 /** Writes one message of any length and any bytes, as it is. Null counts as an empty message. */
 KD_API void kdLogMessage(const char* string);
 
-/** Writes one printf-style message of any length. */
+/** Writes one printf-style message of any length. Numbers have a point in every locale. */
 KD_API void kdLogFormatMessage(const char* format, ...) __attribute__((format(printf, 1, 2)));
 
 /** As `kdLogFormatMessage`, with the arguments as a list. */
@@ -36,7 +36,7 @@ typedef void(KDLogSinkFuncKOR)(const char* message, void* user);
 KD_API void kdSetLogSinkKOR(KDLogSinkFuncKOR* sink, void* user);
 
 /**
- * As C's `snprintf`, but never reports more than it wrote.
+ * As C's `snprintf` in the "C" locale, but never reports more than it wrote.
  * @return the number of characters written before the closing zero, or -1 when `buf` is null or
  *         `bufsize` is 0; a text that did not fit is cut.
  */
