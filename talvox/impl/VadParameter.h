@@ -1,25 +1,33 @@
 /**
  * @file
- * Values of detector parameters.
+ * Values of detector parameters, the same in every locale.
  */
 #pragma once
 
-#include <cstdio>
-#include <cstdlib>
 #include <string>
 
 namespace Talvox {
 
-/** A decimal integer as `scanf` reads it; 0 for what is none. Too large numbers are cut to 32 bits.
- */
-inline int parseIntParameter(const std::string& value) {
-    return static_cast<int>(std::strtoll(value.c_str(), nullptr, 10));
+/** A value as a detector reads it. */
+template <typename Number>
+struct VadNumber {
+    Number value = 0; /**< 0 where the text begins with no number */
+    bool isNumber = false;
+    bool isWholeText = false; /**< nothing stands behind the number */
+};
+
+/** A decimal integer as `scanf` reads it with "%d". Too large numbers are cut to 32 bits. */
+VadNumber<int> readIntParameter(const std::string& text);
+
+/** A number as `scanf` reads it with "%f" in the "C" locale, infinity and not-a-number included. */
+VadNumber<float> readFloatParameter(const std::string& text);
+
+inline int parseIntParameter(const std::string& text) {
+    return readIntParameter(text).value;
 }
 
-/** A number as `scanf` reads it; 0 for what is none. */
-inline float parseFloatParameter(const std::string& value) {
-    float number = 0;
-    return std::sscanf(value.c_str(), "%f", &number) == 1 ? number : 0.0F;
+inline float parseFloatParameter(const std::string& text) {
+    return readFloatParameter(text).value;
 }
 
 }  // namespace Talvox
