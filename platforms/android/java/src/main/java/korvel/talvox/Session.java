@@ -10,7 +10,7 @@ import korvel.talvox.impl.Recognizer;
  */
 final class Session implements Recognizer.Events {
     private final RecognitionListener listener;
-    private final Executor executor;
+    private final SerialExecutor executor;
     private Object owner;
     private NativeHandle handle;
     private boolean stopWanted;
@@ -119,7 +119,7 @@ final class Session implements Recognizer.Events {
 
     private void deliver(Runnable event) {
         if (!ended) {
-            post(event);
+            executor.execute(unlessClosed(event));
         }
     }
 
@@ -129,20 +129,21 @@ final class Session implements Recognizer.Events {
             return;
         }
         ended = true;
-        post(
-                () -> {
-                    over();
-                    event.run();
-                });
+        executor.execute(
+                unlessClosed(
+                        () -> {
+                            over();
+                            event.run();
+                        }),
+                this::over);
     }
 
-    private void post(Runnable event) {
-        executor.execute(
-                () -> {
-                    if (!closed) {
-                        event.run();
-                    }
-                });
+    private Runnable unlessClosed(Runnable event) {
+        return () -> {
+            if (!closed) {
+                event.run();
+            }
+        };
     }
 
     @Override

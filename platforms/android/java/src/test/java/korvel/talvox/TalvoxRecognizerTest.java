@@ -9,11 +9,15 @@ import static org.robolectric.Shadows.shadowOf;
 
 import android.Manifest;
 import android.os.Looper;
+import java.lang.ref.PhantomReference;
+import java.lang.ref.Reference;
+import java.lang.ref.ReferenceQueue;
 import java.util.Arrays;
 import java.util.List;
 import java.util.concurrent.ArrayBlockingQueue;
 import java.util.concurrent.BlockingQueue;
 import java.util.concurrent.CountDownLatch;
+import java.util.concurrent.RejectedExecutionException;
 import java.util.concurrent.TimeUnit;
 import java.util.concurrent.atomic.AtomicInteger;
 import java.util.concurrent.atomic.AtomicReference;
@@ -334,6 +338,53 @@ public class TalvoxRecognizerTest extends EngineTestCase {
                 };
         engine.createRecognizer(NOTHING, events).start();
         assertEquals("results", events.end());
+        assertGoForward(events);
+    }
+
+    /** Starts a recognition that ends at once, with an executor that refuses everything. */
+    private PhantomReference<Object> failUnheard(ReferenceQueue<Object> collected) {
+        final TalvoxRecognizer recognizer =
+                engine.createRecognizer(
+                        NOTHING,
+                        new Events(),
+                        task -> {
+                            throw new OutOfMemoryError("no thread for an event");
+                        });
+        recognizer.start(); // there is no address
+        return new PhantomReference<>(recognizer, collected);
+    }
+
+    @Test
+    public void aLastEventThatIsRefusedFreesTheRecognizer() throws Exception {
+        final ReferenceQueue<Object> collected = new ReferenceQueue<>();
+        final PhantomReference<Object> recognizer = failUnheard(collected);
+        assertLogged("the executor refuses an event, which is lost");
+        Reference<?> gone = null;
+        for (int i = 0; i < 200 && gone == null; i++) {
+            System.gc();
+            gone = collected.remove(50);
+        }
+        assertSame(recognizer, gone);
+    }
+
+    @Test
+    public void anExecutorThatRefusesOneEventCostsNoOther() throws Exception {
+        useGateway(gateway.getUrl());
+        final Events events = new Speaker();
+        final AtomicInteger calls = new AtomicInteger();
+        try (TalvoxRecognizer recognizer =
+                engine.createRecognizer(
+                        NOTHING,
+                        events,
+                        task -> {
+                            if (calls.incrementAndGet() == 2) { // sound or level
+                                throw new RejectedExecutionException("busy");
+                            }
+                            task.run();
+                        })) {
+            recognizer.start();
+            assertEquals("results", events.end());
+        }
         assertGoForward(events);
     }
 
