@@ -29,11 +29,16 @@ public final class CoreApplication {
      * Makes the native libraries use this context, and Android's microphone, network state,
      * proximity sensor and log through it. May be called before they are loaded, and repeatedly.
      *
-     * @param context any context of the application; not null
+     * @param context any context of the application; not null. One that does not know its
+     *     application yet counts only until another is given
      */
     public static void install(Context context) {
         final Context application = context.getApplicationContext();
-        installed = application != null ? application : context;
+        if (application != null) {
+            installed = application;
+        } else if (installed == null) {
+            installed = context;
+        }
         connect();
     }
 

@@ -16,12 +16,19 @@ final class ReachabilityBackend extends ConnectivityManager.NetworkCallback {
     private static final int UNKNOWN = -1;
 
     private static ConnectivityManager watched;
+    private static Context watchedFor;
     private static ReachabilityBackend watcher;
 
     private ReachabilityBackend() {}
 
-    /** Called by the native library. Watches from now on, instead of what was watched before. */
+    /**
+     * Called by the native library. Watches from now on, instead of what was watched before; the
+     * same application is watched once, however often this is called.
+     */
     private static synchronized void start(Context context) {
+        if (watcher != null && watchedFor == context) {
+            return;
+        }
         stop();
         final Object service = context.getSystemService(Context.CONNECTIVITY_SERVICE);
         if (!(service instanceof ConnectivityManager)) {
@@ -34,6 +41,7 @@ final class ReachabilityBackend extends ConnectivityManager.NetworkCallback {
             onReachabilityChangedInternal(judge(manager));
             manager.registerDefaultNetworkCallback(callback);
             watched = manager;
+            watchedFor = context;
             watcher = callback;
         } catch (RuntimeException refused) {
             // No permission ACCESS_NETWORK_STATE, or too many callbacks in this application.
