@@ -25,6 +25,10 @@ public final class Recognition {
         return new Recognition(Outcome.fromCode(outcome), hypotheses, requestId);
     }
 
+    /**
+     * The engine's verdict. Without confidences it says little: one hypothesis is then accepted, two
+     * or more are always rejected.
+     */
     public Outcome getOutcome() {
         return outcome;
     }
@@ -34,7 +38,10 @@ public final class Recognition {
         return hypotheses;
     }
 
-    /** The service's identifier of the request, empty when no service was asked. */
+    /**
+     * The gateway's identifier of the request; empty if its answer had none, or if the device's own
+     * recogniser served.
+     */
     public String getRequestId() {
         return requestId;
     }
