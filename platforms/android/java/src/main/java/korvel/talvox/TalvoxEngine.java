@@ -1,6 +1,7 @@
 package korvel.talvox;
 
 import android.content.Context;
+import android.os.Bundle;
 import android.os.Handler;
 import android.os.Looper;
 import java.util.ArrayList;
@@ -11,6 +12,7 @@ import java.util.concurrent.Executor;
 import korvel.core.CoreApplication;
 import korvel.talvox.impl.PlatformRecognizer;
 import korvel.talvox.impl.Talvox;
+import korvel.talvox.util.LogCollector;
 
 /**
  * The speech-recognition engine. There is one per process, which lives as long as the process.
@@ -27,15 +29,15 @@ public final class TalvoxEngine {
     }
 
     /**
-     * The engine. The first call loads the native library and takes some ten milliseconds.
+     * The engine. The first call loads the native library, takes some ten milliseconds and begins to
+     * watch the state of the network; the others are cheap.
      *
      * @param context any context of the application; only its application context is kept
      * @throws UnsatisfiedLinkError if the application was built without the library for this
      *     device's processor
      */
     public static TalvoxEngine getInstance(Context context) {
-        final Context application = context.getApplicationContext();
-        CoreApplication.install(application == null ? context : application);
+        CoreApplication.install(context);
         PlatformRecognizer.queryLanguages();
         final long handle = Talvox.getHandle();
         synchronized (TalvoxEngine.class) {
@@ -55,9 +57,14 @@ public final class TalvoxEngine {
         return Talvox.getVersion();
     }
 
-    /** The engine's settings, all keys set. */
+    /**
+     * The engine's settings, all keys set. {@link TalvoxSettings#EVENTS_LOGGING} says whether usage
+     * events are collected, however that was switched.
+     */
     public TalvoxSettings getSettings() {
-        return TalvoxSettings.fromBundle(Talvox.getSettings(handle));
+        final Bundle settings = Talvox.getSettings(handle);
+        settings.putAll(eventsLogging());
+        return TalvoxSettings.fromBundle(settings);
     }
 
     /**
@@ -67,14 +74,40 @@ public final class TalvoxEngine {
      */
     public void updateSettings(TalvoxSettings settings) {
         Talvox.updateSettings(handle, settings.toBundle());
+        switchEventsLogging(settings);
     }
 
     /**
      * Changes the engine's settings to what an XML document says under {@code
-     * /startup/features/voice}. What cannot be read there is logged and changes nothing.
+     * /startup/features/voice}. What cannot be read there is logged and changes nothing. The values
+     * are not checked. Otherwise as {@link #updateSettings}.
      */
     public void updateSettingsFromXml(String xml) {
+        Objects.requireNonNull(xml, "xml");
+        // The document need not set this one; if it does not, the collector stays as it is.
+        Talvox.updateSettings(handle, eventsLogging());
         Talvox.updateSettingsFromXml(handle, xml);
+        switchEventsLogging(TalvoxSettings.fromBundle(Talvox.getSettings(handle)));
+    }
+
+    /** The state of the collector as a setting. */
+    private static Bundle eventsLogging() {
+        return TalvoxSettings.builder()
+                .set(
+                        TalvoxSettings.EVENTS_LOGGING,
+                        LogCollector.isLoggingEnabled()
+                                ? EventsLogging.ENABLED
+                                : EventsLogging.DISABLED)
+                .build()
+                .toBundle();
+    }
+
+    /** Switches the collector where the settings say how. */
+    private static void switchEventsLogging(TalvoxSettings settings) {
+        final EventsLogging wanted = settings.get(TalvoxSettings.EVENTS_LOGGING);
+        if (wanted != null) {
+            LogCollector.setLoggingEnabled(wanted == EventsLogging.ENABLED);
+        }
     }
 
     /**
@@ -113,7 +146,8 @@ public final class TalvoxEngine {
      *     TalvoxSettings#forRecognition}
      * @param listener hears the events
      * @param executor runs the listener. One that runs it at once, on the calling thread, has it run
-     *     on the engine's event thread: then the listener must not block at all
+     *     on the engine's event thread: then the listener must not block at all. An event that it
+     *     refuses by throwing is logged and lost, even the last one; the rest still comes
      * @throws IllegalArgumentException if a setting is {@linkplain SettingKey#isEngineOnly of the
      *     engine only}
      */

@@ -26,6 +26,7 @@ import korvel.talvox.impl.Recognizer;
 import korvel.talvox.impl.Talvox;
 import korvel.talvox.support.EngineTestCase;
 import korvel.talvox.support.Events;
+import korvel.talvox.util.LogCollector;
 import org.junit.Test;
 
 public class TalvoxEngineTest extends EngineTestCase {
@@ -107,6 +108,64 @@ public class TalvoxEngineTest extends EngineTestCase {
         assertNull(settings.get(TalvoxSettings.ASR_OVERRIDE));
         engine.updateSettingsFromXml("no XML at all");
         assertEquals("http://example.org", engine.getSettings().get(TalvoxSettings.URL));
+    }
+
+    private void setEventsLogging(EventsLogging value) {
+        engine.updateSettings(
+                TalvoxSettings.builder().set(TalvoxSettings.EVENTS_LOGGING, value).build());
+    }
+
+    private void setEventsLoggingByXml(String child) {
+        engine.updateSettingsFromXml(
+                "<startup><features><voice>" + child + "</voice></features></startup>");
+    }
+
+    private void assertEventsLogging(boolean isOn) {
+        assertEquals(isOn, LogCollector.isLoggingEnabled());
+        assertEquals(
+                isOn ? EventsLogging.ENABLED : EventsLogging.DISABLED,
+                engine.getSettings().get(TalvoxSettings.EVENTS_LOGGING));
+    }
+
+    @Test
+    public void theSettingSwitchesUsageLoggingWhereItIsSet() {
+        try {
+            assertEventsLogging(false);
+            setEventsLogging(EventsLogging.ENABLED);
+            assertEventsLogging(true);
+            useGateway("http://127.0.0.1:9");
+            assertEventsLogging(true);
+            setEventsLogging(EventsLogging.DISABLED);
+            assertEventsLogging(false);
+            LogCollector.setLoggingEnabled(true);
+            useGateway("http://127.0.0.1:9");
+            assertEventsLogging(true);
+            engine.updateSettings(engine.getSettings());
+            assertEventsLogging(true);
+            setEventsLogging(EventsLogging.DISABLED);
+            assertEventsLogging(false);
+        } finally {
+            LogCollector.setLoggingEnabled(false);
+        }
+    }
+
+    @Test
+    public void soDoesADocumentThatSetsIt() {
+        try {
+            setEventsLoggingByXml("<eventslogging>enabled</eventslogging>");
+            assertEventsLogging(true);
+            setEventsLoggingByXml("<url>http://127.0.0.1:9</url>");
+            assertEventsLogging(true);
+            setEventsLoggingByXml("<Events_Logging>disabled</Events_Logging>");
+            assertEventsLogging(false);
+            LogCollector.setLoggingEnabled(true);
+            setEventsLoggingByXml("<eventslogging>perhaps</eventslogging>");
+            assertEventsLogging(true);
+            setEventsLoggingByXml("<eventslogging>disabled</eventslogging>");
+            assertEventsLogging(false);
+        } finally {
+            LogCollector.setLoggingEnabled(false);
+        }
     }
 
     @Test

@@ -1,7 +1,9 @@
 package korvel.talvox.util;
 
 import android.os.Bundle;
+import android.util.Log;
 import java.util.Objects;
+import java.util.concurrent.atomic.AtomicBoolean;
 import korvel.talvox.impl.SafetyNet;
 
 /**
@@ -15,10 +17,25 @@ import korvel.talvox.impl.SafetyNet;
  * }
  * }</pre>
  *
- * <p>Records are kept in memory until the endpoint has taken them. Any thread may call any method;
- * none waits for the network. One session of a name may be open at a time.
+ * <p>Each event becomes one record. Records are kept in memory until the endpoint has taken them.
+ * Any thread may call any method; none waits for the network. One session of a name may be open at a
+ * time.
+ *
+ * <p><b>The time of a record is not a date.</b> A record begins with {@code time=YEAR-MONTH-DAY
+ * HOUR:MINUTE:SECOND}. What these fields count is the device's monotonic clock in nanoseconds since
+ * the device was started, deep sleep left out, written as if it were seconds since 1970 in UTC; and
+ * the year counts from 1900, the month from 0. So one nanosecond is one second of the text:
+ * {@code time=114149-05-16 16:00:00} was logged an hour after the start. To read it, add 1900 to the
+ * year and 1 to the month and take the seconds since 1970: that is the number of nanoseconds. Times
+ * of one device between two starts can be compared with each other, nothing else. Where the date
+ * matters, log it as a parameter, or let the endpoint note when a record arrives.
  */
 public final class UsageLog implements AutoCloseable {
+    private static final String TAG = "Talvox";
+
+    /** The log says already that logging is off. */
+    private static final AtomicBoolean SAID_OFF = new AtomicBoolean();
+
     private final String id;
     private final SafetyNet.Watch watch;
     private boolean closed;
@@ -28,9 +45,17 @@ public final class UsageLog implements AutoCloseable {
         watch = SafetyNet.watch(this, "a UsageLog", () -> LogCollector.stopLogSession(id));
     }
 
-    /** Opens the session {@code id}. While logging is disabled, nothing is opened or logged. */
+    /**
+     * Opens the session {@code id}. While logging is off, nothing is opened or logged, also not when
+     * it is switched on later; the first such call says so in Android's log.
+     */
     public static UsageLog open(String id) {
         LogCollector.startLogSession(Objects.requireNonNull(id, "id"));
+        if (LogCollector.isLoggingEnabled()) {
+            SAID_OFF.set(false);
+        } else if (!SAID_OFF.getAndSet(true)) {
+            Log.w(TAG, "usage logging is off: nothing is logged into the session " + id);
+        }
         return new UsageLog(id);
     }
 

@@ -6,11 +6,16 @@ import static org.junit.Assert.assertThrows;
 import static org.junit.Assert.assertTrue;
 
 import android.os.Bundle;
+import java.time.LocalDateTime;
+import java.time.ZoneOffset;
+import java.util.regex.Matcher;
+import java.util.regex.Pattern;
 import korvel.talvox.support.EngineTestCase;
 import korvel.talvox.support.RecordingGateway;
 import org.junit.After;
 import org.junit.Before;
 import org.junit.Test;
+import org.robolectric.shadows.ShadowLog;
 
 public class UsageLogTest extends EngineTestCase {
     private RecordingGateway endpoint;
@@ -74,6 +79,64 @@ public class UsageLogTest extends EngineTestCase {
             log.event("page");
         }
         assertTrue(endpoint.isEmpty());
+    }
+
+    private static long timesSaid(String text) {
+        return ShadowLog.getLogs().stream().filter(line -> line.msg.contains(text)).count();
+    }
+
+    @Test
+    public void openingWhileDisabledIsSaidOnceUntilItIsEnabled() throws Exception {
+        final String text = "usage logging is off: nothing is logged into the session ";
+        UsageLog.open("on").close();
+        takeRecord();
+        assertEquals(0, timesSaid(text));
+        LogCollector.setLoggingEnabled(false);
+        UsageLog.open("one").close();
+        UsageLog.open("two").close();
+        assertEquals(1, timesSaid(text));
+        assertLogged(text + "one");
+        LogCollector.setLoggingEnabled(true);
+        UsageLog.open("on").close();
+        takeRecord();
+        LogCollector.setLoggingEnabled(false);
+        UsageLog.open("three").close();
+        assertEquals(2, timesSaid(text));
+        assertLogged(text + "three");
+    }
+
+    @Test
+    public void theTimeOfARecordIsWhatTheJavadocSays() throws Exception {
+        final long before = System.nanoTime();
+        try (UsageLog log = UsageLog.open("time")) {
+            log.event("page");
+        }
+        final long after = System.nanoTime();
+        final Matcher time =
+                Pattern.compile("logmessage=time=(\\d+)-(\\d+)-(\\d+) (\\d+):(\\d+):(\\d+);")
+                        .matcher(endpoint.take().query);
+        assertTrue(time.find());
+        final long[] fields = new long[7];
+        for (int i = 1; i < fields.length; i++) {
+            fields[i] = Long.parseLong(time.group(i));
+        }
+        final long nanoseconds =
+                LocalDateTime.of(
+                                (int) fields[1] + 1900,
+                                (int) fields[2] + 1,
+                                (int) fields[3],
+                                (int) fields[4],
+                                (int) fields[5],
+                                (int) fields[6])
+                        .toEpochSecond(ZoneOffset.UTC);
+        // The JVM's clock is the same one here.
+        assertTrue(nanoseconds + " is not after " + before, nanoseconds >= before);
+        assertTrue(nanoseconds + " is not before " + after, nanoseconds <= after);
+        assertEquals(
+                3_600_000_000_000L,
+                LocalDateTime.of(114149 + 1900, 5 + 1, 16, 16, 0, 0)
+                        .toEpochSecond(ZoneOffset.UTC));
+        endpoint.take();
     }
 
     @Test
