@@ -3,6 +3,7 @@
 #include "Engine.h"
 #include "EntryPoint.h"
 #include "Text.h"
+#include "core/network/NetworkManager.h"
 
 using Talvox::Settings;
 
@@ -64,6 +65,15 @@ JNIEXPORT void JNICALL Java_korvel_talvox_impl_Talvox_updateSettingsFromXml(JNIE
         settings->updateFromXml(Jni::toUtf8(env, xml), Settings::XML_PATH_DFLT,
                                 Settings::bundleSpecs);
         facade.setTalvoxSettings(settings);
+    });
+}
+
+JNIEXPORT void JNICALL Java_korvel_talvox_impl_Talvox_setCertificateFile(JNIEnv* /*env*/,
+                                                                         jclass /*type*/,
+                                                                         jstring path) {
+    Jni::enter([path](JNIEnv* env) {
+        Jni::requireNonNull(env, path, "path");
+        Network::NetworkManager::getInstance().setCertificateFile(Jni::toUtf8(env, path));
     });
 }
 

@@ -4,6 +4,7 @@ import android.content.Context;
 import android.os.Bundle;
 import android.os.Handler;
 import android.os.Looper;
+import java.io.File;
 import java.util.ArrayList;
 import java.util.List;
 import java.util.Objects;
@@ -108,6 +109,23 @@ public final class TalvoxEngine {
         if (wanted != null) {
             LogCollector.setLoggingEnabled(wanted == EventsLogging.ENABLED);
         }
+    }
+
+    /**
+     * Trusts the certificate authorities of a file, and no others, for https connections that are
+     * opened from now on, to the gateway and to the endpoint of the usage log: for a private
+     * authority. It holds until the process ends. The file is read again with new connections, so it
+     * must stay where it is.
+     *
+     * @param file certificates in PEM form; null for the authorities of the system
+     * @throws IllegalArgumentException if the file is missing, cannot be read, holds no certificate
+     *     or a broken one; what was trusted before stays trusted
+     */
+    public void setCertificateFile(File file) {
+        if (file != null) {
+            CertificateFile.check(file);
+        }
+        Talvox.setCertificateFile(file == null ? "" : file.getAbsolutePath());
     }
 
     /**

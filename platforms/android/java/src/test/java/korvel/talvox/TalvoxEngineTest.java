@@ -226,6 +226,7 @@ public class TalvoxEngineTest extends EngineTestCase {
         final Bundle bundle = new Bundle();
         assertThrows(NullPointerException.class, () -> Talvox.updateSettings(handle, null));
         assertThrows(NullPointerException.class, () -> Talvox.updateSettingsFromXml(handle, null));
+        assertThrows(NullPointerException.class, () -> Talvox.setCertificateFile(null));
         assertThrows(
                 NullPointerException.class, () -> Talvox.isRecognitionAvailable(handle, null));
         for (long wrong : new long[] {0, 1, -1, handle + 8, Long.MIN_VALUE}) {

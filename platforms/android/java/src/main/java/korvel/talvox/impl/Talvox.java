@@ -26,6 +26,11 @@ public final class Talvox {
 
     public static native void updateSettingsFromXml(long engine, String xml);
 
+    /**
+     * @param path of a PEM file with the authorities to trust, empty for those of the system
+     */
+    public static native void setCertificateFile(String path);
+
     public static native boolean isRecognitionAvailable(long engine, Bundle settings);
 
     public static native ArrayList<String> getAvailableLanguages(long engine);

@@ -5,6 +5,8 @@ import static org.junit.Assert.assertTrue;
 
 import com.sun.net.httpserver.HttpExchange;
 import com.sun.net.httpserver.HttpServer;
+import com.sun.net.httpserver.HttpsConfigurator;
+import com.sun.net.httpserver.HttpsServer;
 import java.io.ByteArrayOutputStream;
 import java.io.IOException;
 import java.io.UncheckedIOException;
@@ -18,6 +20,7 @@ import java.util.concurrent.ExecutorService;
 import java.util.concurrent.Executors;
 import java.util.concurrent.LinkedBlockingQueue;
 import java.util.concurrent.TimeUnit;
+import javax.net.ssl.SSLContext;
 
 /** A gateway that keeps each request and answers with nothing recognised, or when it is told to. */
 public final class RecordingGateway implements AutoCloseable {
@@ -49,9 +52,17 @@ public final class RecordingGateway implements AutoCloseable {
      * @param answers false to let every client wait for its answer until {@link #close}
      */
     public RecordingGateway(boolean answers) {
+        this(answers, null);
+    }
+
+    /**
+     * @param answers false to let every client wait for its answer until {@link #close}
+     * @param certificate what the gateway identifies itself with; null for no TLS
+     */
+    public RecordingGateway(boolean answers, SSLContext certificate) {
         this.answers = answers;
         try {
-            server = HttpServer.create(new InetSocketAddress(InetAddress.getLoopbackAddress(), 0), 0);
+            server = create(certificate);
         } catch (IOException failure) {
             throw new UncheckedIOException(failure);
         }
@@ -60,8 +71,21 @@ public final class RecordingGateway implements AutoCloseable {
         server.start();
     }
 
+    private static HttpServer create(SSLContext certificate) throws IOException {
+        final InetSocketAddress address =
+                new InetSocketAddress(InetAddress.getLoopbackAddress(), 0);
+        if (certificate == null) {
+            return HttpServer.create(address, 0);
+        }
+        final HttpsServer server = HttpsServer.create(address, 0);
+        server.setHttpsConfigurator(new HttpsConfigurator(certificate));
+        return server;
+    }
+
     public String getUrl() {
-        return "http://127.0.0.1:" + server.getAddress().getPort();
+        return (server instanceof HttpsServer ? "https" : "http")
+                + "://127.0.0.1:"
+                + server.getAddress().getPort();
     }
 
     /** Waits for the next request. */
