@@ -100,12 +100,12 @@ std::string parse(const std::string& boundary, const std::string& body, Cut cut)
     return transcript.text + "\n" + parser.getError();
 }
 
-/** Recognisers for a language that no request can ask for: the sound is decoded only. */
+/** A closed pool lends no decoder: sound is turned into samples and never recognised. */
 Gateway::DecoderPool& pool() {
     static auto* const made = [] {
-        Gateway::SpeechModel model;
-        model.language = std::string(Gateway::RequestFields::MAX_VALUE_BYTES + 1, 'x');
-        return new Gateway::DecoderPool(model, 1);
+        auto* const closed = new Gateway::DecoderPool(Gateway::SpeechModel(), 1);
+        closed->close();
+        return closed;
     }();
     return *made;
 }

@@ -13,6 +13,7 @@ struct Answer {
     /** Plain text; the reason where the request was refused. */
     std::string body;
 
+    /** A refusal; clients get `reason` as the body. */
     static Answer refuse(unsigned status, const std::string& reason) {
         Answer answer;
         answer.status = status;

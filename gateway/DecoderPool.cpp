@@ -7,8 +7,9 @@
 
 namespace Gateway {
 
-DecoderPool::DecoderPool(const SpeechModel& speechModel, std::size_t maxDecoders)
-    : model(speechModel), limit(std::max<std::size_t>(1, maxDecoders)) {}
+DecoderPool::DecoderPool(const SpeechModel& speechModel, std::size_t maxDecoders,
+                         unsigned maxWaitMs)
+    : model(speechModel), limit(std::max<std::size_t>(1, maxDecoders)), waitMs(maxWaitMs) {}
 
 DecoderPool::~DecoderPool() {
     close();
@@ -26,10 +27,10 @@ DecoderPool::Lease DecoderPool::tryAcquire() {
     return take(lock);
 }
 
-DecoderPool::Lease DecoderPool::acquire(unsigned timeoutMs) {
+DecoderPool::Lease DecoderPool::acquire() {
     std::unique_lock<std::mutex> lock(mutex);
     const auto place = waiting.insert(waiting.end(), 0);
-    const bool served = changed.wait_for(lock, std::chrono::milliseconds(timeoutMs), [&] {
+    const bool served = changed.wait_for(lock, std::chrono::milliseconds(waitMs), [&] {
         return closed || (place == waiting.begin() && isAvailable());
     });
     waiting.erase(place);

@@ -15,6 +15,9 @@ namespace Gateway {
 namespace {
 
 constexpr std::size_t SOUND_PIECE_BYTES = 4096;
+/** The delay after which the speech kit's clients try again. */
+constexpr unsigned RETRY_AFTER_SECONDS = 2;
+constexpr unsigned BUSY_STATUS = 503;
 
 /** 128 bits nobody can guess, so that no two requests share them. */
 std::string makeRequestId() {
@@ -81,9 +84,10 @@ Answer RecognitionRequest::finish() {
     if (refusedStatus == 0 && !parser.finish()) {
         refuse(400, parser.getError());
     }
-    const std::string missing = findIncompleteness();
-    if (!missing.empty()) {
-        refuse(400, missing);
+    for (const std::string& problem : {findIncompleteness(), findLanguageProblem()}) {
+        if (!problem.empty()) {
+            refuse(400, problem);
+        }
     }
     Answer answer;
     if (refusedStatus == 0) {
@@ -91,6 +95,9 @@ Answer RecognitionRequest::finish() {
     }
     if (refusedStatus != 0) {
         answer = Answer::refuse(refusedStatus, refusedReason);
+    }
+    if (refusedStatus == BUSY_STATUS) {
+        answer.headers.emplace_back("Retry-After", std::to_string(RETRY_AFTER_SECONDS));
     }
     answer.headers.emplace_back("x-kvrequestid", requestId);
     endUtterance();
@@ -180,9 +187,14 @@ std::string RecognitionRequest::beginSound(const MultipartPart& part) {
     if (!reason.empty()) {
         return reason;
     }
+    reason = findLanguageProblem();
+    if (!reason.empty()) {
+        refuse(400, reason);
+        return reason;
+    }
     soundDecoder = std::make_unique<SoundDecoder>(format, SpeechModel::RATE_HZ);
-    // Who sends transcripts with the sound wants it logged, not recognised.
-    if (pool.getModel().speaks(fields.get("lang")) && !fields.has("transcripts")) {
+    // Sound that comes with transcripts is to be logged, not recognised.
+    if (!fields.has("transcripts")) {
         utterance = std::make_unique<Utterance>(pool);
     }
     return std::string();
@@ -214,6 +226,17 @@ std::string RecognitionRequest::findIncompleteness() const {
     return fields.findMissing();
 }
 
+/** Transcripts are logged in any language: that takes no model. */
+std::string RecognitionRequest::findLanguageProblem() const {
+    const SpeechModel& model = pool.getModel();
+    const std::string& language = fields.get("lang");
+    if (fields.has("transcripts") || model.speaks(language)) {
+        return std::string();
+    }
+    return "the language " + toLogText(language) + " is not available; this gateway recognises " +
+           toLogText(model.language);
+}
+
 Answer RecognitionRequest::recognise() {
     Answer answer;
     if (fields.has("canceled") || fields.has("transcripts")) {
@@ -223,7 +246,7 @@ Answer RecognitionRequest::recognise() {
     if (utterance) {
         const Utterance::Status status = utterance->finish(hypotheses);
         if (status == Utterance::Status::BUSY) {
-            refuse(503, "all recognisers are busy");
+            refuse(BUSY_STATUS, "all decoders are busy");
         } else if (status == Utterance::Status::FAILED) {
             refuse(500, "the recogniser failed");
         }

@@ -72,6 +72,7 @@ class RecognitionRequest : private MultipartListener {
     std::string takeSamples(const std::vector<int16_t>& samples);
     void refuse(unsigned status, const std::string& reason);
     std::string findIncompleteness() const;
+    std::string findLanguageProblem() const;
     Answer recognise();
     void endUtterance();
 

@@ -84,7 +84,7 @@ struct AddressList {
 }  // namespace
 
 Server::Server(const ServerOptions& serverOptions)
-    : options(serverOptions), pool(options.model, options.decoders) {}
+    : options(serverOptions), pool(options.model, options.decoders, options.decoderWaitMs) {}
 
 Server::~Server() {
     stop();

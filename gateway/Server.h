@@ -24,6 +24,8 @@ struct ServerOptions {
     std::size_t maxBodyBytes = MAX_BODY_BYTES_DFLT;
     /** Requests that are recognised at the same time; further ones wait. */
     std::size_t decoders = 2;
+    /** Longest wait for a free decoder after the end of a request, in milliseconds. */
+    unsigned decoderWaitMs = DecoderPool::WAIT_MS_DFLT;
     /** Seconds after which a client that says nothing is given up. */
     unsigned idleSeconds = 30;
     bool verbose = false;

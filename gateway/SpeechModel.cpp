@@ -3,6 +3,7 @@
 #include <pocketsphinx.h>
 #include <sphinxbase/err.h>
 
+#include <algorithm>
 #include <fstream>
 
 #include "gateway/HeaderValue.h"
@@ -17,6 +18,13 @@ bool isReadable(const std::string& path) {
     return file.good() && file.peek() != std::ifstream::traits_type::eof();
 }
 
+/** A language tag in lower case, with "-" between its subtags. */
+std::string normalise(const std::string& languageTag) {
+    std::string tag = toLowerAscii(languageTag);
+    std::replace(tag.begin(), tag.end(), '_', '-');
+    return tag;
+}
+
 /** Keeps the recogniser's own chatter off standard error, where the request log goes. */
 void silenceRecogniser() {
     static const bool silenced = [] {
@@ -29,10 +37,10 @@ void silenceRecogniser() {
 }  // namespace
 
 bool SpeechModel::speaks(const std::string& languageTag) const {
-    const std::string tag = toLowerAscii(languageTag);
-    const std::string prefix = toLowerAscii(language);
-    return tag.compare(0, prefix.size(), prefix) == 0 &&
-           (tag.size() == prefix.size() || tag[prefix.size()] == '-' || tag[prefix.size()] == '_');
+    const std::string tag = normalise(languageTag);
+    const std::string own = normalise(language);
+    return tag.compare(0, own.size(), own) == 0 &&
+           (tag.size() == own.size() || tag[own.size()] == '-');
 }
 
 std::string SpeechModel::findProblem() const {

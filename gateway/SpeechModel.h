@@ -17,13 +17,17 @@ struct SpeechModel {
     std::string languageModel = "/usr/share/pocketsphinx/model/en-us/en-us.lm.bin";
     /** Pronouncing dictionary. */
     std::string dictionary = "/usr/share/pocketsphinx/model/en-us/cmudict-en-us.dict";
-    /** First part of the language tags that the model is for. */
+    /** Language tag that the model is for; never empty. */
     std::string language = "en";
 
-    /** True for "en", "en-US", "EN_gb", not for "ru-RU" or "eng". */
+    /**
+     * True if `languageTag` is the model's tag or narrows it down by further subtags. Case does not
+     * matter, and "_" separates subtags just as "-" does. A model for "en" speaks "en", "en-US"
+     * and "EN_gb", not "eng" or "ru-RU"; a model for "en-US" does not speak "en".
+     */
     bool speaks(const std::string& languageTag) const;
 
-    /** Tells which of the files cannot be read; empty when all can. */
+    /** Names the first file that cannot be read; empty when all can. */
     std::string findProblem() const;
 
     /** A configuration of the recogniser, to be freed by the caller; null when it is refused. */

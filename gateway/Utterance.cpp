@@ -32,7 +32,7 @@ Utterance::Status Utterance::finish(std::vector<Hypothesis>& hypotheses) {
         return Status::DONE;
     }
     if (!decoder && !failed) {
-        DecoderPool::Lease lease = pool.acquire(WAIT_MS);
+        DecoderPool::Lease lease = pool.acquire();
         if (!lease) {
             return Status::BUSY;
         }

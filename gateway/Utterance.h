@@ -16,8 +16,8 @@ namespace Gateway {
  * The sound goes to the recogniser in pieces of fixed length, however it arrives, so that the
  * answer depends on the sound alone. Its first one and a half seconds of speech are held back to
  * measure their cepstral mean, then decoded, and the rest follows as it comes; all that is left
- * after the last sample is the recogniser's second pass. While all recognisers are busy the sound
- * is kept and made up for later.
+ * after the last sample is the recogniser's second pass. While all decoders are busy the sound is
+ * kept, for as long as it arrives, and decoded as soon as one is free.
  */
 class Utterance {
   public:
@@ -28,8 +28,6 @@ class Utterance {
     /** Longest utterance in seconds; the recogniser holds 150 s at most. */
     static constexpr std::size_t MAX_SECONDS = 120;
     static constexpr std::size_t MAX_SAMPLES = MAX_SECONDS * SpeechModel::RATE_HZ;
-    /** Wait for a free recogniser; clients give up after 20 s. */
-    static constexpr unsigned WAIT_MS = 18000;
 
     enum class Status { DONE, BUSY, FAILED };
 
@@ -40,8 +38,10 @@ class Utterance {
     bool add(const std::vector<int16_t>& samples);
 
     /**
-     * Ends the utterance; may wait for a recogniser. Called once.
+     * Ends the utterance. Blocks while it decodes and, before that, while all decoders are busy:
+     * as long as `DecoderPool::acquire` waits. Called once.
      * @param[out] hypotheses best first; empty where nothing was understood
+     * @return BUSY when no decoder became free in time
      */
     Status finish(std::vector<Hypothesis>& hypotheses);
 

@@ -2,6 +2,7 @@
 #include <csignal>
 #include <cstdio>
 #include <exception>
+#include <string>
 
 #include "gateway/Server.h"
 #include "pal/kd_log.h"
@@ -15,6 +16,27 @@ constexpr const char* DESCRIPTION =
 
 constexpr const char* VERSION = "talvox-gateway 133 (" TALVOX_BUILD_ID ")";
 
+const CLI::Validator IS_NOT_EMPTY(
+    [](const std::string& text) { return std::string(text.empty() ? "the value is empty" : ""); },
+    "");
+
+constexpr unsigned MAX_BODY_BYTES_LIMIT = 1U << 30U;
+
+/** Decimal digits only: CLI11 would read 010 as 8. */
+CLI::Validator wholeNumber(unsigned min, unsigned max) {
+    const auto check = [min, max](const std::string& text) {
+        const bool isDecimal = !text.empty() && text.size() <= 10 &&
+                               text.find_first_not_of("0123456789") == std::string::npos &&
+                               (text.size() == 1 || text[0] != '0');
+        const unsigned long long value = isDecimal ? std::stoull(text) : 0;
+        return isDecimal && value >= min && value <= max
+                   ? std::string()
+                   : "\"" + text + "\" is not a whole number from " + std::to_string(min) + " to " +
+                         std::to_string(max);
+    };
+    return {check, "from " + std::to_string(min) + " to " + std::to_string(max)};
+}
+
 bool isLoopback(const std::string& host) {
     return host == "localhost" || host == "::1" || host.compare(0, 4, "127.") == 0;
 }
@@ -23,6 +45,7 @@ void declareOptions(CLI::App& app, Gateway::ServerOptions& options) {
     app.set_version_flag("--version", VERSION);
     app.add_option("--host", options.host, "Address to listen on")->capture_default_str();
     app.add_option("--port", options.port, "Port to listen on; 0 picks a free one")
+        ->check(wholeNumber(0, 65535))
         ->capture_default_str();
     app.add_option("--model-dir", options.model.acousticDir, "Folder of the acoustic model")
         ->capture_default_str();
@@ -30,15 +53,21 @@ void declareOptions(CLI::App& app, Gateway::ServerOptions& options) {
     app.add_option("--dict", options.model.dictionary, "Pronouncing dictionary")
         ->capture_default_str();
     app.add_option("--lang", options.model.language,
-                   "Language of the model; requests in others get no results")
+                   "Language of the model, such as en or en-US; requests in others get status 400")
+        ->check(IS_NOT_EMPTY)
         ->capture_default_str();
     app.add_option("--decoders", options.decoders,
                    "Requests recognised at once (about 100 MB each); others wait")
-        ->check(CLI::Range(1, 64))
+        ->check(wholeNumber(1, 64))
+        ->capture_default_str();
+    app.add_option("--decoder-wait", options.decoderWaitMs,
+                   "Milliseconds that a request waits, once it is complete, for a free decoder; "
+                   "then it gets status 503")
+        ->check(wholeNumber(0, 60000))
         ->capture_default_str();
     app.add_option("--max-body", options.maxBodyBytes,
                    "Longest request body in bytes; longer ones get status 413")
-        ->check(CLI::PositiveNumber)
+        ->check(wholeNumber(1, MAX_BODY_BYTES_LIMIT))
         ->capture_default_str();
     app.add_option("--log-file", options.recordFile,
                    "File to which the usage records that clients send to /log are appended, one "

@@ -1,12 +1,10 @@
 // The real gateway behind a connection that breaks while the user speaks.
 #include <gtest/gtest.h>
 
-#include <boost/make_shared.hpp>
 #include <csignal>
 
 #include "CuttingRelay.h"
-#include "FaultSession.h"
-#include "cloud/Sounds.h"
+#include "RecordedSession.h"
 #include "pal/kd.h"
 #include "support/ChildProcess.h"
 #include "talvox/Settings.h"
@@ -17,7 +15,8 @@ namespace {
 
 using Talvox::Settings;
 
-class RelayedRecognition : public FaultSession, public ::testing::WithParamInterface<std::string> {
+class RelayedRecognition : public RecordedSession,
+                           public ::testing::WithParamInterface<std::string> {
   protected:
     /** Starts the gateway. @return its port */
     static unsigned short readPort(TestSupport::ChildProcess& gateway) {
@@ -32,22 +31,9 @@ class RelayedRecognition : public FaultSession, public ::testing::WithParamInter
         }
         return 0;
     }
-
-    /** Plays the next 100 ms. */
-    void play() {
-        constexpr std::size_t SAMPLES = SAMPLE_RATE_HZ / 10;
-        advanceMs(BUFFER_MS);
-        if (played + SAMPLES <= sound.size()) {
-            recorder->deliver(CloudTest::makeBuffer(TestSupport::toBytes(sound, played, SAMPLES)));
-        }
-        played += SAMPLES;
-    }
-
-    std::size_t played = 0;
 };
 
 TEST_P(RelayedRecognition, HearsTheWholeUtterance) {
-    sound = TestSupport::loadRecordedSpeech("goforward.raw");
     if (sound.empty()) {
         GTEST_SKIP() << "needs the package pocketsphinx-testdata";
     }
@@ -58,22 +44,12 @@ TEST_P(RelayedRecognition, HearsTheWholeUtterance) {
     {
         CuttingRelay relay(port, encoded ? 3000 : 32000);
         setChunked(true);
-        configureText(Settings::SKS_URL, relay.getUrl());
         configureText(Settings::SKS_SOUND_FORMAT, GetParam());
-        events = boost::make_shared<CloudTest::EventRecorder>();
-        const auto settings = boost::make_shared<Settings>();
-        settings->putString(Settings::RS_LANGUAGE, "en-US");
-        session = engine().createRecognizer(events, settings);
-        session->start();
-        const std::size_t half = sound.size() / 2;
-        while (played < half) {
-            play();
-        }
+        startSession(relay.getUrl());
+        playTo(sound.size() / 2);
         // Only half of it has been said.
         ASSERT_TRUE(relay.waitForCut());
-        while (played < sound.size()) {
-            play();
-        }
+        playTo(sound.size());
         session->stop();
         // Not beyond the time that the answer may take.
         for (int i = 0; i < 150 && !relay.waitForConnections(2, 20); ++i) {
@@ -84,7 +60,7 @@ TEST_P(RelayedRecognition, HearsTheWholeUtterance) {
         ASSERT_EQ("results", events->texts().back()) << ::testing::PrintToString(log->messages());
         ASSERT_FALSE(events->recognition()->getResults()->empty())
             << ::testing::PrintToString(log->messages());
-        EXPECT_EQ("go forward ten meters", events->recognition()->getResults()->front().getText());
+        EXPECT_EQ(RECORDED_WORDS, events->recognition()->getResults()->front().getText());
         session.reset();
         kdDrainEventsKOR();
     }

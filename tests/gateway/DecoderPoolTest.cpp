@@ -25,24 +25,24 @@ void awaitWaiting(const DecoderPool& pool, std::size_t count) {
 }  // namespace
 
 TEST(DecoderPool, LendsNoMoreThanItMayLoad) {
-    DecoderPool pool(SpeechModel(), 2);
+    DecoderPool pool(SpeechModel(), 2, 0);
     DecoderPool::Lease first = pool.tryAcquire();
     DecoderPool::Lease second = pool.tryAcquire();
     ASSERT_TRUE(first);
     ASSERT_TRUE(second);
     EXPECT_FALSE(pool.tryAcquire());
-    EXPECT_FALSE(pool.acquire(0));
+    EXPECT_FALSE(pool.acquire());
     const Gateway::SpeechDecoder* given = first.get();
     first.reset();
     EXPECT_EQ(given, pool.tryAcquire().get());
 }
 
 TEST(DecoderPool, ServesTheLongestWaitingFirst) {
-    DecoderPool pool(SpeechModel(), 1);
+    DecoderPool pool(SpeechModel(), 1, LONG_MS);
     DecoderPool::Lease lease = pool.tryAcquire();
     std::atomic<int> order{0};
     const auto wait = [&] {
-        const DecoderPool::Lease got = pool.acquire(LONG_MS);
+        const DecoderPool::Lease got = pool.acquire();
         EXPECT_TRUE(got);
         return ++order;
     };
@@ -56,12 +56,12 @@ TEST(DecoderPool, ServesTheLongestWaitingFirst) {
 }
 
 TEST(DecoderPool, LetsNobodyPassThoseWhoWait) {
-    DecoderPool pool(SpeechModel(), 1);
+    DecoderPool pool(SpeechModel(), 1, LONG_MS);
     DecoderPool::Lease lease = pool.tryAcquire();
     std::promise<void> served;
     std::promise<void> done;
     std::thread waiting([&] {
-        const DecoderPool::Lease got = pool.acquire(LONG_MS);
+        const DecoderPool::Lease got = pool.acquire();
         served.set_value();
         done.get_future().wait();
     });
@@ -77,10 +77,10 @@ TEST(DecoderPool, LetsNobodyPassThoseWhoWait) {
 }
 
 TEST(DecoderPool, EndsAllWaitingWhenItIsClosed) {
-    DecoderPool pool(SpeechModel(), 1);
+    DecoderPool pool(SpeechModel(), 1, LONG_MS);
     DecoderPool::Lease lease = pool.tryAcquire();
     std::future<bool> waiting =
-        std::async(std::launch::async, [&] { return pool.acquire(LONG_MS) != nullptr; });
+        std::async(std::launch::async, [&] { return pool.acquire() != nullptr; });
     awaitWaiting(pool, 1);
     EXPECT_FALSE(pool.isClosed());
     pool.close();
@@ -88,7 +88,7 @@ TEST(DecoderPool, EndsAllWaitingWhenItIsClosed) {
     EXPECT_TRUE(pool.isClosed());
     lease.reset();
     EXPECT_FALSE(pool.tryAcquire());
-    EXPECT_FALSE(pool.acquire(LONG_MS));
+    EXPECT_FALSE(pool.acquire());
 }
 
 TEST(DecoderPool, ReportsAModelThatCannotBeLoaded) {
@@ -98,10 +98,10 @@ TEST(DecoderPool, ReportsAModelThatCannotBeLoaded) {
     EXPECT_EQ("cannot read the model's file " + directory.path("nothing") + "/mdef",
               model.findProblem());
     const TestSupport::LogCapture log;
-    DecoderPool pool(model, 1);
+    DecoderPool pool(model, 1, 0);
     EXPECT_FALSE(pool.load());
     EXPECT_TRUE(log.contains("the recogniser cannot load its model"));
-    EXPECT_FALSE(pool.acquire(0));
+    EXPECT_FALSE(pool.acquire());
 }
 
 TEST(SpeechModel, IsForOneLanguage) {
@@ -110,7 +110,18 @@ TEST(SpeechModel, IsForOneLanguage) {
     for (const char* tag : {"en", "en-US", "en_gb", "EN-us"}) {
         EXPECT_TRUE(model.speaks(tag)) << tag;
     }
-    for (const char* tag : {"", "e", "eng", "ru-RU", "den-US"}) {
+    for (const char* tag : {"", " ", "e", "eng", "ru-RU", "den-US", "-", "en.US"}) {
+        EXPECT_FALSE(model.speaks(tag)) << tag;
+    }
+}
+
+TEST(SpeechModel, MayBeForOneCountry) {
+    SpeechModel model;
+    model.language = "en_US";
+    for (const char* tag : {"en-US", "EN_us", "en-us-x-shouted"}) {
+        EXPECT_TRUE(model.speaks(tag)) << tag;
+    }
+    for (const char* tag : {"en", "en-GB", "en-USA", "", "en-"}) {
         EXPECT_FALSE(model.speaks(tag)) << tag;
     }
 }

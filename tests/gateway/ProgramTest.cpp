@@ -49,8 +49,10 @@ TEST(GatewayProgram, ServesFromItsReadyLineToTheSignal) {
 TEST(GatewayProgram, ExplainsItself) {
     const ChildProcess::Result help = ChildProcess::run({GATEWAY_BINARY, "--help"});
     EXPECT_EQ(0, help.exitStatus);
-    for (const char* text : {"loopback", "--host", "--port", "--model-dir", "--lm", "--dict",
-                             "--max-body", "16777216", "--decoders", "--verbose"}) {
+    for (const char* text :
+         {"loopback", "--host", "--port", "--model-dir", "--lm", "--dict", "--max-body", "16777216",
+          "from 1 to 1073741824", "--decoders", "from 1 to 64", "--decoder-wait", "4000",
+          "from 0 to 60000", "from 0 to 65535", "--lang", "--log-file", "--verbose"}) {
         EXPECT_NE(std::string::npos, help.output.find(text)) << text;
     }
     const ChildProcess::Result version = ChildProcess::run({GATEWAY_BINARY, "--version"});
@@ -59,13 +61,26 @@ TEST(GatewayProgram, ExplainsItself) {
 }
 
 TEST(GatewayProgram, RefusesWrongUsage) {
-    const std::vector<std::string> wrongs[] = {
-        {"--nonsense"}, {"--port", "70000"}, {"--port", "http"}, {"--decoders", "0"}};
+    std::vector<std::vector<std::string>> wrongs = {
+        {"--nonsense"}, {"--lang", ""}, {"--port", "-1"}, {"--port", "65536"}};
+    for (const char* option : {"--port", "--decoders", "--decoder-wait", "--max-body"}) {
+        for (const char* value :
+             {"http", "", " ", "-1", "1x", "1.5", "010", "0x10", "99999999999999999999"}) {
+            wrongs.push_back({option, value});
+        }
+    }
+    for (const char* value : {"0", "65"}) {
+        wrongs.push_back({"--decoders", value});
+    }
+    for (const char* value : {"0", "1073741825"}) {
+        wrongs.push_back({"--max-body", value});
+    }
+    wrongs.push_back({"--decoder-wait", "60001"});
     for (const std::vector<std::string>& wrong : wrongs) {
         std::vector<std::string> command = {GATEWAY_BINARY};
         command.insert(command.end(), wrong.begin(), wrong.end());
         const ChildProcess::Result refusal = ChildProcess::run(command);
-        EXPECT_EQ(2, refusal.exitStatus);
+        EXPECT_EQ(2, refusal.exitStatus) << ::testing::PrintToString(wrong);
         EXPECT_EQ(0U, refusal.output.find("talvox-gateway: ")) << refusal.output;
         EXPECT_NE(std::string::npos, refusal.output.find(wrong[0])) << refusal.output;
         EXPECT_EQ(refusal.output.size() - 1, refusal.output.find('\n')) << refusal.output;

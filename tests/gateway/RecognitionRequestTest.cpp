@@ -151,11 +151,62 @@ TEST(RecognitionRequest, UnderstandsNothingWithoutSound) {
     }
 }
 
-TEST(RecognitionRequest, UnderstandsNothingInLanguagesWithoutAModel) {
-    const Outcome outcome = run(bodyWithSound(pcm(), PCM16K, "ru-RU"));
+TEST(RecognitionRequest, RefusesLanguagesWithoutAModel) {
+    const std::string reason = "the language ru-RU is not available; this gateway recognises en\n";
+    const std::string sound = part("audio", pcm(), PCM16K);
+    for (const std::string& body :
+         {bodyWithSound(pcm(), PCM16K, "ru-RU"), parts(usualFields("ru-RU")) + closing(),
+          parts(usualFields("ru-RU")) + sound + part("canceled", "true") + closing()}) {
+        const Outcome outcome = run(body);
+        EXPECT_EQ(400U, outcome.answer.status);
+        EXPECT_EQ(reason, outcome.answer.body);
+        EXPECT_EQ("missing", header(outcome.answer, "x-asrgw-recognition-results"));
+        EXPECT_NE(std::string::npos, outcome.line.find(" lang=ru-RU "));
+        EXPECT_NE(std::string::npos,
+                  outcome.line.find(" refused: \"the language ru-RU is not available; this gateway "
+                                    "recognises en\""));
+        EXPECT_NE(std::string::npos, outcome.line.find(" decode=0ms"));
+    }
+}
+
+TEST(RecognitionRequest, NamesAnUnknownLanguageSafely) {
+    const Outcome outcome =
+        run(parts(usualFields("\xff\r\n" + std::string(4000, 'x'))) + closing());
+    EXPECT_EQ(400U, outcome.answer.status);
+    EXPECT_EQ(0U, outcome.answer.body.find("the language \\xff\\x0d\\x0axxx"))
+        << outcome.answer.body;
+    EXPECT_NE(std::string::npos,
+              outcome.answer.body.find("xxx... is not available; this gateway recognises en\n"));
+    EXPECT_GT(500U, outcome.answer.body.size());
+}
+
+TEST(RecognitionRequest, LogsTranscriptsInAnyLanguage) {
+    const Outcome outcome = run(parts(usualFields("ru-RU")) + part("transcripts", "<a/>") +
+                                part("audio", pcm(), PCM16K) + closing());
     EXPECT_EQ(200U, outcome.answer.status);
-    EXPECT_EQ(NOTHING_UNDERSTOOD, document(outcome.answer));
-    EXPECT_NE(std::string::npos, outcome.line.find(" decode=0ms"));
+    EXPECT_EQ("logged\n", outcome.answer.body);
+}
+
+TEST(RecognitionRequest, RefusesForAWhileWhenAllDecodersAreBusy) {
+    Gateway::DecoderPool pool(Gateway::SpeechModel(), 1, 0);
+    Gateway::DecoderPool::Lease other = pool.tryAcquire();
+    ASSERT_TRUE(other);
+    const std::string body = bodyWithSound(pcm(), PCM16K);
+    RecognitionRequest refused(usualHead(), BOUNDARY, pool, MAX_BODY);
+    EXPECT_TRUE(refused.write(body.data(), body.size()));
+    const Answer answer = refused.finish();
+    EXPECT_EQ(503U, answer.status);
+    EXPECT_EQ("all decoders are busy\n", answer.body);
+    EXPECT_EQ("2", header(answer, "Retry-After"));
+    EXPECT_NE("missing", header(answer, "x-kvrequestid"));
+    EXPECT_NE(std::string::npos, refused.describe().find(" refused: \"all decoders are busy\""));
+    other.reset();
+    RecognitionRequest next(usualHead(), BOUNDARY, pool, MAX_BODY);
+    EXPECT_TRUE(next.write(body.data(), body.size()));
+    const Answer served = next.finish();
+    EXPECT_EQ(200U, served.status);
+    EXPECT_EQ("missing", header(served, "Retry-After"));
+    EXPECT_EQ("go forward ten meters", next.getHypotheses().at(0).text);
 }
 
 TEST(RecognitionRequest, DropsACanceledUtterance) {
@@ -293,12 +344,14 @@ TEST(RecognitionRequest, NamesTheFirstMistakeOfABodyThatIsTooLongHoweverItArrive
 }
 
 TEST(RecognitionRequest, RefusesSoundThatIsTooLong) {
-    for (const char* language : {"en-US", "ru-RU"}) {
+    const std::string sound = part("audio", std::string(121 * 32000, '\0'), PCM16K) + closing();
+    // Sound that is only logged has the same limit as sound that is recognised.
+    for (const std::string& transcripts : {std::string(), part("transcripts", "<a/>")}) {
         RecognitionRequest request(usualHead(), BOUNDARY, sharedPool(), 16 * MAX_BODY);
-        const std::string body = bodyWithSound(std::string(121 * 32000, '\0'), PCM16K, language);
+        const std::string body = parts(usualFields()) + transcripts + sound;
         EXPECT_TRUE(request.write(body.data(), body.size()));
         const Answer answer = request.finish();
-        EXPECT_EQ(413U, answer.status) << language;
-        EXPECT_EQ("the sound is longer than 120 seconds\n", answer.body) << language;
+        EXPECT_EQ(413U, answer.status) << transcripts;
+        EXPECT_EQ("the sound is longer than 120 seconds\n", answer.body) << transcripts;
     }
 }

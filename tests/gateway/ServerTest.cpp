@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 
 #include <future>
+#include <thread>
 
 #include "core/util/Base64Coder.h"
 #include "gateway/Bodies.h"
@@ -23,6 +24,8 @@ constexpr const char* CHUNKED =
 ServerOptions anyPort() {
     ServerOptions options;
     options.port = 0;
+    // A busy machine may take its time.
+    options.decoderWaitMs = 60000;
     return options;
 }
 
@@ -206,7 +209,7 @@ TEST(Server, RefusesBodiesThatAreTooLong) {
     EXPECT_EQ(200, post(port, parts(usualFields()) + closing()).status);
 }
 
-TEST(Server, HonoursCancellationAndLanguage) {
+TEST(Server, HonoursCancellation) {
     const uint16_t port = shared().server.getPort();
     HttpClient client(port);
     const HttpAnswer canceled =
@@ -216,20 +219,95 @@ TEST(Server, HonoursCancellationAndLanguage) {
                3200);
     EXPECT_EQ(200, canceled.status);
     EXPECT_EQ("none", document(canceled));
-    EXPECT_EQ(
-        "<?xml version=\"1.0\" encoding=\"utf-8\"?><recognitionResults success=\"0\">"
-        "</recognitionResults>",
-        document(post(port, bodyWithSound(pcm(), PCM16K, "ru-RU"))));
+}
+
+TEST(Server, RefusesALanguageThatItHasNoModelFor) {
+    RunningServer running;
+    const uint16_t port = running.server.getPort();
+    const std::string reason = "the language ru-RU is not available; this gateway recognises en";
+    const std::string content = bodyWithSound(pcm(), PCM16K, "ru-RU");
+    HttpClient client(port);
+    for (const HttpAnswer& answer : {post(port, content), stream(client, content, 3200)}) {
+        EXPECT_EQ(400, answer.status);
+        EXPECT_EQ(reason + "\n", answer.body);
+        EXPECT_EQ("text/plain; charset=utf-8", answer.headers.at("content-type"));
+        EXPECT_EQ("none", document(answer));
+    }
+    EXPECT_EQ(400, post(port, bodyWithSound(pcm(), PCM16K, "")).status);
+    running.server.stop();
+    const std::vector<std::string> lines = running.log.messages();
+    ASSERT_EQ(3U, lines.size());
+    for (const std::size_t i : {0U, 1U}) {
+        EXPECT_NE(std::string::npos, lines[i].find(" 400 uuid=u1 "));
+        EXPECT_NE(std::string::npos, lines[i].find(" refused: \"" + reason + "\"")) << lines[i];
+    }
+    EXPECT_NE(std::string::npos, lines[2].find("the field lang is empty")) << lines[2];
+}
+
+TEST(Server, RefusesForAWhileWhenAllDecodersAreBusy) {
+    ServerOptions options = anyPort();
+    options.decoders = 2;
+    options.decoderWaitMs = 0;
+    RunningServer running(options);
+    const uint16_t port = running.server.getPort();
+    Gateway::DecoderPool::Lease first = running.server.getPool().tryAcquire();
+    const Gateway::DecoderPool::Lease second = running.server.getPool().tryAcquire();
+    ASSERT_TRUE(first && second);
+    HttpClient client(port);
+    for (const HttpAnswer& answer : {post(port, body()), stream(client, body(), 3200)}) {
+        EXPECT_EQ(503, answer.status);
+        EXPECT_EQ("2", answer.headers.at("retry-after"));
+        EXPECT_EQ("all decoders are busy\n", answer.body);
+    }
+    first.reset();
+    expectUnderstood(stream(client, body(), 3200));
+}
+
+TEST(Server, ServesARequestThatWaitsForADecoder) {
+    ServerOptions options = anyPort();
+    options.decoders = 1;
+    RunningServer running(options);
+    const uint16_t port = running.server.getPort();
+    Gateway::DecoderPool& pool = running.server.getPool();
+    Gateway::DecoderPool::Lease busy = pool.tryAcquire();
+    std::future<HttpAnswer> answer =
+        std::async(std::launch::async, [port] { return post(port, body()); });
+    while (pool.getWaiting() == 0) {
+        std::this_thread::yield();
+    }
+    busy.reset();
+    expectUnderstood(answer.get());
+}
+
+TEST(Server, LosesNoSoundThatArrivesWhileAllDecodersAreBusy) {
+    ServerOptions options = anyPort();
+    options.decoders = 1;
+    options.decoderWaitMs = 0;
+    options.verbose = true;
+    RunningServer running(options);
+    const std::string expected = document(post(running.server.getPort(), body()));
+    Gateway::DecoderPool::Lease busy = running.server.getPool().tryAcquire();
+    ASSERT_TRUE(busy);
+    HttpClient client(running.server.getPort());
+    const std::string content = body();
+    client.send(requestHead(CHUNKED));
+    client.sendChunk(content.substr(0, content.size() - 1001));
+    client.sendChunk(content.substr(content.size() - 1001, 1));
+    ASSERT_TRUE(running.log.waitFor("POST /asrgw_chunked ... sends 1 bytes"));
+    busy.reset();
+    client.sendChunk(content.substr(content.size() - 1000));
+    client.sendChunk("");
+    EXPECT_EQ(expected, document(client.read()));
 }
 
 TEST(Server, LogsOneLinePerRequest) {
     RunningServer running;
-    EXPECT_EQ(200, post(running.server.getPort(), parts(usualFields("de")) + closing()).status);
+    EXPECT_EQ(200, post(running.server.getPort(), parts(usualFields("en")) + closing()).status);
     EXPECT_EQ(404, post(running.server.getPort(), "", "/evil%0aline").status);
     running.server.stop();
     const std::vector<std::string> lines = running.log.messages();
     ASSERT_EQ(2U, lines.size());
-    EXPECT_EQ(0U, lines[0].find("POST /asrgw 200 uuid=u1 session=s1 lang=de topic=freeform type=- "
+    EXPECT_EQ(0U, lines[0].find("POST /asrgw 200 uuid=u1 session=s1 lang=en topic=freeform type=- "
                                 "bytes="))
         << lines[0];
     EXPECT_EQ(0U, lines[1].find("POST /evil\\x0aline 404 uuid=- refused: ")) << lines[1];
