@@ -10,6 +10,7 @@
 #include "GatewayAnswers.h"
 #include "Sounds.h"
 #include "core/network/NetworkManager.h"
+#include "core/sound/OggSpeexEncoder.h"
 #include "core/util/EventLock.h"
 #include "support/AssertCapture.h"
 #include "support/LogCapture.h"
@@ -296,6 +297,69 @@ TEST_F(RecognizeProtocolTest, ChoosesTheEncodingOnceWhenItIsMade) {
     ASSERT_TRUE(server.waitForRequest(2));
     // The content type follows the setting alone.
     EXPECT_EQ(cutSound(PCM_TYPE, server.getRequest(1).body).substr(0, 4), "OggS");
+}
+
+TEST_F(RecognizeProtocolTest, ChunkedKeepsItsEncodingWhenTheNetworkChanges) {
+    configureText(Settings::SKS_SOUND_FORMAT, Settings::SOUND_FORMAT_PCM_IF_WIFI);
+    auto& network = Network::NetworkManager::getInstance();
+    make("chunked");
+    for (const int reachability :
+         {Network::NetworkManager::METERED, Network::NetworkManager::WIFI}) {
+        network.overrideReachability(reachability);
+        handle(makeBuffer({1, 2}));
+    }
+    network.overrideReachability(Network::NetworkManager::METERED);
+    sendRequest();
+    ASSERT_TRUE(server.waitForRequest(1));
+    EXPECT_EQ(server.getRequest(0).body, makeBody(PCM_TYPE, "\x01\x02\x01\x02"));
+
+    listener = boost::make_shared<Listener>();
+    make("chunked");
+    for (const int reachability :
+         {Network::NetworkManager::WIFI, Network::NetworkManager::METERED}) {
+        network.overrideReachability(reachability);
+        handle(makeConstantBuffer(100));
+    }
+    network.overrideReachability(Network::NetworkManager::WIFI);
+    sendRequest();
+    ASSERT_TRUE(server.waitForRequest(2));
+    const std::string sound = cutSound(PCM_TYPE, server.getRequest(1).body);
+    const std::vector<TestSupport::OggPage> pages =
+        TestSupport::readOggPages({sound.begin(), sound.end()});
+    ASSERT_FALSE(pages.empty());
+    EXPECT_TRUE(pages.back().last);
+    EXPECT_EQ(pages.back().granulePosition, 2 * 1600);
+}
+
+TEST_F(RecognizeProtocolTest, EncodesWithTheQualityOfTheSettingsAndItsOwnPageFill) {
+    configureText(Settings::SKS_SOUND_FORMAT, Settings::SOUND_FORMAT_SPEEX);
+    const TestSupport::Samples voice = TestSupport::makeSpeechLike(CloudTest::SAMPLE_RATE, 2000);
+    const std::vector<Sound::SoundDataBuffer> buffers =
+        TestSupport::cutIntoBuffers(voice, CloudTest::SAMPLE_RATE);
+    std::size_t requests = 0;
+    for (const int quality : {0, 3, 8, 10}) {
+        configure([quality](Settings& settings) {
+            settings.putInt(Settings::SKS_SPEEX_QUALITY, quality);
+        });
+        for (const auto& [type, pageFillBytes] : std::vector<std::pair<std::string, int>>{
+                 {"simple", Sound::OggSpeexEncoder::PAGE_FILL_BYTES_DFLT}, {"chunked", 512}}) {
+            Sound::OggSpeexEncoder reference(buffers.front().getInfo(), quality, pageFillBytes);
+            make(type);
+            for (const Sound::SoundDataBuffer& buffer : buffers) {
+                reference.encode(buffer);
+                handle(boost::make_shared<Sound::SoundDataBuffer>(buffer));
+            }
+            reference.finish();
+            sendRequest();
+            ASSERT_TRUE(server.waitForRequest(++requests)) << type;
+            const std::string sound =
+                cutSound("audio/x-speex", server.getRequest(requests - 1).body);
+            const CloudTest::Bytes expected = reference.takeOutput(-1)->getData();
+            EXPECT_TRUE(expected == CloudTest::Bytes(sound.begin(), sound.end()))
+                << type << " with quality " << quality << ": " << sound.size()
+                << " bytes instead of " << expected.size();
+        }
+    }
 }
 
 TEST_F(RecognizeProtocolTest, UnknownSoundFormatIsPcm) {

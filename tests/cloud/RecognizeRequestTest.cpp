@@ -262,6 +262,55 @@ TEST_F(RecognizeRequestTest, CancelledStreamSaysSoAfterTheSound) {
     EXPECT_EQ(takeBody(*request->writer), "abc\r\n" + field("canceled", "true") + FINAL_BOUNDARY);
 }
 
+/** Under an engine that logs everything. */
+class VerboseRecognizeRequestTest : public RecognizeRequestTest {
+  protected:
+    VerboseRecognizeRequestTest() { setVerbosity(2); }
+    ~VerboseRecognizeRequestTest() override {
+        Talvox::Talvox::getInstance().setTalvoxSettings(boost::make_shared<Settings>());
+    }
+
+    static void setVerbosity(int level) {
+        const auto settings = boost::make_shared<Settings>();
+        settings->putInt(Settings::SKS_VERBOSE_LEVEL, level);
+        Talvox::Talvox::getInstance().setTalvoxSettings(settings);
+    }
+};
+
+TEST_F(VerboseRecognizeRequestTest, LogsTheTranscriptsBeforeTheSoundsSize) {
+    const auto request = makeRequest();
+    request->results = boost::make_shared<Talvox::RecognitionResults>();
+    request->results->emplace_back("hello", 0.5F);
+    request->source = "android";
+    request->sound = CloudTest::makeBuffer({1, 2});
+    const LogCapture log;
+    request->issueRequest();
+    ASSERT_EQ(log.messages().size(), 3U);
+    EXPECT_EQ(log.messages()[1],
+              "resultsXml: <?xml version=\"1.0\" encoding=\"utf-8\"?>\n"
+              "<Transcripts source=\"android\">\n"
+              "  <Transcript confidence=\"0.5\">hello</Transcript>\n"
+              "</Transcripts>\n");
+    EXPECT_EQ(log.messages()[2], "request data size 2");
+    setVerbosity(1);
+    request->issueRequest();
+    EXPECT_EQ(log.messages().size(), 5U);
+}
+
+TEST_F(VerboseRecognizeRequestTest, LogsThatTheStreamIsCancelled) {
+    const LogCapture log;
+    const auto finished = makeStreamedRequest();
+    finished->close(true);
+    EXPECT_TRUE(log.messages().empty());
+    const auto cancelled = makeStreamedRequest();
+    cancelled->close(false);
+    cancelled->close(false);
+    EXPECT_EQ(log.messages(), (std::vector<std::string>{"Writing cancel field to request"}));
+    setVerbosity(1);
+    makeStreamedRequest()->close(false);
+    EXPECT_EQ(log.messages().size(), 1U);
+}
+
 TEST_F(RecognizeRequestTest, SecondCloseDoesNothing) {
     const auto request = makeStreamedRequest();
     request->close(true);

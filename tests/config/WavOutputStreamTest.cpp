@@ -1,5 +1,6 @@
 #include "util/WavOutputStream.h"
 
+#include <dlfcn.h>
 #include <gmock/gmock.h>
 #include <unistd.h>
 
@@ -10,6 +11,7 @@
 #include <string>
 #include <vector>
 
+#include "pal/kd_file.h"
 #include "support/AssertCapture.h"
 #include "support/LogCapture.h"
 #include "util/impl/WavHeader.h"
@@ -22,13 +24,29 @@ using Util::WavOutputStream;
 
 namespace {
 
+/** Size of the items whose writing fails; 0 for none. */
+KDsize failingSize = 0;
+
+}  // namespace
+
+/** Stands in front of the platform layer's own: a buffered file hides a full device from us. */
+KDsize kdFwrite(const void* buffer, KDsize size, KDsize count, KDFile* file) {
+    static const auto real = reinterpret_cast<decltype(&kdFwrite)>(dlsym(RTLD_NEXT, "kdFwrite"));
+    return size == failingSize ? 0 : real(buffer, size, count, file);
+}
+
+namespace {
+
 const Sound::SoundDataInfo WIDE(Sound::SoundDataInfo::NONE, 1, 16000, 2);
 
 class WavOutputStreamTest : public ::testing::Test {
   protected:
     WavOutputStreamTest()
         : path(::testing::TempDir() + "wav_output_stream_" + std::to_string(getpid()) + ".wav") {}
-    ~WavOutputStreamTest() override { std::remove(path.c_str()); }
+    ~WavOutputStreamTest() override {
+        failingSize = 0;
+        std::remove(path.c_str());
+    }
 
     std::vector<std::uint8_t> bytes() const {
         std::ifstream file(path, std::ios::binary);
@@ -192,6 +210,30 @@ TEST_F(WavOutputStreamTest, AFullDeviceIsReported) {
     stream.close();
     EXPECT_TRUE(log.containsPart("patchHeader: error in "));
     EXPECT_TRUE(log.contains("close: after kdFclose"));
+}
+
+TEST_F(WavOutputStreamTest, AHeaderThatCannotBeWrittenIsReported) {
+    failingSize = 44;
+    WavOutputStream stream;
+    const LogCapture log;
+    EXPECT_FALSE(stream.init(path, WIDE));
+    EXPECT_EQ(-1, stream.write("abcd", 4));
+    EXPECT_THAT(log.messages(),
+                ElementsAre("writeHeader: error in write", "write: file not opened"));
+}
+
+TEST_F(WavOutputStreamTest, SizesThatCannotBeWrittenAreReportedOnce) {
+    WavOutputStream stream;
+    ASSERT_TRUE(stream.init(path, WIDE));
+    stream.write("abcdef", 6);
+    failingSize = 4;
+    const LogCapture log;
+    stream.close();
+    EXPECT_THAT(log.messages(),
+                ElementsAre("patchHeader: error in write", "close: after kdFclose"));
+    EXPECT_EQ(0U, number(bytes(), 4, 4));
+    EXPECT_EQ(0U, number(bytes(), 40, 4));
+    EXPECT_EQ(50U, bytes().size());
 }
 
 TEST_F(WavOutputStreamTest, ASecondInitFinishesTheFirstFile) {
