@@ -4,6 +4,12 @@
 
 namespace Talvox {
 
+namespace {
+
+const char* const REASON = "settings and platform leave no recognition mechanism";
+
+}  // namespace
+
 DummyRecognizer::DummyRecognizer(const Talvox* facade,
                                  const boost::shared_ptr<const Settings>& settings)
     : Recognizer(facade, settings) {}
@@ -12,17 +18,17 @@ DummyRecognizer::~DummyRecognizer() = default;
 
 void DummyRecognizer::start() {
     const Util::EventLock lock;
-    callOnError(SpeechError::ErrorNotAvailable);
+    callOnError(SpeechError::ErrorNotAvailable, REASON);
 }
 
 void DummyRecognizer::stop() {
     const Util::EventLock lock;
-    callOnError(SpeechError::ErrorNotAvailable);
+    callOnError(SpeechError::ErrorNotAvailable, REASON);
 }
 
 void DummyRecognizer::cancel() {
     const Util::EventLock lock;
-    callOnError(SpeechError::ErrorCanceled);
+    callOnError(SpeechError::ErrorCanceled, "the application cancelled");
 }
 
 }  // namespace Talvox

@@ -24,8 +24,17 @@ void Recognizer::addListener(const boost::weak_ptr<RecognizerListener>& listener
     listeners.add(listener);
 }
 
-void Recognizer::callOnError(SpeechError error) {
+std::string Recognizer::getErrorReason() const {
+    const Util::EventLock lock;
+    return errorReason;
+}
+
+void Recognizer::callOnError(SpeechError error, const std::string& reason) {
     kdLogFormatMessage("Recognizer error: %d, %s", error.getCode(), error.getErrorString().c_str());
+    if (!reason.empty()) {
+        kdLogFormatMessage("Recognizer error reason: %s", reason.c_str());
+    }
+    errorReason = reason;
     // A listener may drop the last reference, and those after it are given this recognizer too.
     const boost::shared_ptr<Recognizer> self = weak_from_this().lock();
     listeners.notify(

@@ -46,15 +46,25 @@ class TALVOX_API Recognizer : public boost::enable_shared_from_this<Recognizer> 
     /** The facade that made this recognizer. */
     const Talvox* getEngine() const { return engine; }
 
+    /**
+     * Why the session ended with its error: one line of English for developers and logs, such as
+     * "HTTP status 404" or "no speech within 5 s". The texts are not fixed; code must not depend on
+     * them. Empty when no error was reported, and when its cause is unknown. Complete from inside
+     * `onError` on. Any thread; takes the event lock.
+     */
+    std::string getErrorReason() const;
+
   protected:
     /** @param facade not owned; must outlive the recognizer */
     Recognizer(const Talvox* facade, boost::shared_ptr<const Settings> settings);
 
     /**
-     * Reports the error to all live listeners. Changes no state of the recognizer; both this and
-     * `callOnResults` keep it alive until the last listener has been called.
+     * Reports the error to all live listeners. Apart from the reason this changes no state of the
+     * recognizer; both this and `callOnResults` keep it alive until the last listener has been
+     * called.
+     * @param reason for `getErrorReason`; empty when the cause is unknown
      */
-    void callOnError(SpeechError error);
+    void callOnError(SpeechError error, const std::string& reason = std::string());
 
     /** Judges the results by the engine's thresholds and hands them to all live listeners. */
     void callOnResults(const boost::shared_ptr<const RecognitionResults>& results,
@@ -66,6 +76,7 @@ class TALVOX_API Recognizer : public boost::enable_shared_from_this<Recognizer> 
   private:
     boost::shared_ptr<const Settings> validatedSettings;
     const Talvox* engine;
+    std::string errorReason;
 };
 
 }  // namespace Talvox

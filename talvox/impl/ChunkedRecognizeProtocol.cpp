@@ -71,7 +71,7 @@ void ChunkedRecognizeProtocol::sendRequest() {
         return;
     }
     if (!closeRequest()) {
-        notifyError(SpeechError(SpeechError::ErrorAudio));
+        notifyError(SpeechError(SpeechError::ErrorAudio), NO_SOUND_REASON);
         return;
     }
     sent = true;

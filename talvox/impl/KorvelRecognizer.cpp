@@ -53,12 +53,14 @@ void KorvelRecognizer::start() {
         return;
     }
     if (!getEngine()->registerRecognizer(this)) {
-        stopWithError(SpeechError(SpeechError::ErrorBusy));
+        stopWithError(SpeechError::ErrorBusy, started ? "the session was started a second time"
+                                                      : "another session is active");
         return;
     }
+    started = true;
     const boost::shared_ptr<const Settings> engineSettings = getEngine()->getTalvoxSettings();
-    if (!statusIsReasonable(*engineSettings)) {
-        stopWithError(SpeechError(SpeechError::ErrorNetwork));
+    if (const char* const reason = findObstacle(*engineSettings)) {
+        stopWithError(SpeechError::ErrorNetwork, reason);
         return;
     }
     chooseSessionMode(*engineSettings);
@@ -77,16 +79,20 @@ void KorvelRecognizer::start() {
     startWatchdog();
 }
 
-bool KorvelRecognizer::statusIsReasonable(const Settings& engineSettings) {
+const char* KorvelRecognizer::findObstacle(const Settings& engineSettings) {
     const int reachability = Network::NetworkManager::getInstance().getReachability();
-    if (reachability != Network::NetworkManager::UNREACHABLE && !engineSettings.getUuid().empty() &&
-        !engineSettings.getUrl().empty()) {
-        return true;
+    const bool hasUuid = !engineSettings.getUuid().empty();
+    const bool hasUrl = !engineSettings.getUrl().empty();
+    if (reachability != Network::NetworkManager::UNREACHABLE && hasUuid && hasUrl) {
+        return nullptr;
     }
     kdLogFormatMessage("KorvelRecognizer: uuid %s, url %s, reachability %d; failing",
                        engineSettings.getUuid().c_str(), engineSettings.getUrl().c_str(),
                        reachability);
-    return false;
+    if (!hasUrl) {
+        return "the engine's setting \"url\" is empty";
+    }
+    return hasUuid ? "there is no network" : "the engine's setting \"uuid\" is empty";
 }
 
 void KorvelRecognizer::chooseSessionMode(const Settings& engineSettings) {
@@ -113,7 +119,7 @@ bool KorvelRecognizer::startRecorder(int sampleRateHz) {
     if (!works) {
         recorderRefused = true;
         getEngine()->unregisterRecognizer(this);
-        callOnError(SpeechError(SpeechError::ErrorAudio));
+        callOnError(SpeechError::ErrorAudio, "the recorder could not be started");
         return false;
     }
     recorder = starting;
@@ -122,7 +128,7 @@ bool KorvelRecognizer::startRecorder(int sampleRateHz) {
         // It failed, or somebody stopped the session, before it had started. Without any sound that
         // is a failure, too.
         starting->stopRecording();
-        stopWithError(SpeechError(SpeechError::ErrorAudio));
+        stopWithError(SpeechError::ErrorAudio, "the recording ended before any sound came");
         return false;
     }
     return true;
@@ -161,7 +167,9 @@ void KorvelRecognizer::checkRecorder() {
     if (recorder && (isSilent || now - startTime >= LISTENING_LIMIT_NS)) {
         kdLogFormatMessage("KorvelRecognizer: the recorder delivers %s",
                            isSilent ? "nothing" : "too little");
-        onRecorderError(recorder.get());
+        stopWithError(SpeechError::ErrorAudio,
+                      isSilent ? "the recorder delivered no sound for 10 s"
+                               : "the recorder delivered less than 20 s of sound in 60 s");
     }
 }
 
@@ -230,7 +238,7 @@ void KorvelRecognizer::detectVoice(const Sound::SoundDataBuffer& buffer) {
             stop();
             return;
         case ListeningStep::NO_VOICE:
-            onProtocolError(SpeechError(SpeechError::ErrorNoVoice));
+            fail(SpeechError::ErrorNoVoice, "no speech within 5 s");
             return;
         case ListeningStep::SPEECH_BEGINS:
             onProtocolVoiceBegin();
@@ -253,7 +261,7 @@ void KorvelRecognizer::stop() {
 
 void KorvelRecognizer::cancel() {
     const Util::EventLock lock;
-    stopWithError(SpeechError(SpeechError::ErrorCanceled));
+    stopWithError(SpeechError::ErrorCanceled, "the application cancelled");
 }
 
 void KorvelRecognizer::stopRecorder() {
@@ -277,7 +285,7 @@ void KorvelRecognizer::dropProtocol() {
     }
 }
 
-void KorvelRecognizer::stopWithError(SpeechError error) {
+void KorvelRecognizer::stopWithError(SpeechError error, const std::string& reason) {
     const boost::shared_ptr<Recognizer> self = shared_from_this();
     if (recorder || watchdog) {
         stopListening();
@@ -286,12 +294,12 @@ void KorvelRecognizer::stopWithError(SpeechError error) {
     if (!isOver()) {
         errorReported = true;
         getEngine()->unregisterRecognizer(this);
-        callOnError(error);
+        callOnError(error, reason);
     }
 }
 
 void KorvelRecognizer::onRecorderError(Sound::Recorder* /*source*/) {
-    stopWithError(SpeechError(SpeechError::ErrorAudio));
+    stopWithError(SpeechError::ErrorAudio, "the recorder failed");
 }
 
 void KorvelRecognizer::onProtocolVoiceBegin() {
@@ -327,6 +335,10 @@ void KorvelRecognizer::onProtocolResults(boost::shared_ptr<const RecognitionResu
 }
 
 void KorvelRecognizer::onProtocolError(SpeechError error) {
+    fail(error, protocol ? protocol->getErrorReason() : std::string());
+}
+
+void KorvelRecognizer::fail(SpeechError error, const std::string& reason) {
     const boost::shared_ptr<Recognizer> self = shared_from_this();
     if (isOver()) {
         return;
@@ -336,7 +348,7 @@ void KorvelRecognizer::onProtocolError(SpeechError error) {
                            static_cast<int>((kdGetTimeUST() - listeningStoppedTime) / NS_PER_MS));
     }
     stopListening();
-    stopWithError(error);
+    stopWithError(error, reason);
 }
 
 }  // namespace Talvox

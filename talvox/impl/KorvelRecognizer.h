@@ -56,7 +56,8 @@ class KorvelRecognizer : public Recognizer,
     static const std::vector<std::string>& getAvailableLanguages();
 
   private:
-    static bool statusIsReasonable(const Settings& engineSettings);
+    /** Why no session can begin, with a line in the log; null when one can. */
+    static const char* findObstacle(const Settings& engineSettings);
     void chooseSessionMode(const Settings& engineSettings);
     /** @return false when the session is over because there is no recording */
     bool startRecorder(int sampleRateHz);
@@ -78,7 +79,9 @@ class KorvelRecognizer : public Recognizer,
     void stopRecorder();
     void stopListening();
     void dropProtocol();
-    void stopWithError(SpeechError error);
+    void stopWithError(SpeechError error, const std::string& reason);
+    /** The end by an error of the protocol, or of what counts as one. */
+    void fail(SpeechError error, const std::string& reason);
 
     Sound::Recorder::Mode sessionMode = Sound::Recorder::MODE_VOICE_RECOGNITION;
     boost::shared_ptr<Sound::Recorder> recorder;
@@ -94,6 +97,7 @@ class KorvelRecognizer : public Recognizer,
     unsigned recordedMs = 0;
     boost::shared_ptr<Util::WavOutputStream> wavDump;
 
+    bool started = false;
     bool recorderRefused = false;
     int64_t lastSoundTime = 0;
     boost::shared_ptr<Util::Timer> watchdog;

@@ -42,7 +42,8 @@ void RecognizeProtocol::abandon() {
     abandoned = true;
 }
 
-void RecognizeProtocol::notifyError(SpeechError error) {
+void RecognizeProtocol::notifyError(SpeechError error, const std::string& reason) {
+    errorReason = reason;
     listeners.notify(
         [&error](RecognizeProtocolListener& listener) { listener.onProtocolError(error); });
 }
@@ -75,13 +76,17 @@ int RecognizeProtocol::getSpeexQuality() const {
 boost::shared_ptr<RecognizeRequest> RecognizeProtocol::makeRequest(
     const Recognizer& recognizer, Network::NetworkTaskHolder& holder) {
     auto request = boost::make_shared<RecognizeRequest>(*engineSettings, *recognizer.getSettings());
+    lastRequest = request;
     const boost::weak_ptr<RecognizeProtocol> weakSelf = shared_from_this();
-    request->callback = [weakSelf, &holder](
+    const boost::weak_ptr<RecognizeRequest> weakRequest = request;
+    request->callback = [weakSelf, weakRequest, &holder](
                             const boost::shared_ptr<const RecognitionResults>& results,
                             const std::string& requestId) {
+        const boost::shared_ptr<RecognizeRequest> finished = weakRequest.lock();
         // The holder is the protocol's own and lives as long.
         if (const boost::shared_ptr<RecognizeProtocol> self = weakSelf.lock()) {
-            self->onNetworkRequestFinished(holder, results, requestId);
+            self->onNetworkRequestFinished(holder, results, requestId,
+                                           finished ? finished->getNoResultsReason() : "");
         }
     };
     return request;
@@ -104,19 +109,26 @@ boost::shared_ptr<Util::Timer> RecognizeProtocol::startAnswerTimer(
 
 void RecognizeProtocol::onNetworkRequestFinished(
     Network::NetworkTaskHolder& holder, const boost::shared_ptr<const RecognitionResults>& results,
-    const std::string& requestId) {
+    const std::string& requestId, const std::string& reason) {
     if (abandoned) {
         return;
     }
     const boost::shared_ptr<RecognizeProtocol> self = shared_from_this();
     holder.onFinished();
     if (!results) {
-        notifyError(SpeechError(SpeechError::ErrorNetwork));
+        notifyError(SpeechError(SpeechError::ErrorNetwork), reason);
         return;
     }
     listeners.notify([&results, &requestId](RecognizeProtocolListener& listener) {
         listener.onProtocolResults(results, requestId);
     });
+}
+
+std::string RecognizeProtocol::describeTimeout() const {
+    const boost::shared_ptr<RecognizeRequest> request = lastRequest.lock();
+    const std::string earlier = request ? request->getFailureReason() : std::string();
+    const std::string reason = "no answer within 20 s";
+    return earlier.empty() ? reason : reason + "; the first attempt failed: " + earlier;
 }
 
 void RecognizeProtocol::onNetworkRequestTimeout(Network::NetworkTaskHolder& holder) {
@@ -125,8 +137,9 @@ void RecognizeProtocol::onNetworkRequestTimeout(Network::NetworkTaskHolder& hold
     }
     const boost::shared_ptr<RecognizeProtocol> self = shared_from_this();
     kdLogFormatMessage("Recognition request timeout");
+    const std::string reason = describeTimeout();
     holder.cancel();
-    notifyError(SpeechError(SpeechError::ErrorNetwork));
+    notifyError(SpeechError(SpeechError::ErrorNetwork), reason);
 }
 
 }  // namespace Talvox

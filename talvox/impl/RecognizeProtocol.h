@@ -59,7 +59,13 @@ class RecognizeProtocol : public boost::enable_shared_from_this<RecognizeProtoco
      */
     void abandon();
 
+    /** Why the error that the listeners were given came about; for `Recognizer::getErrorReason`. */
+    const std::string& getErrorReason() const { return errorReason; }
+
   protected:
+    /** Why an utterance without any buffer is an error. */
+    static constexpr const char* NO_SOUND_REASON = "no sound was recorded";
+
     /** Keeps the engine's settings of now: a later change does not reach a running utterance. */
     explicit RecognizeProtocol(const Recognizer& recognizer);
 
@@ -71,7 +77,7 @@ class RecognizeProtocol : public boost::enable_shared_from_this<RecognizeProtoco
      *         earlier, or this is a call from inside the notification
      */
     bool announceVoiceCaptured();
-    void notifyError(SpeechError error);
+    void notifyError(SpeechError error, const std::string& reason);
 
     /** Whether the sound is sent as Speex, as settings and connection say now. */
     bool choosesSpeex() const;
@@ -91,13 +97,17 @@ class RecognizeProtocol : public boost::enable_shared_from_this<RecognizeProtoco
   private:
     void onNetworkRequestFinished(Network::NetworkTaskHolder& holder,
                                   const boost::shared_ptr<const RecognitionResults>& results,
-                                  const std::string& requestId);
+                                  const std::string& requestId, const std::string& reason);
+    std::string describeTimeout() const;
     void onNetworkRequestTimeout(Network::NetworkTaskHolder& holder);
 
     Util::ListenerList<RecognizeProtocolListener> listeners;
     boost::shared_ptr<const Settings> engineSettings;
     bool announcing = false;
     bool abandoned = false;
+    /** The request that was made last; the holder owns it. */
+    boost::weak_ptr<RecognizeRequest> lastRequest;
+    std::string errorReason;
 };
 
 }  // namespace Talvox

@@ -174,9 +174,11 @@ void RecognizeRequest::writeText(const std::string& text) {
 }
 
 void RecognizeRequest::onResponseRecieved(boost::shared_ptr<Network::HttpResponse> response) {
+    isUnreadable = false;
     if (const std::optional<std::string> header = response->getHeader(RESULTS_HEADER)) {
         const boost::shared_ptr<RecognitionResults> received = parseResultHeader(*header);
         if (!received) {
+            isUnreadable = true;
             return;
         }
         resultsReceived = true;
@@ -196,11 +198,22 @@ void RecognizeRequest::onFinished(int code) {
         return;
     }
     kdLogFormatMessage("RecognizeRequest::onFinished: res code %d", code);
+    noResultsReason = results ? std::string() : describeNoResults(code);
     // The callback may drop the request.
     const Callback target = callback;
     const boost::shared_ptr<const RecognitionResults> outcome = results;
     const std::string identifier = requestId;
     target(outcome, identifier);
+}
+
+std::string RecognizeRequest::describeNoResults(int status) const {
+    if (status > 0 && isUnreadable) {
+        return "the results in the answer cannot be read (HTTP status " + std::to_string(status) +
+               ")";
+    }
+    return getFailureReason().empty()
+               ? "the answer holds no results (HTTP status " + std::to_string(status) + ")"
+               : getFailureReason();
 }
 
 }  // namespace Talvox

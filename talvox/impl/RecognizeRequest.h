@@ -53,6 +53,9 @@ class RecognizeRequest : public Network::NetworkTask {
      */
     void close(bool finished);
 
+    /** Why there are no results, when the request is over; empty before that or when there are. */
+    const std::string& getNoResultsReason() const { return noResultsReason; }
+
     /** Set when a readable results header has arrived. */
     bool resultsReceived = false;
     /** Where a streamed body goes. */
@@ -96,8 +99,14 @@ class RecognizeRequest : public Network::NetworkTask {
     std::string makeField(const std::string& name, const std::string& value) const;
     void writeText(const std::string& text);
 
+    /** @param status as for `onFinished` */
+    std::string describeNoResults(int status) const;
+
     boost::shared_ptr<const Settings> engineCopy;
     boost::shared_ptr<const Settings> recognizerCopy;
+    /** Whether the latest response had a results header that could not be read. */
+    bool isUnreadable = false;
+    std::string noResultsReason;
 };
 
 }  // namespace Talvox

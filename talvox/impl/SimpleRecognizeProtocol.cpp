@@ -67,7 +67,7 @@ void SimpleRecognizeProtocol::sendRequest() {
         return;
     }
     if (useSpeex ? !encoder : !sound) {
-        notifyError(SpeechError(SpeechError::ErrorAudio));
+        notifyError(SpeechError(SpeechError::ErrorAudio), NO_SOUND_REASON);
         return;
     }
     if (useSpeex) {

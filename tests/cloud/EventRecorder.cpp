@@ -53,6 +53,11 @@ void EventRecorder::onResults(Talvox::Recognizer* recognizer,
 }
 
 void EventRecorder::onError(Talvox::Recognizer* recognizer, Talvox::SpeechError error) {
+    {
+        const std::string reason = recognizer->getErrorReason();
+        const std::lock_guard<std::mutex> lock(mutex);
+        lastReason = reason;
+    }
     addEnd("error " + error.getErrorString(), recognizer);
 }
 
@@ -102,6 +107,11 @@ std::vector<float> EventRecorder::powers() const {
 boost::shared_ptr<Talvox::Recognition> EventRecorder::recognition() const {
     const std::lock_guard<std::mutex> lock(mutex);
     return lastRecognition;
+}
+
+std::string EventRecorder::errorReason() const {
+    const std::lock_guard<std::mutex> lock(mutex);
+    return lastReason;
 }
 
 void EventRecorder::add(const std::string& text, Talvox::Recognizer* recognizer) {

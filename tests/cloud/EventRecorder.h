@@ -53,6 +53,8 @@ class EventRecorder : public Talvox::RecognizerListener {
     std::size_t countBuffers() const;
     std::vector<float> powers() const;
     boost::shared_ptr<Talvox::Recognition> recognition() const;
+    /** What the recognizer said inside the last `onError` about its reason. */
+    std::string errorReason() const;
 
     /**
      * Called at the end of each event, buffers ("buffer") and levels ("power") included, without
@@ -74,6 +76,7 @@ class EventRecorder : public Talvox::RecognizerListener {
     std::size_t buffers = 0;
     std::vector<float> levels;
     boost::shared_ptr<Talvox::Recognition> lastRecognition;
+    std::string lastReason;
 };
 
 }  // namespace CloudTest

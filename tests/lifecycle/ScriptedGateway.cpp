@@ -228,7 +228,7 @@ void ScriptedGateway::finish(const Connection& connection, int code) {
     const int session = connection.session;
     disconnect(transfer);
     observer->onAttemptEnd(session, code);
-    transfer->end(code);
+    transfer->end({code, {}});
 }
 
 }  // namespace Lifecycle

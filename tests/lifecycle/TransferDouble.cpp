@@ -52,11 +52,11 @@ std::size_t Transfer::readBody(char* data, std::size_t size) {
     return count;
 }
 
-void Transfer::end(int code) {
+void Transfer::end(const TransferEnd& how) {
     const boost::shared_ptr<TransferListener> hearer = listener;
     abandon();
     if (hearer) {
-        hearer->onTransferEnd(code);
+        hearer->onTransferEnd(how);
     }
 }
 

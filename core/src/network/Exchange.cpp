@@ -6,6 +6,7 @@
 
 #include "core/util/EventLock.h"
 #include "network/EventThread.h"
+#include "network/FailureText.h"
 #include "network/RequestCheck.h"
 #include "network/Transport.h"
 #include "pal/kd_event.h"
@@ -50,6 +51,7 @@ void Exchange::cancel() {
 void Exchange::postAttempt() {
     const boost::shared_ptr<Exchange> self = shared_from_this();
     if (!transport->post([self] { self->attempt(); })) {
+        task->failureReason = "the network thread does not run";
         // Never from inside `start`, so never on the caller's thread.
         postEnd(NetworkTask::NO_RESPONSE);
     }
@@ -72,11 +74,15 @@ boost::shared_ptr<Transfer> Exchange::makeTransfer() {
     if (!active) {
         return nullptr;
     }
-    if (!canBeSent(request)) {
+    const std::string fault = findFault(request);
+    if (!fault.empty()) {
+        kdLogFormatMessage("Network: a request cannot be sent: %s", fault.c_str());
+        current->failureReason = makeReason("the request cannot be sent: " + fault);
         finish(NetworkTask::NO_REQUEST);
         return nullptr;
     }
     collected.clear();
+    attemptReason.clear();
     transfer = boost::make_shared<Transfer>(transport, request, shared_from_this());
     transfer->startWatchdog();
     return transfer;
@@ -86,6 +92,7 @@ bool Exchange::prepareTask(const boost::shared_ptr<NetworkTask>& current) {
     if (attempts > 0) {
         current->onRetried();
     } else if (!current->isReadyToPerform() && active) {
+        current->failureReason = "the request is not ready";
         finish(NetworkTask::NOT_READY);
         return false;
     }
@@ -96,6 +103,7 @@ void Exchange::onTransferHead(const boost::shared_ptr<HttpResponse>& response) {
     const Util::EventLock lock;
     const boost::shared_ptr<NetworkTask> current = task;
     if (isHeard()) {
+        attemptReason = describeStatus(*response);
         current->onResponseRecieved(response);
     }
 }
@@ -120,25 +128,28 @@ bool Exchange::onTransferBytes(const unsigned char* bytes, std::size_t size) {
 bool Exchange::collect(const unsigned char* bytes, std::size_t size) {
     if (size > MOST_COLLECTED_BYTES - collected.size()) {
         kdLogMessage("Network: the body of a response is too large");
+        attemptReason = "the body of the response is too large";
         return false;
     }
     collected.insert(collected.end(), bytes, bytes + size);
     return true;
 }
 
-void Exchange::onTransferEnd(int code) {
+void Exchange::onTransferEnd(const TransferEnd& how) {
     const Util::EventLock lock;
     const boost::shared_ptr<NetworkTask> current = task;
     if (!isHeard()) {
         return;
     }
     transfer.reset();
-    if (code > 0 && !collected.empty()) {
+    // Ours is more precise than what libcurl says about an end that we caused.
+    current->failureReason = attemptReason.empty() ? how.reason : attemptReason;
+    if (how.code > 0 && !collected.empty()) {
         const std::vector<unsigned char> whole = std::move(collected);
         current->onBytesReceived(whole);
     }
     if (active) {
-        retryOrFinish(code);
+        retryOrFinish(how.code);
     }
 }
 

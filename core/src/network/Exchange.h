@@ -35,7 +35,7 @@ class Exchange : public boost::enable_shared_from_this<Exchange>, public Transfe
 
     void onTransferHead(const boost::shared_ptr<HttpResponse>& response) override;
     bool onTransferBytes(const unsigned char* bytes, std::size_t size) override;
-    void onTransferEnd(int code) override;
+    void onTransferEnd(const TransferEnd& how) override;
 
   private:
     void postAttempt();
@@ -55,6 +55,8 @@ class Exchange : public boost::enable_shared_from_this<Exchange>, public Transfe
     const bool endsHere;
     boost::shared_ptr<Transfer> transfer;
     std::vector<unsigned char> collected;
+    /** Why the running attempt fails, as far as its response, or our refusal of it, says so. */
+    std::string attemptReason;
     Util::Timer retryTimer;
     int attempts = 0;
     bool active = true;

@@ -20,4 +20,8 @@ bool NetworkTask::recieveResponseBodyByParts() const {
 
 void NetworkTask::onRetried() {}
 
+const std::string& NetworkTask::getFailureReason() const {
+    return failureReason;
+}
+
 }  // namespace Network

@@ -1,14 +1,10 @@
 #include "network/RequestCheck.h"
 
-#include <string>
-
-#include "pal/kd_log.h"
-
 namespace Network {
 
 namespace {
 
-std::string findFault(const HttpRequest& request) {
+std::string findFaultIn(const HttpRequest& request) {
     const std::string urlFault = HttpRequest::findUrlFault(request.getUrl());
     if (!urlFault.empty()) {
         return "its URL " + urlFault;
@@ -28,12 +24,8 @@ std::string findFault(const HttpRequest& request) {
 
 }  // namespace
 
-bool canBeSent(const boost::shared_ptr<HttpRequest>& request) {
-    const std::string fault = request ? findFault(*request) : "there is none";
-    if (!fault.empty()) {
-        kdLogFormatMessage("Network: a request cannot be sent: %s", fault.c_str());
-    }
-    return fault.empty();
+std::string findFault(const boost::shared_ptr<HttpRequest>& request) {
+    return request ? findFaultIn(*request) : "there is none";
 }
 
 }  // namespace Network

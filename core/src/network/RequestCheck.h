@@ -1,12 +1,13 @@
 #pragma once
 
 #include <boost/shared_ptr.hpp>
+#include <string>
 
 #include "core/network/HttpRequest.h"
 
 namespace Network {
 
-/** Whether a request may go out; a line in the log tells why not. */
-bool canBeSent(const boost::shared_ptr<HttpRequest>& request);
+/** Why a request must not go out; empty when it may. */
+std::string findFault(const boost::shared_ptr<HttpRequest>& request);
 
 }  // namespace Network

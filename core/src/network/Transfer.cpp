@@ -6,6 +6,7 @@
 #include <utility>
 
 #include "core/network/NetworkTask.h"
+#include "network/FailureText.h"
 #include "network/Transport.h"
 #include "pal/kd_log.h"
 
@@ -137,18 +138,32 @@ void Transfer::addHeaderLine(const std::string& line) {
     }
 }
 
-int Transfer::judge(CURLcode result) const {
+TransferEnd Transfer::judge(CURLcode result) const {
     const long status = getStatus();
     if (headDelivered && (result == CURLE_OK || isAnswered())) {
-        return static_cast<int>(status);
+        return {static_cast<int>(status), {}};
     }
-    kdLogFormatMessage("Network: a request failed: %s",
-                       errorText[0] != '\0' ? errorText.data() : curl_easy_strerror(result));
+    const std::string reason = makeReason(describe(result));
+    kdLogFormatMessage("Network: a request failed: %s", reason.c_str());
     if (result == CURLE_OPERATION_TIMEDOUT) {
-        return NetworkTask::TIMED_OUT;
+        return {NetworkTask::TIMED_OUT, reason};
     }
     const bool neverSent = result == CURLE_URL_MALFORMAT && status == 0;
-    return neverSent ? NetworkTask::NO_REQUEST : NetworkTask::NO_RESPONSE;
+    return {neverSent ? NetworkTask::NO_REQUEST : NetworkTask::NO_RESPONSE, reason};
+}
+
+std::string Transfer::describe(CURLcode result) const {
+    if (refusal != nullptr) {
+        return refusal;
+    }
+    if (result == CURLE_OPERATION_TIMEDOUT) {
+        return describeTimeout(request->getTimeoutMs());
+    }
+    // libcurl calls a header line beyond its limit so.
+    if (result == CURLE_OUT_OF_MEMORY && getStatus() != 0 && !headDelivered) {
+        return "the head of the response is too large, or memory is short";
+    }
+    return errorText[0] != '\0' ? errorText.data() : curl_easy_strerror(result);
 }
 
 long Transfer::getStatus() const {
@@ -164,11 +179,11 @@ bool Transfer::isAnswered() const {
     return expected >= 0 && receivedBytes >= expected;
 }
 
-void Transfer::end(int code) {
+void Transfer::end(const TransferEnd& how) {
     const boost::shared_ptr<TransferListener> hearer = listener;
     abandon();
     if (hearer) {
-        hearer->onTransferEnd(code);
+        hearer->onTransferEnd(how);
     }
 }
 
@@ -252,6 +267,7 @@ bool Transfer::takeNewConnection() {
     const bool needed = needsNewConnection;
     if (needed) {
         needsNewConnection = false;
+        errorText[0] = '\0';
         kdLogMessage("Network: there is something unasked on a kept connection, taking a new one");
         curl_easy_setopt(easy.get(), CURLOPT_FRESH_CONNECT, 1L);
     }
@@ -281,6 +297,7 @@ std::size_t Transfer::onHeader(char* data, std::size_t size, std::size_t count, 
     transfer.noteProgress();
     if (!transfer.head.hasRoom(bytes)) {
         kdLogMessage("Network: the head of a response is too large");
+        transfer.refusal = "the head of the response is too large";
         return 0;
     }
     if (transfer.head.addLine(std::string_view(data, bytes))) {

@@ -20,6 +20,12 @@ namespace Network {
 
 class Transport;
 
+/** How a transfer ended. */
+struct TransferEnd {
+    int code = 0;       /**< as for `NetworkTask::onFinished` */
+    std::string reason; /**< why there was no complete response; empty when there was one */
+};
+
 /** Hears of one transfer. All operations are called on the network thread without any lock. */
 class TransferListener {
   public:
@@ -28,8 +34,7 @@ class TransferListener {
     virtual void onTransferHead(const boost::shared_ptr<HttpResponse>& response) = 0;
     /** @return false to end the transfer */
     virtual bool onTransferBytes(const unsigned char* bytes, std::size_t size) = 0;
-    /** The end; `code` as for `NetworkTask::onFinished`. */
-    virtual void onTransferEnd(int code) = 0;
+    virtual void onTransferEnd(const TransferEnd& how) = 0;
 };
 
 /**
@@ -50,7 +55,7 @@ class Transfer : public boost::enable_shared_from_this<Transfer> {
     CURL* open(const std::string& certificateFile);
 
     /** What the listener is to hear of an end with this result, before the handle is freed. */
-    int judge(CURLcode result) const;
+    TransferEnd judge(CURLcode result) const;
 
     bool hasExpired() const { return watchdog.hasExpired(); }
 
@@ -61,7 +66,7 @@ class Transfer : public boost::enable_shared_from_this<Transfer> {
     bool takeNewConnection();
 
     /** Frees the handle, which is in no multi handle any more; tells the listener. */
-    void end(int code);
+    void end(const TransferEnd& how);
 
     /** As `end`, silently. */
     void abandon();
@@ -83,6 +88,7 @@ class Transfer : public boost::enable_shared_from_this<Transfer> {
     void resume();
     void handleHeadEnd();
     bool isAnswered() const;
+    std::string describe(CURLcode result) const;
     long getStatus() const;
     void noteProgress();
     bool canUseConnection(int ownPort);
@@ -105,6 +111,8 @@ class Transfer : public boost::enable_shared_from_this<Transfer> {
 
     std::unique_ptr<curl_slist, ListDeleter> headerLines;
     std::array<char, CURL_ERROR_SIZE> errorText{};
+    /** Set when we ended the transfer ourselves; libcurl only knows that a callback failed. */
+    const char* refusal = nullptr;
     std::unique_ptr<CURL, EasyDeleter> easy;
     RequestBody body;
     ResponseHead head;

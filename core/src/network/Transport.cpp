@@ -237,9 +237,9 @@ void Transport::finish(Transfers::iterator entry, CURLcode result) {
         curl_multi_add_handle(multi.get(), entry->first) == CURLM_OK) {
         return;
     }
-    const int code = transfer->judge(result);
+    const TransferEnd how = transfer->judge(result);
     transfers.erase(entry);
-    transfer->end(code);
+    transfer->end(how);
 }
 
 void Transport::finishAll() {

@@ -5,6 +5,7 @@
 #pragma once
 
 #include <boost/shared_ptr.hpp>
+#include <string>
 #include <vector>
 
 #include "core/Export.h"
@@ -12,6 +13,8 @@
 #include "core/network/HttpResponse.h"
 
 namespace Network {
+
+class Exchange;
 
 /**
  * What a `NetworkTaskHolder` runs. All operations are called under the event lock: the requests
@@ -65,6 +68,14 @@ class KORVEL_CORE_API NetworkTask {
     /** Another attempt follows; default does nothing. */
     virtual void onRetried();
 
+    /**
+     * Why the latest attempt that is over failed, in the network layer's words: one line of
+     * printable ASCII, at most 200 bytes, such as "Could not resolve host: example.org" or "HTTP
+     * status 404". Empty before the first attempt is over and after a status from 200 to 299.
+     * Complete when `onFinished` is called. Under the event lock.
+     */
+    const std::string& getFailureReason() const;
+
     /** Codes of `onFinished` without a response. */
     enum Failure {
         NO_RESPONSE = -1, /**< no connection, broken connection or no valid answer */
@@ -72,6 +83,11 @@ class KORVEL_CORE_API NetworkTask {
         NOT_READY = -3,   /**< `isReadyToPerform` said no */
         NO_REQUEST = -4,  /**< there was no request, or none that can be sent */
     };
+
+  private:
+    friend class Exchange;
+
+    std::string failureReason;
 };
 
 }  // namespace Network
