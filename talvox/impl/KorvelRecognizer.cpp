@@ -59,8 +59,9 @@ void KorvelRecognizer::start() {
     }
     started = true;
     const boost::shared_ptr<const Settings> engineSettings = getEngine()->getTalvoxSettings();
-    if (const char* const reason = findObstacle(*engineSettings)) {
-        stopWithError(SpeechError::ErrorNetwork, reason);
+    std::string obstacle;
+    if (!statusIsReasonable(*engineSettings, obstacle)) {
+        stopWithError(SpeechError::ErrorNetwork, obstacle);
         return;
     }
     chooseSessionMode(*engineSettings);
@@ -79,20 +80,21 @@ void KorvelRecognizer::start() {
     startWatchdog();
 }
 
-const char* KorvelRecognizer::findObstacle(const Settings& engineSettings) {
+bool KorvelRecognizer::statusIsReasonable(const Settings& engineSettings, std::string& obstacle) {
     const int reachability = Network::NetworkManager::getInstance().getReachability();
-    const bool hasUuid = !engineSettings.getUuid().empty();
-    const bool hasUrl = !engineSettings.getUrl().empty();
-    if (reachability != Network::NetworkManager::UNREACHABLE && hasUuid && hasUrl) {
-        return nullptr;
+    if (engineSettings.getUrl().empty()) {
+        obstacle = "the engine's setting \"url\" is empty";
+    } else if (engineSettings.getUuid().empty()) {
+        obstacle = "the engine's setting \"uuid\" is empty";
+    } else if (reachability == Network::NetworkManager::UNREACHABLE) {
+        obstacle = "there is no network";
+    } else {
+        return true;
     }
     kdLogFormatMessage("KorvelRecognizer: uuid %s, url %s, reachability %d; failing",
                        engineSettings.getUuid().c_str(), engineSettings.getUrl().c_str(),
                        reachability);
-    if (!hasUrl) {
-        return "the engine's setting \"url\" is empty";
-    }
-    return hasUuid ? "there is no network" : "the engine's setting \"uuid\" is empty";
+    return false;
 }
 
 void KorvelRecognizer::chooseSessionMode(const Settings& engineSettings) {

@@ -56,8 +56,8 @@ class KorvelRecognizer : public Recognizer,
     static const std::vector<std::string>& getAvailableLanguages();
 
   private:
-    /** Why no session can begin, with a line in the log; null when one can. */
-    static const char* findObstacle(const Settings& engineSettings);
+    /** Whether a session can begin; if not, logs it and says why in `obstacle`. */
+    static bool statusIsReasonable(const Settings& engineSettings, std::string& obstacle);
     void chooseSessionMode(const Settings& engineSettings);
     /** @return false when the session is over because there is no recording */
     bool startRecorder(int sampleRateHz);
