@@ -7,6 +7,7 @@
 #include <utility>
 
 #include "core/sound/RecorderFormat.h"
+#include "core/sound/ZeroWatch.h"
 #include "talvox/impl/BufferedVAD.h"
 #include "talvox/impl/FrameVAD.h"
 #include "talvox/impl/ListeningRules.h"
@@ -138,6 +139,7 @@ VadBufferAnalysis VadAnalyzer::analyze(const Sound::SoundDataBuffer& buffer) {
     impl->samplesSeen += buffer.getSampleCount();
     impl->recordedMs += ListeningRules::getDurationMs(buffer);
     analysis.endMs = impl->soundTimeNs() / NS_PER_MS;
+    analysis.isDigitalSilence = Sound::ZeroWatch::isSilence(buffer);
     analysis.arrivalMs = impl->sinceStartNs() / NS_PER_MS;
     if (impl->leadingNoiseDone) {
         impl->detect(buffer, analysis);

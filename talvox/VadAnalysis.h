@@ -49,8 +49,15 @@ struct VadBufferAnalysis {
      * the share in this buffer. NaN where there are no frames.
      */
     float activity = 0;
-    /** Sound level in dB, as listeners are told; during the leading noise the noise's level. */
+    /**
+     * Sound level in dB, as listeners are notified of it: smoothed over the buffers since the
+     * leading noise, above -60.3 dB of full scale (a mean square of 1000), or in general mode above
+     * the learnt noise. During the leading noise the level of all noise so far that the detector
+     * goes by, above -45.3 dB of full scale. 0 before the first sample that is not zero.
+     */
     float level = 0;
+    /** Every sample of the buffer is zero. `level` may still fall, or be any negative number. */
+    bool isDigitalSilence = false;
     /** The detector's state after the buffer. */
     bool isSpeech = false;
 };

@@ -4,11 +4,13 @@
 
 namespace Sound {
 
-bool ZeroWatch::isSuspicious(const SoundDataBuffer& buffer) {
+bool ZeroWatch::isSilence(const SoundDataBuffer& buffer) {
     const auto& bytes = buffer.getData();
-    const bool allZero =
-        std::all_of(bytes.begin(), bytes.end(), [](unsigned char byte) { return byte == 0; });
-    zeroSamples = allZero ? zeroSamples + buffer.getSampleCount() : 0;
+    return std::all_of(bytes.begin(), bytes.end(), [](unsigned char byte) { return byte == 0; });
+}
+
+bool ZeroWatch::isSuspicious(const SoundDataBuffer& buffer) {
+    zeroSamples = isSilence(buffer) ? zeroSamples + buffer.getSampleCount() : 0;
     if (reported || zeroSamples <= buffer.getInfo().getSampleRate()) {
         return false;
     }

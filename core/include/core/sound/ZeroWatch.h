@@ -17,6 +17,9 @@ class KORVEL_CORE_API ZeroWatch {
     /** Looks at the next recorded buffer. @return true once: zeros alone for over a second */
     bool isSuspicious(const SoundDataBuffer& buffer);
 
+    /** True when every sample is zero: digital silence. */
+    static bool isSilence(const SoundDataBuffer& buffer);
+
   private:
     int64_t zeroSamples = 0;
     bool reported = false;
