@@ -4,11 +4,13 @@
 #include <string>
 
 #include "ExitStatus.h"
+#include "LevelBar.h"
 #include "LogCommand.h"
 #include "SettingsCommand.h"
 #include "SoundInput.h"
 #include "UsageError.h"
 #include "VadCommand.h"
+#include "VadWarnings.h"
 #include "Version.h"
 #include "talvox/Settings.h"
 
@@ -147,6 +149,9 @@ CLI::App* addRecognize(CLI::App& app, RecognizeOptions& options) {
         ->type_name("FILE");
     command->footer(
         "Settings are applied in this order: defaults, --settings, --set, the other options.\n"
+        "Levels are " +
+        levelReference(false) + "; with sessionmode=general,\n" + levelReference(true) +
+        ". \"talvox vad --help\" lists the parameters of --vad.\n"
         "Ctrl-C cancels; a second Ctrl-C leaves at once.\n"
         "Exit status: 0 results were delivered, 1 the recognition ended in an error,\n"
         "2 wrong usage or unreadable input.");
@@ -178,6 +183,12 @@ CLI::App* addVadCommand(CLI::App& app, VadOptions& options) {
     addSettingsSources(*command, options.settings);
     command->add_flag("--json", options.json,
                       "Print every buffer and every segment as one JSON object a line");
+    command->footer("Levels are " + levelReference(false) + "; with sessionmode=general,\n" +
+                    levelReference(true) +
+                    ". The level of the leading noise, by which the detector\n"
+                    "chooses its thresholds, is above -45.3 dBFS and adds the noise up.\n\n"
+                    "Parameters of the detector (values, [default]):\n" +
+                    vadParameterTable());
     return command;
 }
 

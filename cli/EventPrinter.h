@@ -12,9 +12,10 @@ struct SessionEvent {
     enum Kind { RECORDING_BEGIN, SPEAKING_BEGIN, POWER, RECORDING_DONE, RESULTS, FAILURE };
 
     Kind kind = RECORDING_BEGIN;
-    int64_t ms = 0;    /**< since the session's start */
-    float levelDb = 0; /**< of POWER */
-    int errorCode = 0; /**< of FAILURE: a code of `Talvox::SpeechError` */
+    int64_t ms = 0;         /**< since the session's start */
+    float levelDb = 0;      /**< of POWER */
+    bool isSilence = false; /**< of POWER: every sample of the buffer is zero */
+    int errorCode = 0;      /**< of FAILURE: a code of `Talvox::SpeechError` */
     boost::shared_ptr<Talvox::Recognition> recognition; /**< of RESULTS; not null there */
 
     /** The session's last event. */

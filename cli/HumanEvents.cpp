@@ -54,8 +54,8 @@ void HumanEvents::printLine(int64_t ms, const std::string& text) {
 }
 
 void HumanEvents::printLevel(const SessionEvent& event) {
-    const std::string bar = "[" + levelBar(event.levelDb, BAR_WIDTH) + "] " +
-                            fixed(static_cast<double>(event.levelDb), 5, 1) + " dB";
+    const std::string bar = "[" + levelBar(event.isSilence ? 0 : event.levelDb, BAR_WIDTH) + "]" +
+                            levelText(event.levelDb, event.isSilence);
     if (!terminal) {
         printLine(event.ms, bar);
         return;

@@ -44,14 +44,16 @@ std::string sessionText(const SessionEvent& event) {
 
 void HumanVad::printBuffer(const Talvox::VadBufferAnalysis& buffer) {
     if (!headerPrinted) {
+        out << "level: " << levelReference(isGeneral)
+            << ", smoothed; of the noise: dB above -45.3 dBFS, summed up\n\n";
         out << "    from  level" << std::string(BAR_WIDTH + 8, ' ')
             << "activity  state   frames (1 speech, 0 none)\n";
         headerPrinted = true;
     }
-    out << timeColumn(buffer.startMs) << '[' << levelBar(buffer.level, BAR_WIDTH) << ']'
-        << fixed(static_cast<double>(buffer.level), 6, 1) << " dB"
-        << "   " << activityText(buffer) << "  " << padded(stateName(buffer), STATE_COLUMNS)
-        << decisionText(buffer) << '\n';
+    out << timeColumn(buffer.startMs) << '['
+        << levelBar(buffer.isDigitalSilence ? 0 : buffer.level, BAR_WIDTH) << ']'
+        << levelText(buffer.level, buffer.isDigitalSilence) << "   " << activityText(buffer) << "  "
+        << padded(stateName(buffer), STATE_COLUMNS) << decisionText(buffer) << '\n';
 }
 
 void HumanVad::printSessionEvent(const SessionEvent& event) {

@@ -73,6 +73,7 @@ void JsonEvents::print(const SessionEvent& event) {
     object["ms"] = event.ms;
     if (event.kind == SessionEvent::POWER) {
         object["level"] = toJsonNumber(event.levelDb);
+        object["silence"] = event.isSilence;
     } else if (event.kind == SessionEvent::FAILURE) {
         object["code"] = event.errorCode;
         object["name"] = Talvox::SpeechError(event.errorCode).getErrorString();

@@ -11,6 +11,7 @@ void JsonVad::printBuffer(const Talvox::VadBufferAnalysis& buffer) {
     object["endMs"] = buffer.endMs;
     object["learningNoise"] = buffer.learningNoise;
     object["level"] = toJsonNumber(buffer.level);
+    object["silence"] = buffer.isDigitalSilence;
     object["frames"] = decisionText(buffer);
     object["activity"] = toJsonNumber(buffer.activity);
     object["speech"] = buffer.isSpeech;

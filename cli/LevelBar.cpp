@@ -3,6 +3,8 @@
 #include <algorithm>
 #include <cmath>
 
+#include "Text.h"
+
 namespace Cli {
 
 std::string levelBar(float levelDb, int width) {
@@ -11,6 +13,15 @@ std::string levelBar(float levelDb, int width) {
     const auto full = static_cast<int>(std::lround(share * static_cast<float>(width)));
     return std::string(static_cast<std::size_t>(full), '#') +
            std::string(static_cast<std::size_t>(width - full), '-');
+}
+
+std::string levelText(float levelDb, bool isSilence) {
+    return isSilence ? "  silence" : fixed(static_cast<double>(levelDb), 6, 1) + " dB";
+}
+
+std::string levelReference(bool isGeneralMode) {
+    return isGeneralMode ? "dB above the leading noise"
+                         : "dB above -60.3 dBFS (full scale is 60.3 dB)";
 }
 
 }  // namespace Cli

@@ -13,4 +13,11 @@ const float LEVEL_BAR_MAX_DB = 45.0f;
  */
 std::string levelBar(float levelDb, int width);
 
+/** A level right-aligned, such as "  22.5 dB"; digital silence is "  silence", whatever the level.
+ */
+std::string levelText(float levelDb, bool isSilence);
+
+/** What the levels of a session are relative to; in general mode that is its leading noise. */
+std::string levelReference(bool isGeneralMode);
+
 }  // namespace Cli

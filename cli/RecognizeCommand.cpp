@@ -20,6 +20,7 @@
 #include "SoundInput.h"
 #include "Text.h"
 #include "UsageError.h"
+#include "VadWarnings.h"
 #include "core/sound/FileRecorder.h"
 #include "core/sound/Recorder.h"
 #include "pal/kd_file.h"
@@ -127,6 +128,7 @@ int runRecognize(const RecognizeOptions& options, Console& console, LogOutput& l
     log.show(true);
     const boost::shared_ptr<Talvox::Settings> settings = buildSettings(options.settings);
     checkRequestSettings(*settings);
+    warnOfVadMistakes(*settings, console.err);
     log.show(settings->getInt(Talvox::Settings::SKS_VERBOSE_LEVEL) > 0);
     if (!options.dumpDirectory.empty()) {
         mountDump(options.dumpDirectory);

@@ -2,6 +2,7 @@
 
 #include <utility>
 
+#include "core/sound/ZeroWatch.h"
 #include "pal/kd_time.h"
 
 namespace Cli {
@@ -29,11 +30,14 @@ void SessionListener::onRecordingDone(Talvox::Recognizer* /*recognizer*/) {
 }
 
 void SessionListener::onBufferReceived(Talvox::Recognizer* /*recognizer*/,
-                                       const Sound::SoundDataBuffer& /*buffer*/) {}
+                                       const Sound::SoundDataBuffer& buffer) {
+    isSilence = Sound::ZeroWatch::isSilence(buffer);
+}
 
 void SessionListener::onPowerChanged(Talvox::Recognizer* /*recognizer*/, float power) {
     SessionEvent event = make(SessionEvent::POWER);
     event.levelDb = power;
+    event.isSilence = isSilence;
     queue->put(event);
 }
 

@@ -29,6 +29,7 @@ class SessionListener : public Talvox::RecognizerListener {
 
     boost::shared_ptr<EventQueue> queue;
     KDust startTime;
+    bool isSilence = false;
 };
 
 }  // namespace Cli

@@ -11,6 +11,7 @@
 #include "HumanVad.h"
 #include "JsonVad.h"
 #include "SoundInput.h"
+#include "VadWarnings.h"
 #include "core/sound/Recorder.h"
 #include "core/sound/SoundDataBuffer.h"
 #include "talvox/SpeechError.h"
@@ -74,11 +75,11 @@ bool endsListening(Talvox::ListeningStep step) {
     return step == Talvox::ListeningStep::LISTENING_ENDS || step == Talvox::ListeningStep::NO_VOICE;
 }
 
-std::unique_ptr<VadPrinter> makePrinter(bool json, std::ostream& out) {
+std::unique_ptr<VadPrinter> makePrinter(bool json, Sound::Recorder::Mode mode, std::ostream& out) {
     if (json) {
         return std::make_unique<JsonVad>(out);
     }
-    return std::make_unique<HumanVad>(out);
+    return std::make_unique<HumanVad>(out, mode == Sound::Recorder::MODE_GENERAL);
 }
 
 }  // namespace
@@ -86,14 +87,16 @@ std::unique_ptr<VadPrinter> makePrinter(bool json, std::ostream& out) {
 int runVad(const VadOptions& options, Console& console, LogOutput& log) {
     log.show(true);
     const boost::shared_ptr<Talvox::Settings> settings = buildSettings(options.settings);
+    warnOfVadMistakes(*settings, console.err);
     const int rate = settings->getSampleRate();
     std::vector<int16_t> samples = loadSound(options.file, console.in, rate, MAX_CLIP_SECONDS);
     addLeadIn(samples, rate, options.leadInMs);
     const std::size_t length = static_cast<std::size_t>(rate) * BUFFER_MS / 1000;
 
-    const std::unique_ptr<VadPrinter> printer = makePrinter(options.json, console.out);
+    const Sound::Recorder::Mode mode = sessionMode(*settings);
+    const std::unique_ptr<VadPrinter> printer = makePrinter(options.json, mode, console.out);
     Talvox::VadAnalyzer analyzer(settings->getString(Talvox::Settings::SKS_VAD_SETTINGS), rate,
-                                 sessionMode(*settings));
+                                 mode);
     bool isSpeech = false;
     bool isListening = true;
     // A session goes on behind the sound, in silence, until one of its limits ends it.

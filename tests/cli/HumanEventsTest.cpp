@@ -57,6 +57,14 @@ TEST(HumanEvents, RedrawsTheBarInPlaceOnATerminal) {
                           "\r\x1b[K   903 ms  speech begins\n"));
 }
 
+TEST(HumanEvents, ShowsDigitalSilenceAsSilence) {
+    SessionEvent silence = TestSupport::power(303, -87.25F);
+    silence.isSilence = true;
+    std::ostringstream out;
+    Cli::HumanEvents(out, false).print(silence);
+    EXPECT_EQ(out.str(), "   303 ms  [------------------------------]  silence\n");
+}
+
 TEST(HumanEvents, NamesAnError) {
     std::ostringstream out;
     Cli::HumanEvents(out, false).print(TestSupport::failure(5100, 6));

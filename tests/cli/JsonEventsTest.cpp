@@ -29,11 +29,15 @@ TEST(JsonEvents, PrintsOneObjectALine) {
 
 TEST(JsonEvents, PrintsTheLevelOfPower) {
     EXPECT_EQ(printed(TestSupport::power(300, 21.5F)),
-              "{\"event\":\"power\",\"ms\":300,\"level\":21.5}\n");
+              "{\"event\":\"power\",\"ms\":300,\"level\":21.5,\"silence\":false}\n");
+    SessionEvent silence = TestSupport::power(300, -87.25F);
+    silence.isSilence = true;
+    EXPECT_EQ(printed(silence),
+              "{\"event\":\"power\",\"ms\":300,\"level\":-87.25,\"silence\":true}\n");
     EXPECT_EQ(printed(TestSupport::power(300, 0.1F)),
-              "{\"event\":\"power\",\"ms\":300,\"level\":0.1}\n");
+              "{\"event\":\"power\",\"ms\":300,\"level\":0.1,\"silence\":false}\n");
     EXPECT_EQ(printed(TestSupport::power(300, std::numeric_limits<float>::quiet_NaN())),
-              "{\"event\":\"power\",\"ms\":300,\"level\":null}\n");
+              "{\"event\":\"power\",\"ms\":300,\"level\":null,\"silence\":false}\n");
 }
 
 TEST(JsonEvents, PrintsCodeAndNameOfAnError) {

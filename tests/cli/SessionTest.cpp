@@ -37,6 +37,17 @@ class Recording : public Cli::EventPrinter {
         return -1;
     }
 
+    /** Of each level, whether its buffer was digital silence. */
+    std::vector<bool> silences() const {
+        std::vector<bool> found;
+        for (const SessionEvent& event : events) {
+            if (event.kind == SessionEvent::POWER) {
+                found.push_back(event.isSilence);
+            }
+        }
+        return found;
+    }
+
     std::vector<SessionEvent> events;
 };
 
@@ -103,6 +114,12 @@ TEST_F(SessionTest, TellsEveryEventWithItsTime) {
     EXPECT_GE(done, 1700);
     EXPECT_LE(done, 2500);
     EXPECT_EQ(done % 100, 20);
+    // After the noise there is one more buffer of zeros, then a second of voice, then zeros.
+    const std::vector<bool> silences = recording.silences();
+    ASSERT_GT(silences.size(), 12U);
+    EXPECT_EQ(std::vector<bool>(silences.begin(), silences.begin() + 12),
+              (std::vector<bool>{true, false, false, false, false, false, false, false, false,
+                                 false, false, true}));
 }
 
 TEST_F(SessionTest, EndsWithNoVoiceAfterFiveSeconds) {

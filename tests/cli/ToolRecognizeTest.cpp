@@ -87,7 +87,8 @@ TEST(ToolRecognize, PrintsEveryEventAsAJsonLine) {
         lastMs = event["ms"].get<int64_t>();
         if (index > 0 && index + 2 < events.size()) {
             EXPECT_THAT(events[index],
-                        MatchesRegex("\\{\"event\":\"power\",\"ms\":[0-9]+,\"level\":-?[0-9.e-]+\\}"
+                        MatchesRegex("\\{\"event\":\"power\",\"ms\":[0-9]+,\"level\":-?[0-9.e-]+,"
+                                     "\"silence\":(true|false)\\}"
                                      "|\\{\"event\":\"speakingBegin\",\"ms\":[0-9]+\\}"));
             speakingBegins += event["event"] == "speakingBegin" ? 1 : 0;
         }

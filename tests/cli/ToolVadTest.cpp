@@ -83,7 +83,7 @@ TEST(ToolVad, PrintsATableForReaders) {
     const ToolResult result =
         runTalvox({"vad", "--file", "-"}, TestSupport::rawBytes(utterance(16000)));
     EXPECT_EQ(result.status, 0);
-    EXPECT_THAT(result.out, HasSubstr("     0 ms  [--------------------]   0.0 dB       -  noise"));
+    EXPECT_THAT(result.out, HasSubstr("     0 ms  [--------------------]  silence       -  noise"));
     EXPECT_THAT(result.out, HasSubstr("  speech  1"));
     EXPECT_THAT(result.out, HasSubstr("\nsegments of speech:\n  1"));
 }
@@ -110,9 +110,12 @@ TEST(ToolVad, RunsWithADocumentOfNumbersBeyondRangeAndTellsItsRepairs) {
     const ToolResult result = runTalvox({"vad", "--file", "-", "--json", "--settings", file},
                                         TestSupport::rawBytes(utterance(16000)));
     EXPECT_EQ(result.status, 0);
-    EXPECT_EQ(result.err,
-              "talvox: TalvoxSettings::validate: bad sampleRate: 96000, setting to default\n"
-              "talvox: activityOn 1.000000\n");
+    EXPECT_EQ(
+        result.err,
+        "talvox: TalvoxSettings::validate: bad sampleRate: 96000, setting to default\n"
+        "talvox: warning: vad: activityon=1.0 is out of range (0 to less than 1): speech never "
+        "begins\n"
+        "talvox: activityOn 1.000000\n");
     EXPECT_EQ(objects(result.out, "buffer").size(), 40U);
     EXPECT_TRUE(objects(result.out, "segment").empty());
 }
@@ -128,6 +131,11 @@ TEST(ToolVad, SurvivesAndTellsMistakesInTheParameters) {
     EXPECT_THAT(unknown.err, HasSubstr("talvox: Unknown WebRTC VAD parameter setting: colour\n"));
     EXPECT_THAT(unknown.err, HasSubstr("talvox: assertion failed: aValue == \"buffered\" "
                                        "(talvox/impl/BufferedVAD:174)\n"));
+    for (const char* warning :
+         {"a=b=c has more than one \"=\" and is ignored",
+          "engine=ears is unknown; buffered is used", "there is no parameter \"colour\""}) {
+        EXPECT_THAT(unknown.err, HasSubstr("talvox: warning: vad: " + std::string(warning) + '\n'));
+    }
     for (const char* text : {"framems=0", "framems=-5", "framems=1000000000", "analyzemson=0",
                              "analyzemsoff=0;analyzemson=0", "engine=wrtc;framems=7"}) {
         EXPECT_EQ(runTalvox({"vad", "--file", "-", "--vad", text}, sound).status, 0) << text;
