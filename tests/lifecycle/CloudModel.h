@@ -32,7 +32,7 @@ class CloudModel : public SessionModel {
 
     void beginStart(int64_t now, std::optional<int> refusal) override;
     std::string endStart() override;
-    void beginStop() override { ++stops; }
+    void beginStop(int64_t /*now*/) override { ++stops; }
     std::string endStop() override;
     void beginCancel() override { ++cancels; }
     std::string endCancel() override;

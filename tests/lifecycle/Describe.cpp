@@ -69,7 +69,9 @@ void describe(const AttemptPlan& attempt, std::ostream& out) {
 
 void describe(const DevicePlan& device, std::ostream& out) {
     out << "    is served by the platform" << (device.throwsWhenMade ? ", throws when made" : "")
-        << (device.throwsAtStart ? ", throws at start" : "") << "; says inside start "
+        << (device.throwsAtStart ? ", throws at start" : "")
+        << (device.throwsAtStop ? ", throws at stop" : "")
+        << (device.throwsAtCancel ? ", throws at cancel" : "") << "; says inside start "
         << static_cast<int>(device.insideStart) << ", stop " << static_cast<int>(device.insideStop)
         << ", cancel " << static_cast<int>(device.insideCancel) << "; logging " << device.logging
         << "\n";

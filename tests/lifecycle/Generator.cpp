@@ -76,6 +76,8 @@ DevicePlan makeDevice(Dice& dice) {
     DevicePlan device;
     device.throwsWhenMade = dice.oneIn(20);
     device.throwsAtStart = dice.oneIn(20);
+    device.throwsAtStop = dice.oneIn(20);
+    device.throwsAtCancel = dice.oneIn(20);
     device.insideStart = dice.oneIn(8) ? pickSaying(dice) : Saying::NOTHING;
     device.insideStop = dice.oneIn(4) ? pickSaying(dice) : Saying::NOTHING;
     device.insideCancel = dice.oneIn(4) ? pickSaying(dice) : Saying::NOTHING;

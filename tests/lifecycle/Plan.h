@@ -116,13 +116,16 @@ enum class Saying {
     PARTIAL,
     RESULTS,
     NO_HYPOTHESIS,
-    ERROR
+    ERROR,
+    OTHER /**< an event that means nothing to the recognizer */
 };
-constexpr int SAYING_COUNT = 10;
+constexpr int SAYING_COUNT = 11;
 
 struct DevicePlan {
     bool throwsWhenMade = false;
     bool throwsAtStart = false;
+    bool throwsAtStop = false;
+    bool throwsAtCancel = false;
     Saying insideStart = Saying::NOTHING; /**< what it says before the call returns */
     Saying insideStop = Saying::NOTHING;
     Saying insideCancel = Saying::NOTHING;

@@ -34,7 +34,7 @@ class SessionModel {
     /** @param refusal the error that is due when the session starts now */
     virtual void beginStart(int64_t now, std::optional<int> refusal) = 0;
     virtual std::string endStart() = 0;
-    virtual void beginStop() = 0;
+    virtual void beginStop(int64_t now) = 0;
     virtual std::string endStop() = 0;
     virtual void beginCancel() = 0;
     virtual std::string endCancel() = 0;
@@ -71,7 +71,7 @@ class StandInModel : public SessionModel {
         expect(Talvox::SpeechError::ErrorNotAvailable);
     }
     std::string endStart() override { return expectAnswered(); }
-    void beginStop() override { expect(Talvox::SpeechError::ErrorNotAvailable); }
+    void beginStop(int64_t /*now*/) override { expect(Talvox::SpeechError::ErrorNotAvailable); }
     std::string endStop() override { return expectAnswered(); }
     void beginCancel() override { expect(Talvox::SpeechError::ErrorCanceled); }
     std::string endCancel() override { return expectAnswered(); }

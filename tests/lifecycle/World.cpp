@@ -169,15 +169,6 @@ bool World::isAnyActive() const {
     });
 }
 
-/** A device may be silent for ever. */
-void World::cancelRelays() {
-    for (std::size_t i = 0; i < sessions.size(); ++i) {
-        if (sessions[i]->relay != nullptr && sessions[i]->model->isActive()) {
-            act(Action::CANCEL, sessions[i].get(), 0);
-        }
-    }
-}
-
 // Whatever happened, time alone ends every session and every upload, and nothing is left.
 void World::end() {
     networkStands = false;
@@ -187,7 +178,6 @@ void World::end() {
     for (int64_t waited = 0; waited < ALL_OVER_MS && wrong.empty() &&
                              (isAnyActive() || ScriptedGateway::instance().countTransfers() > 0);
          waited += LONGEST_PIECE_MS) {
-        cancelRelays();
         wait(LONGEST_PIECE_MS);
     }
     checkNothingIsLeft();

@@ -81,7 +81,6 @@ class World : public GatewayObserver, public SessionHost, public DeviceHost {
     void check();
     void checkEngine();
     void end();
-    void cancelRelays();
     void checkNothingIsLeft();
 
     Session* find(int index);

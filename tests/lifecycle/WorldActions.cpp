@@ -88,7 +88,7 @@ void World::call(Action action, Session& session) {
             start(session, *recognizer);
             break;
         case Action::STOP:
-            session.model->beginStop();
+            session.model->beginStop(now());
             recognizer->stop();
             onWrong(session.model->endStop());
             break;
@@ -240,9 +240,12 @@ void World::sayAsDevice(Session& session, Saying what) {
     }
     note("      the device says ", static_cast<int>(what));
     session.enter();
+    if (what != Saying::NOTHING) {
+        session.relay->onHeard(now());
+    }
     const auto event = EVENTS.find(what);
     if (event != EVENTS.end()) {
-        session.relay->beginSaying(event->second, DEVICE_ERROR);
+        session.relay->beginSaying(event->second, now(), DEVICE_ERROR);
     }
     device->say(session.deviceHandle, what, session.index);
     session.relay->endSaying();
@@ -253,7 +256,7 @@ bool World::onDeviceMade(int64_t handle) {
     Session& session = *starting.back();
     session.deviceHandle = handle;
     if (session.plan.device.throwsWhenMade) {
-        session.relay->onThrown();
+        session.relay->onThrown(SpeechError::ErrorNotAvailable);
         // That is reported to crash reports as well.
         ++expectedAsserts;
     }
@@ -269,11 +272,15 @@ bool World::onDeviceAsked(int64_t handle, const std::string& what) {
     sayAsDevice(session, what == "start"  ? plan.insideStart
                          : what == "stop" ? plan.insideStop
                                           : plan.insideCancel);
-    const bool throws = what == "start" && plan.throwsAtStart;
-    if (throws) {
-        session.relay->onThrown();
+    if (what == "start" && plan.throwsAtStart) {
+        session.relay->onThrown(SpeechError::ErrorNotAvailable);
+        return false;
     }
-    return !throws;
+    if (what == "stop" && plan.throwsAtStop) {
+        session.relay->onThrown(SpeechError::ErrorUnknown);
+        return false;
+    }
+    return what != "cancel" || !plan.throwsAtCancel;
 }
 
 }  // namespace Lifecycle

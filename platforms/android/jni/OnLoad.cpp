@@ -1,5 +1,6 @@
 #include "EntryPoint.h"
 #include "PlatformRecognizer.h"
+#include "pal/kd_log.h"
 #include "talvox/PlatformMechanism.h"
 
 namespace {
@@ -18,16 +19,47 @@ class AndroidMechanism : public Talvox::PlatformMechanism {
     }
 };
 
+const char* const APPLICATION = "korvel/core/CoreApplication";
+
+/** One of these is of the application that loads the library; it need not have all of them. */
+const char* const KNOWN_CLASSES[] = {APPLICATION,
+                                     "korvel/talvox/impl/Talvox",
+                                     "korvel/talvox/impl/Recognizer",
+                                     "korvel/talvox/impl/PlatformRecognizer",
+                                     "korvel/talvox/util/LogCollector",
+                                     "korvel/talvox/proximity/ProximityGestureRecognizer"};
+
+void keepClassLoader(JNIEnv* env) {
+    for (const char* const name : KNOWN_CLASSES) {
+        try {
+            const Jni::LocalRef<jclass> type = Jni::findClass(env, name);
+            Jni::keepClassLoader(env, type.get());
+            return;
+        } catch (const Jni::PendingException&) {
+            env->ExceptionClear();
+        }
+    }
+    kdLogFormatMessage("JNI_OnLoad: none of the classes with native methods is there");
+}
+
+/** Without the back ends the library records, logs and watches the network by its own means. */
+void announce(JNIEnv* env) {
+    try {
+        const Jni::LocalRef<jclass> application = Jni::findClass(env, APPLICATION);
+        const jmethodID onLibraryLoaded =
+            Jni::findStaticMethod(env, application.get(), "onLibraryLoaded", "()V");
+        env->CallStaticVoidMethod(application.get(), onLibraryLoaded);
+        Jni::check(env);
+    } catch (const Jni::PendingException&) {
+        Jni::logAndClear(env, "CoreApplication.onLibraryLoaded, the back ends in Java stay off");
+    }
+}
+
 void load(JNIEnv* env) {
-    const Jni::LocalRef<jclass> application(env, env->FindClass("korvel/core/CoreApplication"));
-    Jni::check(env);
-    Jni::keepClassLoader(env, application.get());
+    keepClassLoader(env);
     static auto* const mechanism = new AndroidMechanism;
     Talvox::PlatformMechanism::install(mechanism);
-    const jmethodID onLibraryLoaded =
-        Jni::findStaticMethod(env, application.get(), "onLibraryLoaded", "()V");
-    env->CallStaticVoidMethod(application.get(), onLibraryLoaded);
-    Jni::check(env);
+    announce(env);
 }
 
 }  // namespace

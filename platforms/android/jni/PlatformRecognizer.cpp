@@ -32,6 +32,8 @@ const int LOG_LEVEL = 2;
 const int SAMPLE_RATE_HZ = 8000;
 const int BYTES_PER_SAMPLE = 2;
 const int64_t NS_PER_MS = 1000000;
+const int64_t SILENCE_LIMIT_NS = 30000 * NS_PER_MS;
+const int64_t ANSWER_LIMIT_NS = 20000 * NS_PER_MS;
 const int NO_HYPOTHESIS = -1;
 
 Sound::SoundDataInfo makeSoundFormat() {
@@ -153,9 +155,12 @@ void PlatformRecognizer::start() {
         endWithError(SpeechError::ErrorNotAvailable);
         return;
     }
+    hear();
+    silenceTimer = std::make_unique<Util::Timer>([this] { checkSilence(); });
+    silenceTimer->start(KD_TIMER_ONESHOT, SILENCE_LIMIT_NS);
     try {
         createJavaObject();
-        if (jobj) {
+        if (!over) {
             Jni::callVoid(env, jobj.get(), "start", "()V");
         }
     } catch (const Jni::PendingException&) {
@@ -183,21 +188,29 @@ void PlatformRecognizer::stop() {
     if (!jobj || env == nullptr) {
         return;
     }
+    awaitAnswer();
     try {
         Jni::callVoid(env, jobj.get(), "stop", "()V");
     } catch (const Jni::PendingException&) {
         Jni::logAndClear(env, "PlatformRecognizer.stop");
+        if (!pendingResults) {
+            giveUp(SpeechError::ErrorUnknown);
+        }
     }
 }
 
 void PlatformRecognizer::cancel() {
     const Util::EventLock lock;
     const boost::shared_ptr<Recognizer> self = shared_from_this();
+    giveUp(SpeechError::ErrorCanceled);
+}
+
+void PlatformRecognizer::giveUp(int code) {
     // What Java says while it is cancelled does not count.
     const bool wasOver = std::exchange(over, true);
     cancelSilently();
     if (!wasOver) {
-        reportError(SpeechError::ErrorCanceled);
+        reportError(code);
     }
 }
 
@@ -223,6 +236,7 @@ void PlatformRecognizer::endWithError(int code) {
 
 void PlatformRecognizer::reportError(int code) {
     encoder.reset();
+    silenceTimer.reset();
     getEngine()->unregisterRecognizer(this);
     callOnError(SpeechError(code));
 }
@@ -262,19 +276,54 @@ void PlatformRecognizer::announce(Call call) {
     });
 }
 
+void PlatformRecognizer::hear() {
+    if (!answerAwaited) {
+        silenceDeadline = kdGetTimeUST() + SILENCE_LIMIT_NS;
+    }
+}
+
+void PlatformRecognizer::awaitAnswer() {
+    if (!silenceTimer || answerAwaited) {
+        return;
+    }
+    answerAwaited = true;
+    silenceDeadline = kdGetTimeUST() + ANSWER_LIMIT_NS;
+    silenceTimer->start(KD_TIMER_ONESHOT, ANSWER_LIMIT_NS);
+}
+
+void PlatformRecognizer::checkSilence() {
+    // The last reference may be going on another thread.
+    const boost::shared_ptr<Recognizer> self = weak_from_this().lock();
+    if (!self) {
+        return;
+    }
+    const int64_t leftNs = silenceDeadline - kdGetTimeUST();
+    if (leftNs > 0) {
+        silenceTimer->start(KD_TIMER_ONESHOT, leftNs);
+        return;
+    }
+    kdLogFormatMessage("PlatformRecognizer: the device's recogniser %s, the session ends",
+                       answerAwaited ? "does not answer" : "is silent");
+    giveUp(SpeechError::ErrorNetwork);
+}
+
 void PlatformRecognizer::onReadyForSpeech() {
+    hear();
     announce([this](RecognizerListener& listener) { listener.onRecordingBegin(this); });
 }
 
 void PlatformRecognizer::onBeginningOfSpeech() {
+    hear();
     announce([this](RecognizerListener& listener) { listener.onSpeakingBegin(this); });
 }
 
 void PlatformRecognizer::onRmsChanged(float rms) {
+    hear();
     announce([this, rms](RecognizerListener& listener) { listener.onPowerChanged(this, rms); });
 }
 
 void PlatformRecognizer::onBufferReceived(const char* data, unsigned size) {
+    hear();
     if (!logWithSound || over || pendingResults) {
         return;
     }
@@ -295,11 +344,14 @@ void PlatformRecognizer::onEndOfSpeech() {
         return;
     }
     requestTime = kdGetTimeUST();
+    awaitAnswer();
     announce([this](RecognizerListener& listener) { listener.onRecordingDone(this); });
 }
 
 void PlatformRecognizer::onPartialResults(
-    const boost::shared_ptr<const RecognitionResults>& /*results*/) {}
+    const boost::shared_ptr<const RecognitionResults>& /*results*/) {
+    hear();
+}
 
 void PlatformRecognizer::onResults(const boost::shared_ptr<const RecognitionResults>& results) {
     if (over || pendingResults) {
@@ -323,7 +375,16 @@ void PlatformRecognizer::onError(int code) {
     if (requestTime != 0) {
         tvLogFormatMessage(LOG_LEVEL, "Request failed in %d msec", getMsSinceRequest());
     }
+    if (code < 0 || code >= SpeechError::ErrorMax) {
+        kdLogFormatMessage("PlatformRecognizer: %d is not an error code, reporting ErrorUnknown",
+                           code);
+        code = SpeechError::ErrorUnknown;
+    }
     endWithError(code);
+}
+
+void PlatformRecognizer::onEvent() {
+    hear();
 }
 
 int PlatformRecognizer::getMsSinceRequest() const {
@@ -334,6 +395,7 @@ void PlatformRecognizer::finishWithResults(
     const boost::shared_ptr<const RecognitionResults>& results) {
     const boost::shared_ptr<Recognizer> self = shared_from_this();
     pendingResults = results;
+    silenceTimer.reset();
     if (loggingEnabled && logWithSound && encodeWithSpeex) {
         encoder->closeWrite();
     } else {
@@ -343,8 +405,9 @@ void PlatformRecognizer::finishWithResults(
 
 void PlatformRecognizer::makeHttpRequest(
     const boost::shared_ptr<const Sound::SoundDataBuffer>& sound) {
-    const boost::shared_ptr<Recognizer> self = shared_from_this();
-    if (over) {
+    // The encoder's end may meet the last reference going on another thread.
+    const boost::shared_ptr<Recognizer> self = weak_from_this().lock();
+    if (!self || over) {
         return;
     }
     if (loggingEnabled) {

@@ -8,11 +8,13 @@
 
 #include <boost/shared_ptr.hpp>
 #include <cstdint>
+#include <memory>
 #include <string>
 #include <vector>
 
 #include "Refs.h"
 #include "core/sound/SoundDataBuffer.h"
+#include "core/util/Timer.h"
 #include "talvox/Recognizer.h"
 #include "talvox/impl/ParallelEncoder.h"
 
@@ -23,6 +25,10 @@
  *
  * `start`, `stop`, `cancel` and the destructor take the event lock; everything else is called
  * under it. After the one end of a session (results or an error) the callbacks have no effect.
+ *
+ * A device that falls silent does not keep the engine busy: `ErrorNetwork` ends the session 30 s
+ * after the last callback while it listens, and 20 s after the first `stop` or end of speech,
+ * whatever callbacks follow. An exception from Java's `stop` ends it with `ErrorUnknown`.
  */
 class PlatformRecognizer : public Talvox::Recognizer {
   public:
@@ -52,19 +58,28 @@ class PlatformRecognizer : public Talvox::Recognizer {
     /** Partial results are not reported. */
     void onPartialResults(const boost::shared_ptr<const Talvox::RecognitionResults>& results);
     void onResults(const boost::shared_ptr<const Talvox::RecognitionResults>& results);
-    /** @param code a `SpeechError` code, or -1: the session ended without a hypothesis */
+    /**
+     * @param code a `SpeechError` code, or -1: the session ended without a hypothesis. Any other
+     *     number is logged and reported as `ErrorUnknown`
+     */
     void onError(int code);
+    /** Any other callback: a sign of life. */
+    void onEvent();
 
   private:
     void chooseLogging();
     void prepareSound(bool isWifi);
     void createJavaObject();
     void cancelSilently();
+    void giveUp(int code);
     void endWithError(int code);
     void reportError(int code);
     template <typename Call>
     void announce(Call call);
 
+    void hear();
+    void awaitAnswer();
+    void checkSilence();
     void finishWithResults(const boost::shared_ptr<const Talvox::RecognitionResults>& results);
     void makeHttpRequest(const boost::shared_ptr<const Sound::SoundDataBuffer>& sound);
     void submitLog(const boost::shared_ptr<const Sound::SoundDataBuffer>& sound);
@@ -84,4 +99,7 @@ class PlatformRecognizer : public Talvox::Recognizer {
     boost::shared_ptr<const Talvox::RecognitionResults> pendingResults;
     int64_t requestTime = 0;
     bool over = false;
+    bool answerAwaited = false;
+    int64_t silenceDeadline = 0;
+    std::unique_ptr<Util::Timer> silenceTimer;
 };

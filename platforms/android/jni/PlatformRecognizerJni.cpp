@@ -7,6 +7,7 @@
 #include "PlatformRecognizer.h"
 #include "Text.h"
 #include "pal/kd_assert.h"
+#include "pal/kd_log.h"
 
 using Talvox::RecognitionResult;
 using Talvox::RecognitionResults;
@@ -33,22 +34,38 @@ std::vector<jfloat> readScores(JNIEnv* env, jfloatArray scores) {
     return values;
 }
 
+/** Null, once that is reported, for what cannot be results: no texts, or scores of another length.
+ */
 boost::shared_ptr<const RecognitionResults> readResults(JNIEnv* env, jobjectArray strings,
                                                         jfloatArray jconfidenceScores) {
-    Jni::requireNonNull(env, strings, "texts");
+    if (strings == nullptr) {
+        kdLogFormatMessage("PlatformRecognizer: results without an array of texts");
+        return {};
+    }
     const std::vector<jfloat> scores = readScores(env, jconfidenceScores);
     const jsize count = env->GetArrayLength(strings);
-    KOR_ASSERT_AT(jconfidenceScores == nullptr || static_cast<std::size_t>(count) == scores.size(),
-                  SAME_LENGTH, ASSERT_PATH, __LINE__);
+    if (!KOR_ASSERT_AT(
+            jconfidenceScores == nullptr || static_cast<std::size_t>(count) == scores.size(),
+            SAME_LENGTH, ASSERT_PATH, __LINE__)) {
+        return {};
+    }
     auto results = boost::make_shared<RecognitionResults>();
+    int ignored = 0;
     for (jsize index = 0; index < count; ++index) {
         const Jni::LocalRef<jstring> text(
             env, static_cast<jstring>(env->GetObjectArrayElement(strings, index)));
         Jni::check(env);
-        const auto position = static_cast<std::size_t>(index);
-        results->emplace_back(
-            Jni::toUtf8(env, text.get()),
-            position < scores.size() ? scores[position] : RecognitionResult::UNKNOWN_CONFIDENCE);
+        if (!text) {
+            ++ignored;
+            continue;
+        }
+        results->emplace_back(Jni::toUtf8(env, text.get()),
+                              jconfidenceScores != nullptr ? scores[static_cast<std::size_t>(index)]
+                                                           : RecognitionResult::UNKNOWN_CONFIDENCE);
+    }
+    if (ignored > 0) {
+        kdLogFormatMessage("PlatformRecognizer: %d of %d hypotheses are null, ignored", ignored,
+                           static_cast<int>(count));
     }
     return results;
 }
@@ -87,8 +104,9 @@ JNIEXPORT void JNICALL Java_korvel_talvox_impl_PlatformRecognizer_onBufferReceiv
     JNIEnv* /*env*/, jclass /*type*/, jlong recognizer, jbyteArray sound) {
     Jni::enter([recognizer, sound](JNIEnv* env) {
         const boost::shared_ptr<PlatformRecognizer> target = getRecognizer(env, recognizer);
-        Jni::requireNonNull(env, sound, "sound");
-        receiveBuffer(env, *target, sound);
+        if (sound != nullptr) {
+            receiveBuffer(env, *target, sound);
+        }
     });
 }
 
@@ -101,7 +119,9 @@ JNIEXPORT void JNICALL Java_korvel_talvox_impl_PlatformRecognizer_onPartialResul
     JNIEnv* /*env*/, jclass /*type*/, jlong recognizer, jobjectArray texts, jfloatArray scores) {
     Jni::enter([recognizer, texts, scores](JNIEnv* env) {
         const boost::shared_ptr<PlatformRecognizer> target = getRecognizer(env, recognizer);
-        target->onPartialResults(readResults(env, texts, scores));
+        if (const auto results = readResults(env, texts, scores)) {
+            target->onPartialResults(results);
+        }
     });
 }
 
@@ -109,7 +129,11 @@ JNIEXPORT void JNICALL Java_korvel_talvox_impl_PlatformRecognizer_onResultsInter
     JNIEnv* /*env*/, jclass /*type*/, jlong recognizer, jobjectArray texts, jfloatArray scores) {
     Jni::enter([recognizer, texts, scores](JNIEnv* env) {
         const boost::shared_ptr<PlatformRecognizer> target = getRecognizer(env, recognizer);
-        target->onResults(readResults(env, texts, scores));
+        if (const auto results = readResults(env, texts, scores)) {
+            target->onResults(results);
+        } else {
+            target->onError(Talvox::SpeechError::ErrorUnknown);
+        }
     });
 }
 
@@ -121,7 +145,12 @@ JNIEXPORT void JNICALL Java_korvel_talvox_impl_PlatformRecognizer_onErrorInterna
 }
 
 JNIEXPORT void JNICALL Java_korvel_talvox_impl_PlatformRecognizer_onEventInternal(
-    JNIEnv* /*env*/, jclass /*type*/, jlong /*recognizer*/, jint /*kind*/, jobject /*parameters*/) {
+    JNIEnv* /*env*/, jclass /*type*/, jlong recognizer, jint /*kind*/, jobject /*parameters*/) {
+    Jni::enter([recognizer](JNIEnv* /*env*/) {
+        if (const auto target = Jni::KnownObjects<PlatformRecognizer>::find(recognizer)) {
+            target->onEvent();
+        }
+    });
 }
 
 }  // extern "C"

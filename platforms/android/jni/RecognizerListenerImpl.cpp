@@ -9,7 +9,7 @@
 
 namespace {
 
-/** References that an event needs besides those of its hypotheses. */
+/** References that an event needs besides those of its hypotheses; of these one lives at a time. */
 const jint FRAME_SIZE = 10;
 
 Jni::LocalRef<jobjectArray> makeTexts(JNIEnv* env, const Talvox::RecognitionResults& results) {
@@ -55,7 +55,7 @@ void RecognizerListenerImpl::deliver(const char* name, jint localReferences, Eve
         return;
     }
     try {
-        const Jni::LocalFrame frame(env, localReferences);
+        const Jni::LocalFrame frame(env, localReferences, FRAME_SIZE);
         event(env);
     } catch (const Jni::PendingException&) {
         Jni::logAndClear(env, name);
@@ -106,19 +106,24 @@ void RecognizerListenerImpl::onPowerChanged(Talvox::Recognizer* /*source*/, floa
     });
 }
 
-void RecognizerListenerImpl::onResults(Talvox::Recognizer* /*source*/,
+void RecognizerListenerImpl::onResults(Talvox::Recognizer* source,
                                        boost::shared_ptr<Talvox::Recognition> recognition) {
     const Talvox::RecognitionResults& results = *recognition->getResults();
-    deliver("onResults", static_cast<jint>(results.size()) + FRAME_SIZE,
-            [this, &recognition, &results](JNIEnv* env) {
-                const Jni::LocalRef<jobjectArray> texts = makeTexts(env, results);
-                const Jni::LocalRef<jfloatArray> confidences = makeConfidences(env, results);
-                const Jni::LocalRef<jstring> request =
-                    Jni::toJString(env, recognition->getRequestId());
-                callJava(env, "onResults", "(I[Ljava/lang/String;[FLjava/lang/String;)V",
-                         static_cast<jint>(recognition->getOutcome()), texts.get(),
-                         confidences.get(), request.get());
-            });
+    bool isMade = false;
+    deliver("onResults", static_cast<jint>(results.size()) + FRAME_SIZE, [&](JNIEnv* env) {
+        const Jni::LocalRef<jobjectArray> texts = makeTexts(env, results);
+        const Jni::LocalRef<jfloatArray> confidences = makeConfidences(env, results);
+        const Jni::LocalRef<jstring> request = Jni::toJString(env, recognition->getRequestId());
+        isMade = true;
+        callJava(env, "onResults", "(I[Ljava/lang/String;[FLjava/lang/String;)V",
+                 static_cast<jint>(recognition->getOutcome()), texts.get(), confidences.get(),
+                 request.get());
+    });
+    if (!isMade && javaObject) {
+        kdLogFormatMessage("onResults: no room for %d hypotheses in Java, reporting ErrorUnknown",
+                           static_cast<int>(results.size()));
+        onError(source, Talvox::SpeechError::ErrorUnknown);
+    }
 }
 
 void RecognizerListenerImpl::onError(Talvox::Recognizer* /*source*/, Talvox::SpeechError error) {

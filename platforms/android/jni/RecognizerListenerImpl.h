@@ -15,7 +15,8 @@
 
 /**
  * Forwards every event to a Java recognizer object, and owns the native recognizer for Java. Used
- * under the event lock. What the Java methods throw is logged and cleared.
+ * under the event lock. What the Java methods throw is logged and cleared. Results that the VM has
+ * no room for become `onError` with `ErrorUnknown`.
  */
 class RecognizerListenerImpl : public Talvox::RecognizerListener {
   public:

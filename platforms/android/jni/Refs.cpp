@@ -30,14 +30,21 @@ void GlobalRef::reset() {
     ref = nullptr;
 }
 
-LocalFrame::LocalFrame(JNIEnv* environment, jint capacity) : env(environment) {
-    if (env->PushLocalFrame(capacity) != 0) {
-        throw PendingException();
+LocalFrame::LocalFrame(JNIEnv* environment, jint capacity, jint enough)
+    : env(environment), pushed(push(capacity) || push(enough)) {}
+
+bool LocalFrame::push(jint capacity) {
+    if (env->PushLocalFrame(capacity) == JNI_OK) {
+        return true;
     }
+    env->ExceptionClear();
+    return false;
 }
 
 LocalFrame::~LocalFrame() {
-    env->PopLocalFrame(nullptr);
+    if (pushed) {
+        env->PopLocalFrame(nullptr);
+    }
 }
 
 }  // namespace Jni

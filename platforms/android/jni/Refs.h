@@ -65,19 +65,27 @@ class GlobalRef {
 
 /**
  * Releases every local reference made within its scope: native threads that are attached for long
- * never return to Java, which would do it.
+ * never return to Java, which would do it. A VM that refuses the frame costs nothing but this:
+ * each reference still has its own owner.
  */
 class LocalFrame {
   public:
-    /** @param capacity how many references the frame must have room for
-     * @throw PendingException when there is no memory */
-    LocalFrame(JNIEnv* environment, jint capacity);
+    /**
+     * @param capacity how many references the frame is made for
+     * @param enough what is asked for if the VM refuses that: it bounds the size of a frame, and
+     *     this many are alive at one time
+     */
+    LocalFrame(JNIEnv* environment, jint capacity, jint enough);
+    LocalFrame(JNIEnv* environment, jint capacity) : LocalFrame(environment, capacity, capacity) {}
     ~LocalFrame();
     LocalFrame(const LocalFrame&) = delete;
     LocalFrame& operator=(const LocalFrame&) = delete;
 
   private:
+    bool push(jint capacity);
+
     JNIEnv* env;
+    bool pushed;
 };
 
 }  // namespace Jni

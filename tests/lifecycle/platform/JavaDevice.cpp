@@ -82,6 +82,9 @@ void JavaDevice::say(int64_t handle, Saying what, int session) {
         case Saying::ERROR:
             recognizer->onError(DEVICE_ERROR);
             break;
+        case Saying::OTHER:
+            recognizer->onEvent();
+            break;
     }
 }
 

@@ -6,6 +6,12 @@
 #include "../EntryPoint.h"
 #include "../Handles.h"
 
+namespace {
+
+const char* const JAVA_CLASS = "korvel/core/ProximityBackend";
+
+}  // namespace
+
 using Sources = Jni::KnownObjects<AndroidProximitySource>;
 
 AndroidProximitySource::~AndroidProximitySource() {
@@ -14,7 +20,8 @@ AndroidProximitySource::~AndroidProximitySource() {
     AndroidProximitySource::stop();
 }
 
-void AndroidProximitySource::install() {
+void AndroidProximitySource::install(JNIEnv* env) {
+    Jni::findClass(env, JAVA_CLASS);
     setFactory([]() -> boost::shared_ptr<ProximitySource> {
         auto source = boost::allocate_shared<AndroidProximitySource>(
             Jni::QuarantineAllocator<AndroidProximitySource>());
@@ -31,7 +38,7 @@ bool AndroidProximitySource::start(Callback callback) {
     stop();
     target = std::move(callback);
     try {
-        const Jni::LocalRef<jclass> type = Jni::findClass(env, "korvel/core/ProximityBackend");
+        const Jni::LocalRef<jclass> type = Jni::findClass(env, JAVA_CLASS);
         const Jni::LocalRef<jobject> object =
             Jni::newObject(env, type.get(), "(J)V", Jni::toHandle(this));
         backend = Jni::GlobalRef(env, object.get());

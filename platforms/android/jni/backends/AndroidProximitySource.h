@@ -20,8 +20,9 @@ class AndroidProximitySource : public Sensor::ProximitySource,
     AndroidProximitySource& operator=(const AndroidProximitySource&) = delete;
     ~AndroidProximitySource() override;
 
-    /** Makes this the platform's kind of source. */
-    static void install();
+    /** Makes this the platform's kind of source.
+     * @throw Jni::PendingException when its Java class is missing */
+    static void install(JNIEnv* env);
 
     bool start(Callback callback) override;
     void stop() override;

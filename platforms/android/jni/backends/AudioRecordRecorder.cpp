@@ -11,6 +11,8 @@
 
 namespace {
 
+const char* const JAVA_CLASS = "korvel/core/AudioRecorderBackend";
+
 /** The queues that Java's threads may fill. Has its own lock: those threads must not wait. */
 class OpenQueues {
   public:
@@ -65,7 +67,8 @@ AudioRecordRecorder::~AudioRecordRecorder() {
     QueuedRecorder::stopRecording();
 }
 
-void AudioRecordRecorder::install() {
+void AudioRecordRecorder::install(JNIEnv* env) {
+    Jni::findClass(env, JAVA_CLASS);
     Sound::Recorder::setFactory([] { return boost::make_shared<AudioRecordRecorder>(); });
 }
 
@@ -77,7 +80,7 @@ bool AudioRecordRecorder::openDevice(const Sound::RecorderFormat& /*format*/,
     }
     handle = OpenQueues::instance().add(target);
     try {
-        const Jni::LocalRef<jclass> type = Jni::findClass(env, "korvel/core/AudioRecorderBackend");
+        const Jni::LocalRef<jclass> type = Jni::findClass(env, JAVA_CLASS);
         const Jni::LocalRef<jobject> object =
             Jni::newObject(env, type.get(), "(JIII)V", handle, static_cast<jint>(getSampleRate()),
                            static_cast<jint>(getBufferLength()), static_cast<jint>(getMode()));
@@ -119,7 +122,7 @@ extern "C" {
 
 JNIEXPORT void JNICALL Java_korvel_core_AudioRecorderBackend_installInternal(JNIEnv* /*env*/,
                                                                              jclass /*type*/) {
-    Jni::enter([](JNIEnv* /*env*/) { AudioRecordRecorder::install(); });
+    Jni::enter([](JNIEnv* env) { AudioRecordRecorder::install(env); });
 }
 
 JNIEXPORT void JNICALL Java_korvel_core_AudioRecorderBackend_onDataInternal(

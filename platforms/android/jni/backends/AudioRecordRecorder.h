@@ -15,8 +15,9 @@ class AudioRecordRecorder : public Sound::QueuedRecorder {
     AudioRecordRecorder();
     ~AudioRecordRecorder() override;
 
-    /** Makes this the platform's kind of recorder. */
-    static void install();
+    /** Makes this the platform's kind of recorder.
+     * @throw Jni::PendingException when its Java class is missing */
+    static void install(JNIEnv* env);
 
   protected:
     bool openDevice(const Sound::RecorderFormat& format,

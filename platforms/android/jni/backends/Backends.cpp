@@ -6,6 +6,20 @@
 #include "AndroidReachability.h"
 #include "AudioRecordRecorder.h"
 
+namespace {
+
+/** @param what names it in the log if it cannot be installed */
+template <typename Install>
+void tryInstall(JNIEnv* env, const char* what, Install install) {
+    try {
+        install();
+    } catch (const Jni::PendingException&) {
+        Jni::logAndClear(env, what);
+    }
+}
+
+}  // namespace
+
 void Backends::install(JNIEnv* env) {
     const Jni::LocalRef<jclass> application = Jni::findClass(env, "korvel/core/CoreApplication");
     const Jni::LocalRef<jobject> context = Jni::callStaticObject(
@@ -13,10 +27,13 @@ void Backends::install(JNIEnv* env) {
     if (!context) {
         return;
     }
-    AndroidLog::install(env);
-    AudioRecordRecorder::install();
-    AndroidProximitySource::install();
-    AndroidReachability::install(env, context.get());
+    tryInstall(env, "LogBackend, Android's log stays off", [env] { AndroidLog::install(env); });
+    tryInstall(env, "AudioRecorderBackend, Android's microphone stays off",
+               [env] { AudioRecordRecorder::install(env); });
+    tryInstall(env, "ProximityBackend, the proximity sensor stays off",
+               [env] { AndroidProximitySource::install(env); });
+    tryInstall(env, "ReachabilityBackend, the state of the network is not watched",
+               [env, &context] { AndroidReachability::install(env, context.get()); });
 }
 
 extern "C" {

@@ -13,8 +13,8 @@ class Backends {
 
     /**
      * Installs all of them when the process has an Android application, real or simulated;
-     * otherwise nothing.
-     * @throw Jni::PendingException when Java fails
+     * otherwise nothing. One whose Java class is missing or fails is logged and stays off.
+     * @throw Jni::PendingException when `CoreApplication` fails
      */
     static void install(JNIEnv* env);
 };

@@ -1,6 +1,8 @@
 package korvel.talvox.impl;
 
 import android.os.Bundle;
+import android.util.Log;
+import korvel.talvox.SpeechError;
 
 /**
  * The native side's partner in one recognition. Applications use {@link
@@ -24,8 +26,11 @@ public final class Recognizer {
 
         void onError(int code);
 
+        /** Where this has no memory for the results, {@link #onError} follows. */
         void onResults(int outcome, String[] texts, float[] confidences, String requestId);
     }
+
+    private static final String TAG = "Talvox";
 
     static {
         NativeLibrary.load();
@@ -93,6 +98,11 @@ public final class Recognizer {
 
     private void onResults(
             int outcome, String[] texts, float[] confidences, String requestId) {
-        events.onResults(outcome, texts, confidences, requestId);
+        try {
+            events.onResults(outcome, texts, confidences, requestId);
+        } catch (OutOfMemoryError full) {
+            Log.e(TAG, "no memory for " + texts.length + " hypotheses", full);
+            events.onError(SpeechError.UNKNOWN.getCode());
+        }
     }
 }
