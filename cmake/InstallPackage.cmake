@@ -10,7 +10,13 @@ set_target_properties(KorvelPAL KorvelCore KorvelLibs KorvelTalvox PROPERTIES
 install(TARGETS KorvelPAL KorvelCore KorvelLibs KorvelTalvox korvel_boost_assert
         EXPORT KorvelTalvoxTargets
         LIBRARY DESTINATION ${CMAKE_INSTALL_LIBDIR})
-install(DIRECTORY pal/include/ core/include/ libs/include/ DESTINATION ${korvel_headers})
+# The functions of kd_jni.h are there only with the bindings, and so is the jni.h that it needs.
+set(korvel_unfit_headers "")
+if(NOT TALVOX_JNI)
+    set(korvel_unfit_headers PATTERN "kd_jni.h" EXCLUDE)
+endif()
+install(DIRECTORY pal/include/ core/include/ libs/include/ DESTINATION ${korvel_headers}
+        ${korvel_unfit_headers})
 install(DIRECTORY logcollector talvox util DESTINATION ${korvel_headers}
         FILES_MATCHING PATTERN "*.h" PATTERN "impl" EXCLUDE)
 install(EXPORT KorvelTalvoxTargets NAMESPACE KorvelTalvox:: DESTINATION ${korvel_package})

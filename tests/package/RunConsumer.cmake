@@ -24,6 +24,7 @@ run(${CMAKE_COMMAND} -S ${SOURCE_DIR}/tests/package/consumer -B ${WORK_DIR}/buil
     -DCMAKE_BUILD_TYPE=Debug
     -DCMAKE_CXX_COMPILER=${CXX_COMPILER}
     -DCMAKE_CXX_FLAGS=${CXX_FLAGS}
+    -DJNI_INCLUDES=${JNI_INCLUDES}
     -DREADME_EXAMPLE=${WORK_DIR}/example.cpp
     -DAPI_TESTS=${SOURCE_DIR}/tests/api)
 run(${CMAKE_COMMAND} --build ${WORK_DIR}/build)

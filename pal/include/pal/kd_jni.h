@@ -1,7 +1,7 @@
 /**
  * @file
- * The Java VM of the process. Only where the library is built with the bindings; not part of kd.h,
- * because it needs jni.h (that of a JDK or of Android).
+ * The Java VM of the process. Installed only by builds with the Java bindings; not part of kd.h,
+ * because it needs jni.h: compile with the include directories of a JDK, or for Android.
  */
 #ifndef KORVEL_PAL_KD_JNI_H
 #define KORVEL_PAL_KD_JNI_H
