@@ -83,7 +83,7 @@ public abstract class SettingKey<T> {
     }
 
     static <E extends Enum<E> & SettingValue> SettingKey<E> ofChoice(
-            String name, Level level, Class<E> values) {
+            String name, Level level, E[] values) {
         return new SettingKey<E>(name, level, SettingChecks.none()) {
             @Override
             void put(Bundle bundle, E value) {
@@ -93,7 +93,7 @@ public abstract class SettingKey<T> {
             @Override
             E get(Bundle bundle) {
                 final String text = read(bundle, getName(), String.class);
-                for (E value : values.getEnumConstants()) {
+                for (E value : values) {
                     if (value.getText().equals(text)) {
                         return value;
                     }

@@ -64,11 +64,11 @@ public final class TalvoxSettings {
 
     /** Override of {@link #ASR_POLICY}, meant for all recognitions of the application. */
     public static final SettingKey<AsrOverride> ASR_OVERRIDE =
-            SettingKey.ofChoice("asr", BOTH, AsrOverride.class);
+            SettingKey.ofChoice("asr", BOTH, AsrOverride.values());
 
     /** Whether recognitions by the device are copied to the gateway. */
     public static final SettingKey<LoggingPolicy> LOGGING =
-            SettingKey.ofChoice("logging", BOTH, LoggingPolicy.class);
+            SettingKey.ofChoice("logging", BOTH, LoggingPolicy.values());
 
     /**
      * Whether usage events are collected. Set on the engine, it switches the collector on or off as
@@ -76,14 +76,14 @@ public final class TalvoxSettings {
      * {@link TalvoxEngine#getSettings} says how the collector is switched. Of the engine only.
      */
     public static final SettingKey<EventsLogging> EVENTS_LOGGING =
-            SettingKey.ofChoice("eventslogging", ENGINE, EventsLogging.class);
+            SettingKey.ofChoice("eventslogging", ENGINE, EventsLogging.values());
 
     /**
      * The form in which sound is sent, also that of recognitions by the device which are copied to
      * the gateway. Of the engine only.
      */
     public static final SettingKey<SoundFormat> SOUND_FORMAT =
-            SettingKey.ofChoice("soundformat", ENGINE, SoundFormat.class);
+            SettingKey.ofChoice("soundformat", ENGINE, SoundFormat.values());
 
     /** Sample rate of the recording in hertz, 8000 to 44100. Of the engine only. */
     public static final SettingKey<Integer> SAMPLE_RATE =
@@ -98,7 +98,7 @@ public final class TalvoxSettings {
 
     /** How the microphone is opened. Of the engine only. */
     public static final SettingKey<SessionMode> SESSION_MODE =
-            SettingKey.ofChoice("sessionmode", ENGINE, SessionMode.class);
+            SettingKey.ofChoice("sessionmode", ENGINE, SessionMode.values());
 
     /** Send the sound while it is recorded instead of afterwards. Of the engine only. */
     public static final SettingKey<Boolean> STREAMING =
@@ -143,11 +143,11 @@ public final class TalvoxSettings {
 
     /** What is spoken about. */
     public static final SettingKey<RecognitionModel> MODEL =
-            SettingKey.ofChoice("model", BOTH, RecognitionModel.class);
+            SettingKey.ofChoice("model", BOTH, RecognitionModel.values());
 
     /** Which recogniser to use. */
     public static final SettingKey<AsrPolicy> ASR_POLICY =
-            SettingKey.ofChoice("asrpolicy", BOTH, AsrPolicy.class);
+            SettingKey.ofChoice("asrpolicy", BOTH, AsrPolicy.values());
 
     /** The user's position: latitude from -90 to 90, longitude from -180 to 180. */
     public static final SettingKey<LatLon> MY_POSITION = SettingKey.ofPosition("myll", BOTH);

@@ -453,11 +453,13 @@ public class PlatformRecognizerTest extends EngineTestCase {
         assertEquals(
                 Arrays.asList("de-DE", "ru-RU", "tr-TR", "uk-UA"), engine.getAvailableLanguages());
         assertLogged("3 of 5 entries of android.speech.extra.SUPPORTED_LANGUAGES are not texts");
-        start(
-                TalvoxSettings.builder()
+        final Bundle settings =
+                TalvoxSettings.forRecognition()
                         .set(TalvoxSettings.ASR_POLICY, AsrPolicy.PLATFORM_ONLY)
-                        .set(TalvoxSettings.LANGUAGE, "")
-                        .build());
+                        .build()
+                        .toBundle();
+        settings.putString(TalvoxSettings.LANGUAGE.getName(), ""); // a builder refuses it
+        start(TalvoxSettings.fromBundle(settings));
         assertEquals(
                 "de-DE",
                 DeviceRecognizer.getIntent().getStringExtra(RecognizerIntent.EXTRA_LANGUAGE));
