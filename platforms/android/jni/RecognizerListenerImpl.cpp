@@ -126,7 +126,22 @@ void RecognizerListenerImpl::onResults(Talvox::Recognizer* source,
     }
 }
 
-void RecognizerListenerImpl::onError(Talvox::Recognizer* /*source*/, Talvox::SpeechError error) {
+void RecognizerListenerImpl::tellReason(const std::string& reason) {
+    deliver("onErrorReason", FRAME_SIZE, [this, &reason](JNIEnv* env) {
+        const jmethodID method =
+            env->GetMethodID(javaClass.getClass(), "onErrorReason", "(Ljava/lang/String;)V");
+        if (method == nullptr) {
+            env->ExceptionClear();
+            return;
+        }
+        const Jni::LocalRef<jstring> text = Jni::toJString(env, reason);
+        env->CallNonvirtualVoidMethod(javaObject.get(), javaClass.getClass(), method, text.get());
+        Jni::check(env);
+    });
+}
+
+void RecognizerListenerImpl::onError(Talvox::Recognizer* source, Talvox::SpeechError error) {
+    tellReason(source->getErrorReason());
     deliver("onError", FRAME_SIZE, [this, error](JNIEnv* env) {
         callJava(env, "onError", "(I)V", static_cast<jint>(error.getCode()));
     });

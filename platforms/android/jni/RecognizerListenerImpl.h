@@ -47,6 +47,9 @@ class RecognizerListenerImpl : public Talvox::RecognizerListener {
     template <typename Event>
     void deliver(const char* name, jint localReferences, Event event);
 
+    /** Hands the reason of the error that follows to a Java object that wants to know it. */
+    void tellReason(const std::string& reason);
+
     /** Calls a method of exactly the kept class. */
     template <typename... Args>
     void callJava(JNIEnv* env, const char* name, const char* signature, Args... args);

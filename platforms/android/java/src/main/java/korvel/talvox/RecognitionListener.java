@@ -40,6 +40,8 @@ public interface RecognitionListener {
     /** The recognition has ended with results. */
     default void onResults(Recognition recognition) {}
 
-    /** The recognition has ended without results. */
+    /**
+     * The recognition has ended without results; {@link TalvoxRecognizer#getErrorReason} says more.
+     */
     default void onError(SpeechError error) {}
 }

@@ -15,6 +15,7 @@ final class Session implements Recognizer.Events {
     private NativeHandle handle;
     private boolean stopWanted;
     private boolean cancelWanted;
+    private volatile String errorReason = "";
     private volatile boolean ended;
     private volatile boolean closed;
 
@@ -169,6 +170,17 @@ final class Session implements Recognizer.Events {
     @Override
     public void onBufferReceived(byte[] buffer) {
         deliver(() -> listener.onBufferReceived(buffer));
+    }
+
+    @Override
+    public void onErrorReason(String reason) {
+        if (!ended) {
+            errorReason = reason;
+        }
+    }
+
+    String getErrorReason() {
+        return errorReason;
     }
 
     @Override

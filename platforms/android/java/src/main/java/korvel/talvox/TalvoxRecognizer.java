@@ -78,6 +78,18 @@ public final class TalvoxRecognizer implements AutoCloseable {
     }
 
     /**
+     * Why the recognition ended with its error, for developers and logs: one line of English, from
+     * the network layer where that failed, such as "HTTP status 404" or "HTTP status 503 (the service
+     * is busy)". The texts are not fixed: do not let code depend on them, nor show them to users.
+     *
+     * @return empty while there is no error, after results, and where the cause is not known; there
+     *     from inside {@link RecognitionListener#onError} on, also after {@link #close}
+     */
+    public String getErrorReason() {
+        return session.getErrorReason();
+    }
+
+    /**
      * Gives up without an event if the recognition is running, and releases what it holds. No event
      * is delivered after this when it is called on the listener's executor; on another thread, one
      * that is being delivered may still come to its end. Closing again does nothing.

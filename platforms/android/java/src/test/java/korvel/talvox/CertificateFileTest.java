@@ -36,8 +36,12 @@ public class CertificateFileTest extends EngineTestCase {
         engine.setCertificateFile(null);
     }
 
-    /** Sends what a microphone hears until the recording has begun; without results in any case. */
-    private void recognize() throws InterruptedException {
+    /**
+     * Sends what a microphone hears until the recording has begun; without results in any case.
+     *
+     * @return the reason
+     */
+    private String recognize() throws InterruptedException {
         final Events events = new Events();
         try (Microphone microphone = new Microphone(16000, 4).plugIn();
                 TalvoxRecognizer recognizer =
@@ -47,6 +51,7 @@ public class CertificateFileTest extends EngineTestCase {
             assertEquals("recordingBegin", events.next());
             recognizer.stop();
             assertEquals("error NETWORK", events.end());
+            return recognizer.getErrorReason();
         }
     }
 
@@ -55,7 +60,8 @@ public class CertificateFileTest extends EngineTestCase {
         try (RecordingGateway gateway =
                 new RecordingGateway(true, authority.getServerCertificate())) {
             useGateway(gateway.getUrl());
-            recognize();
+            final String reason = recognize();
+            assertTrue(reason, reason.contains("certificate"));
             assertTrue("the request was sent all the same", gateway.isEmpty());
             engine.setCertificateFile(authority.getFile());
             recognize();

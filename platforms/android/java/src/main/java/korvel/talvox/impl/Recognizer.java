@@ -24,6 +24,9 @@ public final class Recognizer {
 
         void onBufferReceived(byte[] buffer);
 
+        /** Comes right before {@link #onError}; empty where the cause is not known. */
+        void onErrorReason(String reason);
+
         void onError(int code);
 
         /** Where this has no memory for the results, {@link #onError} follows. */
@@ -90,6 +93,10 @@ public final class Recognizer {
 
     private void onBufferReceived(byte[] buffer) {
         events.onBufferReceived(buffer);
+    }
+
+    private void onErrorReason(String reason) {
+        events.onErrorReason(reason);
     }
 
     private void onError(int code) {

@@ -18,6 +18,9 @@ class SilentEvents implements Recognizer.Events {
     public void onBufferReceived(byte[] buffer) {}
 
     @Override
+    public void onErrorReason(String reason) {}
+
+    @Override
     public void onError(int code) {}
 
     @Override

@@ -47,6 +47,7 @@ public final class RecordingGateway implements AutoCloseable {
     private final ExecutorService threads = Executors.newCachedThreadPool();
     private final BlockingQueue<Request> requests = new LinkedBlockingQueue<>();
     private final boolean answers;
+    private volatile int status = 200;
 
     /**
      * @param answers false to let every client wait for its answer until {@link #close}
@@ -88,6 +89,11 @@ public final class RecordingGateway implements AutoCloseable {
                 + server.getAddress().getPort();
     }
 
+    /** The status of the answers from now on; a 503 asks to try again. */
+    public void setStatus(int value) {
+        status = value;
+    }
+
     /** Waits for the next request. */
     public Request take() throws InterruptedException {
         final Request request = requests.poll(KitTest.PATIENCE_S, TimeUnit.SECONDS);
@@ -111,7 +117,10 @@ public final class RecordingGateway implements AutoCloseable {
                                 ? parse(body.toString("ISO-8859-1"), boundary(type))
                                 : new LinkedHashMap<>());
         if (answers) {
-            exchange.sendResponseHeaders(200, -1);
+            if (status == 503) {
+                exchange.getResponseHeaders().set("Retry-After", "1");
+            }
+            exchange.sendResponseHeaders(status, -1);
             exchange.close();
         }
         requests.add(request); // answered by now: the test may end
