@@ -101,6 +101,25 @@ TEST(ToolVad, FollowsTheDetectorsParameters) {
     EXPECT_EQ(bySet.out, deaf.out);
 }
 
+TEST(ToolVad, PutsSilenceBeforeTheSound) {
+    const std::string sound = TestSupport::rawBytes(utterance(16000));
+    const ToolResult plain = runTalvox({"vad", "--file", "-", "--json"}, sound);
+    const ToolResult later = runTalvox({"vad", "--file", "-", "--json", "--lead-in", "700"}, sound);
+    EXPECT_EQ(objects(later.out, "buffer").size(), objects(plain.out, "buffer").size() + 7);
+    const nlohmann::json before = objects(plain.out, "segment").at(0);
+    const nlohmann::json behind = objects(later.out, "segment").at(0);
+    EXPECT_EQ(behind["startMs"].get<int>(), before["startMs"].get<int>() + 700);
+}
+
+TEST(ToolVad, RecognizeWarnsOfMistakesInTheParametersToo) {
+    const ToolResult result =
+        runTalvox({"recognize", "--file", "/nonexistent.wav", "--vad", "framems=25"});
+    EXPECT_EQ(result.status, 2);
+    EXPECT_THAT(result.err,
+                ::testing::StartsWith("talvox: warning: vad: framems=25 is out of range "
+                                      "(10, 20 or 30): detection is off\ntalvox: "));
+}
+
 TEST(ToolVad, RunsWithADocumentOfNumbersBeyondRangeAndTellsItsRepairs) {
     const ScratchDirectory directory;
     const std::string file =

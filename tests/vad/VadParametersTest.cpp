@@ -213,6 +213,15 @@ TEST(VadParameters, ValuesOutOfRangeAreNamedWithWhatTheyLeadTo) {
     EXPECT_TRUE(isOff("framems=101"));
 }
 
+TEST(VadParameters, DetectionWorksWithEveryUsefulFrameLength) {
+    for (const VadParameter& parameter : numbers()) {
+        for (double value = parameter.lowest;
+             parameter.name == "framems" && value <= parameter.highest; value += parameter.step) {
+            EXPECT_FALSE(isOff("framems=" + numberText(parameter, value))) << value;
+        }
+    }
+}
+
 TEST(VadParameters, WhatIsNoNumberCountsAsZero) {
     for (const VadParameter& parameter : numbers()) {
         for (const char* value : {"x", "", "-"}) {
