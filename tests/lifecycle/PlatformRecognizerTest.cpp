@@ -204,8 +204,7 @@ TEST_F(PlatformRecognizerTest, ADeviceThatIsSilentWhileItListensEndsTheSession) 
     EXPECT_THAT(events, IsEmpty());
     pass(1);
     EXPECT_THAT(events, ElementsAre("ErrorNetwork"));
-    EXPECT_TRUE(
-        log.contains("PlatformRecognizer: the device's recogniser is silent, the session ends"));
+    EXPECT_EQ(recognizer->getErrorReason(), "no callback of the device's recogniser for 30 s");
     expectNextWorks();
 }
 
@@ -236,8 +235,7 @@ TEST_F(PlatformRecognizerTest, ADeviceThatDoesNotAnswerAfterStopEndsTheSession) 
     EXPECT_THAT(events, ElementsAre("power", "recordingDone"));
     pass(1);
     EXPECT_THAT(events, ElementsAre("power", "recordingDone", "ErrorNetwork"));
-    EXPECT_TRUE(log.contains(
-        "PlatformRecognizer: the device's recogniser does not answer, the session ends"));
+    EXPECT_EQ(recognizer->getErrorReason(), "no answer of the device's recogniser within 20 s");
     expectNextWorks();
 }
 
@@ -351,6 +349,7 @@ TEST_F(PlatformRecognizerTest, AStopThatFailsIsOneErrorAndCancelsTheDevice) {
     recognizer->start();
     recognizer->stop();
     EXPECT_THAT(events, ElementsAre("ErrorUnknown"));
+    EXPECT_EQ(recognizer->getErrorReason(), "the device's recogniser could not be stopped");
     EXPECT_THAT(asked, ElementsAre("start", "stop", "cancel"));
     expectNextWorks();
 }

@@ -167,7 +167,8 @@ void PlatformRecognizer::start() {
         Jni::logAndClear(env, "PlatformRecognizer.start");
         // A listener may have cancelled meanwhile.
         KOR_ASSERT_AT(jobj || over, "jobj", ASSERT_PATH, __LINE__);
-        endWithError(SpeechError::ErrorNotAvailable);
+        endWithError(SpeechError::ErrorNotAvailable,
+                     "the device's recogniser could not be started");
     }
 }
 
@@ -194,7 +195,7 @@ void PlatformRecognizer::stop() {
     } catch (const Jni::PendingException&) {
         Jni::logAndClear(env, "PlatformRecognizer.stop");
         if (!pendingResults) {
-            giveUp(SpeechError::ErrorUnknown);
+            giveUp(SpeechError::ErrorUnknown, "the device's recogniser could not be stopped");
         }
     }
 }
@@ -205,12 +206,12 @@ void PlatformRecognizer::cancel() {
     giveUp(SpeechError::ErrorCanceled);
 }
 
-void PlatformRecognizer::giveUp(int code) {
+void PlatformRecognizer::giveUp(int code, const std::string& reason) {
     // What Java says while it is cancelled does not count.
     const bool wasOver = std::exchange(over, true);
     cancelSilently();
     if (!wasOver) {
-        reportError(code);
+        reportError(code, reason);
     }
 }
 
@@ -228,17 +229,17 @@ void PlatformRecognizer::cancelSilently() {
     }
 }
 
-void PlatformRecognizer::endWithError(int code) {
+void PlatformRecognizer::endWithError(int code, const std::string& reason) {
     if (!std::exchange(over, true)) {
-        reportError(code);
+        reportError(code, reason);
     }
 }
 
-void PlatformRecognizer::reportError(int code) {
+void PlatformRecognizer::reportError(int code, const std::string& reason) {
     encoder.reset();
     silenceTimer.reset();
     getEngine()->unregisterRecognizer(this);
-    callOnError(SpeechError(code));
+    callOnError(SpeechError(code), reason);
 }
 
 bool PlatformRecognizer::isRecognitionAvailable() {
@@ -302,9 +303,9 @@ void PlatformRecognizer::checkSilence() {
         silenceTimer->start(KD_TIMER_ONESHOT, leftNs);
         return;
     }
-    kdLogFormatMessage("PlatformRecognizer: the device's recogniser %s, the session ends",
-                       answerAwaited ? "does not answer" : "is silent");
-    giveUp(SpeechError::ErrorNetwork);
+    giveUp(SpeechError::ErrorNetwork, answerAwaited
+                                          ? "no answer of the device's recogniser within 20 s"
+                                          : "no callback of the device's recogniser for 30 s");
 }
 
 void PlatformRecognizer::onReadyForSpeech() {

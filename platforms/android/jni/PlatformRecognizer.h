@@ -71,9 +71,9 @@ class PlatformRecognizer : public Talvox::Recognizer {
     void prepareSound(bool isWifi);
     void createJavaObject();
     void cancelSilently();
-    void giveUp(int code);
-    void endWithError(int code);
-    void reportError(int code);
+    void giveUp(int code, const std::string& reason = std::string());
+    void endWithError(int code, const std::string& reason = std::string());
+    void reportError(int code, const std::string& reason);
     template <typename Call>
     void announce(Call call);
 
