@@ -21,11 +21,13 @@ using Util::Bundle;
 // Well beyond what the engine accepts; a device that never ends must not fill the memory.
 const std::size_t DOCUMENT_MAX_BYTES = std::size_t{16} * 1024 * 1024;
 
-bool parseBoolean(std::string text) {
+/** Words that leave no doubt; a document takes any word that it does not know for true. */
+bool parseBoolean(std::string text, bool& value) {
     std::transform(text.begin(), text.end(), text.begin(), [](char character) {
         return static_cast<char>(std::tolower(static_cast<unsigned char>(character)));
     });
-    return !(text.empty() || text == "0" || text == "false" || text == "no");
+    value = text == "1" || text == "true" || text == "yes" || text == "on";
+    return value || text == "0" || text == "false" || text == "no" || text == "off";
 }
 
 /** Decimal, 0x hexadecimal or leading-zero octal, and nothing behind it. */
@@ -57,12 +59,16 @@ bool parseLatLon(const std::string& text, Bundle::LatLon& value) {
 bool store(Talvox::Settings& settings, const std::string& key, Bundle::ElemType type,
            const std::string& text) {
     const char* behind = nullptr;
+    bool booleanValue = false;
     int intValue = 0;
     float floatValue = 0;
     Bundle::LatLon position = {};
     switch (type) {
         case Bundle::BOOLEAN:
-            settings.putBoolean(key, parseBoolean(text));
+            if (!parseBoolean(text, booleanValue)) {
+                return false;
+            }
+            settings.putBoolean(key, booleanValue);
             return true;
         case Bundle::STRING:
             settings.putString(key, text);
@@ -92,6 +98,8 @@ bool store(Talvox::Settings& settings, const std::string& key, Bundle::ElemType 
 
 const char* typeName(Bundle::ElemType type) {
     switch (type) {
+        case Bundle::BOOLEAN:
+            return "yes or no";
         case Bundle::INT:
             return "an integer";
         case Bundle::FLOAT:
@@ -134,6 +142,10 @@ void applyDocument(Talvox::Settings& settings, const std::string& path) {
         throw UsageError(
             "cannot read " + path + ": " +
             (tooLarge ? "it is too large for a settings document" : std::strerror(errno)));
+    }
+    const std::string fault = Bundle::findXmlFault(xml, Talvox::Settings::XML_PATH_DFLT);
+    if (!fault.empty()) {
+        throw UsageError(path + ": " + fault);
     }
     settings.updateFromXml(xml, Talvox::Settings::XML_PATH_DFLT, Talvox::Settings::bundleSpecs);
 }

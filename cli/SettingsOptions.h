@@ -21,18 +21,20 @@ struct SettingsOptions {
 };
 
 /**
- * Stores a value given as text, in the value syntax of a configuration document, under the type
- * that the key has. Any spelling of the key is accepted that normalises to it.
+ * Stores a value given as text under the type that the key has: a boolean as one of yes, no, true,
+ * false, on, off, 1 and 0 in any case, other types in the value syntax of a configuration document.
+ * Any spelling of the key is accepted that normalises to it.
  * @throws UsageError when there is no such setting, or the text is not wholly a value of its type
  */
 void assign(Talvox::Settings& settings, const std::string& key, const std::string& text);
 
 /**
- * The settings that all sources together make. The document at `file` is applied as the engine
- * applies a configuration document: what is wrong in it is logged and skipped. With
- * `repairDocument`, values in it that validation does not accept are repaired and logged as well;
- * what the user assigns by hand stays as it is.
- * @throws UsageError when the file cannot be read or an assignment is wrong
+ * The settings that all sources together make. Names and values in the document at `file` are
+ * treated as the engine treats them: what is wrong is logged and skipped or repaired. A document
+ * that is not XML, breaks off or lacks the element with the settings is not used in part, as the
+ * engine would. With `repairDocument`, values in it that validation does not accept are repaired
+ * and logged as well; what the user assigns by hand stays as it is.
+ * @throws UsageError when the file cannot be read or used, or an assignment is wrong
  */
 boost::shared_ptr<Talvox::Settings> buildSettings(const SettingsOptions& options);
 

@@ -5,6 +5,7 @@
 #include <cmath>
 #include <initializer_list>
 #include <string>
+#include <vector>
 
 #include "Fuzz.h"
 #include "support/LogCapture.h"
@@ -50,6 +51,18 @@ void requireValid(const Settings& settings) {
 
 bool startsWith(const std::string& text, const std::string& prefix) {
     return text.compare(0, prefix.size(), prefix) == 0;
+}
+
+/** An update logs an error in the text, or a missing path, when a check finds one. */
+void requireFaultsLogged(const std::string& document, const TestSupport::LogCapture& log) {
+    const std::vector<std::string> messages = log.messages();
+    const auto faults =
+        std::count_if(messages.begin(), messages.end(), [](const std::string& message) {
+            return startsWith(message, "Bundle::updateFromXml parse error: ") ||
+                   startsWith(message, "updateFromXml: path ");
+        });
+    const std::string fault = Settings::findXmlFault(document, Settings::XML_PATH_DFLT);
+    require((faults > 0) == !fault.empty(), "an update logs what a check finds");
 }
 
 /** What is valid stays as it is; only what is never repaired is complained about again. */
@@ -122,6 +135,7 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, std::size_t size) {
     Settings settings;
     settings.updateFromXml(document, Settings::XML_PATH_DFLT, Settings::bundleSpecs);
     require(settings.conformsTo(Settings::bundleSpecs), "an update keeps keys and types");
+    requireFaultsLogged(document, log);
     requireSameAfterReading(settings);
     settings.validate();
     require(settings.conformsTo(Settings::bundleSpecs), "a repair keeps keys and types");

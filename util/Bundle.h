@@ -142,12 +142,20 @@ class TALVOX_API Bundle {
     void updateFromXml(const TiXmlNode& node, const std::string& path, const ElemSpec* spec);
 
     /**
-     * The same for a text. After a syntax error, which is logged, what came before it is still
-     * applied; a text that is not safe to parse at all (not UTF-8, too large, nested too deeply;
-     * see `Util::XmlUtils::findHazard`) is logged and changes nothing. Takes the event lock while
-     * it parses.
+     * The same for a text. What can be used of a text with errors is applied, and the first error
+     * is logged with its place: all before a byte that is not UTF-8 or a bad character reference,
+     * but nothing of the value in which it stands; after a syntax error, what the parser had read.
+     * A text that is too large or nested too deeply changes nothing. For the exact rules, and for
+     * documents in a single-byte encoding, see `Util::XmlUtils::loadUsable`.
      */
     void updateFromXml(const std::string& xml, const std::string& path, const ElemSpec* spec);
+
+    /**
+     * Tells whether `updateFromXml` would find an error in the text itself, or not find the path;
+     * names and values are not checked. Never fails.
+     * @return an empty text when there is no error, else the first one in plain words
+     */
+    static std::string findXmlFault(const std::string& xml, const std::string& path);
 
   private:
     static const ElemSpec* findRow(const ElemSpec* spec, const std::string& key);

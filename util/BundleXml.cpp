@@ -2,7 +2,6 @@
 #include <sstream>
 #include <vector>
 
-#include "core/util/EventLock.h"
 #include "core/util/XmlUtils.h"
 #include "pal/kd_log.h"
 #include "tinyxml.h"
@@ -158,22 +157,21 @@ std::string Bundle::toXmlString(const std::string& name) const {
 }
 
 void Bundle::updateFromXml(const std::string& xml, const std::string& path, const ElemSpec* spec) {
-    const std::string hazard = XmlUtils::findHazard(xml);
-    if (!hazard.empty()) {
-        kdLogFormatMessage("Bundle::updateFromXml parse error: %s", hazard.c_str());
-        return;
-    }
     TiXmlDocument document;
-    {
-        // The parser's treatment of white space is one setting for the process, which the engine's
-        // other user of the parser changes for a moment, under this lock.
-        const EventLock lock;
-        document.Parse(xml.c_str(), nullptr, TIXML_ENCODING_UTF8);
-    }
-    if (document.Error()) {
-        kdLogFormatMessage("Bundle::updateFromXml parse error: %s", document.ErrorDesc());
+    const std::string fault = XmlUtils::loadUsable(xml, document);
+    if (!fault.empty()) {
+        kdLogFormatMessage("Bundle::updateFromXml parse error: %s", fault.c_str());
     }
     updateFromXml(document, path, spec);
+}
+
+std::string Bundle::findXmlFault(const std::string& xml, const std::string& path) {
+    TiXmlDocument document;
+    const std::string fault = XmlUtils::loadUsable(xml, document);
+    if (fault.empty() && findNode(document, path) == nullptr) {
+        return "there is no element " + path;
+    }
+    return fault;
 }
 
 void Bundle::updateFromXml(const TiXmlNode& node, const std::string& path, const ElemSpec* spec) {

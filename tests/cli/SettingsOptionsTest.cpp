@@ -53,14 +53,14 @@ TEST(Assign, StoresEachTypeInTheSyntaxOfADocument) {
     EXPECT_TRUE(settings.conformsTo(Settings::bundleSpecs));
 }
 
-TEST(Assign, TakesBooleansAsADocumentDoes) {
+TEST(Assign, TakesBooleansInTheirUsualWords) {
     Settings settings;
-    for (const char* text : {"true", "yes", "1", "on", "TRUE", "2"}) {
+    for (const char* text : {"true", "yes", "1", "on", "TRUE", "Yes"}) {
         assign(settings, "streaming", "false");
         assign(settings, "streaming", text);
         EXPECT_TRUE(settings.getBoolean("streaming")) << text;
     }
-    for (const char* text : {"", "0", "false", "no", "No", "FALSE"}) {
+    for (const char* text : {"0", "false", "no", "No", "FALSE", "off"}) {
         assign(settings, "streaming", "true");
         assign(settings, "streaming", text);
         EXPECT_FALSE(settings.getBoolean("streaming")) << text;
@@ -81,6 +81,10 @@ TEST(Assign, RefusesUnknownKeys) {
 }
 
 TEST(Assign, RefusesWhatIsNotWhollyAValueOfTheType) {
+    EXPECT_EQ(refusal("streaming", "maybe"), "setting \"streaming\": \"maybe\" is not yes or no");
+    for (const char* text : {"", "2", "yes please", "none", "truth"}) {
+        EXPECT_NE(refusal("streaming", text), "") << text;
+    }
     EXPECT_EQ(refusal("samplerate", "fast"), "setting \"samplerate\": \"fast\" is not an integer");
     for (const char* text : {"", "16k", "1.5", "0x", "9999999999", "-2147483649", "1 2"}) {
         EXPECT_NE(refusal("samplerate", text), "") << text;
@@ -171,14 +175,38 @@ TEST(BuildSettings, RepairsADocumentOnlyWhereAskedTo) {
                     "TalvoxSettings::validate: bad speexQuality: 20, setting to default"));
 }
 
-TEST(BuildSettings, KeepsTheDefaultsWhenTheDocumentIsBroken) {
+std::string documentRefusal(const std::string& file) {
+    SettingsOptions options;
+    options.file = file;
+    try {
+        buildSettings(options);
+    } catch (const Cli::UsageError& error) {
+        return error.what();
+    }
+    return "";
+}
+
+TEST(BuildSettings, RefusesADocumentThatIsBrokenOrHoldsNoSettings) {
     const ScratchDirectory directory;
-    for (const char* text : {"", "<startup>", "not XML at all", "<startup/>", "\xC3"}) {
+    const struct {
+        std::string text;
+        std::string reason;
+    } cases[] = {
+        {"", "Error document empty. (line 1, column 1)"},
+        {"<startup>", "Error reading Element value. (line 1, column 10)"},
+        {"not XML at all", "Error document empty. (line 1, column 15)"},
+        {"<startup/>", "there is no element /startup/features/voice"},
+        {"\xC3", "the text is not UTF-8 (line 1, column 1)"},
+        {document("<url>\xFF</url>"), "the text is not UTF-8 (line 1, column 32)"},
+        {document("<url>http://h/?a&b</url>"),
+         "an unknown entity loses its \"&\" (line 1, column 43)"},
+        {document("<url>x</url>") + "more", "text outside of the elements (line 1, column 68)"},
+    };
+    for (const auto& each : cases) {
         const LogCapture log;
-        SettingsOptions options;
-        options.file = directory.write("settings.xml", text);
-        EXPECT_EQ(buildSettings(options)->toXmlString("s"), Settings().toXmlString("s")) << text;
-        EXPECT_FALSE(log.messages().empty()) << text;
+        const std::string file = directory.write("settings.xml", each.text);
+        EXPECT_EQ(documentRefusal(file), file + ": " + each.reason);
+        EXPECT_TRUE(log.messages().empty()) << each.text;
     }
 }
 

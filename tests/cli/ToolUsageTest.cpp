@@ -83,6 +83,8 @@ TEST(Tool, RefusesWrongSettings) {
                   "setting \"samplerate\": \"fast\" is not an integer");
     expectRefused({"recognize", "--mic", "--set", "upperconfidence=high"},
                   "setting \"upperconfidence\": \"high\" is not a number");
+    expectRefused({"settings", "--set", "streaming=maybe"},
+                  "setting \"streaming\": \"maybe\" is not yes or no");
     expectRefused({"settings", "--settings", "/nowhere/at.all"},
                   "cannot read /nowhere/at.all: No such file or directory");
 }
@@ -140,6 +142,25 @@ TEST(Tool, RefusesWhatADocumentLeavesWithoutAnAddress) {
     expectRefused({"recognize", "--file", "/nowhere/at.all", "--url", "http://host", "--settings",
                    document("<url>foo</url>")},
                   "cannot read /nowhere/at.all: No such file or directory");
+}
+
+TEST(Tool, RefusesSettingsDocumentsThatItCannotUseAsAWhole) {
+    const ScratchDirectory directory;
+    const std::string sound = directory.path("sound.wav");
+    ASSERT_TRUE(TestSupport::writeSoundFile(sound, SF_FORMAT_WAV | SF_FORMAT_PCM_16, 16000, 1,
+                                            std::vector<int16_t>(16000)));
+    const std::string cut =
+        directory.write("cut.xml", "<startup><features><voice><url>http://127.0.0.1</url>");
+    const std::string other = directory.write("other.xml", "<startup><features/></startup>");
+    for (const std::vector<std::string>& command : {std::vector<std::string>{"settings"},
+                                                    {"vad", "--file", sound},
+                                                    {"recognize", "--file", sound}}) {
+        std::vector<std::string> arguments = command;
+        arguments.insert(arguments.end(), {"--settings", cut});
+        expectRefused(arguments, cut + ": Error reading Element value. (line 1, column 54)");
+        arguments.back() = other;
+        expectRefused(arguments, other + ": there is no element /startup/features/voice");
+    }
 }
 
 TEST(Tool, RefusesBadSoundFiles) {
@@ -230,15 +251,6 @@ TEST(ToolSettings, AppliesADocumentThenAssignmentsAndTellsEveryRepair) {
               "talvox: TalvoxSettings::validate: bad speexQuality: 20, setting to default\n"
               "talvox: RecognizerSettings::validate:: bad value for model: poetry, setting to "
               "general\n");
-}
-
-TEST(ToolSettings, TellsWhenADocumentIsBroken) {
-    const ScratchDirectory directory;
-    const ToolResult result =
-        runTalvox({"settings", "--settings", directory.write("s.xml", "<startup>")});
-    EXPECT_EQ(result.status, 0);
-    EXPECT_THAT(result.err, HasSubstr("talvox: Bundle::updateFromXml parse error: "));
-    EXPECT_THAT(result.out, HasSubstr("<samplerate>16000</samplerate>\n"));
 }
 
 }  // namespace

@@ -3,6 +3,7 @@
 #include <gtest/gtest.h>
 #include <tinyxml.h>
 
+#include <iconv.h>
 #include <random>
 #include <thread>
 
@@ -289,6 +290,197 @@ TEST(XmlUtils, NeverLetsADeeperTreeThrough) {
     }
     // The texts are of the kind that matters.
     EXPECT_GT(accepted, 2000U);
+    EXPECT_GT(deepest, XmlUtils::MAX_DEPTH / 2);
+}
+
+/** What is in the document after as much as possible of a text was parsed. */
+std::string usableOf(const std::string& xml, std::string& fault) {
+    TiXmlDocument document;
+    document.Parse("<what was there before/>");
+    fault = XmlUtils::loadUsable(xml, document);
+    TiXmlPrinter printer;
+    printer.SetStreamPrinting();
+    document.Accept(&printer);
+    return printer.CStr();
+}
+
+TEST(XmlUtilsUsable, LoadsASoundTextAsAWhole) {
+    std::string fault = "unset";
+    EXPECT_EQ("<r><a b=\"c\">t u</a></r>", usableOf("<r>\n<a b='c'>t \n u</a>\n</r>\n", fault));
+    EXPECT_EQ("", fault);
+}
+
+TEST(XmlUtilsUsable, EndsBeforeTheElementWithTheFirstBlemish) {
+    const struct {
+        std::string xml;
+        std::string usable;
+        std::string fault;
+    } cases[] = {
+        {"<r><a>1</a><b>2\xFF</b><c/></r>", "<r><a>1</a></r>",
+         "the text is not UTF-8 (line 1, column 16)"},
+        {"<r><a>1</a>\xFF<b/></r>", "<r><a>1</a></r>", "the text is not UTF-8 (line 1, column 12)"},
+        {"<r><s><a/><t x='y\xFF'/></s></r>", "<r><s><a /></s></r>",
+         "the text is not UTF-8 (line 1, column 18)"},
+        {"<r><a>1</a><!-- c\xFF --></r>", "<r><a>1</a></r>",
+         "the text is not UTF-8 (line 1, column 18)"},
+        {"<r><a>1</a></r>\xFF", "<r><a>1</a></r>", "the text is not UTF-8 (line 1, column 16)"},
+        {"<r><a>1</a><b>&#65\xFF;</b></r>", "<r><a>1</a></r>",
+         "the text is not UTF-8 (line 1, column 19)"},
+        {"<r><a>1</a><b>&#65x;</b></r>", "<r><a>1</a></r>",
+         "a character reference is malformed (line 1, column 15)"},
+        {"<r><a/><b c='&#0;'/></r>", "<r><a /></r>",
+         "a character reference names no character (line 1, column 14)"},
+        {"<r><a/><?xml version='1.0'", "<r><a /></r>",
+         "a declaration is malformed (line 1, column 27)"},
+        {"<r><a/><?xml version></r>", "<r><a /></r>",
+         "a declaration is malformed (line 1, column 8)"},
+        {"<r><a></r>\xFF", "<r><a /></r>", "Error reading end tag. (line 1, column 7)"},
+        {"<r>\xFF", "", "the text is not UTF-8 (line 1, column 4)"},
+        {"\xEF\xBB\xBF<r>\xD0\x96\xFF", "", "the text is not UTF-8 (line 1, column 5)"},
+        {"<r><\xC3\xA4>1</\xC3\xA4><b>\n\xD0\x96\tx\xFF", "<r><\xC3\xA4>1</\xC3\xA4></r>",
+         "the text is not UTF-8 (line 2, column 4)"},
+    };
+    for (const auto& each : cases) {
+        std::string fault;
+        EXPECT_EQ(each.usable, usableOf(each.xml, fault)) << each.xml;
+        EXPECT_EQ(each.fault, fault) << each.xml;
+        EXPECT_FALSE(loads(each.xml)) << each.xml;
+    }
+}
+
+TEST(XmlUtilsUsable, KeepsWhatTheParserHadReadAtASyntaxError) {
+    std::string fault;
+    EXPECT_EQ("<r><a>1</a><b>2</b></r>", usableOf("<r><a>1</a>\n\t<b>2</r>", fault));
+    EXPECT_EQ("Error reading end tag. (line 2, column 6)", fault);
+    EXPECT_EQ("<r><a>1</a><b>2</b></r>", usableOf("<r><a>1</a>\n<b>2", fault));
+    EXPECT_EQ("Error reading Element value. (line 2, column 5)", fault);
+    EXPECT_EQ("<a />", usableOf("<a/>more", fault));
+    EXPECT_EQ("text outside of the elements (line 1, column 5)", fault);
+    EXPECT_EQ("", usableOf("", fault));
+    EXPECT_EQ("Error document empty. (line 1, column 1)", fault);
+}
+
+TEST(XmlUtilsUsable, LeavesTheDocumentEmptyBeyondTheLimits) {
+    std::string attributes;
+    for (unsigned i = 0; i <= XmlUtils::MAX_ATTRIBUTES; ++i) {
+        attributes += " a" + std::to_string(i) + "='v'";
+    }
+    std::string fault;
+    EXPECT_EQ("", usableOf("<r><a/>" + nested(XmlUtils::MAX_DEPTH) + "</r>", fault));
+    EXPECT_EQ("elements are nested too deeply (line 1, column 199)", fault);
+    EXPECT_EQ("", usableOf("<r><a/><b" + attributes + "/></r>", fault));
+    EXPECT_EQ(0U, fault.find("an element has too many attributes (line 1, column "));
+    EXPECT_EQ("", usableOf("<r/>" + std::string(XmlUtils::MAX_SIZE_BYTES, ' '), fault));
+    EXPECT_EQ("the text is too large", fault);
+}
+
+TEST(XmlUtilsUsable, TellsOfTheFirstUnknownEntity) {
+    std::string fault;
+    EXPECT_EQ("<r>x;&lt;&amp;&gt;&quot;&apos;y</r>",
+              usableOf("<r>&x;&lt;&amp;&gt;&quot;&apos;&y</r>", fault));
+    EXPECT_EQ("an unknown entity loses its \"&\" (line 1, column 4)", fault);
+    EXPECT_EQ("<r><!-- &x; --><![CDATA[&y;]]></r>",
+              usableOf("<r><!-- &x; --><![CDATA[&y;]]></r>", fault));
+    EXPECT_EQ("", fault);
+}
+
+/** A text of an encoding in UTF-8 by the C library's tables; empty where it has no character. */
+std::string convert(const char* encoding, char byte) {
+    const iconv_t conversion = iconv_open("UTF-8", encoding);
+    EXPECT_NE(reinterpret_cast<iconv_t>(-1), conversion) << encoding;
+    char* in = &byte;
+    std::size_t inLeft = 1;
+    char converted[8];
+    char* out = converted;
+    std::size_t outLeft = sizeof converted;
+    const bool isCharacter =
+        iconv(conversion, &in, &inLeft, &out, &outLeft) != static_cast<std::size_t>(-1);
+    iconv_close(conversion);
+    return isCharacter ? std::string(converted, out) : std::string();
+}
+
+TEST(XmlUtilsUsable, ConvertsEveryCharacterOfTheEncodingsThatItKnows) {
+    const struct {
+        const char* name;
+        const char* library;
+        unsigned characters;
+    } encodings[] = {{"windows-1251", "CP1251", 255}, {"CP1251", "CP1251", 255},
+                     {"windows-1252", "CP1252", 251}, {"cp1252", "CP1252", 251},
+                     {"ISO-8859-1", "LATIN1", 256},   {"iso8859_1", "LATIN1", 256},
+                     {"Latin1", "LATIN1", 256}};
+    for (const auto& encoding : encodings) {
+        const TestSupport::LogCapture log;
+        unsigned characters = 0;
+        for (int byte = 0; byte < 256; ++byte) {
+            const std::string wanted = convert(encoding.library, static_cast<char>(byte));
+            characters += wanted.empty() ? 0 : 1;
+            if (byte < 0x80 || wanted.empty()) {
+                continue;
+            }
+            // The byte at the end makes sure that the text is not UTF-8.
+            std::string fault;
+            EXPECT_NE(std::string::npos,
+                      usableOf("<?xml version='1.0' encoding='" + std::string(encoding.name) +
+                                   "'?><r>" + static_cast<char>(byte) + "|\xFF</r>",
+                               fault)
+                          .find("<r>" + wanted + "|"))
+                << encoding.name << ' ' << byte;
+            EXPECT_EQ("", fault);
+        }
+        EXPECT_EQ(encoding.characters, characters) << encoding.name;
+        EXPECT_TRUE(log.messages().empty());
+    }
+}
+
+TEST(XmlUtilsUsable, ReadsItsRelativesAsLatin1AndLogsIt) {
+    for (const std::string name : {"ISO-8859-15", "windows-1250", "KOI8-R", "cp866", "latin2"}) {
+        const TestSupport::LogCapture log;
+        std::string fault;
+        const std::string usable =
+            usableOf("<?xml version=\"1.0\" encoding=\"" + name + "\"?><r>\xE4</r>", fault);
+        EXPECT_NE(std::string::npos, usable.find("<r>\xC3\xA4</r>")) << name;
+        EXPECT_EQ("", fault);
+        EXPECT_TRUE(log.contains("XmlUtils: reading encoding " + name + " as ISO-8859-1"));
+    }
+}
+
+TEST(XmlUtilsUsable, BelievesTheBytesRatherThanTheDeclaration) {
+    std::string fault;
+    EXPECT_NE(std::string::npos,
+              usableOf("<?xml version='1.0' encoding='windows-1251'?><r>\xD0\x96</r>", fault)
+                  .find("<r>\xD0\x96</r>"));
+    EXPECT_EQ("", fault);
+    for (const std::string declaration :
+         {"<?xml version='1.0' encoding='UTF-8'?>", "<?xml version='1.0' encoding='Shift_JIS'?>",
+          "<?xml version='1.0' encoding='ISO-8859-1?>", "<?xml version='1.0'?>",
+          "<!-- encoding='ISO-8859-1' ?> -->", " <?xml version='1.0' encoding='ISO-8859-1'?>"}) {
+        EXPECT_EQ(std::string::npos, usableOf(declaration + "<r><a/>\xE4</r>", fault).find("\xC3"));
+        EXPECT_NE("", fault) << declaration;
+    }
+}
+
+TEST(XmlUtilsUsable, NeverHoldsADeeperTree) {
+    const std::string pieces[] = {
+        "<a>",  "<b>", "<a c='", "'>",   "</a>",     "</b>",   "<a/>", "<!--",      "-->", "&#65;",
+        "&#0;", "&x;", "t",      "\xFF", "\xD0\x96", "<?xml ", "?>",   "<![CDATA[", "]]>"};
+    const std::size_t count = sizeof(pieces) / sizeof(pieces[0]);
+    std::mt19937 random(12);
+    unsigned deepest = 0;
+    unsigned partial = 0;
+    for (int round = 0; round < 20000; ++round) {
+        const unsigned variety = 1 + random() % 40;
+        std::string xml;
+        for (unsigned length = 60 + random() % 60; length > 0; --length) {
+            xml += random() % 80 < variety ? pieces[random() % count] : pieces[random() % 2];
+        }
+        TiXmlDocument document;
+        const std::string fault = XmlUtils::loadUsable(xml, document);
+        const unsigned depth = depthOf(document);
+        deepest = std::max(deepest, depth);
+        partial += !fault.empty() && depth > 0 ? 1 : 0;
+        ASSERT_LE(depth, XmlUtils::MAX_DEPTH) << xml;
+    }
+    EXPECT_GT(partial, 2000U);
     EXPECT_GT(deepest, XmlUtils::MAX_DEPTH / 2);
 }
 

@@ -31,30 +31,48 @@ bool findSequence(unsigned char lead, Sequence& sequence) {
 
 }  // namespace
 
-bool isUtf8Text(const std::string& bytes) {
-    std::size_t i = 0;
-    while (i < bytes.size()) {
-        const auto lead = static_cast<unsigned char>(bytes[i++]);
+std::size_t utf8PrefixLength(const std::string& bytes) {
+    std::size_t length = 0;
+    while (length < bytes.size()) {
+        const auto lead = static_cast<unsigned char>(bytes[length]);
         if (lead == 0) {
-            return false;
-        }
-        if (lead < 0x80) {
-            continue;
+            return length;
         }
         Sequence sequence{};
-        if (!findSequence(lead, sequence) || sequence.continuations > bytes.size() - i) {
-            return false;
+        if (lead >= 0x80 &&
+            (!findSequence(lead, sequence) || sequence.continuations >= bytes.size() - length)) {
+            return length;
         }
-        for (std::size_t n = 0; n < sequence.continuations; ++n, ++i) {
-            const auto byte = static_cast<unsigned char>(bytes[i]);
-            const unsigned char low = n == 0 ? sequence.firstLow : 0x80;
-            const unsigned char high = n == 0 ? sequence.firstHigh : 0xBF;
+        for (std::size_t n = 1; n <= sequence.continuations; ++n) {
+            const auto byte = static_cast<unsigned char>(bytes[length + n]);
+            const unsigned char low = n == 1 ? sequence.firstLow : 0x80;
+            const unsigned char high = n == 1 ? sequence.firstHigh : 0xBF;
             if (byte < low || byte > high) {
-                return false;
+                return length;
             }
         }
+        length += 1 + sequence.continuations;
     }
-    return true;
+    return length;
+}
+
+bool isUtf8Text(const std::string& bytes) {
+    return utf8PrefixLength(bytes) == bytes.size();
+}
+
+void appendUtf8(std::string& text, char16_t character) {
+    const auto code = static_cast<unsigned>(character);
+    if (code < 0x80) {
+        text += static_cast<char>(code);
+        return;
+    }
+    if (code < 0x800) {
+        text += static_cast<char>(0xC0U | (code >> 6U));
+    } else {
+        text += static_cast<char>(0xE0U | (code >> 12U));
+        text += static_cast<char>(0x80U | ((code >> 6U) & 0x3FU));
+    }
+    text += static_cast<char>(0x80U | (code & 0x3FU));
 }
 
 }  // namespace Util

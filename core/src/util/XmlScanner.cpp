@@ -2,6 +2,8 @@
 
 #include <cstdint>
 
+#include "util/Ascii.h"
+
 namespace Util {
 
 namespace {
@@ -36,10 +38,6 @@ int hexValue(char c) {
     return c >= 'A' && c <= 'F' ? c - 'A' + 10 : -1;
 }
 
-char toLower(char c) {
-    return c >= 'A' && c <= 'Z' ? static_cast<char>(c - 'A' + 'a') : c;
-}
-
 bool isXmlCharacter(std::uint32_t code) {
     return code == '\t' || code == '\n' || code == '\r' || (code >= 0x20 && code < 0xD800) ||
            (code >= 0xE000 && code < 0xFFFE) || (code > 0xFFFF && code <= LAST_CODE_POINT);
@@ -56,6 +54,16 @@ std::string XmlScanner::findHazard() {
         step = current() == '<' ? scanMarkup() : scanText("<");
     }
     return hazard;
+}
+
+std::string XmlScanner::completeElements() const {
+    std::string complete = text.substr(0, completeEnd);
+    // No element was closed since, so those that were open there still are.
+    for (std::size_t i = completeDepth; i > 0; --i) {
+        const auto& [begin, length] = openNames[i - 1];
+        complete.append("</").append(text, begin, length).append(">");
+    }
+    return complete;
 }
 
 XmlScanner::Step XmlScanner::scanMarkup() {
@@ -83,11 +91,13 @@ XmlScanner::Step XmlScanner::scanMarkup() {
 XmlScanner::Step XmlScanner::scanElement() {
     ++position;
     skipWhiteSpace();
+    const std::size_t name = position;
     if (!skipName()) {
         return Step::STOP;
     }
-    if (++depth > maxDepth) {
-        return fail("elements are nested too deeply");
+    openNames.emplace_back(name, position - name);
+    if (openNames.size() > maxDepth) {
+        return refuse("elements are nested too deeply");
     }
     for (unsigned attributes = 0;; ++attributes) {
         skipWhiteSpace();
@@ -96,7 +106,7 @@ XmlScanner::Step XmlScanner::scanElement() {
         }
         if (startsWith("/>")) {
             position += 2;
-            --depth;
+            leaveElement();
             return Step::ON;
         }
         if (current() == '>') {
@@ -104,7 +114,7 @@ XmlScanner::Step XmlScanner::scanElement() {
             return Step::ON;
         }
         if (attributes >= maxAttributes) {
-            return fail("an element has too many attributes");
+            return refuse("an element has too many attributes");
         }
         if (scanAttribute() == Step::STOP) {
             return Step::STOP;
@@ -113,11 +123,15 @@ XmlScanner::Step XmlScanner::scanElement() {
 }
 
 XmlScanner::Step XmlScanner::scanClosingTag() {
-    depth -= depth > 0 ? 1 : 0;
-    return skipBehind(">");
+    const Step step = skipBehind(">");
+    if (step == Step::ON && !openNames.empty()) {
+        leaveElement();
+    }
+    return step;
 }
 
 XmlScanner::Step XmlScanner::scanDeclaration() {
+    const std::size_t start = position;
     position += 5;
     while (!atEnd()) {
         if (current() == '>') {
@@ -137,7 +151,8 @@ XmlScanner::Step XmlScanner::scanDeclaration() {
         }
     }
     // The parser ends quietly here, or with a failed assertion of its own.
-    return hazard.empty() ? fail("a declaration is malformed") : Step::STOP;
+    return hazard.empty() ? fail("a declaration is malformed", atEnd() ? position : start)
+                          : Step::STOP;
 }
 
 XmlScanner::Step XmlScanner::scanAttribute() {
@@ -175,7 +190,7 @@ XmlScanner::Step XmlScanner::scanAttribute() {
 // The end itself is left alone.
 XmlScanner::Step XmlScanner::scanText(const std::string& end) {
     while (!atEnd() && !startsWith(end)) {
-        if (!startsWith("&#")) {
+        if (current() != '&') {
             ++position;
         } else if (scanReference() == Step::STOP) {
             return Step::STOP;
@@ -184,9 +199,24 @@ XmlScanner::Step XmlScanner::scanText(const std::string& end) {
     return Step::ON;
 }
 
+// The parser drops the "&" in front of a name that it does not know.
+XmlScanner::Step XmlScanner::scanReference() {
+    if (startsWith("&#")) {
+        return scanCharacterReference();
+    }
+    const bool isKnown = startsWith("&amp;") || startsWith("&lt;") || startsWith("&gt;") ||
+                         startsWith("&quot;") || startsWith("&apos;");
+    if (!isKnown && unknown == std::string::npos) {
+        unknown = position;
+    }
+    ++position;
+    return Step::ON;
+}
+
 // In a malformed reference the parser looks for the next ";", wherever it is, and may take markup
 // on the way for a part of the reference.
-XmlScanner::Step XmlScanner::scanReference() {
+XmlScanner::Step XmlScanner::scanCharacterReference() {
+    const std::size_t reference = position;
     position += 2;
     const bool hexadecimal = startsWith("x");
     position += hexadecimal ? 1 : 0;
@@ -195,7 +225,7 @@ XmlScanner::Step XmlScanner::scanReference() {
     for (; !atEnd() && current() != ';'; ++position) {
         const int digit = hexadecimal || isDigit(current()) ? hexValue(current()) : -1;
         if (digit < 0) {
-            return fail("a character reference is malformed");
+            return fail("a character reference is malformed", reference);
         }
         if (code <= LAST_CODE_POINT) {
             code = code * (hexadecimal ? 16 : 10) + static_cast<std::uint32_t>(digit);
@@ -205,7 +235,7 @@ XmlScanner::Step XmlScanner::scanReference() {
         return Step::STOP;
     }
     if (position == start || !isXmlCharacter(code)) {
-        return fail("a character reference names no character");
+        return fail("a character reference names no character", reference);
     }
     ++position;
     return Step::ON;
@@ -214,15 +244,28 @@ XmlScanner::Step XmlScanner::scanReference() {
 XmlScanner::Step XmlScanner::skipBehind(const std::string& end) {
     const std::size_t found = text.find(end, position);
     if (found == std::string::npos) {
+        position = text.size();
         return Step::STOP;
     }
     position = found + end.size();
     return Step::ON;
 }
 
-XmlScanner::Step XmlScanner::fail(const std::string& reason) {
+XmlScanner::Step XmlScanner::fail(const std::string& reason, std::size_t where) {
     hazard = reason;
+    position = where;
     return Step::STOP;
+}
+
+XmlScanner::Step XmlScanner::refuse(const std::string& reason) {
+    beyondLimits = true;
+    return fail(reason, position);
+}
+
+void XmlScanner::leaveElement() {
+    openNames.pop_back();
+    completeEnd = position;
+    completeDepth = openNames.size();
 }
 
 bool XmlScanner::startsWith(const std::string& prefix) const {

@@ -2,6 +2,8 @@
 
 #include <cstddef>
 #include <string>
+#include <utility>
+#include <vector>
 
 namespace Util {
 
@@ -18,6 +20,21 @@ class XmlScanner {
     /** @return an empty text when nothing is found, else the reason in plain words */
     std::string findHazard();
 
+    /** The hazard is one of the limits, not a blemish: no part of the text should be used. */
+    bool isBeyondLimits() const { return beyondLimits; }
+
+    /** Where the hazard stands or, without one, where the walk ended. */
+    std::size_t stoppedAt() const { return position; }
+
+    /** Where the first reference stands whose entity the parser does not know; else `npos`. */
+    std::size_t unknownEntity() const { return unknown; }
+
+    /**
+     * The text up to the end of the last complete element before that place, with end tags added
+     * for the elements that are open there. Empty when there is no complete element.
+     */
+    std::string completeElements() const;
+
   private:
     enum class Step { ON, STOP };
 
@@ -28,8 +45,11 @@ class XmlScanner {
     Step scanAttribute();
     Step scanText(const std::string& end);
     Step scanReference();
+    Step scanCharacterReference();
     Step skipBehind(const std::string& end);
-    Step fail(const std::string& reason);
+    Step fail(const std::string& reason, std::size_t where);
+    Step refuse(const std::string& reason);
+    void leaveElement();
 
     bool atEnd() const { return position >= text.size(); }
     char current() const { return text[position]; }
@@ -42,7 +62,13 @@ class XmlScanner {
     const unsigned maxDepth;
     const unsigned maxAttributes;
     std::size_t position = 0;
-    unsigned depth = 0;
+    /** Of the open elements, outermost first: where the name begins, and its length. */
+    std::vector<std::pair<std::size_t, std::size_t>> openNames;
+    /** Behind the last complete element, and how many elements are open there. */
+    std::size_t completeEnd = 0;
+    std::size_t completeDepth = 0;
+    std::size_t unknown = std::string::npos;
+    bool beyondLimits = false;
     std::string hazard;
 };
 

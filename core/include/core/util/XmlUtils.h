@@ -48,6 +48,27 @@ class KORVEL_CORE_API XmlUtils {
      */
     static bool load(const std::vector<unsigned char>& bytes, bool keepWhiteSpace,
                      TiXmlDocument& document);
+
+    /**
+     * Parses as much of a text as can be used, for a reader to whom a part is better than nothing;
+     * `load` is for one to whom it is not. Runs of white space are condensed.
+     *
+     * - A text beyond the three limits leaves the document empty.
+     * - At the first byte that is not UTF-8, zero byte, bad numeric character reference or bad
+     *   declaration the text ends: the document holds the elements that were complete before, and
+     *   the open ones around them.
+     * - After any other syntax error the document holds what the parser had read, the element that
+     *   it was reading included.
+     * - A reference to an unknown entity ends nothing, but the parser drops its "&".
+     *
+     * A text that is not UTF-8 and declares a single-byte encoding is converted first:
+     * ISO-8859-1, windows-1251 and windows-1252 by their tables, others as ISO-8859-1, with a line
+     * in the log. Nothing else is logged.
+     * @param[out] document  what could be used
+     * @return an empty text when the whole text was parsed without an error; else what is wrong and
+     *         where, as in "the text is not UTF-8 (line 3, column 12)"
+     */
+    static std::string loadUsable(const std::string& xml, TiXmlDocument& document);
 };
 
 }  // namespace Util
