@@ -16,9 +16,16 @@ namespace Talvox {
 /**
  * A settings tree that is born with every known key at its default, so readers may fetch any key.
  *
- * Engine settings (`SKS_`) and recognizer settings (`RS_`) live in every object. One owner changes
- * an object; afterwards it is shared read-only (see `Util::Bundle`). The constants are the only
- * spelling of keys and values, and may be used from static initialisers.
+ * The same keys live in the engine's object and in that of each recognizer; `keyLevels` says whose
+ * value counts. Mostly those of `SKS_` keys count on the engine and those of `RS_` keys on a
+ * recognizer; "asr" and "logging" are exceptions.
+ *
+ * What is checked: `createRecognizer` repairs its copy of a recognizer's settings with `validate`.
+ * The engine's own settings are not repaired: a sample rate of 1000 opens the recorder at 1000.
+ * Call `validate` before `Talvox::setTalvoxSettings` where values come from outside.
+ *
+ * One owner changes an object; afterwards it is shared read-only (see `Util::Bundle`). The
+ * constants are the only spelling of keys and values, and may be used from static initialisers.
  */
 class TALVOX_API Settings : public Util::Bundle {
   public:
@@ -28,7 +35,9 @@ class TALVOX_API Settings : public Util::Bundle {
     static const std::string SKS_UUID;
     /** Text, `ASRO_DEFAULT`: engine-wide override of the recognition mechanism. */
     static const std::string SKS_ASR_POLICY_OVERRIDE;
-    /** Text, `LOG_DISABLED`: whether and how recognition logs are sent. */
+    /**
+     * Text, `LOG_DISABLED`: whether and how a device recognizer sends its sessions to the service.
+     */
     static const std::string SKS_LOGGING_POLICY;
     /** Text, `EVENTS_LOG_DISABLED`: usage-event logging. */
     static const std::string SKS_EVENTS_LOGGING_POLICY;
@@ -50,7 +59,10 @@ class TALVOX_API Settings : public Util::Bundle {
     static const std::string SKS_LOWER_CONFIDENCE;
     /** Integer, 8: quality of the Speex encoder, 0 to 10. */
     static const std::string SKS_SPEEX_QUALITY;
-    /** Integer, 0: diagnostic verbosity, 0 to 10. */
+    /**
+     * Integer, 0: diagnostic verbosity, 0 to 10. The engine's is for the lines of a session; with a
+     * recognizer's own above 0, `createRecognizer` logs its settings.
+     */
     static const std::string SKS_VERBOSE_LEVEL;
     /** Text, "ru-RU": recognition language. */
     static const std::string RS_LANGUAGE;
@@ -111,6 +123,23 @@ class TALVOX_API Settings : public Util::Bundle {
 
     /** The keys and their types: what every settings object conforms to. */
     static const ElemSpec bundleSpecs[];
+
+    /** Whose value of a key counts in a recognition. */
+    enum class Level {
+        ENGINE,           /**< the engine's; a recognizer's own has no effect */
+        ENGINE_FOR_CLOUD, /**< as `ENGINE`, but a device recognizer goes by its own */
+        RECOGNIZER,       /**< the recognizer's own; the engine's has no effect */
+        BOTH              /**< both, each for its part */
+    };
+
+    /** A row of `keyLevels`. */
+    struct KeyLevel {
+        const char* key;
+        Level level;
+    };
+
+    /** The level of every key, in the order of `bundleSpecs`; ended by a row with a null key. */
+    static const KeyLevel keyLevels[];
 
     /** All defaults. */
     Settings();

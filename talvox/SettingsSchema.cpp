@@ -115,4 +115,28 @@ const Util::Bundle::ElemSpec Settings::bundleSpecs[] = {
     // The end.
     {nullptr, BOOLEAN, nullptr}};
 
+const Settings::KeyLevel Settings::keyLevels[] = {{KEY_URL, Level::ENGINE},
+                                                  {KEY_UUID, Level::ENGINE},
+                                                  {KEY_ASR_POLICY_OVERRIDE, Level::RECOGNIZER},
+                                                  {KEY_LOGGING_POLICY, Level::RECOGNIZER},
+                                                  {KEY_EVENTS_LOGGING_POLICY, Level::ENGINE},
+                                                  {KEY_SOUND_FORMAT, Level::ENGINE_FOR_CLOUD},
+                                                  {KEY_STREAMING, Level::ENGINE},
+                                                  {KEY_SAMPLE_RATE, Level::ENGINE},
+                                                  {KEY_VAD_SETTINGS, Level::ENGINE},
+                                                  {KEY_SESSION_MODE, Level::ENGINE},
+                                                  {KEY_UPPER_CONFIDENCE, Level::ENGINE},
+                                                  {KEY_WINNER_LEAD_CONFIDENCE, Level::ENGINE},
+                                                  {KEY_LOWER_CONFIDENCE, Level::ENGINE},
+                                                  {KEY_SPEEX_QUALITY, Level::ENGINE_FOR_CLOUD},
+                                                  {KEY_VERBOSE_LEVEL, Level::BOTH},
+                                                  {KEY_LANGUAGE, Level::RECOGNIZER},
+                                                  {KEY_MODEL, Level::RECOGNIZER},
+                                                  {KEY_ASR_POLICY, Level::RECOGNIZER},
+                                                  {KEY_MY_LL, Level::RECOGNIZER},
+                                                  {KEY_CENTER_LL, Level::RECOGNIZER},
+                                                  {KEY_SESSION_ID, Level::RECOGNIZER},
+                                                  // The end.
+                                                  {nullptr, Level::BOTH}};
+
 }  // namespace Talvox

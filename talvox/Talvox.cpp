@@ -43,6 +43,41 @@ void logSettings(const Settings& settings) {
 #pragma GCC diagnostic pop
 }
 
+bool isSame(const Settings& left, const Settings& right, const char* key) {
+    if (!left.hasKey(key) || !right.hasKey(key)) {
+        return left.hasKey(key) == right.hasKey(key);
+    }
+    const Util::Bundle::Elem& one = left.get(key);
+    const Util::Bundle::Elem& other = right.get(key);
+    return one.type == other.type && one.scalar == other.scalar && one.text == other.text;
+}
+
+bool hasEffect(Settings::Level level, Talvox::RecognitionMechanism mechanism) {
+    switch (level) {
+        case Settings::Level::ENGINE:
+            return false;
+        case Settings::Level::ENGINE_FOR_CLOUD:
+            return mechanism == Talvox::MechanismPlatform;
+        case Settings::Level::RECOGNIZER:
+        case Settings::Level::BOTH:
+            break;
+    }
+    return true;
+}
+
+/** The defaults do not count: they are there because nobody set the key. */
+void logWhatHasNoEffect(const Settings& given, const Settings& engineSettings,
+                        Talvox::RecognitionMechanism mechanism) {
+    for (const Settings::KeyLevel* row = Settings::keyLevels; row->key != nullptr; ++row) {
+        if (!hasEffect(row->level, mechanism) && !isSame(given, engineSettings, row->key) &&
+            !isSame(given, Settings(), row->key)) {
+            kdLogFormatMessage(
+                "createRecognizer: %s has no effect on a recognizer, set it on the engine",
+                row->key);
+        }
+    }
+}
+
 }  // namespace
 
 TALVOX_EARLY const std::string Talvox::VERSION("133");
@@ -158,7 +193,11 @@ boost::shared_ptr<Recognizer> Talvox::createRecognizer(
     if (copy->getInt(Settings::SKS_VERBOSE_LEVEL) > 0) {
         logSettings(isGiven ? *settings : *copy);
     }
-    boost::shared_ptr<Recognizer> recognizer = makeRecognizer(getRecognitionMechanism(*copy), copy);
+    const RecognitionMechanism mechanism = getRecognitionMechanism(*copy);
+    if (isGiven && mechanism != MechanismDummy) {
+        logWhatHasNoEffect(*settings, *getTalvoxSettings(), mechanism);
+    }
+    boost::shared_ptr<Recognizer> recognizer = makeRecognizer(mechanism, copy);
     recognizer->addListener(listener);
     return recognizer;
 }

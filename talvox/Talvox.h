@@ -55,9 +55,9 @@ class TALVOX_API Talvox : public Util::Singleton<Talvox> {
     boost::shared_ptr<const Settings> getTalvoxSettings() const;
 
     /**
-     * Installs new engine-wide settings, for recognitions that start from now on. They are not
-     * validated. The caller must not change the object any more; to change settings, clone what
-     * `getTalvoxSettings` returns, change the clone and install that.
+     * Installs new engine-wide settings, for recognitions that start from now on. They are neither
+     * checked nor repaired (see `Settings`). The caller must not change the object any more; to
+     * change settings, clone what `getTalvoxSettings` returns, change the clone and install that.
      * @param settings not null (else nothing is installed)
      */
     void setTalvoxSettings(const boost::shared_ptr<Settings>& settings);
@@ -87,7 +87,9 @@ class TALVOX_API Talvox : public Util::Singleton<Talvox> {
     static bool isAvailable(RecognitionMechanism mechanism);
 
     /**
-     * Makes a recognizer; nothing is started. It works on a validated copy of the settings.
+     * Makes a recognizer; nothing is started. It works on a validated copy of the settings. A value
+     * that has no effect there (see `Settings::keyLevels`) is logged once, unless it is the
+     * engine's or the default: "KEY has no effect on a recognizer, set it on the engine".
      * @param listener held weakly
      * @param settings not null; never changed
      * @return the recognizer, owned by the caller; never null

@@ -81,6 +81,22 @@ TEST_F(PlatformMechanismTest, ServesWhatThePolicyGivesToThePlatform) {
     EXPECT_TRUE(is<DummyRecognizer>(create(Settings::ASRP_DISABLED)));
 }
 
+TEST_F(PlatformMechanismTest, ItsRecognizerGoesByItsOwnSoundFormatAndQuality) {
+    const FakeMechanism mechanism;
+    const auto settings = settingsWith(Settings::ASRP_PLATFORM_ONLY);
+    settings->putString(Settings::SKS_LOGGING_POLICY, Settings::LOG_WITH_SOUND_ALWAYS);
+    settings->putString(Settings::SKS_SOUND_FORMAT, Settings::SOUND_FORMAT_SPEEX);
+    settings->putInt(Settings::SKS_SPEEX_QUALITY, 3);
+    settings->putInt(Settings::SKS_SAMPLE_RATE, 8000);
+    const TestSupport::LogCapture log;
+    Engine::getInstance().createRecognizer(nullptr, settings);
+    EXPECT_TRUE(log.contains(
+        "createRecognizer: samplerate has no effect on a recognizer, set it on the engine"));
+    EXPECT_FALSE(log.containsPart("createRecognizer: soundformat"));
+    EXPECT_FALSE(log.containsPart("createRecognizer: speexquality"));
+    EXPECT_FALSE(log.containsPart("createRecognizer: logging"));
+}
+
 TEST_F(PlatformMechanismTest, IsAskedOncePerDecision) {
     FakeMechanism mechanism;
     create(Settings::ASRP_PLATFORM_FIRST);

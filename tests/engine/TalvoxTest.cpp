@@ -226,6 +226,18 @@ TEST_F(TalvoxTest, OfTwoThreadsThatRegisterOnceExactlyOneIsAdmitted) {
     }
 }
 
+TEST_F(TalvoxTest, UnregisteringNothingLeavesTheActiveRecognizer) {
+    const auto active = dummy();
+    const auto other = dummy();
+    ASSERT_TRUE(engine.registerRecognizer(active.get()));
+    engine.unregisterRecognizer(nullptr);
+    EXPECT_FALSE(engine.registerRecognizer(other.get()));
+    engine.unregisterRecognizer(active.get());
+    engine.unregisterRecognizer(nullptr);
+    EXPECT_TRUE(engine.registerRecognizer(other.get()));
+    engine.unregisterRecognizer(other.get());
+}
+
 TEST_F(TalvoxTest, MakesTheRecognizerThatTheSettingsAskFor) {
     const auto settings = completeSettings();
     EXPECT_TRUE(
@@ -238,6 +250,7 @@ TEST_F(TalvoxTest, MakesTheRecognizerThatTheSettingsAskFor) {
 TEST_F(TalvoxTest, GivesTheRecognizerAValidatedCopyAndLeavesTheCallersSettingsAlone) {
     const auto settings = completeSettings();
     settings->putInt(Settings::SKS_SPEEX_QUALITY, 20);
+    engine.setTalvoxSettings(settings->clone());
     const LogCapture log;
     const auto recognizer = engine.createRecognizer(nullptr, settings);
     EXPECT_EQ(20, settings->getInt(Settings::SKS_SPEEX_QUALITY));
@@ -288,6 +301,7 @@ TEST_F(TalvoxTest, AVerboseRecognizerLogsTheCallersSettingsAsGiven) {
     settings->putInt(Settings::SKS_VERBOSE_LEVEL, 1);
     settings->putInt(Settings::SKS_SPEEX_QUALITY, 20);
     settings->putString(Settings::RS_SESSION_ID, "100% %s%n %% %");
+    engine.setTalvoxSettings(settings->clone());
     const LogCapture log;
     engine.createRecognizer(nullptr, settings);
     EXPECT_THAT(
@@ -305,6 +319,98 @@ TEST_F(TalvoxTest, AVerbosityThatWasRepairedToZeroLogsNoSettings) {
     const LogCapture log;
     engine.createRecognizer(nullptr, settings);
     EXPECT_THAT(log.messages(), Not(Contains("createRecognizer called")));
+}
+
+/** The lines about keys without effect, each without its text behind the key. */
+std::vector<std::string> keysWithoutEffect(const LogCapture& log) {
+    const std::string begin = "createRecognizer: ";
+    const std::string end = " has no effect on a recognizer, set it on the engine";
+    std::vector<std::string> keys;
+    for (const std::string& line : log.messages()) {
+        if (line.rfind(begin, 0) == 0) {
+            EXPECT_EQ(begin +
+                          line.substr(begin.size(), line.find(' ', begin.size()) - begin.size()) +
+                          end,
+                      line);
+            keys.push_back(line.substr(begin.size(), line.size() - begin.size() - end.size()));
+        }
+    }
+    return keys;
+}
+
+/** No value is a default or that of another call with another `variant`. */
+boost::shared_ptr<Settings> changeEveryKey(int variant) {
+    auto settings = boost::make_shared<Settings>();
+    for (const Util::Bundle::ElemSpec* row = Settings::bundleSpecs; row->name != nullptr; ++row) {
+        switch (row->type) {
+            case Util::Bundle::BOOLEAN:
+                settings->putBoolean(row->name, variant == 1);
+                break;
+            case Util::Bundle::INT:
+                settings->putInt(row->name, variant);
+                break;
+            case Util::Bundle::FLOAT:
+                settings->putFloat(row->name, 0.125F * static_cast<float>(variant));
+                break;
+            case Util::Bundle::LATLON:
+                settings->putLatLon(row->name, {1.0F, static_cast<float>(variant)});
+                break;
+            default:
+                settings->putString(row->name, std::string(32, static_cast<char>('a' + variant)));
+        }
+    }
+    settings->putInt(Settings::SKS_VERBOSE_LEVEL, 0);
+    settings->putString(Settings::SKS_ASR_POLICY_OVERRIDE, Settings::ASRO_DEFAULT);
+    settings->putString(Settings::RS_ASR_POLICY, Settings::ASRP_KORVEL_ONLY);
+    return settings;
+}
+
+TEST_F(TalvoxTest, EveryKeyHasALevel) {
+    const Settings::KeyLevel* level = Settings::keyLevels;
+    for (const Util::Bundle::ElemSpec* row = Settings::bundleSpecs; row->name != nullptr; ++row) {
+        ASSERT_NE(nullptr, level->key);
+        EXPECT_STREQ(row->name, level->key);
+        ++level;
+    }
+    EXPECT_EQ(nullptr, level->key);
+}
+
+TEST_F(TalvoxTest, KeysWithoutEffectOnARecognizerAreLogged) {
+    engine.setTalvoxSettings(changeEveryKey(2));
+    const LogCapture log;
+    engine.createRecognizer(nullptr, changeEveryKey(1));
+    EXPECT_THAT(keysWithoutEffect(log),
+                ElementsAre("url", "uuid", "eventslogging", "soundformat", "streaming",
+                            "samplerate", "vad", "sessionmode", "upperconfidence",
+                            "winnerleadconfidence", "lowerconfidence", "speexquality"));
+}
+
+TEST_F(TalvoxTest, KeysWithTheEnginesValueOrTheDefaultAreNotLogged) {
+    engine.setTalvoxSettings(changeEveryKey(1));
+    const LogCapture log;
+    engine.createRecognizer(nullptr, changeEveryKey(1));
+    engine.createRecognizer(nullptr, boost::make_shared<Settings>());
+    EXPECT_THAT(keysWithoutEffect(log), IsEmpty());
+}
+
+TEST_F(TalvoxTest, KeysAreComparedBeforeTheirRepair) {
+    const auto settings = completeSettings();
+    settings->putInt(Settings::SKS_SAMPLE_RATE, 1000);
+    engine.setTalvoxSettings(settings->clone());
+    const LogCapture log;
+    engine.createRecognizer(nullptr, settings);
+    EXPECT_THAT(keysWithoutEffect(log), IsEmpty());
+    engine.setTalvoxSettings(completeSettings());
+    engine.createRecognizer(nullptr, settings);
+    EXPECT_THAT(keysWithoutEffect(log), ElementsAre("samplerate"));
+}
+
+TEST_F(TalvoxTest, NothingHasAnEffectOnTheStandIn) {
+    const auto settings = changeEveryKey(1);
+    settings->putString(Settings::RS_ASR_POLICY, Settings::ASRP_DISABLED);
+    const LogCapture log;
+    engine.createRecognizer(nullptr, settings);
+    EXPECT_THAT(keysWithoutEffect(log), IsEmpty());
 }
 
 TEST_F(TalvoxTest, LanguagesAreThoseOfTheCloudInByteOrder) {
