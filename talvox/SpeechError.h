@@ -10,21 +10,49 @@
 
 namespace Talvox {
 
-/** An error code; a plain value. */
+/**
+ * An error code; a plain value. `Recognizer::getErrorReason` says more. "Device recognizer" is the
+ * platform's own, which reports errors of its own choice.
+ */
 class TALVOX_API SpeechError {
   public:
     /** The numbers are fixed. */
     enum Code {
+        /** The device recognizer failed without a cause that has a code here. */
         ErrorUnknown = 0,
-        ErrorAudio = 1,        /**< no sound could be recorded */
-        ErrorEncoding = 2,     /**< the sound could not be encoded */
-        ErrorNetwork = 3,      /**< the service was not reached, or the settings do not name it */
-        ErrorServer = 4,       /**< the service answered with a failure or not understandably */
-        ErrorCanceled = 5,     /**< the application cancelled */
-        ErrorNoVoice = 6,      /**< nobody spoke */
-        ErrorNotAvailable = 7, /**< no recognition mechanism is available */
-        ErrorBusy = 8,         /**< another recognition is active */
-        ErrorMax = 9           /**< number of codes; not a code */
+        /**
+         * The recorder could not be started, failed, or delivered too little; or the session was
+         * stopped before any sound. The device recognizer: no microphone, or no permission.
+         */
+        ErrorAudio = 1,
+        /** Reserved: nothing reports it. */
+        ErrorEncoding = 2,
+        /**
+         * Everything between the engine and results: no network at the start, no address or
+         * identifier in the engine's settings, a request that cannot be sent, no connection, no
+         * answer within 20 s, and every answer without readable results, whatever its HTTP status.
+         * The device recognizer: network errors.
+         */
+        ErrorNetwork = 3,
+        /** The device recognizer's service failed. The cloud service's failures are `ErrorNetwork`.
+         */
+        ErrorServer = 4,
+        /** The application cancelled. */
+        ErrorCanceled = 5,
+        /** No speech within 5 s of the start. The device recognizer: its own limit. */
+        ErrorNoVoice = 6,
+        /**
+         * The settings and the platform leave no recognition mechanism. The device recognizer: it
+         * could not be started, or it does not have the language.
+         */
+        ErrorNotAvailable = 7,
+        /**
+         * Another session is active, or this one was started a second time. The device recognizer:
+         * it is in use elsewhere.
+         */
+        ErrorBusy = 8,
+        /** Number of codes; not a code. */
+        ErrorMax = 9
     };
 
     /** The texts, indexed by code. */

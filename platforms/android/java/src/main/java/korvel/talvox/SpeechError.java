@@ -1,24 +1,40 @@
 package korvel.talvox;
 
-/** Why a recognition ended without results. */
+/**
+ * Why a recognition ended without results. The device recognizer, Android's own, reports errors of
+ * its own choice; the cloud recognizer uses all but {@link #UNKNOWN}, {@link #ENCODING} and {@link #SERVER}.
+ */
 public enum SpeechError {
-    /** Nothing more is known. */
+    /** The device recognizer failed without a cause that has a value here. */
     UNKNOWN("ErrorUnknown"),
-    /** The microphone failed or may not be used; the log says which. */
+    /**
+     * The microphone could not be opened, may not be used, failed or delivered too little, or the
+     * recognition was stopped before any sound; the log says which.
+     */
     AUDIO("ErrorAudio"),
-    /** The sound could not be encoded. */
+    /** Reserved: nothing reports it. */
     ENCODING("ErrorEncoding"),
-    /** No network, no answer in time, or no address and identifier configured. */
+    /**
+     * Everything between the engine and results: no network at the start, no address or identifier
+     * configured, no connection, no answer within 20 s, and every answer without readable results,
+     * whatever its HTTP status. The device recognizer: network errors.
+     */
     NETWORK("ErrorNetwork"),
-    /** The service answered with an error. */
+    /** The service of the device recognizer failed. Failures of the gateway are NETWORK. */
     SERVER("ErrorServer"),
     /** {@link TalvoxRecognizer#cancel} was called. */
     CANCELED("ErrorCanceled"),
-    /** Nobody spoke within the time limit. */
+    /** No speech within 5 s of the start. The device recognizer: its own limit. */
     NO_VOICE("ErrorNoVoice"),
-    /** Recognition is not available with these settings on this device. */
+    /**
+     * Recognition is not available with these settings on this device. The device recognizer: it
+     * could not be started, or it does not have the language.
+     */
     NOT_AVAILABLE("ErrorNotAvailable"),
-    /** Another recognition is running. */
+    /**
+     * Another recognition is running, or this one was started a second time. The device
+     * recognizer: it is in use elsewhere.
+     */
     BUSY("ErrorBusy");
 
     private final String text;
