@@ -6,6 +6,7 @@
 #include <fstream>
 #include <iterator>
 
+#include "DetectorCalls.h"
 #include "SessionTest.h"
 #include "core/network/NetworkManager.h"
 #include "core/sound/FileRecorder.h"
@@ -150,6 +151,30 @@ TEST_F(KorvelRecognizerTest, UnknownSessionModeIsLoggedAndKeepsVoiceRecognition)
     startSession(NEVER_SPEECH);
     EXPECT_EQ(recorder->getMode(), Sound::Recorder::MODE_VOICE_RECOGNITION);
     EXPECT_TRUE(log.contains("KorvelRecognizer: unknown session mode General"));
+}
+
+TEST_F(KorvelRecognizerTest, GivesTheSessionModeToTheDetector) {
+    for (const std::string& mode :
+         {Settings::SESSION_MODE_GENERAL, Settings::SESSION_MODE_VOICE_RECOGNITION}) {
+        configureText(Settings::SKS_SESSION_MODE, mode);
+        CloudTest::takeDetectorCalls();
+        startSession(NEVER_SPEECH);
+        const bool isGeneral = mode == Settings::SESSION_MODE_GENERAL;
+        EXPECT_EQ(CloudTest::takeDetectorCalls(), isGeneral ? Texts{"force noise"} : Texts{})
+            << mode;
+    }
+}
+
+TEST_F(KorvelRecognizerTest, GivesTheDetectorTheLeadingNoiseToLearn) {
+    startSession(NEVER_SPEECH);
+    CloudTest::takeDetectorCalls();
+    for (int i = 0; i < 4; ++i) {
+        advanceMs(100);
+        recorder->deliver(makeConstantBuffer(20000));
+    }
+    // Three buffers of the leading noise, loud enough for the strictest thresholds.
+    EXPECT_EQ(CloudTest::takeDetectorCalls(),
+              (Texts{"individual 98", "individual 98", "individual 98"}));
 }
 
 // --- Limits ---
@@ -425,6 +450,32 @@ TEST_F(KorvelRecognizerTest, LogsHowLongTheRequestTook) {
     EXPECT_TRUE(log.contains("Request failed in 20000 msec"));
 }
 
+TEST_F(KorvelRecognizerTest, LogsNoRequestThatFailedBeforeListeningHasStopped) {
+    configure([](Settings& settings) { settings.putInt(Settings::SKS_VERBOSE_LEVEL, 2); });
+    const LogCapture log;
+    startSession(NEVER_SPEECH);
+    play(5000);
+    EXPECT_EQ(events->texts().back(), "error ErrorNoVoice");
+    EXPECT_FALSE(log.containsPart("Request failed in"));
+}
+
+TEST_F(KorvelRecognizerTest, TheRequestBeginsWhenTheRecorderHasStopped) {
+    configure([](Settings& settings) { settings.putInt(Settings::SKS_VERBOSE_LEVEL, 2); });
+    prepareRecorder = [](CloudTest::ScriptedRecorder& made) {
+        made.insideStop = [] { advanceMs(50); };
+    };
+    server.script({CloudTest::answerGoForward().held()});
+    const LogCapture log;
+    startSession(ENDLESS_SPEECH);
+    play(500);
+    session->stop();
+    ASSERT_TRUE(server.waitForRequest(1));
+    advanceMs(1000);
+    server.release();
+    ASSERT_TRUE(events->waitForEnds());
+    EXPECT_TRUE(log.contains("Request request-1 finished in 1000 msec"));
+}
+
 TEST_F(KorvelRecognizerTest, AnswerBeforeTheEndOfSpeechEndsTheSession) {
     configure([](Settings& settings) { settings.putBoolean(Settings::SKS_STREAMING, true); });
     server.script({CloudTest::answerGoForward().onHead().held()});
@@ -458,6 +509,29 @@ TEST_F(KorvelRecognizerTest, DumpsItsSoundWhereARootIsMounted) {
             << i;
     }
     EXPECT_TRUE(events->waitForEnds());
+}
+
+TEST_F(KorvelRecognizerTest, ListeningHasStoppedWhenRecordingIsDone) {
+    const TestSupport::ScratchDirectory directory;
+    ASSERT_EQ(kdMountKOR("/removable", directory.path("").c_str()), 0);
+    configureText(Settings::SKS_VAD_SETTINGS, SHORT_SPEECH);
+    makeSession();
+    std::string dump;
+    bool wasRecording = true;
+    events->hook = [&](const std::string& event, Talvox::Recognizer*) {
+        if (event == "recordingDone") {
+            dump = TestSupport::ScratchDirectory::read(directory.path("in.wav"));
+            wasRecording = recorder->isRecording();
+        }
+    };
+    session->start();
+    play(1100);
+    kdMountKOR("/removable", nullptr);
+    ASSERT_TRUE(events->waitForEnds());
+    EXPECT_FALSE(wasRecording);
+    // The header holds the length of the data once the file is closed.
+    ASSERT_EQ(dump.size(), 44U + 35200U);
+    EXPECT_EQ(dump.substr(40, 4), std::string("\x80\x89\0\0", 4));
 }
 
 TEST_F(KorvelRecognizerTest, MissingDumpIsLoggedOnce) {

@@ -400,6 +400,21 @@ TEST_F(RecognizeProtocolTest, SendRequestFromInsideItsOwnEventDoesNothing) {
     EXPECT_EQ(server.getRequestCount(), 1U);
 }
 
+TEST_F(RecognizeProtocolTest, AnnouncesTheVoiceBeforeItClosesTheRequest) {
+    configure([](Settings& settings) { settings.putInt(Settings::SKS_VERBOSE_LEVEL, 2); });
+    const TestSupport::LogCapture log;
+    make("chunked");
+    handle(makeConstantBuffer(1));
+    const std::string closes = "ChunkedRecognizeProtocol closes request";
+    bool wasOpen = false;
+    listener->hook = [&](const std::string& event) {
+        wasOpen = wasOpen || (event == "voiceCaptured" && !log.contains(closes));
+    };
+    sendRequest();
+    EXPECT_TRUE(wasOpen);
+    EXPECT_TRUE(log.contains(closes));
+}
+
 TEST_F(RecognizeProtocolTest, AbandonedInsideItsEventSendsNothing) {
     for (const char* type : {"simple", "chunked"}) {
         listener = boost::make_shared<Listener>();

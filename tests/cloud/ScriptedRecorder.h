@@ -32,6 +32,9 @@ class ScriptedRecorder : public Sound::Recorder {
     }
     void stopRecording() override {
         ++stops;
+        if (insideStop) {
+            insideStop();
+        }
         if (failsWhenStopped) {
             notifyError();
         }
@@ -56,6 +59,7 @@ class ScriptedRecorder : public Sound::Recorder {
 
     std::function<void()> insideInit;
     std::function<void()> insideStart;
+    std::function<void()> insideStop;
     bool works = true;
     bool failsAtStart = false;
     bool failsWhenStopped = false;

@@ -67,6 +67,12 @@ TEST(RecognitionOutcome, EqualityReachesTheUpperThresholdsAndIsNotBelowTheLowerO
     EXPECT_EQ(Recognition::OutcomeUncertain, outcomeOf({0.5F}, thresholds(0.75F, 0.25F, 0.5F)));
 }
 
+// In double precision the lead would be a little too small.
+TEST(RecognitionOutcome, TheLeadIsComputedInSinglePrecision) {
+    EXPECT_EQ(Recognition::OutcomeAccepted,
+              outcomeOf({0.553F, 0.168F}, thresholds(0.5F, 0.385F, 0.4F)));
+}
+
 TEST(RecognitionOutcome, NoHypothesisIsUncertain) {
     EXPECT_EQ(Recognition::OutcomeUncertain, outcomeOf({}));
 }

@@ -125,6 +125,18 @@ TEST(Recognizer, AReleasedListenerIsRemovedAndTheErrorStillLogged) {
     EXPECT_THAT(log.messages(), ElementsAre("Recognizer error: 1, ErrorAudio"));
 }
 
+TEST(Recognizer, AnErrorIsLoggedAlsoWhenNoListenerIsLeft) {
+    const auto recognizer = boost::make_shared<PlainRecognizer>();
+    recognizer->addListener(boost::make_shared<RecordingListener>());
+    const LogCapture log;
+    recognizer->callOnError(SpeechError::ErrorAudio, "because");
+    recognizer->callOnError(SpeechError::ErrorBusy);
+    EXPECT_EQ(0U, recognizer->listenerCount());
+    EXPECT_THAT(log.messages(),
+                ElementsAre("Recognizer error: 1, ErrorAudio", "Recognizer error reason: because",
+                            "Recognizer error: 8, ErrorBusy"));
+}
+
 TEST(Recognizer, ResultsRemoveReleasedListenersToo) {
     const auto recognizer = boost::make_shared<PlainRecognizer>();
     recognizer->addListener(boost::make_shared<RecordingListener>());
@@ -146,6 +158,22 @@ TEST(Recognizer, AListenerMayDropTheLastReferenceWhileOthersWait) {
     recognizer->addListener(next);
     recognizer->callOnError(SpeechError::ErrorServer);
     EXPECT_THAT(next->errors, ElementsAre(4));
+    EXPECT_THAT(next->callers, ElementsAre(address));
+    EXPECT_TRUE(destroyed);
+}
+
+TEST(Recognizer, AListenerMayDropTheLastReferenceInResultsWhileOthersWait) {
+    bool destroyed = false;
+    auto recognizer = boost::make_shared<PlainRecognizer>(&destroyed);
+    Recognizer* const address = recognizer.get();
+    const auto dropping = boost::make_shared<RecordingListener>();
+    const auto next = boost::make_shared<RecordingListener>();
+    dropping->whenResults = [&recognizer] { recognizer.reset(); };
+    next->whenResults = [&destroyed] { EXPECT_FALSE(destroyed); };
+    recognizer->addListener(dropping);
+    recognizer->addListener(next);
+    recognizer->callOnResults(oneResult(0.5F), "request");
+    EXPECT_EQ(1U, next->recognitions.size());
     EXPECT_THAT(next->callers, ElementsAre(address));
     EXPECT_TRUE(destroyed);
 }

@@ -16,6 +16,9 @@ class RecordingListener : public Talvox::RecognizerListenerAdapter {
                    boost::shared_ptr<Talvox::Recognition> recognition) override {
         callers.push_back(recognizer);
         recognitions.push_back(recognition);
+        if (whenResults) {
+            whenResults();
+        }
     }
 
     void onError(Talvox::Recognizer* recognizer, Talvox::SpeechError error) override {
@@ -30,6 +33,7 @@ class RecordingListener : public Talvox::RecognizerListenerAdapter {
     std::vector<boost::shared_ptr<Talvox::Recognition>> recognitions;
     std::vector<int> errors;
     std::function<void()> whenError;
+    std::function<void()> whenResults;
 };
 
 }  // namespace TestSupport
