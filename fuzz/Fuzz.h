@@ -8,6 +8,9 @@
 #include <cstdint>
 #include <string>
 
+/** Makes a broken invariant a finding. Called once, before the first input. Returns 0. */
+extern "C" int LLVMFuzzerInitialize(int* argc, char*** argv);
+
 /** The body of each target: runs one input. Returns 0; a finding aborts the process. */
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, std::size_t size);
 
@@ -46,10 +49,7 @@ inline void require(bool holds, const char* what) {
     }
 }
 
-/**
- * Keeps the log off standard error while it lives, but reads every byte of it. The default
- * handler's word on a broken invariant, which is a finding, is shown.
- */
+/** Keeps the log off standard error while it lives, but reads every byte of it. */
 class QuietLog {
   public:
     QuietLog();

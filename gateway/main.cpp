@@ -6,6 +6,7 @@
 
 #include "gateway/Server.h"
 #include "pal/kd_log.h"
+#include "tools/AssertionHandler.h"
 
 namespace {
 
@@ -129,6 +130,7 @@ int parseAndRun(int argc, char** argv) {
 }  // namespace
 
 int main(int argc, char** argv) {
+    Tools::installAssertionHandler("talvox-gateway");
     try {
         return parseAndRun(argc, argv);
     } catch (const std::exception& failure) {

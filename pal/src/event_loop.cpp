@@ -106,6 +106,7 @@ bool EventLoop::start() {
         return false;
     }
     if (!KOR_ASSERT(uv_async_init(&loop, &async, &EventLoop::onWake) == 0)) {
+        uv_loop_close(&loop);
         return false;
     }
     uv_timer_init(&loop, &timer);

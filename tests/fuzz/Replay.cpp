@@ -50,6 +50,7 @@ bool replayFolder(const std::string& folder) {
 }  // namespace
 
 int main(int argc, char** argv) {
+    LLVMFuzzerInitialize(&argc, &argv);
     bool isReplayed = argc > 1;
     try {
         for (int i = 1; i < argc; ++i) {

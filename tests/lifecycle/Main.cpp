@@ -7,6 +7,7 @@
 
 #include "Runner.h"
 #include "World.h"
+#include "support/AbortOnAssertion.h"
 
 namespace {
 
@@ -56,6 +57,7 @@ int runRange(const Lifecycle::Range& range) {
 /** Without arguments of its own this is a test program like the others. */
 int main(int argc, char** argv) {
     ::testing::InitGoogleMock(&argc, argv);
+    TestSupport::abortOnAssertion();
     if (argc == 1) {
         return RUN_ALL_TESTS();
     }

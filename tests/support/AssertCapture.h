@@ -12,6 +12,7 @@
 #include <vector>
 
 #include "pal/kd_assert.h"
+#include "support/AbortOnAssertion.h"
 
 namespace TestSupport {
 
@@ -36,7 +37,10 @@ class AssertionRaised : public std::runtime_error {
     using std::runtime_error::runtime_error;
 };
 
-/** Takes every assertion, from any thread, while it lives. One at a time. */
+/**
+ * Takes every assertion, from any thread, while it lives; the next one then ends the process again.
+ * One at a time.
+ */
 class AssertCapture {
   public:
     enum Then { RETURN, THROW };
@@ -45,7 +49,7 @@ class AssertCapture {
     explicit AssertCapture(Then then = RETURN) : action(then) {
         kdSetAssertionHandlerKOR(&AssertCapture::receive, this);
     }
-    ~AssertCapture() { kdSetAssertionHandlerKOR(nullptr, nullptr); }
+    ~AssertCapture() { abortOnAssertion(); }
     AssertCapture(const AssertCapture&) = delete;
     AssertCapture& operator=(const AssertCapture&) = delete;
 
@@ -77,6 +81,15 @@ class AssertCapture {
     const Then action;
     mutable std::mutex mutex;
     std::vector<AssertReport> entries;
+};
+
+/** The handler of an application that installs none, while this lives. */
+class DefaultAssertionHandler {
+  public:
+    DefaultAssertionHandler() { kdSetAssertionHandlerKOR(nullptr, nullptr); }
+    ~DefaultAssertionHandler() { abortOnAssertion(); }
+    DefaultAssertionHandler(const DefaultAssertionHandler&) = delete;
+    DefaultAssertionHandler& operator=(const DefaultAssertionHandler&) = delete;
 };
 
 }  // namespace TestSupport

@@ -1,18 +1,18 @@
 #include <boost/assert.hpp>
-#include <cstdlib>
+#include <stdexcept>
+#include <string>
 
 #include "core/Export.h"
 #include "pal/kd_assert.h"
-#include "pal/kd_log.h"
 
 namespace {
 
-// Boost's code goes on with what the check was there to prevent, such as a call through a null
-// pointer. So a handler may end the call by an exception, but must not simply return.
+// Boost's code would go on with what the check is there to prevent: a call through a null pointer.
+// So where the handler returns, an exception ends the call. This is the last resort for a mistake
+// in the code: what an input can make null is checked before it is followed.
 [[noreturn]] void report(const char* condition, const char* file, long line) {
     kdHandleAssertionInFileKOR(condition, file, static_cast<KDint>(line));
-    kdLogFormatMessage("cannot go on after assertion \"%s\"", condition);
-    std::abort();
+    throw std::logic_error(std::string("cannot go on after assertion \"") + condition + '"');
 }
 
 }  // namespace

@@ -1,6 +1,10 @@
 /**
  * @file
  * Reporting of broken invariants.
+ *
+ * A report never ends the process: the libraries run inside an application that is not theirs. The
+ * caller of each check goes on safely, whichever handler is installed. Tests, and an application
+ * that prefers a core dump to a log line, install a handler that aborts.
  */
 #ifndef KORVEL_PAL_KD_ASSERT_H
 #define KORVEL_PAL_KD_ASSERT_H
@@ -15,18 +19,39 @@ KD_EXTERN_C_BEGIN
  * @param filename   source path relative to the project, without extension, such as "util/Bundle"
  * @param linenumber source line
  *
- * The default handler logs "assertion failed: CONDITION (FILE:LINE)" and aborts the process. Where
- * an installed handler returns, the caller goes on.
+ * Counts the report, then calls the installed handler on this thread. Where the handler returns,
+ * the caller goes on. Any thread, any number of threads at a time; never blocks on the event lock.
  */
 KD_API void kdHandleAssertion(const char* condition, const char* filename, KDint linenumber);
 
+/**
+ * Receives each report. Called on the reporting thread, often under the event lock and possibly on
+ * several threads at once. The texts are never null and are valid during the call only.
+ *
+ * May do: return, log, end the process. Must not do: block, call the engine. It may throw in tests.
+ */
 typedef void(KDAssertionHandlerFuncKOR)(const char* condition, const char* filename,
                                         KDint linenumber, void* user);
 
-/** Replaces the assertion handler; null restores the default. The handler may throw in tests. */
+/**
+ * Replaces the assertion handler; null restores the default. Any thread. A report that another
+ * thread has begun may still reach the former handler.
+ *
+ * The default handler logs "assertion failed: CONDITION (FILE:LINE)" and returns. So that a check
+ * in a loop does not flood the log, it logs the 1st, 10th, 100th, ... report of each site; from the
+ * 10th on, ", N times" follows. Sites beyond the first 256 share one count.
+ */
 KD_API void kdSetAssertionHandlerKOR(KDAssertionHandlerFuncKOR* handler, void* user);
 
-/** As `kdHandleAssertion`, for `__FILE__`: removes the extension. Used by `KOR_ASSERT`. */
+/**
+ * The number of reports since the process began, whichever handler received them. Never decreases.
+ * Any thread; never blocks. An application can compare two values, for example at the start and the
+ * end of a session, to learn whether an invariant broke in between.
+ */
+KD_API KDint64 kdGetAssertionCountKOR(void);
+
+/** As `kdHandleAssertion`, for `__FILE__`: removes the extension and any
+ * leading "../". Used by `KOR_ASSERT`. */
 KD_API void kdHandleAssertionInFileKOR(const char* condition, const char* file, KDint linenumber);
 
 KD_EXTERN_C_END

@@ -15,6 +15,7 @@
 #include "Scene.h"
 #include "core/util/Singleton.h"
 #include "pal/kd.h"
+#include "support/AbortOnAssertion.h"
 
 namespace TearDown {
 
@@ -122,6 +123,7 @@ int endProcess(const Options& options, Scene& scene) {
 }  // namespace
 
 int main(int argc, char** argv) {
+    TestSupport::abortOnAssertion();
     static const Options options(argc, argv);
     // What the session refers to while it runs goes with the process.
     static auto& scene = *new Scene(options);
