@@ -14,7 +14,12 @@ RecognizerListener::~RecognizerListener() = default;
 
 Recognizer::Recognizer(const Talvox* facade, boost::shared_ptr<const Settings> settings)
     : validatedSettings(std::move(settings)), engine(facade) {
-    KOR_ASSERT(engine);
+    if (!KOR_ASSERT(validatedSettings)) {
+        validatedSettings = boost::make_shared<const Settings>();
+    }
+    if (!KOR_ASSERT(engine)) {
+        engine = &Talvox::getInstance();
+    }
 }
 
 Recognizer::~Recognizer() = default;

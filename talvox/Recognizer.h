@@ -55,7 +55,11 @@ class TALVOX_API Recognizer : public boost::enable_shared_from_this<Recognizer> 
     std::string getErrorReason() const;
 
   protected:
-    /** @param facade not owned; must outlive the recognizer */
+    /**
+     * @param facade   not owned; must outlive the recognizer. Null is a broken invariant; the
+     *                 process's facade then takes its place.
+     * @param settings null is a broken invariant; the defaults then take their place
+     */
     Recognizer(const Talvox* facade, boost::shared_ptr<const Settings> settings);
 
     /**

@@ -5,6 +5,7 @@
 
 #include "pal/kd_assert.h"
 #include "pal/kd_log.h"
+#include "talvox/impl/SettingsCheck.h"
 
 namespace Talvox {
 
@@ -30,6 +31,11 @@ float defaultBelow(float upper, float dflt) {
 
 }  // namespace
 
+void requireConformance(const Settings& settings) {
+    KOR_ASSERT_AT(settings.conformsTo(Settings::bundleSpecs), "conformsTo(bundleSpecs)",
+                  "talvox/Talvox", __LINE__);
+}
+
 Settings::Settings() {
     putString(SKS_URL, "");
     putString(SKS_UUID, "");
@@ -52,7 +58,7 @@ Settings::Settings() {
     putLatLon(RS_MY_LL, LatLon());
     putLatLon(RS_CENTER_LL, LatLon());
     putString(RS_SESSION_ID, "");
-    KOR_ASSERT_AT(conformsTo(bundleSpecs), "conformsTo(bundleSpecs)", "talvox/Talvox", __LINE__);
+    requireConformance(*this);
 }
 
 Settings::~Settings() = default;

@@ -97,8 +97,9 @@ Talvox::~Talvox() {
 
 boost::shared_ptr<const Settings> Talvox::getTalvoxSettings() const {
     boost::shared_ptr<const Settings> current = boost::atomic_load(&talvoxSettings);
-    KOR_ASSERT_AT(current, "talvoxSettings", ASSERT_PATH, __LINE__);
-    return current;
+    return KOR_ASSERT_AT(current, "talvoxSettings", ASSERT_PATH, __LINE__)
+               ? current
+               : boost::make_shared<const Settings>();
 }
 
 void Talvox::setTalvoxSettings(const boost::shared_ptr<Settings>& settings) {

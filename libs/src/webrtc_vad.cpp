@@ -1,8 +1,6 @@
 #include "libs/webrtc_vad.h"
 
 #include <cstdio>
-#include <cstdlib>
-#include <mutex>
 #include <new>
 
 #include "libs/src/vad_core.h"
@@ -23,19 +21,19 @@ constexpr int MODE_MAX = 3;
 using CalcVad = int (*)(VadCore*, const int16_t*, size_t);
 
 /**
- * Once per process. A core that is not the mirrored one would be corrupted by every call that
- * follows, and can only come from a wrong build: there is nothing to go on with.
+ * Checked once per process. A core that is not the mirrored one would be corrupted by every call
+ * that follows, and can only come from a wrong build: then no detector is made.
  */
-void checkLayoutOnce() {
-    static std::once_flag checked;
-    std::call_once(checked, [] {
+bool isCoreUsable() {
+    static const bool usable = [] {
         WebRtcSpl_Init();
         const char* fault = findVadLayoutFault({WebRtcVad_InitCore, WebRtcVad_set_mode_core});
         if (fault != nullptr) {
             std::fprintf(stderr, "libKorvelLibs: unusable voice activity detector: %s\n", fault);
-            std::abort();
         }
-    });
+        return fault == nullptr;
+    }();
+    return usable;
 }
 
 CalcVad calcForRate(int sampleRateHz) {
@@ -62,8 +60,7 @@ int WebRtcVad_Create(VadInst** handle) {
     if (handle == nullptr) {
         return FAILED;
     }
-    checkLayoutOnce();
-    *handle = new (std::nothrow) KorvelVadInst;
+    *handle = isCoreUsable() ? new (std::nothrow) KorvelVadInst : nullptr;
     return *handle != nullptr ? 0 : FAILED;
 }
 

@@ -6,6 +6,7 @@
 
 #include "support/AssertCapture.h"
 #include "support/LogCapture.h"
+#include "talvox/impl/SettingsCheck.h"
 
 using Talvox::Settings;
 using ::testing::IsEmpty;
@@ -37,6 +38,20 @@ TEST(Settings, AFreshObjectConformsToTheTable) {
     const Settings settings;
     EXPECT_TRUE(settings.conformsTo(Settings::bundleSpecs));
     EXPECT_THAT(asserts.reports(), IsEmpty());
+}
+
+TEST(Settings, AnObjectThatDoesNotConformIsReportedAndStaysAsItIs) {
+    Settings settings;
+    settings.putInt("one more", 7);
+    settings.putString(Settings::SKS_SAMPLE_RATE, "fast");
+    const AssertCapture asserts;
+    Talvox::requireConformance(settings);
+    ASSERT_EQ(1U, asserts.count());
+    EXPECT_EQ("conformsTo(bundleSpecs)", asserts.reports()[0].condition);
+    EXPECT_EQ("talvox/Talvox", asserts.reports()[0].path);
+    EXPECT_EQ(7, settings.getInt("one more"));
+    EXPECT_EQ("fast", settings.getString(Settings::SKS_SAMPLE_RATE));
+    EXPECT_EQ(1U, asserts.count());
 }
 
 TEST(Settings, KeysHaveTheirTexts) {

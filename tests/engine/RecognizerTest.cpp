@@ -79,8 +79,24 @@ TEST(Recognizer, KeepsItsSettingsAndItsEngine) {
 
 TEST(Recognizer, WithoutAnEngineIsABrokenInvariant) {
     const AssertCapture asserts;
-    const DummyRecognizer recognizer(nullptr, boost::make_shared<const Settings>());
-    EXPECT_EQ(1U, asserts.count());
+    const auto recognizer =
+        boost::make_shared<DummyRecognizer>(nullptr, boost::make_shared<const Settings>());
+    ASSERT_EQ(1U, asserts.count());
+    EXPECT_EQ("engine", asserts.reports()[0].condition);
+    EXPECT_EQ(&Talvox::Talvox::getInstance(), recognizer->getEngine());
+    const auto listener = boost::make_shared<RecordingListener>();
+    recognizer->addListener(listener);
+    recognizer->start();
+    EXPECT_THAT(listener->errors, ElementsAre(7));
+}
+
+TEST(Recognizer, WithoutSettingsIsABrokenInvariantAndHasTheDefaults) {
+    const AssertCapture asserts;
+    const DummyRecognizer recognizer(&Talvox::Talvox::getInstance(), nullptr);
+    ASSERT_EQ(1U, asserts.count());
+    EXPECT_EQ("validatedSettings", asserts.reports()[0].condition);
+    ASSERT_TRUE(recognizer.getSettings());
+    EXPECT_EQ("ru-RU", recognizer.getSettings()->getLanguage());
 }
 
 TEST(Recognizer, AnErrorIsLoggedAndReachesEveryListener) {

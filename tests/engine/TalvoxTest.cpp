@@ -13,6 +13,7 @@
 #include "core/util/EventLock.h"
 #include "support/AssertCapture.h"
 #include "support/LogCapture.h"
+#include "support/PrivateMember.h"
 #include "talvox/DummyRecognizer.h"
 #include "talvox/Log.h"
 #include "talvox/impl/KorvelRecognizer.h"
@@ -29,6 +30,16 @@ using TestSupport::AssertCapture;
 using TestSupport::LogCapture;
 using TestSupport::RecordingListener;
 using Engine = Talvox::Talvox;
+
+namespace TestSupport {
+
+struct EngineSettings {
+    using Type = boost::shared_ptr<const Settings> Engine::*;
+    friend Type memberOf(EngineSettings);
+};
+template struct PrivateMember<EngineSettings, &Talvox::Talvox::talvoxSettings>;
+
+}  // namespace TestSupport
 
 namespace {
 
@@ -119,6 +130,19 @@ TEST_F(TalvoxTest, MissingSettingsAreABrokenInvariantAndChangeNothing) {
     engine.setTalvoxSettings(nullptr);
     EXPECT_EQ(1U, asserts.count());
     EXPECT_EQ(old, engine.getTalvoxSettings());
+}
+
+TEST_F(TalvoxTest, WithoutSettingsOfItsOwnTheEngineReportsThatAndGivesTheDefaults) {
+    auto& slot = engine.*memberOf(TestSupport::EngineSettings());
+    const boost::shared_ptr<const Settings> old = std::exchange(slot, nullptr);
+    const AssertCapture asserts;
+    const boost::shared_ptr<const Settings> given = engine.getTalvoxSettings();
+    slot = old;
+    ASSERT_EQ(1U, asserts.count());
+    EXPECT_EQ("talvoxSettings", asserts.reports()[0].condition);
+    EXPECT_EQ("talvox/Talvox", asserts.reports()[0].path);
+    ASSERT_TRUE(given);
+    EXPECT_TRUE(given->conformsTo(Settings::bundleSpecs));
 }
 
 TEST_F(TalvoxTest, SettingsMayBeReadWhileTheyAreReplaced) {

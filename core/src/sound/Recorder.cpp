@@ -4,6 +4,7 @@
 #include <utility>
 
 #include "core/util/EventLock.h"
+#include "pal/kd_assert.h"
 
 #if defined(__linux__) && !defined(__ANDROID__)
 #include "sound/PulseRecorder.h"
@@ -68,6 +69,9 @@ void Recorder::addListener(const boost::weak_ptr<RecorderListener>& listener) {
 }
 
 void Recorder::notifyData(const boost::shared_ptr<const SoundDataBuffer>& buffer) {
+    if (!KOR_ASSERT(buffer)) {
+        return;
+    }
     const boost::shared_ptr<Recorder> self = weak_from_this().lock();
     const unsigned stopsBefore = stopCount;
     listeners.notify([this, &buffer, stopsBefore](RecorderListener& listener) {
