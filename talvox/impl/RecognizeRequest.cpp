@@ -64,6 +64,7 @@ boost::shared_ptr<Network::HttpRequest> RecognizeRequest::issueRequest() const {
         makeRequestUrl(engineSettings, recognizerSettings, chunked, contentType);
     boost::shared_ptr<Network::HttpRequest> http =
         Network::HttpRequest::create(url, "POST", TIMEOUT_MS, false);
+    refuseIncomplete(*http);
     http->setChunked(chunked);
     if (chunked) {
         fillChunked(*http);
@@ -71,6 +72,19 @@ boost::shared_ptr<Network::HttpRequest> RecognizeRequest::issueRequest() const {
         fillWhole(*http);
     }
     return http;
+}
+
+// The service could only guess what is missing, and the sound is the user's voice: it stays here.
+void RecognizeRequest::refuseIncomplete(Network::HttpRequest& http) const {
+    if (engineSettings.getUuid().empty()) {
+        http.refuse("the uuid is empty");
+    }
+    if (recognizerSettings.getLanguage().empty()) {
+        http.refuse("the language is empty");
+    }
+    if (recognizerSettings.getModel().empty()) {
+        http.refuse("the model is empty");
+    }
 }
 
 void RecognizeRequest::fillChunked(Network::HttpRequest& http) const {
@@ -174,6 +188,9 @@ void RecognizeRequest::writeText(const std::string& text) {
 }
 
 void RecognizeRequest::onResponseRecieved(boost::shared_ptr<Network::HttpResponse> response) {
+    if (!isPresent(response)) {
+        return;
+    }
     isUnreadable = false;
     if (const std::optional<std::string> header = response->getHeader(RESULTS_HEADER)) {
         const boost::shared_ptr<RecognitionResults> received = parseResultHeader(*header);

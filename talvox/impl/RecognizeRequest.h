@@ -34,6 +34,7 @@ class RecognizeRequest : public Network::NetworkTask {
     ~RecognizeRequest() override;
 
     bool isReadyToPerform() const override;
+    /** Without a uuid, language or model, the request is built all the same, but refused. */
     boost::shared_ptr<Network::HttpRequest> issueRequest() const override;
     void onResponseRecieved(boost::shared_ptr<Network::HttpResponse> response) override;
     void onBytesReceived(const std::vector<unsigned char>& bytes) override;
@@ -92,6 +93,7 @@ class RecognizeRequest : public Network::NetworkTask {
 
     /** Name and value of what both kinds of body begin with. */
     std::vector<Field> makeFields() const;
+    void refuseIncomplete(Network::HttpRequest& http) const;
     void fillChunked(Network::HttpRequest& http) const;
     void fillWhole(Network::HttpRequest& http) const;
     void addTranscripts(Network::HttpRequest::MultipartBuilder& builder) const;

@@ -15,9 +15,21 @@
 #include "support/AssertCapture.h"
 #include "support/LogCapture.h"
 #include "support/OggSpeexDecoder.h"
+#include "support/PrivateMember.h"
 #include "support/ScriptedHttpServer.h"
 #include "talvox/impl/ChunkedRecognizeProtocol.h"
 #include "talvox/impl/SimpleRecognizeProtocol.h"
+
+namespace TestSupport {
+
+struct MakeHttpRequest {
+    using Type = void (Talvox::SimpleRecognizeProtocol::*)(
+        const boost::shared_ptr<const Sound::SoundDataBuffer>&);
+    friend Type memberOf(MakeHttpRequest);
+};
+template struct PrivateMember<MakeHttpRequest, &Talvox::SimpleRecognizeProtocol::makeHttpRequest>;
+
+}  // namespace TestSupport
 
 namespace {
 
@@ -449,6 +461,26 @@ TEST_F(RecognizeProtocolTest, SimpleAssertsThatNoSoundComesLate) {
                   {"!holder.isWorking()", "talvox/impl/SimpleRecognizeProtocol", 38}}));
     ASSERT_TRUE(server.waitForRequest(1));
     EXPECT_EQ(server.getRequest(0).body, makeBody(PCM_TYPE, "\x01\x02"));
+}
+
+TEST_F(RecognizeProtocolTest, SimpleAssertsThatItSendsOneRequestOnly) {
+    server.script({Answer::never()});
+    make("simple");
+    handle(makeBuffer({1, 2}));
+    sendRequest();
+    ASSERT_TRUE(server.waitForRequest(1));
+    const AssertCapture asserts;
+    {
+        const Util::EventLock lock;
+        auto& simple = static_cast<Talvox::SimpleRecognizeProtocol&>(*protocol);
+        (simple.*memberOf(TestSupport::MakeHttpRequest()))(makeBuffer({3, 4}));
+    }
+    EXPECT_EQ(asserts.reports(),
+              (std::vector<TestSupport::AssertReport>{
+                  {"!holder.isWorking()", "talvox/impl/SimpleRecognizeProtocol", 85}}));
+    advanceMs(20000);
+    EXPECT_EQ(listener->getEvents(), (Events{"voiceCaptured", "ErrorNetwork"}));
+    EXPECT_EQ(server.getRequestCount(), 1U);
 }
 
 TEST_F(RecognizeProtocolTest, TimesOutTwentySecondsAfterSending) {

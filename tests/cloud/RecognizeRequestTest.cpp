@@ -210,7 +210,7 @@ TEST_F(RecognizeRequestTest, IsTheSameAtEveryAttempt) {
     EXPECT_EQ(request->issueRequest()->getBody(), request->issueRequest()->getBody());
 }
 
-TEST_F(RecognizeRequestTest, AssertsWhatIsMissingAndSendsItEmpty) {
+TEST_F(RecognizeRequestTest, AssertsWhatIsMissingAndBuildsItEmptyButRefusesIt) {
     engine.putString(Settings::SKS_UUID, "");
     recognizer.putString(Settings::RS_LANGUAGE, "");
     recognizer.putString(Settings::RS_MODEL, "");
@@ -224,6 +224,34 @@ TEST_F(RecognizeRequestTest, AssertsWhatIsMissingAndSendsItEmpty) {
     EXPECT_EQ(http->getBody(), field("uuid", "") + field("lang", "") + field("topic", "") +
                                    field("myll", "55.750000,37.500000") +
                                    field("centerll", "0.000000,0.000000") + FINAL_BOUNDARY);
+    EXPECT_EQ(http->getRefusal(), "the uuid is empty");
+}
+
+TEST_F(RecognizeRequestTest, EachMissingFieldIsReasonEnoughToRefuse) {
+    EXPECT_EQ(makeRequest()->issueRequest()->getRefusal(), "");
+    EXPECT_EQ(makeStreamedRequest()->issueRequest()->getRefusal(), "");
+    const AssertCapture asserts;
+    recognizer.putString(Settings::RS_MODEL, "");
+    EXPECT_EQ(makeRequest()->issueRequest()->getRefusal(), "the model is empty");
+    EXPECT_EQ(makeStreamedRequest()->issueRequest()->getRefusal(), "the model is empty");
+    recognizer.putString(Settings::RS_LANGUAGE, "");
+    EXPECT_EQ(makeRequest()->issueRequest()->getRefusal(), "the language is empty");
+    EXPECT_EQ(makeStreamedRequest()->issueRequest()->getRefusal(), "the language is empty");
+}
+
+TEST_F(RecognizeRequestTest, StreamedBodyWithoutLanguageAndModelAssertsAndIsWritten) {
+    recognizer.putString(Settings::RS_LANGUAGE, "");
+    recognizer.putString(Settings::RS_MODEL, "");
+    const auto request = makeStreamedRequest();
+    const AssertCapture asserts;
+    request->writeBodyStart();
+    EXPECT_EQ(asserts.reports(),
+              (std::vector<AssertReport>{{"!recognizerSettings.getLanguage().empty()", SOURCE, 170},
+                                         {"!recognizerSettings.getModel().empty()", SOURCE, 172}}));
+    EXPECT_EQ(takeBody(*request->writer),
+              field("uuid", UUID) + field("lang", "") + field("topic", "") +
+                  field("myll", "55.750000,37.500000") + field("centerll", "0.000000,0.000000") +
+                  field("Content-Type", PCM_TYPE) + audioStart(PCM_TYPE));
 }
 
 TEST_F(RecognizeRequestTest, StreamedRequestHasAWriterInsteadOfABody) {
@@ -337,7 +365,28 @@ TEST_F(RecognizeRequestTest, StreamWithoutWriterReportsTheNullPointer) {
     EXPECT_EQ(asserts.reports()[0].condition, "px != 0");
 }
 
+TEST_F(RecognizeRequestTest, StreamWithoutWriterIsClosedAllTheSame) {
+    const auto request = makeRequest();
+    const AssertCapture asserts;
+    request->close(false);
+    EXPECT_TRUE(request->closed);
+    EXPECT_GT(asserts.count(), 0U);
+    for (const AssertReport& report : asserts.reports()) {
+        EXPECT_EQ(report.condition, "px != 0");
+        EXPECT_EQ(report.path, "talvox/impl/IsPresent");
+    }
+}
+
 // --- The answer ---
+
+TEST_F(RecognizeRequestTest, MissingResponseReportsTheNullPointer) {
+    const auto request = makeRequest();
+    const AssertCapture asserts;
+    request->onResponseRecieved(nullptr);
+    ASSERT_EQ(asserts.count(), 1U);
+    EXPECT_EQ(asserts.reports()[0].condition, "px != 0");
+    EXPECT_FALSE(request->resultsReceived);
+}
 
 boost::shared_ptr<Network::HttpResponse> makeResponse(const std::string& document,
                                                       const std::string& requestId) {

@@ -2,6 +2,7 @@
 
 #include <algorithm>
 
+#include "pal/kd_assert.h"
 #include "pal/kd_log.h"
 
 namespace Network {
@@ -42,6 +43,12 @@ void HttpRequest::setBody(const std::string& boundaryText, std::string content) 
     setBoundary(boundaryText);
     addBoundaryHeader();
     body = std::move(content);
+}
+
+void HttpRequest::refuse(const std::string& reason) {
+    if (KOR_ASSERT(!reason.empty()) && refusal.empty()) {
+        refusal = reason;
+    }
 }
 
 void HttpRequest::addHeader(const std::string& name, const std::string& value) {

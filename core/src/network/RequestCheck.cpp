@@ -5,6 +5,9 @@ namespace Network {
 namespace {
 
 std::string findFaultIn(const HttpRequest& request) {
+    if (!request.getRefusal().empty()) {
+        return request.getRefusal();
+    }
     const std::string urlFault = HttpRequest::findUrlFault(request.getUrl());
     if (!urlFault.empty()) {
         return "its URL " + urlFault;

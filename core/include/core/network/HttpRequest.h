@@ -105,6 +105,15 @@ class KORVEL_CORE_API HttpRequest {
     /** Adds a header; one with a control character in it is refused and logged. */
     void addHeader(const std::string& name, const std::string& value);
 
+    /**
+     * Marks a request that must not be sent: the attempt fails before anything leaves the device,
+     * and the task ends with `NO_REQUEST` and no retry. The first reason counts.
+     * @param reason says what is wrong, such as "the language is empty"; not empty
+     */
+    void refuse(const std::string& reason);
+    /** The reason given to `refuse`; empty for a request that may be sent. */
+    const std::string& getRefusal() const { return refusal; }
+
     const std::string& getUrl() const { return url; }
     const std::string& getMethod() const { return method; }
     int getTimeoutMs() const { return timeoutMs; }
@@ -123,6 +132,7 @@ class KORVEL_CORE_API HttpRequest {
     boost::shared_ptr<NetworkTaskWriter> writer;
     std::string boundary;
     std::string body;
+    std::string refusal;
     std::vector<std::pair<std::string, std::string>> headers;
 };
 
