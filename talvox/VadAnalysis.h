@@ -75,11 +75,12 @@ struct VadSegment {
  * Runs a detector over sound and shows what a session does that hears it through a
  * `Sound::FileRecorder`, by the session's own rules. Goes on where a session stops listening.
  *
- * Each buffer arrives the device's delay after its last sample. The first buffer that arrives more
- * than the detector's leading noise (200 ms) after the start is the last one that is learnt from:
- * with buffers of 100 ms and a delay of 2 to 100 ms the second, at every rate. At 11,025 Hz a
- * buffer has 1102 samples, so that two of them last 199 whole ms and arrive, with a delay of 20 ms,
- * after 219 ms; there the 203rd buffer, not the 201st, exceeds 20 s, since each counts as 99 ms.
+ * A buffer arrives the device's delay after its last sample. The detector learns from each buffer
+ * up to the first one that arrives more than its leading noise (200 ms) after the start. With
+ * buffers of 100 ms and a delay of 2 to 100 ms that is the second buffer, at every rate. At 11,025
+ * Hz a buffer has 1102 samples: two buffers last 199 whole ms and, with a delay of 20 ms, have
+ * arrived after 219 ms. There the 203rd buffer exceeds 20 s of sound, since each counts as 99 ms;
+ * at multiples of 10 Hz it is the 201st.
  *
  * Used by one thread at a time; never blocks, needs no event thread.
  */

@@ -18,10 +18,10 @@ namespace Sound {
  * is: each buffer arrives the device's delay after its last sample. A recorder that was stopped and
  * is started again goes on where it was.
  *
- * The first sample counts from when the caller of `startRecording` releases the event lock. So what
- * it does under that lock after the call, however long it takes, does not change how old a buffer
- * is for it: it takes the time of its start before the first sample, and the k-th buffer is then at
- * least its own length k times plus the delay old.
+ * The sound begins when the caller of `startRecording` releases the event lock. A caller that notes
+ * its start time under that lock receives the k-th buffer at least k buffer lengths plus the delay
+ * later, however long its start takes. On the hand-driven clock the sound begins at the first move
+ * of the clock after the call.
  */
 class KORVEL_CORE_API FileRecorder : public Recorder {
   public:
@@ -31,8 +31,9 @@ class KORVEL_CORE_API FileRecorder : public Recorder {
     /**
      * @param samples       mono samples at the rate that will be asked for
      * @param deviceDelayMs milliseconds from a buffer's last sample to its delivery; values below 0
-     *                      count as 0. Without any delay a buffer arrives exactly when a time limit
-     *                      of the same length ends, and on the real clock either may come first.
+     *                      count as 0. Without a delay, a buffer and a time limit of equal
+     *                      length fall on the same moment; on the real clock either may be
+     *                      first.
      */
     explicit FileRecorder(std::vector<int16_t> samples, int deviceDelayMs = DEVICE_DELAY_MS_DFLT);
     ~FileRecorder() override;
