@@ -151,8 +151,9 @@ class TALVOX_API Settings : public Util::Bundle {
     boost::shared_ptr<Settings> clone() const;
 
     /**
-     * Repairs bad values in place, each with a line in the log. An empty address and a bad
-     * identifier are only reported. The object must conform to `bundleSpecs`.
+     * Repairs bad values in place, each with a line in the log. A threshold that is not a number
+     * is bad. An empty address and a bad identifier are only reported. The object must conform to
+     * `bundleSpecs`.
      */
     void validate();
 
