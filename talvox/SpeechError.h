@@ -31,7 +31,7 @@ class TALVOX_API SpeechError {
          * Everything between the engine and results: no network at the start, no address or
          * identifier in the engine's settings, a request that cannot be sent, no connection, no
          * answer within 20 s, and every answer without readable results, whatever its HTTP status.
-         * The device recognizer: network errors.
+         * The device recognizer: network errors, and no callback of it within its time limits.
          */
         ErrorNetwork = 3,
         /** The device recognizer's service failed. The cloud service's failures are `ErrorNetwork`.

@@ -17,7 +17,8 @@ public enum SpeechError {
     /**
      * Everything between the engine and results: no network at the start, no address or identifier
      * configured, no connection, no answer within 20 s, and every answer without readable results,
-     * whatever its HTTP status. The device recognizer: network errors.
+     * whatever its HTTP status. The device recognizer: network errors, and no
+     * callback of it within its time limits.
      */
     NETWORK("ErrorNetwork"),
     /** The service of the device recognizer failed. Failures of the gateway are NETWORK. */
