@@ -16,7 +16,7 @@ public final class Hypothesis {
         return text;
     }
 
-    /** From 0 to 1, or −1 when the recogniser did not say. */
+    /** As the recogniser gave it, as a rule from 0 to 1; −1 when it gave none. */
     public float getConfidence() {
         return confidence;
     }

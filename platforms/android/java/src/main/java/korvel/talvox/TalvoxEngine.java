@@ -30,8 +30,8 @@ public final class TalvoxEngine {
     }
 
     /**
-     * The engine. The first call loads the native library, takes some ten milliseconds and begins to
-     * watch the state of the network; the others are cheap.
+     * The engine. The first call loads the native library and begins to watch the state of the
+     * network; the others do neither.
      *
      * @param context any context of the application; only its application context is kept
      * @throws UnsatisfiedLinkError if the application was built without the library for this
@@ -114,8 +114,8 @@ public final class TalvoxEngine {
     /**
      * Trusts the certificate authorities of a file, and no others, for https connections that are
      * opened from now on, to the gateway and to the endpoint of the usage log: for a private
-     * authority. It holds until the process ends. The file is read again with new connections, so it
-     * must stay where it is.
+     * authority. It holds until the process ends. The file is checked on the calling thread and read
+     * again with new connections, so it must stay where it is.
      *
      * @param file certificates in PEM form; null for the authorities of the system
      * @throws IllegalArgumentException if the file is missing, cannot be read, holds no certificate

@@ -49,8 +49,8 @@ public final class TalvoxSettings {
     private static final SettingKey.Level BOTH = SettingKey.Level.ENGINE_AND_RECOGNITION;
 
     /**
-     * Base address of the gateway: http or https, without a user name, a blank or a "#". Android
-     * refuses http by default. Of the engine only.
+     * Base address of the gateway: http or https, without a user name, a blank or a "#". Of the
+     * engine only.
      */
     public static final SettingKey<String> URL =
             SettingKey.ofText("url", ENGINE, SettingChecks::address);

@@ -159,6 +159,8 @@ public class TalvoxEngineTest extends EngineTestCase {
             setEventsLoggingByXml("<Events_Logging>disabled</Events_Logging>");
             assertEventsLogging(false);
             LogCollector.setLoggingEnabled(true);
+            setEventsLoggingByXml("<url>http://127.0.0.1:9</url>");
+            assertEventsLogging(true);
             setEventsLoggingByXml("<eventslogging>perhaps</eventslogging>");
             assertEventsLogging(true);
             setEventsLoggingByXml("<eventslogging>disabled</eventslogging>");

@@ -47,7 +47,7 @@ public final class UsageLog implements AutoCloseable {
 
     /**
      * Opens the session {@code id}. While logging is off, nothing is opened or logged, also not when
-     * it is switched on later; the first such call says so in Android's log.
+     * it is switched on later; Android's log says so, once until logging has been on.
      */
     public static UsageLog open(String id) {
         LogCollector.startLogSession(Objects.requireNonNull(id, "id"));
