@@ -156,6 +156,17 @@ public class BareApplicationTest {
     }
 
     @Test
+    public void scoresOfAnotherLengthThanTheTextsAreOneError() throws Exception {
+        expectThenNext("scores", "onError 0", "onError 0");
+        // The second report of the same place is counted only.
+        assertLogged(
+                1,
+                "assertion failed: !jconfidenceScores || ( jenv->GetArrayLength(strings) == "
+                        + "jenv->GetArrayLength(jconfidenceScores)) "
+                        + "(platforms/android/jni/PlatformRecognizer:");
+    }
+
+    @Test
     public void numbersThatAreNotErrorCodesAreUnknownErrors() throws Exception {
         expectThenNext(
                 "codes", "onError 0", "onError 0", "onError 0", "onError 0", "onError 0");
