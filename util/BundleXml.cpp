@@ -167,7 +167,7 @@ void Bundle::updateFromXml(const std::string& xml, const std::string& path, cons
 
 std::string Bundle::findXmlFault(const std::string& xml, const std::string& path) {
     TiXmlDocument document;
-    const std::string fault = XmlUtils::loadUsable(xml, document);
+    std::string fault = XmlUtils::loadUsable(xml, document);
     if (fault.empty() && findNode(document, path) == nullptr) {
         return "there is no element " + path;
     }

@@ -232,8 +232,9 @@ TEST(HostileXml, DeepNestingIsRefused) {
 }
 
 TEST(HostileXml, AHugeDocumentIsRefused) {
-    expectNothingApplied(document("<url>" + std::string(10U * 1024U * 1024U, 'x') + "</url>"),
-                         "the text is too large");
+    expectNothingApplied(
+        document("<url>" + std::string(std::size_t{10} * 1024 * 1024, 'x') + "</url>"),
+        "the text is too large");
     expectNothingApplied(document(repeat("<url>x</url>", 900000)), "the text is too large");
 }
 

@@ -80,8 +80,9 @@ public final class TalvoxEngine {
 
     /**
      * Changes the engine's settings to what an XML document says under {@code
-     * /startup/features/voice}. What cannot be read there is logged and changes nothing. The values
-     * are not checked. Otherwise as {@link #updateSettings}.
+     * /startup/features/voice}. What cannot be read there is logged and changes nothing; of a
+     * document with an error, what stands before the error counts. The values are not checked.
+     * Otherwise as {@link #updateSettings}.
      */
     public void updateSettingsFromXml(String xml) {
         Objects.requireNonNull(xml, "xml");
