@@ -2,7 +2,7 @@
 
 #include <pocketsphinx.h>
 
-#include <memory>
+#include <algorithm>
 
 #include "pal/kd_log.h"
 
@@ -10,7 +10,12 @@ namespace Gateway {
 
 namespace {
 
-constexpr int MAX_FRAMES_PER_CALL = 32;
+constexpr std::size_t MAX_FRAMES_PER_CALL = 32;
+
+/** Its logarithmic energy is negative; that of any sound is not. */
+bool isDigitalSilence(const float* cepstrum) {
+    return cepstrum[0] < 0;
+}
 
 }  // namespace
 
@@ -19,20 +24,22 @@ CepstralMean::CepstralMean(const SpeechModel& model) {
     if (configuration == nullptr) {
         return;
     }
+    // Its own choice of speech would hide which frame belongs to which sound.
+    cmd_ln_set_boolean_r(configuration, "-remove_silence", FALSE);
     frontEnd = fe_init_auto_r(configuration);
     cmd_ln_free_r(configuration);
     if (frontEnd == nullptr) {
         kdLogFormatMessage("the recogniser's front end cannot be made");
         return;
     }
-    sums.assign(static_cast<std::size_t>(fe_get_output_size(frontEnd)), 0.0);
+    dimensions = static_cast<std::size_t>(fe_get_output_size(frontEnd));
     fe_start_stream(frontEnd);
     fe_start_utt(frontEnd);
 }
 
 CepstralMean::~CepstralMean() {
     if (frontEnd != nullptr) {
-        std::vector<mfcc_t> rest(sums.size());
+        std::vector<mfcc_t> rest(dimensions);
         int32 count = 0;
         fe_end_utt(frontEnd, rest.data(), &count);
         fe_free(frontEnd);
@@ -40,40 +47,64 @@ CepstralMean::~CepstralMean() {
 }
 
 void CepstralMean::add(const int16_t* samples, std::size_t count) {
+    levels.add(samples, count);
     if (frontEnd == nullptr) {
         return;
     }
-    std::vector<mfcc_t> cepstra(sums.size() * MAX_FRAMES_PER_CALL);
+    std::vector<mfcc_t> found(dimensions * MAX_FRAMES_PER_CALL);
     std::vector<mfcc_t*> rows;
     rows.reserve(MAX_FRAMES_PER_CALL);
-    for (int i = 0; i < MAX_FRAMES_PER_CALL; ++i) {
-        rows.push_back(&cepstra[static_cast<std::size_t>(i) * sums.size()]);
+    for (std::size_t i = 0; i < MAX_FRAMES_PER_CALL; ++i) {
+        rows.push_back(&found[i * dimensions]);
     }
     while (count > 0) {
-        int32 found = MAX_FRAMES_PER_CALL;
+        int32 rowCount = MAX_FRAMES_PER_CALL;
         int32 firstFrame = 0;
         const std::size_t before = count;
-        if (fe_process_frames(frontEnd, &samples, &count, rows.data(), &found, &firstFrame) < 0) {
+        if (fe_process_frames(frontEnd, &samples, &count, rows.data(), &rowCount, &firstFrame) <
+            0) {
             return;
         }
-        for (int i = 0; i < found; ++i) {
-            const mfcc_t* frame = rows[static_cast<std::size_t>(i)];
-            // Digital silence has no energy and no meaning.
-            if (frame[0] < 0) {
-                continue;
-            }
-            ++frames;
-            for (std::size_t k = 0; k < sums.size(); ++k) {
-                sums[k] += static_cast<double>(frame[k]);
-            }
+        for (std::size_t i = 0; i < static_cast<std::size_t>(rowCount); ++i) {
+            append(rows[i]);
         }
-        if (count == before && found == 0) {
+        if (count == before && rowCount == 0) {
             return;
         }
     }
 }
 
+void CepstralMean::append(const float* cepstrum) {
+    cepstra.insert(cepstra.end(), cepstrum, cepstrum + dimensions);
+    silent = silent && isDigitalSilence(cepstrum);
+}
+
+std::size_t CepstralMean::countSpeech() const {
+    const double speechLevel = levels.findSpeechLevel();
+    std::size_t frames = 0;
+    for (std::size_t i = 0; speechLevel >= 0 && i < levels.getCount(); ++i) {
+        frames += levels.getLevel(i) >= speechLevel ? 1U : 0U;
+    }
+    return frames;
+}
+
 std::vector<float> CepstralMean::get() const {
+    const double speechLevel = levels.findSpeechLevel();
+    std::vector<double> sums(dimensions);
+    std::size_t frames = 0;
+    // The two differ by the length of a frame: the front end's are longer.
+    const std::size_t available =
+        dimensions == 0 ? 0 : std::min(levels.getCount(), cepstra.size() / dimensions);
+    for (std::size_t i = 0; i < available; ++i) {
+        const float* cepstrum = &cepstra[i * dimensions];
+        if (levels.getLevel(i) < speechLevel || isDigitalSilence(cepstrum)) {
+            continue;
+        }
+        ++frames;
+        for (std::size_t k = 0; k < dimensions; ++k) {
+            sums[k] += static_cast<double>(cepstrum[k]);
+        }
+    }
     std::vector<float> mean;
     if (frames >= MIN_FRAMES) {
         for (const double sum : sums) {

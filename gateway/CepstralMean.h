@@ -4,6 +4,7 @@
 #include <cstdint>
 #include <vector>
 
+#include "gateway/FrameLevels.h"
 #include "gateway/SpeechModel.h"
 
 // Named so by the recogniser's base library.
@@ -12,9 +13,9 @@ struct fe_s;
 namespace Gateway {
 
 /**
- * Mean of the cepstra of the speech in some sound. The recogniser subtracts such a mean from what
- * it hears; measured on the utterance's own beginning, it depends on nothing that was said before
- * and makes the streamed recognition as good as one over the finished utterance.
+ * Mean of the cepstra of the speech in some sound. The decoder subtracts it from the cepstra of an
+ * utterance, which takes the channel out of them: measured on the utterance itself, it depends on
+ * nothing that was said before. Only speech counts: the mean of a pause describes the room.
  */
 class CepstralMean {
   public:
@@ -26,19 +27,31 @@ class CepstralMean {
     CepstralMean(const CepstralMean&) = delete;
     CepstralMean& operator=(const CepstralMean&) = delete;
 
-    /** Takes more of the sound in. */
+    /** Appends sound at 16 kHz. */
     void add(const int16_t* samples, std::size_t count);
 
-    /** Frames of speech, of 10 ms each, that have been found so far. */
-    std::size_t getFrames() const { return frames; }
+    /** True while all sound has been digital silence. */
+    bool isSilent() const { return silent; }
 
-    /** The mean; empty where there is too little speech for one. */
+    /** Frames of speech, one each 10 ms, as far as the sound tells by now; 0 while it is noise. */
+    std::size_t countSpeech() const;
+
+    /**
+     * The mean over all speech so far. Where nothing stands out from the background, all sound
+     * counts but digital silence.
+     * @return empty if there are fewer than `MIN_FRAMES` frames
+     */
     std::vector<float> get() const;
 
   private:
+    void append(const float* cepstrum);
+
     fe_s* frontEnd = nullptr;
-    std::vector<double> sums;
-    std::size_t frames = 0;
+    FrameLevels levels;
+    std::size_t dimensions = 0;
+    /** One after the other, `dimensions` numbers each. */
+    std::vector<float> cepstra;
+    bool silent = true;
 };
 
 }  // namespace Gateway

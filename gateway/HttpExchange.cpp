@@ -35,7 +35,7 @@ Answer refuseMethod(const std::string& reason, const std::string& allowed) {
 }
 
 bool isRecognitionPath(const std::string& path) {
-    return path == "/asrgw" || path == "/asrgw_chunked";
+    return path == RecognitionRequest::WHOLE_PATH || path == RecognitionRequest::STREAMING_PATH;
 }
 
 }  // namespace

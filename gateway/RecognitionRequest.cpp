@@ -195,7 +195,9 @@ std::string RecognitionRequest::beginSound(const MultipartPart& part) {
     soundDecoder = std::make_unique<SoundDecoder>(format, SpeechModel::RATE_HZ);
     // Sound that comes with transcripts is to be logged, not recognised.
     if (!fields.has("transcripts")) {
-        utterance = std::make_unique<Utterance>(pool);
+        const bool streamed = head.path == STREAMING_PATH;
+        utterance = std::make_unique<Utterance>(
+            pool, streamed ? Utterance::Arrival::STREAMED : Utterance::Arrival::WHOLE);
     }
     return std::string();
 }

@@ -35,6 +35,11 @@ struct RequestHead {
  */
 class RecognitionRequest : private MultipartListener {
   public:
+    /** Path of requests whose body arrives while the user speaks. */
+    static constexpr const char* STREAMING_PATH = "/asrgw_chunked";
+    /** Path of requests whose body is complete when it is sent. */
+    static constexpr const char* WHOLE_PATH = "/asrgw";
+
     /**
      * Judges a head.
      * @param[out] boundary the boundary of the body that follows

@@ -6,7 +6,8 @@
 
 namespace Gateway {
 
-Utterance::Utterance(DecoderPool& decoderPool) : pool(decoderPool), mean(pool.getModel()) {}
+Utterance::Utterance(DecoderPool& decoderPool, Arrival soundArrival)
+    : pool(decoderPool), arrival(soundArrival), mean(pool.getModel()) {}
 
 bool Utterance::add(const std::vector<int16_t>& samples) {
     if (total + samples.size() > MAX_SAMPLES) {
@@ -28,7 +29,7 @@ bool Utterance::add(const std::vector<int16_t>& samples) {
 Utterance::Status Utterance::finish(std::vector<Hypothesis>& hypotheses) {
     hypotheses.clear();
     measure(true);
-    if (mean.getFrames() == 0) {
+    if (mean.isSilent()) {
         return Status::DONE;
     }
     if (!decoder && !failed) {
@@ -57,7 +58,7 @@ void Utterance::measure(bool last) {
         }
         mean.add(&sound[measured], count);
         measured += count;
-        measuring = mean.getFrames() < MEAN_FRAMES;
+        measuring = arrival == Arrival::WHOLE || mean.countSpeech() < MEAN_FRAMES;
     }
 }
 

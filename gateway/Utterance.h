@@ -11,12 +11,17 @@
 namespace Gateway {
 
 /**
- * Recognises one utterance while it is still arriving.
+ * Recognises one utterance.
  *
- * The sound goes to the recogniser in pieces of fixed length, however it arrives, so that the
- * answer depends on the sound alone. Its first one and a half seconds of speech are held back to
- * measure their cepstral mean, then decoded, and the rest follows as it comes; all that is left
- * after the last sample is the recogniser's second pass. While all decoders are busy the sound is
+ * The decoder needs the cepstral mean of the speech before it can begin. A whole utterance is
+ * collected and decoded with its own mean when it is complete. A streamed one is decoded while it
+ * arrives: its first one and a half seconds of speech, and the silence or noise before them, are
+ * held back to measure the mean, then decoded, and the rest follows as it comes. Speech that is
+ * shorter than that is decoded like a whole utterance. What is left after the last sample of a
+ * longer one is the decoder's second pass.
+ *
+ * The sound goes to the decoder in pieces of fixed length, however it arrives, so that the answer
+ * depends on the sound and the arrival only. While all decoders are busy the sound is
  * kept, for as long as it arrives, and decoded as soon as one is free.
  */
 class Utterance {
@@ -29,10 +34,14 @@ class Utterance {
     static constexpr std::size_t MAX_SECONDS = 120;
     static constexpr std::size_t MAX_SAMPLES = MAX_SECONDS * SpeechModel::RATE_HZ;
 
+    enum class Arrival { WHOLE, STREAMED };
     enum class Status { DONE, BUSY, FAILED };
 
-    /** @param decoderPool must outlive the utterance */
-    explicit Utterance(DecoderPool& decoderPool);
+    /**
+     * @param decoderPool   must outlive the utterance
+     * @param soundArrival  STREAMED if the speaker may still speak while sound arrives
+     */
+    Utterance(DecoderPool& decoderPool, Arrival soundArrival);
 
     /** Takes more sound, at the recogniser's rate. @return false once the utterance is too long */
     bool add(const std::vector<int16_t>& samples);
@@ -57,6 +66,7 @@ class Utterance {
     void decode(bool last);
 
     DecoderPool& pool;
+    const Arrival arrival;
     CepstralMean mean;
     DecoderPool::Lease decoder;
     std::vector<int16_t> sound;

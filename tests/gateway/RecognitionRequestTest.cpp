@@ -209,6 +209,18 @@ TEST(RecognitionRequest, RefusesForAWhileWhenAllDecodersAreBusy) {
     EXPECT_EQ("go forward ten meters", next.getHypotheses().at(0).text);
 }
 
+TEST(RecognitionRequest, BorrowsADecoderEarlyWhereTheSoundIsStreamed) {
+    Gateway::DecoderPool pool(Gateway::SpeechModel(), 1, 0);
+    const std::string begun = parts(usualFields()) + part("audio", pcm() + pcm(), PCM16K);
+    for (const bool streamed : {true, false}) {
+        RequestHead head = usualHead();
+        head.path = streamed ? "/asrgw_chunked" : "/asrgw";
+        RecognitionRequest request(head, BOUNDARY, pool, MAX_BODY);
+        EXPECT_TRUE(request.write(begun.data(), begun.size()));
+        EXPECT_EQ(streamed, pool.tryAcquire() == nullptr);
+    }
+}
+
 TEST(RecognitionRequest, DropsACanceledUtterance) {
     const std::string body =
         parts(usualFields()) + part("audio", pcm(), PCM16K) + part("canceled", "true") + closing();

@@ -23,9 +23,14 @@ std::string readFile(const std::string& path) {
 }  // namespace
 
 std::vector<int16_t> readRecording(const std::string& name) {
-    const std::string bytes = readFile("/usr/share/pocketsphinx/test/data/" + name);
+    return readSound("/usr/share/pocketsphinx/test/data/" + name);
+}
+
+std::vector<int16_t> readSound(const std::string& path) {
+    const std::string bytes = readFile(path);
+    const std::size_t data = bytes.compare(0, 4, "RIFF") == 0 ? bytes.find("data") + 8 : 0;
     std::vector<int16_t> samples;
-    for (std::size_t i = 0; i + 1 < bytes.size(); i += 2) {
+    for (std::size_t i = data; i + 1 < bytes.size(); i += 2) {
         const unsigned low = static_cast<unsigned char>(bytes[i]);
         const unsigned high = static_cast<unsigned char>(bytes[i + 1]);
         samples.push_back(static_cast<int16_t>(static_cast<uint16_t>(low | (high << 8U))));

@@ -10,6 +10,9 @@
 
 namespace GatewayTest {
 
+/** Samples of a file of 16-bit mono sound, raw or WAV. Throws when it cannot be read. */
+std::vector<int16_t> readSound(const std::string& path);
+
 /** Samples of a recording of the pocketsphinx-testdata package, 16 kHz mono. Throws without it. */
 std::vector<int16_t> readRecording(const std::string& name);
 

@@ -13,8 +13,9 @@ using GatewayTest::sharedPool;
 using Samples = std::vector<int16_t>;
 
 std::vector<Hypothesis> recognise(Gateway::DecoderPool& pool, const Samples& samples,
-                                  std::size_t piece) {
-    Utterance utterance(pool);
+                                  std::size_t piece,
+                                  Utterance::Arrival arrival = Utterance::Arrival::STREAMED) {
+    Utterance utterance(pool, arrival);
     for (std::size_t i = 0; i < samples.size(); i += piece) {
         EXPECT_TRUE(
             utterance.add(Samples(&samples[i], &samples[i] + std::min(piece, samples.size() - i))));
@@ -26,6 +27,14 @@ std::vector<Hypothesis> recognise(Gateway::DecoderPool& pool, const Samples& sam
 
 std::vector<Hypothesis> recognise(const std::string& recording, std::size_t piece = 1600) {
     return recognise(sharedPool(), GatewayTest::readRecording(recording), piece);
+}
+
+/** More speech than the mean of a streamed utterance is measured over. */
+Samples longSpeech() {
+    Samples samples = GatewayTest::readRecording("something.raw");
+    const Samples more = GatewayTest::readRecording("goforward.raw");
+    samples.insert(samples.end(), more.begin(), more.end());
+    return samples;
 }
 
 void expectSame(const std::vector<Hypothesis>& expected, const std::vector<Hypothesis>& actual) {
@@ -80,28 +89,32 @@ TEST(Utterance, IsNotInfluencedByOneThatWasAbandoned) {
     Gateway::DecoderPool pool(Gateway::SpeechModel(), 1);
     const Samples a = GatewayTest::readRecording("goforward.raw");
     const std::vector<Hypothesis> fresh = recognise(pool, a, 1600);
-    Samples loud = GatewayTest::readRecording("something.raw");
+    Samples loud = longSpeech();
     for (int16_t& sample : loud) {
         sample = static_cast<int16_t>(sample * 2 / 3);
     }
     {
-        Utterance abandoned(pool);
+        Utterance abandoned(pool, Utterance::Arrival::STREAMED);
         EXPECT_TRUE(abandoned.add(loud));
         EXPECT_GT(abandoned.getDecodeMs(), 0U);
     }
     expectSame(fresh, recognise(pool, a, 1600));
 }
 
-TEST(Utterance, GivesTheSameAnswerHoweverTheSoundArrives) {
-    const std::vector<Hypothesis> expected = recognise("goforward.raw", 1600);
-    for (const std::size_t piece : {97U, 1599U, 5000U, 1000000U}) {
-        expectSame(expected, recognise("goforward.raw", piece));
+TEST(Utterance, GivesTheSameAnswerWhateverThePieces) {
+    const Samples samples = longSpeech();
+    for (const Utterance::Arrival arrival :
+         {Utterance::Arrival::STREAMED, Utterance::Arrival::WHOLE}) {
+        const std::vector<Hypothesis> expected = recognise(sharedPool(), samples, 1600, arrival);
+        for (const std::size_t piece : {97U, 5000U, 1000000U}) {
+            expectSame(expected, recognise(sharedPool(), samples, piece, arrival));
+        }
     }
 }
 
-TEST(Utterance, DecodesWhileTheSoundArrives) {
-    const Samples samples = GatewayTest::readRecording("something.raw");
-    Utterance utterance(sharedPool());
+TEST(Utterance, DecodesAStreamedOneWhileItArrives) {
+    const Samples samples = longSpeech();
+    Utterance utterance(sharedPool(), Utterance::Arrival::STREAMED);
     EXPECT_TRUE(utterance.add(Samples(samples.begin(), samples.begin() + 16000)));
     EXPECT_EQ(0U, utterance.getDecodeMs());
     EXPECT_TRUE(utterance.add(Samples(samples.begin() + 16000, samples.end())));
@@ -109,6 +122,28 @@ TEST(Utterance, DecodesWhileTheSoundArrives) {
     std::vector<Hypothesis> hypotheses;
     EXPECT_EQ(Utterance::Status::DONE, utterance.finish(hypotheses));
     EXPECT_EQ(samples.size() / 16, utterance.getDurationMs());
+}
+
+TEST(Utterance, DecodesAStreamedOneWithLittleSpeechAsAWhole) {
+    const Samples samples = GatewayTest::readRecording("cards/002.wav");
+    Utterance utterance(sharedPool(), Utterance::Arrival::STREAMED);
+    EXPECT_TRUE(utterance.add(samples));
+    EXPECT_EQ(0U, utterance.getDecodeMs());
+    std::vector<Hypothesis> hypotheses;
+    EXPECT_EQ(Utterance::Status::DONE, utterance.finish(hypotheses));
+    ASSERT_FALSE(hypotheses.empty());
+    expectSame(recognise(sharedPool(), samples, 1600, Utterance::Arrival::WHOLE), hypotheses);
+}
+
+TEST(Utterance, DecodesAWholeOneWhenItIsComplete) {
+    Utterance utterance(sharedPool(), Utterance::Arrival::WHOLE);
+    EXPECT_TRUE(utterance.add(longSpeech()));
+    EXPECT_EQ(0U, utterance.getDecodeMs());
+    std::vector<Hypothesis> hypotheses;
+    EXPECT_EQ(Utterance::Status::DONE, utterance.finish(hypotheses));
+    EXPECT_GT(utterance.getDecodeMs(), 0U);
+    ASSERT_FALSE(hypotheses.empty());
+    EXPECT_EQ(0U, hypotheses[0].text.find("go somewhere and do something"));
 }
 
 TEST(Utterance, UnderstandsNothingInSilence) {
@@ -120,14 +155,13 @@ TEST(Utterance, UnderstandsNothingInSilence) {
 TEST(Utterance, UnderstandsShortWords) {
     // Less speech than the cepstral mean is measured over.
     const Samples samples = GatewayTest::readRecording("cards/001.wav");
-    const std::vector<Hypothesis> hypotheses =
-        recognise(sharedPool(), Samples(samples.begin() + 22, samples.end()), 1600);
+    const std::vector<Hypothesis> hypotheses = recognise(sharedPool(), samples, 1600);
     ASSERT_FALSE(hypotheses.empty());
     EXPECT_EQ("ten of clubs", hypotheses[0].text);
 }
 
 TEST(Utterance, EndsWhereTheRecogniserWould) {
-    Utterance utterance(sharedPool());
+    Utterance utterance(sharedPool(), Utterance::Arrival::STREAMED);
     const Samples second(16000, 0);
     for (std::size_t i = 0; i < Utterance::MAX_SECONDS; ++i) {
         ASSERT_TRUE(utterance.add(second));
@@ -142,7 +176,7 @@ TEST(Utterance, CatchesUpOnceARecogniserIsFree) {
     const std::vector<Hypothesis> expected = recognise(pool, samples, 1600);
     Gateway::DecoderPool::Lease other = pool.tryAcquire();
     ASSERT_TRUE(other);
-    Utterance utterance(pool);
+    Utterance utterance(pool, Utterance::Arrival::STREAMED);
     EXPECT_TRUE(utterance.add(samples));
     EXPECT_EQ(0U, utterance.getDecodeMs());
     other.reset();
@@ -154,7 +188,7 @@ TEST(Utterance, CatchesUpOnceARecogniserIsFree) {
 TEST(Utterance, GetsNoRecogniserFromAClosedPool) {
     Gateway::DecoderPool pool(Gateway::SpeechModel(), 1);
     pool.close();
-    Utterance utterance(pool);
+    Utterance utterance(pool, Utterance::Arrival::STREAMED);
     EXPECT_TRUE(utterance.add(GatewayTest::readRecording("goforward.raw")));
     std::vector<Hypothesis> hypotheses;
     EXPECT_EQ(Utterance::Status::BUSY, utterance.finish(hypotheses));
