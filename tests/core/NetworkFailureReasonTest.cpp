@@ -1,4 +1,5 @@
 #include "NetworkFixture.h"
+#include "network/FailureText.h"
 
 using TestSupport::Answer;
 
@@ -107,13 +108,18 @@ TEST_F(NetworkFailureReasonTest, HoldsNoneOfThePeersControlCharacters) {
     EXPECT_EQ("HTTP status 404", get(server.getUrl()));
 }
 
-TEST_F(NetworkFailureReasonTest, IsOneShortPrintableLine) {
-    const std::string reason = get("http://" + std::string(150, 'n') + "\xC3\xA4\xFF.invalid:1");
-    EXPECT_LE(reason.size(), 200U);
-    EXPECT_FALSE(reason.empty());
-    for (const char c : reason) {
-        EXPECT_TRUE(c >= ' ' && c <= '~') << reason;
-    }
+TEST_F(NetworkFailureReasonTest, IsCut) {
+    const std::string label(60, 'n');
+    const std::string reason =
+        get("http://" + label + '.' + label + '.' + label + ".example.invalid");
+    EXPECT_EQ("Could not resolve host: " + label, reason.substr(0, 84));
+    EXPECT_EQ(200U, reason.size());
+}
+
+TEST(NetworkFailureText, IsOnePrintableLine) {
+    EXPECT_EQ("a??b????~ c", Network::makeReason("a\r\nb\x1B\x7F\xFF\x80~ c"));
+    EXPECT_EQ(std::string(200, 'x'), Network::makeReason(std::string(1000, 'x')));
+    EXPECT_EQ("", Network::makeReason(""));
 }
 
 }  // namespace
