@@ -1,9 +1,10 @@
 #include "core/util/XmlUtils.h"
 
 #include <gtest/gtest.h>
+#include <iconv.h>
 #include <tinyxml.h>
 
-#include <iconv.h>
+#include <cstdint>
 #include <random>
 #include <thread>
 
@@ -172,7 +173,7 @@ TEST(XmlUtils, BoundsTheSize) {
     EXPECT_EQ("", XmlUtils::findHazard(fitting));
     EXPECT_TRUE(loads(fitting));
     EXPECT_EQ("the text is too large", XmlUtils::findHazard(fitting + " "));
-    EXPECT_FALSE(loads(std::string(10 * 1024 * 1024, '<')));
+    EXPECT_FALSE(loads(std::string(10 * XmlUtils::MAX_SIZE_BYTES, '<')));
 }
 
 TEST(XmlUtils, BoundsTheDepth) {
@@ -387,7 +388,7 @@ TEST(XmlUtilsUsable, TellsOfTheFirstUnknownEntity) {
 /** A text of an encoding in UTF-8 by the C library's tables; empty where it has no character. */
 std::string convert(const char* encoding, char byte) {
     const iconv_t conversion = iconv_open("UTF-8", encoding);
-    EXPECT_NE(reinterpret_cast<iconv_t>(-1), conversion) << encoding;
+    EXPECT_NE(-1, reinterpret_cast<std::intptr_t>(conversion)) << encoding;
     char* in = &byte;
     std::size_t inLeft = 1;
     char converted[8];
@@ -454,7 +455,7 @@ TEST(XmlUtilsUsable, BelievesTheBytesRatherThanTheDeclaration) {
          {"<?xml version='1.0' encoding='UTF-8'?>", "<?xml version='1.0' encoding='Shift_JIS'?>",
           "<?xml version='1.0' encoding='ISO-8859-1?>", "<?xml version='1.0'?>",
           "<!-- encoding='ISO-8859-1' ?> -->", " <?xml version='1.0' encoding='ISO-8859-1'?>"}) {
-        EXPECT_EQ(std::string::npos, usableOf(declaration + "<r><a/>\xE4</r>", fault).find("\xC3"));
+        EXPECT_EQ(std::string::npos, usableOf(declaration + "<r><a/>\xE4</r>", fault).find('\xC3'));
         EXPECT_NE("", fault) << declaration;
     }
 }
