@@ -1,75 +1,72 @@
 #include "AudioFile.h"
 
-#include <sndfile.h>
 #include <sys/stat.h>
 
-#include <algorithm>
+#include <array>
 #include <cerrno>
-#include <cmath>
 #include <cstring>
-#include <memory>
+#include <fstream>
+#include <optional>
 
-#include "UsageError.h"
+#include "SoundDecoder.h"
+#include "WavHead.h"
 
 namespace Cli {
 
 namespace {
 
-const float FULL_SCALE = 32768.0f;
-const int RATE_MIN_HZ = 1000;
-const int RATE_MAX_HZ = 768000;
-const std::size_t BLOCK_SAMPLES = 65536;
-
-using SoundFile = std::unique_ptr<SNDFILE, int (*)(SNDFILE*)>;
-
-[[noreturn]] void refuse(const std::string& path, const std::string& reason) {
-    throw UsageError("cannot read " + path + ": " + reason);
-}
+// Less than a buffer of a session; the lengths of MPEG files are estimates.
+const double TOLERATED_LOSS_S = 0.1;
 
 void checkIsFile(const std::string& path) {
     struct stat status = {};
     if (stat(path.c_str(), &status) != 0) {
-        refuse(path, std::strerror(errno));
+        refuseSound(path, std::strerror(errno));
     }
     if (S_ISDIR(status.st_mode)) {
-        refuse(path, "it is a directory");
+        refuseSound(path, "it is a directory");
     }
     if (S_ISREG(status.st_mode) && status.st_size == 0) {
-        refuse(path, "the file is empty");
+        refuseSound(path, "the file is empty");
     }
 }
 
-/** libsndfile ends some of its messages with a full stop and some with none. */
-std::string plainReason(const char* message) {
-    std::string reason(message);
-    while (!reason.empty() && (reason.back() == '.' || reason.back() == '\n')) {
-        reason.pop_back();
-    }
-    std::replace(reason.begin(), reason.end(), '\n', ' ');
-    return reason;
+bool endsWith(const std::string& text, const std::string& tail) {
+    return text.size() >= tail.size() &&
+           text.compare(text.size() - tail.size(), tail.size(), tail) == 0;
 }
 
-SoundFile openSoundFile(const std::string& path, SF_INFO& info) {
-    SoundFile file(sf_open(path.c_str(), SFM_READ, &info), &sf_close);
-    if (!file) {
-        refuse(path, sf_error(nullptr) == SF_ERR_UNRECOGNISED_FORMAT
-                         ? "it is not sound of a known format"
-                         : plainReason(sf_strerror(nullptr)));
-    }
-    if (info.samplerate < RATE_MIN_HZ || info.samplerate > RATE_MAX_HZ) {
-        refuse(path,
-               "its sample rate of " + std::to_string(info.samplerate) + " Hz is out of range");
-    }
-    return file;
+bool isSpeex(const std::string& path) {
+    std::array<char, 36> begin = {};
+    std::ifstream(path, std::ios::binary).read(begin.data(), begin.size());
+    return std::memcmp(begin.data(), "OggS", 4) == 0 &&
+           std::memcmp(begin.data() + 28, "Speex   ", 8) == 0;
 }
 
-float mixDown(const float* frame, int channels) {
-    float sum = 0.0f;
-    for (int channel = 0; channel < channels; ++channel) {
-        sum += frame[channel];
+/** Why libsndfile refused a file, and what the user can do instead. */
+std::string explainRefusal(const std::string& path) {
+    if (isSpeex(path)) {
+        return "it is Ogg Speex; decode it first, as with speexdec FILE.spx FILE.wav";
     }
-    const float sample = sum / static_cast<float>(channels) * FULL_SCALE;
-    return std::isfinite(sample) ? sample : 0.0f;
+    if (sf_error(nullptr) != SF_ERR_UNRECOGNISED_FORMAT) {
+        return plainReason(sf_strerror(nullptr));
+    }
+    const bool isRaw = endsWith(path, ".raw") || endsWith(path, ".pcm");
+    return std::string("it is not sound of a known format") +
+           (isRaw ? "; pipe raw sound as with --file - --rate HZ < FILE" : "");
+}
+
+void warnOfLoss(const std::string& path, const SF_INFO& info, const AudioClip& clip) {
+    const double promisedS = static_cast<double>(info.frames) / info.samplerate;
+    if (info.frames < SF_COUNT_MAX && promisedS - clip.lengthS() > TOLERATED_LOSS_S) {
+        warnOfCut(path, clip.lengthS(), promisedS);
+    }
+    std::ifstream file(path, std::ios::binary);
+    if (const std::optional<WavHead> head = readWavHead(file)) {
+        file.clear();
+        file.seekg(0, std::ios::end);
+        warnOfCutWav(path, *head, static_cast<std::uint64_t>(file.tellg()), clip);
+    }
 }
 
 }  // namespace
@@ -77,52 +74,16 @@ float mixDown(const float* frame, int channels) {
 AudioClip readAudioFile(const std::string& path) {
     checkIsFile(path);
     SF_INFO info = {};
-    const SoundFile file = openSoundFile(path, info);
-    const std::size_t channels = static_cast<std::size_t>(info.channels);
-    const std::size_t maxSamples =
-        static_cast<std::size_t>(info.samplerate) * static_cast<std::size_t>(MAX_CLIP_SECONDS);
-
-    AudioClip clip;
-    clip.sampleRateHz = info.samplerate;
-    const std::size_t blockFrames = std::max<std::size_t>(1, BLOCK_SAMPLES / channels);
-    std::vector<float> block(blockFrames * channels);
-    for (;;) {
-        const sf_count_t frames =
-            sf_readf_float(file.get(), block.data(), static_cast<sf_count_t>(blockFrames));
-        if (frames <= 0) {
-            break;
-        }
-        for (std::size_t frame = 0; frame < static_cast<std::size_t>(frames); ++frame) {
-            clip.samples.push_back(mixDown(&block[frame * channels], info.channels));
-        }
-        if (clip.samples.size() > maxSamples) {
-            refuse(path, "it holds more than an hour of sound");
-        }
+    const SoundFile file(sf_open(path.c_str(), SFM_READ, &info), &sf_close);
+    if (!file) {
+        refuseSound(path, explainRefusal(path));
     }
-    if (clip.samples.empty()) {
-        refuse(path, "it holds no sound");
+    const std::size_t maxSamples = samplesIn(MAX_CLIP_SECONDS, info.samplerate);
+    AudioClip clip = decodeSound(file.get(), info, path, maxSamples);
+    if (clip.samples.size() > maxSamples) {
+        refuseSound(path, "it holds more than an hour of sound");
     }
-    return clip;
-}
-
-AudioClip readRawAudio(std::istream& in, int sampleRateHz, std::size_t maxSamples) {
-    AudioClip clip;
-    clip.sampleRateHz = sampleRateHz;
-    std::vector<char> block(BLOCK_SAMPLES * 2);
-    while (in && clip.samples.size() < maxSamples) {
-        const std::size_t wanted = std::min(BLOCK_SAMPLES, maxSamples - clip.samples.size());
-        in.read(block.data(), static_cast<std::streamsize>(wanted * 2));
-        const std::size_t samples = static_cast<std::size_t>(in.gcount()) / 2;
-        for (std::size_t index = 0; index < samples; ++index) {
-            const unsigned low = static_cast<unsigned char>(block[index * 2]);
-            const unsigned high = static_cast<unsigned char>(block[index * 2 + 1]);
-            const int value = static_cast<int>(low | (high << 8U));
-            clip.samples.push_back(static_cast<float>(value < 0x8000 ? value : value - 0x10000));
-        }
-    }
-    if (clip.samples.empty()) {
-        throw UsageError("cannot read standard input: it holds no sound");
-    }
+    warnOfLoss(path, info, clip);
     return clip;
 }
 

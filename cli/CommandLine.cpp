@@ -122,8 +122,8 @@ CLI::App* addRecognize(CLI::App& app, RecognizeOptions& options) {
     CLI::Option* file =
         command
             ->add_option("--file", options.file,
-                         "Sound file to play, at its own pace; \"-\" reads raw 16-bit "
-                         "little-endian mono sound from standard input, at most a minute")
+                         "Sound file to play, at its own pace; \"-\" reads a WAV file or raw "
+                         "16-bit little-endian mono sound from standard input, at most a minute")
             ->type_name("FILE");
     command
         ->add_flag("--mic", options.microphone,
@@ -135,7 +135,8 @@ CLI::App* addRecognize(CLI::App& app, RecognizeOptions& options) {
     addRate(*command, options.settings);
     addSettingsSources(*command, options.settings);
     addSetting(*command, options.settings, Settings::SKS_VERBOSE_LEVEL, "--verbosity",
-               "How much the engine logs to standard error, 0 (nothing) to 10 [0]")
+               "How much the engine logs to standard error, 0 to 10; with 0 only warnings about "
+               "settings and sound appear [0]")
         ->type_name("N")
         ->check(CLI::Range(0, 10).description(""));
     command
@@ -169,8 +170,8 @@ CLI::App* addVadCommand(CLI::App& app, VadOptions& options) {
     CLI::App* command = app.add_subcommand("vad", "Show what the speech detector decides");
     command
         ->add_option("--file", options.file,
-                     "Sound file; \"-\" reads raw 16-bit little-endian mono sound from standard "
-                     "input")
+                     "Sound file; \"-\" reads a WAV file or raw 16-bit little-endian mono sound "
+                     "from standard input, at most an hour")
         ->type_name("FILE")
         ->required();
     addLeadInOption(*command, options.leadInMs);

@@ -124,18 +124,18 @@ std::vector<SettingsOptions::Assignment> recognizeDefaults() {
 }
 
 int runRecognize(const RecognizeOptions& options, Console& console, LogOutput& log) {
-    // What is wrong in a settings document is the user's to know in any case.
+    // The user gets the warnings about the settings and the sound in any case.
     log.show(true);
     const boost::shared_ptr<Talvox::Settings> settings = buildSettings(options.settings);
     checkRequestSettings(*settings);
     warnOfVadMistakes(*settings, console.err);
-    log.show(settings->getInt(Talvox::Settings::SKS_VERBOSE_LEVEL) > 0);
     if (!options.dumpDirectory.empty()) {
         mountDump(options.dumpDirectory);
     }
     if (!options.microphone) {
         installPlayer(options, settings->getSampleRate(), console.in);
     }
+    log.show(settings->getInt(Talvox::Settings::SKS_VERBOSE_LEVEL) > 0);
 
     std::ofstream eventsFile;
     PrinterList printers;

@@ -1,6 +1,7 @@
 #include "SoundInput.h"
 
 #include "AudioFile.h"
+#include "AudioStream.h"
 #include "ClipSamples.h"
 #include "UsageError.h"
 
@@ -24,9 +25,7 @@ std::vector<int16_t> loadSound(const std::string& path, std::istream& input, int
     if (path != STANDARD_INPUT) {
         return toSamples(readAudioFile(path), sampleRateHz);
     }
-    const std::size_t maxSamples =
-        static_cast<std::size_t>(sampleRateHz) * static_cast<std::size_t>(maxSeconds);
-    return toSamples(readRawAudio(input, sampleRateHz, maxSamples), sampleRateHz);
+    return toSamples(readAudioStream(input, sampleRateHz, maxSeconds), sampleRateHz);
 }
 
 void addLeadIn(std::vector<int16_t>& samples, int sampleRateHz, int milliseconds) {

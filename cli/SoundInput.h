@@ -7,12 +7,12 @@
 
 namespace Cli {
 
-/** The name that stands for raw sound on standard input. */
+/** The name that stands for sound on standard input. */
 extern const char* const STANDARD_INPUT;
 
 /**
- * The sound of a file, or raw sound from `input` when `path` is `STANDARD_INPUT`, as 16-bit mono
- * samples at the engine's rate.
+ * The sound of a file, or a WAV file or raw sound from `input` when `path` is `STANDARD_INPUT`, as
+ * 16-bit mono samples at the engine's rate. The log says when a file is cut.
  * @param maxSeconds the most to take from standard input
  * @throws UsageError when there is no sound to be had or the rate is out of the engine's range
  */

@@ -130,13 +130,14 @@ void readFile(Input& input) {
     }
 }
 
-/** What the command-line tool does with raw sound on standard input. */
-void readRaw(Input& input) {
+/** What the command-line tool does with standard input: raw sound, unless it is a WAV file. */
+void readStream(Input& input) {
     const int rate = takeNumber(input);
     const std::string bytes = input.takeRest();
     std::istringstream stream(bytes);
     try {
-        require(Cli::loadSound(Cli::STANDARD_INPUT, stream, rate, 1) == toSamples(bytes),
+        const Samples samples = Cli::loadSound(Cli::STANDARD_INPUT, stream, rate, 1);
+        require(samples == toSamples(bytes) || bytes.compare(0, 4, "RIFF") == 0,
                 "raw sound is read as it is");
         require(rate >= 8000 && rate <= 44100, "the engine's rates are accepted");
     } catch (const Cli::UsageError& refused) {
@@ -351,7 +352,7 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, std::size_t size) {
     Input input(data, size);
     switch (input.takeBelow(8)) {
         case 0:
-            readRaw(input);
+            readStream(input);
             break;
         case 1:
             writeWav(input);

@@ -3,10 +3,9 @@
 #include <gmock/gmock.h>
 #include <sndfile.h>
 
-#include <sstream>
-
 #include "SoundFiles.h"
 #include "cli/UsageError.h"
+#include "support/LogCapture.h"
 #include "support/ScratchDirectory.h"
 
 namespace {
@@ -15,8 +14,12 @@ using Cli::AudioClip;
 using Cli::readAudioFile;
 using ::testing::Each;
 using ::testing::ElementsAre;
+using ::testing::EndsWith;
 using ::testing::FloatNear;
+using ::testing::IsEmpty;
+using ::testing::MatchesRegex;
 using ::testing::StartsWith;
+using TestSupport::LogCapture;
 using TestSupport::ScratchDirectory;
 using TestSupport::sine;
 using TestSupport::writeSoundFile;
@@ -96,15 +99,79 @@ TEST(AudioFile, ReadsOtherContainers) {
     EXPECT_EQ(readAudioFile(flac).samples.size(), 11025U);
 }
 
-TEST(AudioFile, GivesTheSoundThatIsLeftOfATruncatedFile) {
+TEST(AudioFile, GivesTheSoundThatIsLeftOfACutFileAndSaysSo) {
+    const LogCapture log;
+    const ScratchDirectory directory;
+    const std::string whole = directory.path("whole.wav");
+    ASSERT_TRUE(writeSoundFile(whole, WAV, 16000, 1, std::vector<int16_t>(1600, 7)));
+    const std::string bytes = ScratchDirectory::read(whole);
+    ASSERT_EQ(bytes.size(), 44U + 3200U);
+    EXPECT_EQ(readAudioFile(whole).samples.size(), 1600U);
+    EXPECT_THAT(log.messages(), IsEmpty());
+    const std::string cut = directory.write("cut.wav", bytes.substr(0, 44 + 1600));
+    const AudioClip clip = readAudioFile(cut);
+    EXPECT_EQ(clip.samples.size(), 800U);
+    EXPECT_THAT(clip.samples, Each(7));
+    EXPECT_THAT(log.messages(), ElementsAre(cut + " is cut: it holds 0.050 s of the 0.100 s that "
+                                                  "it promises"));
+}
+
+TEST(AudioFile, TakesThePlaceholderOfAWriterIntoAPipeForNoLength) {
+    const LogCapture log;
     const ScratchDirectory directory;
     const std::string whole = directory.path("whole.wav");
     ASSERT_TRUE(writeSoundFile(whole, WAV, 16000, 1, std::vector<int16_t>(1000, 7)));
-    const std::string bytes = ScratchDirectory::read(whole);
-    ASSERT_EQ(bytes.size(), 44U + 2000U);
-    const AudioClip clip = readAudioFile(directory.write("cut.wav", bytes.substr(0, 44 + 401)));
-    EXPECT_EQ(clip.samples.size(), 200U);
-    EXPECT_THAT(clip.samples, Each(7));
+    for (const char* const placeholder : {"\xFF\xFF\xFF\xFF", "\xFF\xFF\xFF\x7F"}) {
+        std::string bytes = ScratchDirectory::read(whole);
+        bytes.replace(4, 4, placeholder, 4);
+        bytes.replace(40, 4, placeholder, 4);
+        EXPECT_EQ(readAudioFile(directory.write("open.wav", bytes)).samples.size(), 1000U);
+    }
+    EXPECT_THAT(log.messages(), IsEmpty());
+}
+
+TEST(AudioFile, RefusesAFileThatCannotBeReadToItsEnd) {
+    const ScratchDirectory directory;
+    const std::string whole = directory.path("whole.flac");
+    ASSERT_TRUE(writeSoundFile(whole, SF_FORMAT_FLAC | SF_FORMAT_PCM_16, 16000, 1, sine(16000, 3)));
+    std::string bytes = ScratchDirectory::read(whole);
+    bytes.resize(bytes.size() / 2);
+    const std::string path = directory.write("half.flac", bytes);
+    EXPECT_THAT(refusal(path), MatchesRegex("cannot read " + path +
+                                            ": only its first 1\\.[0-9]+ s can be read: flac "
+                                            "decoder lost sync"));
+}
+
+TEST(AudioFile, SaysWhatToDoWithSpeexAndRawSound) {
+    const ScratchDirectory directory;
+    std::string page = "OggS";
+    page.resize(28, '\0');
+    const std::string speex = directory.write("a.spx", page + "Speex   1.2.1");
+    EXPECT_EQ(refusal(speex), "cannot read " + speex +
+                                  ": it is Ogg Speex; decode it first, as with speexdec FILE.spx "
+                                  "FILE.wav");
+    for (const char* const name : {"a.raw", "a.pcm"}) {
+        const std::string raw = directory.write(name, TestSupport::rawBytes(sine(16000, 0.1)));
+        EXPECT_EQ(refusal(raw), "cannot read " + raw +
+                                    ": it is not sound of a known format; pipe raw sound as with "
+                                    "--file - --rate HZ < FILE");
+    }
+}
+
+TEST(AudioFile, SaysWhenFramesOfACompressedFileAreMissing) {
+    const LogCapture log;
+    const ScratchDirectory directory;
+    const std::string whole = directory.path("whole.mp3");
+    ASSERT_TRUE(
+        writeSoundFile(whole, SF_FORMAT_MPEG | SF_FORMAT_MPEG_LAYER_III, 16000, 1, sine(16000, 3)));
+    EXPECT_EQ(readAudioFile(whole).samples.size(), 48000U);
+    EXPECT_THAT(log.messages(), IsEmpty());
+    std::string bytes = ScratchDirectory::read(whole);
+    bytes.resize(bytes.size() / 2);
+    const AudioClip clip = readAudioFile(directory.write("cut.mp3", bytes));
+    EXPECT_LT(clip.samples.size(), 32000U);
+    ASSERT_EQ(log.messages().size(), 1U);
+    EXPECT_THAT(log.messages().front(), EndsWith(" of the 3.000 s that it promises"));
 }
 
 TEST(AudioFile, RefusesAFileThatIsCutInItsHeader) {
@@ -147,31 +214,6 @@ TEST(AudioFile, RefusesAnAbsurdSampleRate) {
     const std::string path = directory.path("slow.wav");
     ASSERT_TRUE(writeSoundFile(path, WAV, 10, 1, {1, 2, 3}));
     EXPECT_EQ(refusal(path), "cannot read " + path + ": its sample rate of 10 Hz is out of range");
-}
-
-TEST(RawAudio, ReadsSignedLittleEndianSamples) {
-    std::istringstream in(std::string("\x01\x00\xFF\xFF\x00\x80\xFF\x7F", 8));
-    const AudioClip clip = Cli::readRawAudio(in, 8000, 100);
-    EXPECT_EQ(clip.sampleRateHz, 8000);
-    EXPECT_THAT(clip.samples, ElementsAre(1, -1, -32768, 32767));
-}
-
-TEST(RawAudio, DropsAnOddByteAtTheEnd) {
-    std::istringstream in(std::string("\x01\x00\x02", 3));
-    EXPECT_THAT(Cli::readRawAudio(in, 8000, 100).samples, ElementsAre(1));
-}
-
-TEST(RawAudio, TakesNoMoreThanAskedFor) {
-    std::istringstream in(std::string(1000, '\1'));
-    EXPECT_EQ(Cli::readRawAudio(in, 8000, 7).samples.size(), 7U);
-    EXPECT_EQ(in.tellg(), std::istringstream::pos_type(14));
-}
-
-TEST(RawAudio, RefusesAnEmptyStream) {
-    std::istringstream in("");
-    EXPECT_THROW(Cli::readRawAudio(in, 8000, 100), Cli::UsageError);
-    std::istringstream oneByte("x");
-    EXPECT_THROW(Cli::readRawAudio(oneByte, 8000, 100), Cli::UsageError);
 }
 
 }  // namespace
