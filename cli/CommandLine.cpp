@@ -39,6 +39,19 @@ struct Arguments {
     LogOptions log;
 };
 
+/** Refuses an empty text, which otherwise would stand for an option that is not given. */
+std::string checkNotEmpty(const std::string& text) {
+    return text.empty() ? "the text is empty" : "";
+}
+
+/** Adds an option that names a file or a directory. */
+CLI::Option* addPath(CLI::App& command, const std::string& name, std::string& path,
+                     const std::string& type, const std::string& help) {
+    return command.add_option(name, path, help)
+        ->type_name(type)
+        ->check(CLI::Validator(checkNotEmpty, ""));
+}
+
 /** Adds an option that stands for one setting. */
 CLI::Option* addSetting(CLI::App& command, SettingsOptions& settings, const std::string& key,
                         const std::string& name, const std::string& help) {
@@ -139,23 +152,19 @@ CLI::App* addRecognize(CLI::App& app, RecognizeOptions& options) {
                "settings and sound appear [0]")
         ->type_name("N")
         ->check(CLI::Range(0, 10).description(""));
-    command
-        ->add_option("--dump", options.dumpDirectory,
-                     "Directory in which the session leaves what it heard, as in.wav")
-        ->type_name("DIR");
+    addPath(*command, "--dump", options.dumpDirectory, "DIR",
+            "Directory in which the session leaves what it heard, as in.wav");
     command->add_flag("--json", options.json, "Print every event as one JSON object a line");
-    command
-        ->add_option("--events", options.eventsFile,
-                     "File to which every event is written as with --json, whatever is printed")
-        ->type_name("FILE");
+    addPath(*command, "--events", options.eventsFile, "FILE",
+            "File to which every event is written as with --json, whatever is printed");
     command->footer(
         "Settings are applied in this order: defaults, --settings, --set, the other options.\n"
         "Levels are " +
         levelReference(false) + "; with sessionmode=general,\n" + levelReference(true) +
         ". \"talvox vad --help\" lists the parameters of --vad.\n"
         "Ctrl-C cancels; a second Ctrl-C leaves at once.\n"
-        "Exit status: 0 results were delivered, 1 the recognition ended in an error,\n"
-        "2 wrong usage or unreadable input.");
+        "Exit status: 0 results were delivered, 1 the recognition ended in an error or an output\n"
+        "could not be written, 2 wrong usage or unreadable input.");
     return command;
 }
 

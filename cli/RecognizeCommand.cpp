@@ -1,16 +1,15 @@
 #include "RecognizeCommand.h"
 
-#include <sys/stat.h>
-#include <unistd.h>
-
 #include <boost/make_shared.hpp>
 #include <cerrno>
 #include <cstring>
 #include <fstream>
 #include <memory>
+#include <optional>
 #include <random>
 
 #include "Address.h"
+#include "Dump.h"
 #include "ExitStatus.h"
 #include "HumanEvents.h"
 #include "Interrupts.h"
@@ -23,7 +22,6 @@
 #include "VadWarnings.h"
 #include "core/sound/FileRecorder.h"
 #include "core/sound/Recorder.h"
-#include "pal/kd_file.h"
 #include "talvox/Settings.h"
 #include "talvox/SpeechError.h"
 
@@ -34,8 +32,6 @@ namespace {
 const char* const URL_DFLT = "http://127.0.0.1:8090";
 const char* const LANGUAGE_DFLT = "en-US";
 const int UUID_LENGTH = 32;
-// The root below which a session dumps its sound.
-const char* const DUMP_ROOT = "/removable";
 // A session takes 20 s of sound; standard input may be a pipe that never ends.
 const int STANDARD_INPUT_MAX_SECONDS = 60;
 
@@ -48,20 +44,6 @@ std::string makeUuid() {
         uuid += DIGITS[digit(random)];
     }
     return uuid;
-}
-
-void mountDump(const std::string& directory) {
-    struct stat status = {};
-    std::string reason;
-    if (stat(directory.c_str(), &status) == 0 && !S_ISDIR(status.st_mode)) {
-        reason = "it is not a directory";
-    } else if (access(directory.c_str(), W_OK | X_OK) != 0) {
-        reason = std::strerror(errno);
-    }
-    if (!reason.empty()) {
-        throw UsageError("cannot write to " + directory + ": " + reason);
-    }
-    kdMountKOR(DUMP_ROOT, directory.c_str());
 }
 
 /** Makes the engine hear the file in place of a device. */
@@ -129,8 +111,9 @@ int runRecognize(const RecognizeOptions& options, Console& console, LogOutput& l
     const boost::shared_ptr<Talvox::Settings> settings = buildSettings(options.settings);
     checkRequestSettings(*settings);
     warnOfVadMistakes(*settings, console.err);
+    std::optional<Dump> dump;
     if (!options.dumpDirectory.empty()) {
-        mountDump(options.dumpDirectory);
+        dump.emplace(options.dumpDirectory);
     }
     if (!options.microphone) {
         installPlayer(options, settings->getSampleRate(), console.in);
@@ -142,16 +125,25 @@ int runRecognize(const RecognizeOptions& options, Console& console, LogOutput& l
     addPrinters(options, console, eventsFile, printers);
     Session session(settings);
     const Interrupts interrupts([&session] { session.interrupt(); });
+    if (dump) {
+        dump->begin();
+    }
     const SessionEvent last = session.run(printers);
+    int status = EXIT_OK;
+    if (last.kind == SessionEvent::FAILURE) {
+        reportError(last.errorCode, options, *settings, console.err);
+        status = EXIT_ENDED_IN_ERROR;
+    }
     if (!eventsFile) {
-        console.err << "talvox: cannot write to " << options.eventsFile << std::endl;
-        return EXIT_ENDED_IN_ERROR;
+        console.err << "talvox: cannot write to " << printable(options.eventsFile) << std::endl;
+        status = EXIT_ENDED_IN_ERROR;
     }
-    if (last.kind == SessionEvent::RESULTS) {
-        return EXIT_OK;
+    if (dump && !dump->isComplete()) {
+        console.err << "talvox: the dump " << printable(dump->getPath()) << " is not complete"
+                    << std::endl;
+        status = EXIT_ENDED_IN_ERROR;
     }
-    reportError(last.errorCode, options, *settings, console.err);
-    return EXIT_ENDED_IN_ERROR;
+    return status;
 }
 
 }  // namespace Cli

@@ -3,6 +3,7 @@
 #include <sndfile.h>
 
 #include <algorithm>
+#include <filesystem>
 
 #include "SoundFiles.h"
 #include "ToolProcess.h"
@@ -13,6 +14,7 @@ namespace {
 using ::testing::EndsWith;
 using ::testing::HasSubstr;
 using ::testing::MatchesRegex;
+using ::testing::Not;
 using ::testing::StartsWith;
 using TestSupport::runTalvox;
 using TestSupport::ScratchDirectory;
@@ -191,6 +193,38 @@ TEST(Tool, RefusesADumpDirectoryThatItCannotUse) {
                   "nowhere: No such file or directory");
     expectRefused({"recognize", "--mic", "--dump", directory.write("file", "x")},
                   "file: it is not a directory");
+    expectRefused({"recognize", "--mic", "--dump", ""}, "--dump: the text is empty");
+}
+
+TEST(Tool, RefusesADumpThatItCannotWriteAndLeavesTheOneThatIsThere) {
+    const ScratchDirectory directory;
+    const std::string dump = directory.write("in.wav", "an earlier one");
+    expectRefused({"recognize", "--file", directory.path("nowhere"), "--dump", directory.path()},
+                  "nowhere: No such file or directory");
+    EXPECT_EQ(ScratchDirectory::read(dump), "an earlier one");
+    std::filesystem::remove(dump);
+    expectRefused({"recognize", "--file", directory.path("nowhere"), "--dump", directory.path()},
+                  "nowhere: No such file or directory");
+    EXPECT_FALSE(std::filesystem::exists(dump));
+    std::filesystem::create_directory(dump);
+    expectRefused({"recognize", "--mic", "--dump", directory.path()},
+                  "cannot write to " + dump + ": Is a directory");
+}
+
+TEST(Tool, EndsQuietlyWhenItsReaderHasLeft) {
+    const ScratchDirectory directory;
+    const std::string sound =
+        directory.write("a.raw", TestSupport::rawBytes(TestSupport::sine(16000, 10)));
+    for (const std::string& arguments :
+         {std::string("settings"), std::string("--help"), "vad --file - --json < " + sound}) {
+        TestSupport::ToolProcess process(
+            "/bin/bash", {"-c", "exec > >(true); wait $!; exec " + std::string(TALVOX_BINARY) +
+                                    " " + arguments + " 2> " + directory.path("err")});
+        EXPECT_EQ(process.wait().status, 0) << arguments;
+        EXPECT_THAT(ScratchDirectory::read(directory.path("err")),
+                    Not(HasSubstr("standard output")))
+            << arguments;
+    }
 }
 
 TEST(Tool, SaysSoWhenItsOutputCannotBeWritten) {
