@@ -52,6 +52,12 @@ CLI::Option* addPath(CLI::App& command, const std::string& name, std::string& pa
         ->check(CLI::Validator(checkNotEmpty, ""));
 }
 
+CLI::Option* addCertificateFile(CLI::App& command, std::string& path) {
+    return addPath(command, "--ca-file", path, "FILE",
+                   "PEM file with the certificate authorities to trust for https addresses instead "
+                   "of the system's");
+}
+
 /** Adds an option that stands for one setting. */
 CLI::Option* addSetting(CLI::App& command, SettingsOptions& settings, const std::string& key,
                         const std::string& name, const std::string& help) {
@@ -144,6 +150,7 @@ CLI::App* addRecognize(CLI::App& app, RecognizeOptions& options) {
         ->excludes(file);
     addLeadInOption(*command, options.leadInMs);
     addRequestOptions(*command, options.settings);
+    addCertificateFile(*command, options.certificateFile);
     addVad(*command, options.settings);
     addRate(*command, options.settings);
     addSettingsSources(*command, options.settings);
@@ -219,6 +226,7 @@ CLI::App* addLogCommand(CLI::App& app, LogOptions& options) {
         ->add_option("--url", options.url,
                      "Address of the endpoint [" + LogCollector::LogCollector::URL_DFLT + "]")
         ->type_name("URL");
+    addCertificateFile(*command, options.certificateFile);
     command->add_option("--uuid", options.uuid, "Identifier of this installation, as it is [empty]")
         ->type_name("TEXT");
     command->add_option("--session", options.session, "Session that the event belongs to")

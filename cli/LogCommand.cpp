@@ -5,6 +5,7 @@
 #include <mutex>
 
 #include "Address.h"
+#include "CertificateFile.h"
 #include "ExitStatus.h"
 #include "Interrupts.h"
 #include "UsageError.h"
@@ -59,6 +60,9 @@ int runLog(const LogOptions& options, Console& console, LogOutput& log) {
     const std::map<std::string, std::string> params = readParams(options.params);
     checkUrl(options.url);
     checkQueryValue("uuid", options.uuid);
+    if (!options.certificateFile.empty()) {
+        trustAuthoritiesOf(options.certificateFile);
+    }
     Logger::setLevel(options.verbosity);
     log.show(options.verbosity > 0);
     End end;

@@ -9,6 +9,7 @@
 #include <random>
 
 #include "Address.h"
+#include "CertificateFile.h"
 #include "Dump.h"
 #include "ExitStatus.h"
 #include "HumanEvents.h"
@@ -110,6 +111,9 @@ int runRecognize(const RecognizeOptions& options, Console& console, LogOutput& l
     log.show(true);
     const boost::shared_ptr<Talvox::Settings> settings = buildSettings(options.settings);
     checkRequestSettings(*settings);
+    if (!options.certificateFile.empty()) {
+        trustAuthoritiesOf(options.certificateFile);
+    }
     warnOfVadMistakes(*settings, console.err);
     std::optional<Dump> dump;
     if (!options.dumpDirectory.empty()) {

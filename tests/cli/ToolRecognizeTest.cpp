@@ -8,59 +8,51 @@
 #include <csignal>
 #include <filesystem>
 #include <nlohmann/json.hpp>
-#include <sstream>
+#include <set>
 
+#include "RecognizeRun.h"
 #include "SoundFiles.h"
 #include "ToolProcess.h"
-#include "core/util/Base64Coder.h"
+#include "support/OggSpeexDecoder.h"
 #include "support/ScratchDirectory.h"
 #include "support/ScriptedHttpServer.h"
 
 namespace {
 
+using ::testing::ElementsAre;
 using ::testing::EndsWith;
 using ::testing::HasSubstr;
 using ::testing::MatchesRegex;
 using ::testing::Not;
 using TestSupport::Answer;
+using TestSupport::lines;
+using TestSupport::QUICK_VAD;
+using TestSupport::recognize;
 using TestSupport::RefusingPort;
+using TestSupport::resultAnswer;
 using TestSupport::runTalvox;
 using TestSupport::ScratchDirectory;
 using TestSupport::ScriptedHttpServer;
 using TestSupport::ToolProcess;
 using TestSupport::ToolResult;
+using TestSupport::UUID;
+using TestSupport::voice;
 
-const char* const QUICK_VAD = "analyzemson=200;analyzemsoff=200;minvoicetimems=100";
-const char* const UUID = "0123456789abcdef0123456789abcdef";
-
-Answer resultAnswer(const std::string& variants) {
-    const std::string xml =
-        "<?xml version=\"1.0\" encoding=\"utf-8\"?><recognitionResults "
-        "success=\"1\">" +
-        variants + "</recognitionResults>";
-    const std::vector<unsigned char> bytes(xml.begin(), xml.end());
-    return Answer::status(200, {{"x-asrgw-recognition-results", Util::Base64Coder::encode(bytes)},
-                                {"x-kvrequestid", "request-7"}});
-}
-
-std::string voice() {
-    return TestSupport::rawBytes(TestSupport::voiceLike(16000, 0.6));
-}
-
-std::vector<std::string> recognize(const std::string& url, const std::vector<std::string>& more) {
-    std::vector<std::string> arguments = {"recognize", "--file", "-",     "--url",  url,
-                                          "--uuid",    UUID,     "--vad", QUICK_VAD};
-    arguments.insert(arguments.end(), more.begin(), more.end());
-    return arguments;
-}
-
-std::vector<std::string> lines(const std::string& text) {
-    std::vector<std::string> found;
-    std::istringstream in(text);
-    for (std::string line; std::getline(in, line);) {
-        found.push_back(line);
+/** The different sizes of the Speex packets with sound in a request's body. */
+std::set<std::size_t> soundPacketSizes(const std::string& body) {
+    const std::size_t begin = std::min(body.find("OggS"), body.size());
+    std::set<std::size_t> sizes;
+    std::size_t packets = 0;
+    for (const TestSupport::OggPage& page : TestSupport::readOggPages(
+             {body.begin() + static_cast<std::ptrdiff_t>(begin), body.end()})) {
+        for (const TestSupport::Bytes& packet : page.packets) {
+            // The first two are the headers.
+            if (packets++ >= 2) {
+                sizes.insert(packet.size());
+            }
+        }
     }
-    return found;
+    return sizes;
 }
 
 TEST(ToolRecognize, PrintsEveryEventAsAJsonLine) {
@@ -133,6 +125,23 @@ TEST(ToolRecognize, SendsWhatItsOptionsSay) {
         EXPECT_THAT(request.body, HasSubstr(part));
     }
     EXPECT_THAT(request.body, Not(HasSubstr("uk-UA")));
+}
+
+TEST(ToolRecognize, EncodesAtTheQualityThatItsOptionSays) {
+    ScriptedHttpServer server;
+    server.setDefaultAnswer(resultAnswer("<variant confidence=\"1\">a</variant>"));
+    std::size_t count = 0;
+    for (const char* const protocol : {"--streaming", "--no-streaming"}) {
+        // 12,800 and 27,800 bits a second, in packets of 20 ms.
+        for (const auto& [quality, packetSize] : {std::pair("4", 32U), std::pair("8", 70U)}) {
+            const ToolResult result = runTalvox(
+                recognize(server.getUrl(), {protocol, "--format", "speex", "--quality", quality}),
+                voice());
+            EXPECT_EQ(result.status, 0) << result.err;
+            EXPECT_THAT(soundPacketSizes(server.getRequest(count++).body), ElementsAre(packetSize))
+                << protocol << " --quality " << quality;
+        }
+    }
 }
 
 TEST(ToolRecognize, HasDefaultsOfItsOwn) {

@@ -5,6 +5,7 @@
 
 #include "NetworkFixture.h"
 #include "support/ChildProcess.h"
+#include "support/TlsRelay.h"
 
 using Network::NetworkManager;
 using TestSupport::ChildProcess;
@@ -39,12 +40,7 @@ class NetworkTlsTest : public NetworkFixture {
     std::string path(const std::string& name) const { return folder + "/" + name; }
 
     void makeCertificate(const std::string& name, const std::string& subject) const {
-        const auto made =
-            ChildProcess::run({"openssl", "req", "-x509", "-newkey", "ec", "-pkeyopt",
-                               "ec_paramgen_curve:prime256v1", "-nodes", "-days", "2", "-subj",
-                               "/CN=talvox test", "-addext", "subjectAltName=" + subject, "-keyout",
-                               path(name + ".key"), "-out", path(name + ".pem")});
-        ASSERT_EQ(0, made.exitStatus) << made.output;
+        ASSERT_EQ("", TestSupport::makeCertificate(path(name), subject));
     }
 
     void startServer() {

@@ -1,0 +1,13 @@
+#pragma once
+
+#include <string>
+
+namespace Cli {
+
+/**
+ * Makes the network layer trust the certificate authorities of a PEM file instead of the system's.
+ * @throws UsageError if the file cannot be read or holds no certificate
+ */
+void trustAuthoritiesOf(const std::string& path);
+
+}  // namespace Cli
