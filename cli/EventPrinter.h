@@ -2,6 +2,7 @@
 
 #include <boost/shared_ptr.hpp>
 #include <cstdint>
+#include <string>
 
 #include "talvox/Recognition.h"
 
@@ -16,6 +17,7 @@ struct SessionEvent {
     float levelDb = 0;      /**< of POWER */
     bool isSilence = false; /**< of POWER: every sample of the buffer is zero */
     int errorCode = 0;      /**< of FAILURE: a code of `Talvox::SpeechError` */
+    std::string reason;     /**< of FAILURE: why, for the reader; empty if that is unknown */
     boost::shared_ptr<Talvox::Recognition> recognition; /**< of RESULTS; not null there */
 
     /** The session's last event. */

@@ -22,6 +22,11 @@ std::string confidenceText(float confidence) {
 
 }  // namespace
 
+std::string errorText(const SessionEvent& event) {
+    const std::string name = Talvox::SpeechError(event.errorCode).getErrorString();
+    return event.reason.empty() ? name : name + ": " + printable(event.reason);
+}
+
 void HumanEvents::print(const SessionEvent& event) {
     switch (event.kind) {
         case SessionEvent::RECORDING_BEGIN:
@@ -41,8 +46,7 @@ void HumanEvents::print(const SessionEvent& event) {
             printResults(event);
             break;
         case SessionEvent::FAILURE:
-            printLine(event.ms, std::string("error: ") +
-                                    Talvox::SpeechError(event.errorCode).getErrorString());
+            printLine(event.ms, "error: " + errorText(event));
             break;
     }
     out.flush();

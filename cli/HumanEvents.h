@@ -8,6 +8,9 @@
 
 namespace Cli {
 
+/** The name of a FAILURE and its reason. */
+std::string errorText(const SessionEvent& event);
+
 /**
  * Prints a session for a reader: the events with a level bar, then the table of hypotheses, the
  * verdict and how long the answer took. On a terminal the bar is redrawn in place; anywhere else

@@ -77,6 +77,9 @@ void JsonEvents::print(const SessionEvent& event) {
     } else if (event.kind == SessionEvent::FAILURE) {
         object["code"] = event.errorCode;
         object["name"] = Talvox::SpeechError(event.errorCode).getErrorString();
+        if (!event.reason.empty()) {
+            object["reason"] = event.reason;
+        }
     } else if (event.kind == SessionEvent::RESULTS) {
         object["outcome"] = outcomeName(event.recognition->getOutcome());
         object["outcomeCode"] = static_cast<int>(event.recognition->getOutcome());

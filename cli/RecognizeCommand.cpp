@@ -56,17 +56,23 @@ void installPlayer(const RecognizeOptions& options, int sampleRateHz, std::istre
         [samples] { return boost::make_shared<Sound::FileRecorder>(samples); });
 }
 
-/** What a user can do about an error; empty where the name says it all. */
-std::string hint(int errorCode, const RecognizeOptions& options, const Talvox::Settings& settings) {
-    switch (errorCode) {
+/** Whether nothing listens at the address; libcurl's words are all that says so. */
+bool isRefused(const SessionEvent& failure) {
+    return failure.reason.find("connect to server") != std::string::npos;
+}
+
+/** What a user can do about an error; empty where name and reason say it all. */
+std::string hint(const SessionEvent& failure, const RecognizeOptions& options,
+                 const Talvox::Settings& settings) {
+    switch (failure.errorCode) {
         case Talvox::SpeechError::ErrorNetwork:
-            return "is a gateway running at " + settings.getUrl() + "?";
+            return isRefused(failure) ? "is a gateway running at " + settings.getUrl() + "?" : "";
         case Talvox::SpeechError::ErrorAudio:
             return options.microphone ? "is there a microphone, and a sound server for it?" : "";
         case Talvox::SpeechError::ErrorNoVoice:
-            return "no speech was heard; \"talvox vad\" shows what the detector decides";
+            return "\"talvox vad\" shows what the detector decides";
         case Talvox::SpeechError::ErrorNotAvailable:
-            return "the settings \"asr\" and \"asrpolicy\" leave no way to recognise";
+            return "see the settings \"asr\" and \"asrpolicy\"";
         default:
             return "";
     }
@@ -88,10 +94,10 @@ void addPrinters(const RecognizeOptions& options, Console& console, std::ofstrea
     }
 }
 
-void reportError(int errorCode, const RecognizeOptions& options, const Talvox::Settings& settings,
-                 std::ostream& err) {
-    err << "talvox: recognition ended with " << Talvox::SpeechError(errorCode).getErrorString();
-    const std::string advice = hint(errorCode, options, settings);
+void reportError(const SessionEvent& failure, const RecognizeOptions& options,
+                 const Talvox::Settings& settings, std::ostream& err) {
+    err << "talvox: recognition ended with " << errorText(failure);
+    const std::string advice = hint(failure, options, settings);
     if (!advice.empty()) {
         err << " (" << printable(advice) << ')';
     }
@@ -135,7 +141,7 @@ int runRecognize(const RecognizeOptions& options, Console& console, LogOutput& l
     const SessionEvent last = session.run(printers);
     int status = EXIT_OK;
     if (last.kind == SessionEvent::FAILURE) {
-        reportError(last.errorCode, options, *settings, console.err);
+        reportError(last, options, *settings, console.err);
         status = EXIT_ENDED_IN_ERROR;
     }
     if (!eventsFile) {

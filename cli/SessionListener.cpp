@@ -4,6 +4,7 @@
 
 #include "core/sound/ZeroWatch.h"
 #include "pal/kd_time.h"
+#include "talvox/Recognizer.h"
 
 namespace Cli {
 
@@ -48,9 +49,10 @@ void SessionListener::onResults(Talvox::Recognizer* /*recognizer*/,
     queue->put(event);
 }
 
-void SessionListener::onError(Talvox::Recognizer* /*recognizer*/, Talvox::SpeechError error) {
+void SessionListener::onError(Talvox::Recognizer* recognizer, Talvox::SpeechError error) {
     SessionEvent event = make(SessionEvent::FAILURE);
     event.errorCode = error.getCode();
+    event.reason = recognizer->getErrorReason();
     queue->put(event);
 }
 

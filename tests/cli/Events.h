@@ -21,9 +21,10 @@ inline Cli::SessionEvent power(int64_t ms, float levelDb) {
     return made;
 }
 
-inline Cli::SessionEvent failure(int64_t ms, int code) {
+inline Cli::SessionEvent failure(int64_t ms, int code, const std::string& reason = "") {
     Cli::SessionEvent made = event(Cli::SessionEvent::FAILURE, ms);
     made.errorCode = code;
+    made.reason = reason;
     return made;
 }
 

@@ -65,10 +65,14 @@ TEST(HumanEvents, ShowsDigitalSilenceAsSilence) {
     EXPECT_EQ(out.str(), "   303 ms  [------------------------------]  silence\n");
 }
 
-TEST(HumanEvents, NamesAnError) {
+TEST(HumanEvents, NamesAnErrorAndItsReason) {
     std::ostringstream out;
-    Cli::HumanEvents(out, false).print(TestSupport::failure(5100, 6));
-    EXPECT_EQ(out.str(), "  5100 ms  error: ErrorNoVoice\n");
+    Cli::HumanEvents printer(out, false);
+    printer.print(TestSupport::failure(5100, 6));
+    printer.print(TestSupport::failure(700, 3, "HTTP \x1b[2Jstatus 404"));
+    EXPECT_EQ(out.str(),
+              "  5100 ms  error: ErrorNoVoice\n"
+              "   700 ms  error: ErrorNetwork: HTTP ?[2Jstatus 404\n");
 }
 
 TEST(HumanEvents, SaysSoWhenThereAreNoHypotheses) {

@@ -45,6 +45,12 @@ TEST(JsonEvents, PrintsCodeAndNameOfAnError) {
               "{\"event\":\"error\",\"ms\":5100,\"code\":6,\"name\":\"ErrorNoVoice\"}\n");
 }
 
+TEST(JsonEvents, PrintsTheReasonOfAnErrorWhereItIsKnown) {
+    EXPECT_EQ(printed(TestSupport::failure(700, 3, "HTTP status 404")),
+              "{\"event\":\"error\",\"ms\":700,\"code\":3,\"name\":\"ErrorNetwork\","
+              "\"reason\":\"HTTP status 404\"}\n");
+}
+
 TEST(JsonEvents, PrintsOutcomeAndHypotheses) {
     EXPECT_EQ(printed(TestSupport::results(2400, Recognition::OutcomeAccepted,
                                            {{"go forward", 0.95F}, {"go four", 0.5F}}, "r1")),

@@ -28,7 +28,6 @@ using TestSupport::Answer;
 using TestSupport::lines;
 using TestSupport::QUICK_VAD;
 using TestSupport::recognize;
-using TestSupport::RefusingPort;
 using TestSupport::resultAnswer;
 using TestSupport::runTalvox;
 using TestSupport::ScratchDirectory;
@@ -195,18 +194,6 @@ TEST(ToolRecognize, SaysWhenTheDumpIsNotComplete) {
     EXPECT_EQ(result.err, "talvox: the dump " + directory.path("in.wav") + " is not complete\n");
 }
 
-TEST(ToolRecognize, EndsWithStatus1WhenTheGatewayIsNotThere) {
-    const RefusingPort port;
-    const ToolResult result =
-        runTalvox(recognize(port.getUrl(), {"--json", "--streaming"}), voice());
-    EXPECT_EQ(result.status, 1);
-    EXPECT_THAT(lines(result.out).back(),
-                MatchesRegex("\\{\"event\":\"error\",\"ms\":[0-9]+,\"code\":3,"
-                             "\"name\":\"ErrorNetwork\"\\}"));
-    EXPECT_EQ(result.err, "talvox: recognition ended with ErrorNetwork (is a gateway running at " +
-                              port.getUrl() + "?)\n");
-}
-
 TEST(ToolRecognize, EndsWithStatus1WhenNoMechanismMayServe) {
     const ToolResult result =
         runTalvox(recognize("http://127.0.0.1:1", {"--json", "--set", "asr=disabled"}), voice());
@@ -253,8 +240,10 @@ TEST(ToolRecognize, CtrlCCancels) {
         EXPECT_EQ(result.status, 1);
         EXPECT_THAT(lines(result.out).back(),
                     MatchesRegex("\\{\"event\":\"error\",\"ms\":[0-9]+,\"code\":5,"
-                                 "\"name\":\"ErrorCanceled\"\\}"));
-        EXPECT_EQ(result.err, "talvox: recognition ended with ErrorCanceled\n");
+                                 "\"name\":\"ErrorCanceled\",\"reason\":\"the application "
+                                 "cancelled\"\\}"));
+        EXPECT_EQ(result.err,
+                  "talvox: recognition ended with ErrorCanceled: the application cancelled\n");
     }
 }
 

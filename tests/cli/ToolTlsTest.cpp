@@ -11,6 +11,7 @@ namespace {
 
 using ::testing::EndsWith;
 using ::testing::HasSubstr;
+using ::testing::StartsWith;
 using TestSupport::recognize;
 using TestSupport::resultAnswer;
 using TestSupport::runTalvox;
@@ -70,7 +71,10 @@ TEST_F(ToolTls, RecognizeTrustsTheAuthoritiesOfTheFileAndNoOther) {
     EXPECT_EQ(1U, server.getRequestCount());
     const std::vector<std::string> others[] = {{}, {"--ca-file", directory.path("other.pem")}};
     for (const std::vector<std::string>& options : others) {
-        EXPECT_EQ(1, runTalvox(recognize(relay.getUrl(), options), voice()).status);
+        const ToolResult refused = runTalvox(recognize(relay.getUrl(), options), voice());
+        EXPECT_EQ(1, refused.status);
+        EXPECT_THAT(refused.err, StartsWith("talvox: recognition ended with ErrorNetwork: SSL "
+                                            "certificate problem: "));
     }
     EXPECT_EQ(1U, server.getRequestCount());
 }
