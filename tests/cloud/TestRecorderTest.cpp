@@ -3,8 +3,10 @@
 #include <gtest/gtest.h>
 
 #include <boost/make_shared.hpp>
+#include <filesystem>
 #include <fstream>
 #include <string>
+#include <system_error>
 #include <vector>
 
 #include "EngineTest.h"
@@ -35,6 +37,16 @@ class Listener : public Sound::RecorderListener {
     int errors = 0;
     Sound::Recorder* failed = nullptr;
 };
+
+/** How many of the process's descriptors lead to a file. */
+int countDescriptors(const std::string& path) {
+    int count = 0;
+    for (const auto& entry : std::filesystem::directory_iterator("/proc/self/fd")) {
+        std::error_code gone;
+        count += std::filesystem::read_symlink(entry.path(), gone) == path ? 1 : 0;
+    }
+    return count;
+}
 
 class TestRecorderTest : public CloudTest::EngineTest {
   protected:
@@ -141,6 +153,21 @@ TEST_F(TestRecorderTest, BeginsAnewAtTheFilesBeginning) {
     advanceMs(100);
     ASSERT_EQ(listener->buffers.size(), 3U);
     EXPECT_EQ(listener->buffers[2]->getData()[0], 9);
+}
+
+TEST_F(TestRecorderTest, ClosesItsFile) {
+    const std::string path = makeFile({1, 2});
+    auto tested = makeRecorder(path);
+    EXPECT_EQ(countDescriptors(path), 0);
+    tested->startRecording();
+    EXPECT_EQ(countDescriptors(path), 1);
+    tested->startRecording();
+    EXPECT_EQ(countDescriptors(path), 1) << "left open by a second start";
+    tested->stopRecording();
+    EXPECT_EQ(countDescriptors(path), 0) << "left open by the stop";
+    tested->startRecording();
+    tested.reset();
+    EXPECT_EQ(countDescriptors(path), 0) << "left open by the destructor";
 }
 
 TEST_F(TestRecorderTest, IsSilentOnceDestroyed) {

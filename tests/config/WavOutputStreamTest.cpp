@@ -132,6 +132,18 @@ TEST_F(WavOutputStreamTest, DestroyingAStreamClosesIt) {
     EXPECT_EQ(4U, number(bytes(), 40, 4));
 }
 
+TEST_F(WavOutputStreamTest, CountsSingleBytes) {
+    {
+        WavOutputStream stream;
+        ASSERT_TRUE(stream.init(path, WIDE));
+        EXPECT_EQ(1, stream.write("a", 1));
+        EXPECT_EQ(1, stream.write("b", 1));
+    }
+    EXPECT_EQ(46U, bytes().size());
+    EXPECT_EQ(38U, number(bytes(), 4, 4));
+    EXPECT_EQ(2U, number(bytes(), 40, 4));
+}
+
 TEST_F(WavOutputStreamTest, WritingNothingChangesNothing) {
     {
         WavOutputStream stream;
@@ -249,6 +261,8 @@ TEST_F(WavOutputStreamTest, ASecondInitFinishesTheFirstFile) {
     const std::vector<std::uint8_t> written{std::istreambuf_iterator<char>(file),
                                             std::istreambuf_iterator<char>()};
     EXPECT_EQ(44U, written.size());
+    EXPECT_EQ(36U, number(written, 4, 4));
+    EXPECT_EQ(0U, number(written, 40, 4));
     std::remove(second.c_str());
 }
 
