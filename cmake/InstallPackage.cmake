@@ -29,7 +29,12 @@ write_basic_package_version_file(${CMAKE_BINARY_DIR}/KorvelTalvoxConfigVersion.c
 install(FILES ${CMAKE_BINARY_DIR}/KorvelTalvoxConfig.cmake
               ${CMAKE_BINARY_DIR}/KorvelTalvoxConfigVersion.cmake
         DESTINATION ${korvel_package})
-install(FILES LICENSE README.md DESTINATION ${CMAKE_INSTALL_DATADIR}/doc/korveltalvox)
+# As in the source tree, so that the links between the documents hold.
+set(korvel_documents ${CMAKE_INSTALL_DATADIR}/doc/korveltalvox)
+install(FILES LICENSE README.md ARCHITECTURE.md CHANGELOG.md CONTRIBUTING.md
+        DESTINATION ${korvel_documents})
+install(DIRECTORY docs/ DESTINATION ${korvel_documents}/docs FILES_MATCHING PATTERN "*.md")
+install(FILES platforms/android/BUILDING.md DESTINATION ${korvel_documents}/platforms/android)
 
 if(TALVOX_BUILD_TOOLS)
     set_target_properties(talvox talvox-gateway PROPERTIES

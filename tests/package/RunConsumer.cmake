@@ -1,5 +1,6 @@
-# Installs the build into a staging directory, builds the consumer project against it and runs its
-# programs. The example is taken out of the README, so that what stands there compiles.
+# Installs the build into a staging directory, checks the links of the installed documents, builds the
+# consumer project against it and runs its programs. The example is taken out of the README, so that
+# what stands there compiles.
 file(REMOVE_RECURSE ${WORK_DIR})
 file(MAKE_DIRECTORY ${WORK_DIR})
 
@@ -19,6 +20,7 @@ endif()
 file(WRITE ${WORK_DIR}/example.cpp "${CMAKE_MATCH_1}")
 
 run(${CMAKE_COMMAND} --install ${BUILD_DIR} --prefix ${WORK_DIR}/install)
+run(${SOURCE_DIR}/tests/package/check_links ${WORK_DIR}/install)
 run(${CMAKE_COMMAND} -S ${SOURCE_DIR}/tests/package/consumer -B ${WORK_DIR}/build -G Ninja
     -DCMAKE_PREFIX_PATH=${WORK_DIR}/install
     -DCMAKE_BUILD_TYPE=Debug
