@@ -120,7 +120,6 @@ int runRecognize(const RecognizeOptions& options, Console& console, LogOutput& l
     if (!options.certificateFile.empty()) {
         trustAuthoritiesOf(options.certificateFile);
     }
-    warnOfVadMistakes(*settings, console.err);
     std::optional<Dump> dump;
     if (!options.dumpDirectory.empty()) {
         dump.emplace(options.dumpDirectory);
@@ -128,6 +127,7 @@ int runRecognize(const RecognizeOptions& options, Console& console, LogOutput& l
     if (!options.microphone) {
         installPlayer(options, settings->getSampleRate(), console.in);
     }
+    warnOfVadMistakes(*settings, console.err);
     log.show(settings->getInt(Talvox::Settings::SKS_VERBOSE_LEVEL) > 0);
 
     std::ofstream eventsFile;

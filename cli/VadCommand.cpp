@@ -87,9 +87,9 @@ std::unique_ptr<VadPrinter> makePrinter(bool json, Sound::Recorder::Mode mode, s
 int runVad(const VadOptions& options, Console& console, LogOutput& log) {
     log.show(true);
     const boost::shared_ptr<Talvox::Settings> settings = buildSettings(options.settings);
-    warnOfVadMistakes(*settings, console.err);
     const int rate = settings->getSampleRate();
     std::vector<int16_t> samples = loadSound(options.file, console.in, rate, MAX_CLIP_SECONDS);
+    warnOfVadMistakes(*settings, console.err);
     addLeadIn(samples, rate, options.leadInMs);
     const std::size_t length = static_cast<std::size_t>(rate) * BUFFER_MS / 1000;
 
