@@ -64,10 +64,12 @@ class PlatformRecognizerTest : public ::testing::Test,
         kdUseRealClockKOR();
     }
 
-    boost::shared_ptr<Talvox::Recognizer> create() {
+    boost::shared_ptr<Talvox::Recognizer> create(
+        const std::string& logging = Settings::LOG_WITHOUT_SOUND_ALWAYS) {
         const auto settings = boost::make_shared<Settings>();
         settings->putString(Settings::RS_ASR_POLICY, Settings::ASRP_PLATFORM_ONLY);
-        settings->putString(Settings::SKS_LOGGING_POLICY, Settings::LOG_WITHOUT_SOUND_ALWAYS);
+        settings->putString(Settings::SKS_LOGGING_POLICY, logging);
+        settings->putString(Settings::SKS_SOUND_FORMAT, Settings::SOUND_FORMAT_SPEEX);
         settings->putString(Settings::RS_SESSION_ID, ScriptedGateway::makeSessionId(0));
         return Talvox::Talvox::getInstance().createRecognizer(listener, settings);
     }
@@ -259,6 +261,21 @@ TEST_F(PlatformRecognizerTest, AnEndStopsTheClock) {
         pass(LISTENING_LIMIT_MS);
         EXPECT_EQ(events.size(), 1U);
     }
+}
+
+TEST_F(PlatformRecognizerTest, ResultsThatWaitForTheEncoderAreNotSilence) {
+    recognizer = create(Settings::LOG_WITH_SOUND_ALWAYS);
+    recognizer->start();
+    say(Saying::SOUND);
+    recognizer->stop();
+    {
+        const Util::EventLock lock;
+        say(Saying::RESULTS);
+        EXPECT_THAT(events, IsEmpty());
+        kdAdvanceClockKOR(LISTENING_LIMIT_MS * NS_PER_MS);
+    }
+    settle();
+    EXPECT_THAT(events, ElementsAre("results"));
 }
 
 TEST_F(PlatformRecognizerTest, CancelOnAnIdleRecognizerIsReportedOnce) {

@@ -167,6 +167,12 @@ public class BareApplicationTest {
     }
 
     @Test
+    public void partialResultsThatDoNotFitTogetherAreReportedOnly() throws Exception {
+        expectThenNext("partial", "onResults 1 a=-1.0");
+        assertLogged(1, "assertion failed: !jconfidenceScores");
+    }
+
+    @Test
     public void numbersThatAreNotErrorCodesAreUnknownErrors() throws Exception {
         expectThenNext(
                 "codes", "onError 0", "onError 0", "onError 0", "onError 0", "onError 0");
@@ -178,6 +184,12 @@ public class BareApplicationTest {
                             + " is not an error code, reporting ErrorUnknown");
         }
         assertLogged(5, "Recognizer error: 0, ErrorUnknown");
+    }
+
+    @Test
+    public void aConstructorThatThrowsIsNotAvailable() throws Exception {
+        expectThenNext("new", "onError 7", "calls: ");
+        assertLogged(1, "assertion failed: jobj (platforms/android/jni/PlatformRecognizer:");
     }
 
     @Test
