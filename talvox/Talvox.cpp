@@ -65,12 +65,10 @@ bool hasEffect(Settings::Level level, Talvox::RecognitionMechanism mechanism) {
     return true;
 }
 
-/** The defaults do not count: they are there because nobody set the key. */
 void logWhatHasNoEffect(const Settings& given, const Settings& engineSettings,
                         Talvox::RecognitionMechanism mechanism) {
     for (const Settings::KeyLevel* row = Settings::keyLevels; row->key != nullptr; ++row) {
-        if (!hasEffect(row->level, mechanism) && !isSame(given, engineSettings, row->key) &&
-            !isSame(given, Settings(), row->key)) {
+        if (!hasEffect(row->level, mechanism) && !isSame(given, engineSettings, row->key)) {
             kdLogFormatMessage(
                 "createRecognizer: %s has no effect on a recognizer, set it on the engine",
                 row->key);

@@ -88,8 +88,9 @@ class TALVOX_API Talvox : public Util::Singleton<Talvox> {
 
     /**
      * Makes a recognizer; nothing is started. It works on a validated copy of the settings. A value
-     * that has no effect there (see `Settings::keyLevels`) is logged once, unless it is the
-     * engine's or the default: "KEY has no effect on a recognizer, set it on the engine".
+     * that has no effect there (see `Settings::keyLevels`) and differs from the engine's is logged
+     * once: "KEY has no effect on a recognizer, set it on the engine". A recognizer whose settings
+     * begin as a clone of the engine's logs only what the application changed.
      * @param listener held weakly
      * @param settings not null; never changed
      * @return the recognizer, owned by the caller; never null

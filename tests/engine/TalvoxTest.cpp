@@ -409,12 +409,21 @@ TEST_F(TalvoxTest, KeysWithoutEffectOnARecognizerAreLogged) {
                             "winnerleadconfidence", "lowerconfidence", "speexquality"));
 }
 
-TEST_F(TalvoxTest, KeysWithTheEnginesValueOrTheDefaultAreNotLogged) {
+TEST_F(TalvoxTest, KeysWithTheEnginesValueAreNotLogged) {
     engine.setTalvoxSettings(changeEveryKey(1));
     const LogCapture log;
     engine.createRecognizer(nullptr, changeEveryKey(1));
-    engine.createRecognizer(nullptr, boost::make_shared<Settings>());
     EXPECT_THAT(keysWithoutEffect(log), IsEmpty());
+}
+
+TEST_F(TalvoxTest, DefaultThatDiffersFromTheEnginesValueIsLogged) {
+    const auto settings = completeSettings();
+    settings->putBoolean(Settings::SKS_STREAMING, true);
+    engine.setTalvoxSettings(settings->clone());
+    settings->putBoolean(Settings::SKS_STREAMING, false);
+    const LogCapture log;
+    engine.createRecognizer(nullptr, settings);
+    EXPECT_THAT(keysWithoutEffect(log), ElementsAre("streaming"));
 }
 
 TEST_F(TalvoxTest, KeysAreComparedBeforeTheirRepair) {
