@@ -117,6 +117,8 @@ int runRecognize(const RecognizeOptions& options, Console& console, LogOutput& l
     log.show(true);
     const boost::shared_ptr<Talvox::Settings> settings = buildSettings(options.settings);
     checkRequestSettings(*settings);
+    checkSampleRate(settings->getSampleRate());
+    warnOfVadMistakes(*settings, console.err);
     if (!options.certificateFile.empty()) {
         trustAuthoritiesOf(options.certificateFile);
     }
@@ -127,7 +129,6 @@ int runRecognize(const RecognizeOptions& options, Console& console, LogOutput& l
     if (!options.microphone) {
         installPlayer(options, settings->getSampleRate(), console.in);
     }
-    warnOfVadMistakes(*settings, console.err);
     log.show(settings->getInt(Talvox::Settings::SKS_VERBOSE_LEVEL) > 0);
 
     std::ofstream eventsFile;

@@ -16,12 +16,16 @@ const int RATE_MAX_HZ = 44100;
 
 const char* const STANDARD_INPUT = "-";
 
-std::vector<int16_t> loadSound(const std::string& path, std::istream& input, int sampleRateHz,
-                               int maxSeconds) {
+void checkSampleRate(int sampleRateHz) {
     if (sampleRateHz < RATE_MIN_HZ || sampleRateHz > RATE_MAX_HZ) {
         throw UsageError("the sample rate " + std::to_string(sampleRateHz) +
                          " is not in the range 8000 to 44100");
     }
+}
+
+std::vector<int16_t> loadSound(const std::string& path, std::istream& input, int sampleRateHz,
+                               int maxSeconds) {
+    checkSampleRate(sampleRateHz);
     if (path != STANDARD_INPUT) {
         return toSamples(readAudioFile(path), sampleRateHz);
     }

@@ -10,6 +10,9 @@ namespace Cli {
 /** The name that stands for sound on standard input. */
 extern const char* const STANDARD_INPUT;
 
+/** @throws UsageError if the engine does not take the rate */
+void checkSampleRate(int sampleRateHz);
+
 /**
  * The sound of a file, or a WAV file or raw sound from `input` when `path` is `STANDARD_INPUT`, as
  * 16-bit mono samples at the engine's rate. The log says when a file is cut.

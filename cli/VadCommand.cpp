@@ -88,8 +88,9 @@ int runVad(const VadOptions& options, Console& console, LogOutput& log) {
     log.show(true);
     const boost::shared_ptr<Talvox::Settings> settings = buildSettings(options.settings);
     const int rate = settings->getSampleRate();
-    std::vector<int16_t> samples = loadSound(options.file, console.in, rate, MAX_CLIP_SECONDS);
+    checkSampleRate(rate);
     warnOfVadMistakes(*settings, console.err);
+    std::vector<int16_t> samples = loadSound(options.file, console.in, rate, MAX_CLIP_SECONDS);
     addLeadIn(samples, rate, options.leadInMs);
     const std::size_t length = static_cast<std::size_t>(rate) * BUFFER_MS / 1000;
 

@@ -87,6 +87,8 @@ TEST(Tool, RefusesWrongSettings) {
                   "setting \"upperconfidence\": \"high\" is not a number");
     expectRefused({"settings", "--set", "streaming=maybe"},
                   "setting \"streaming\": \"maybe\" is not yes or no");
+    expectRefused({"recognize", "--mic", "--set", "samplerate=0"},
+                  "talvox: the sample rate 0 is not in the range 8000 to 44100\n");
     expectRefused({"settings", "--settings", "/nowhere/at.all"},
                   "cannot read /nowhere/at.all: No such file or directory");
 }
