@@ -158,23 +158,23 @@ bool Transport::hasCommands() {
     return !commands.empty();
 }
 
-// The end comes when there is nothing left to run, so that each command that was accepted is run.
+// One batch at a time: transfers go on between commands that come in quick succession. The end
+// comes when nothing is left to run, so that each command that was accepted is run.
 bool Transport::runCommands() {
-    for (;;) {
-        std::vector<std::function<void()>> current;
-        {
-            const std::lock_guard<std::mutex> lock(mutex);
-            awake = false;
-            current.swap(commands);
-            if (current.empty()) {
-                closed = stopping;
-                return !closed;
-            }
-        }
-        for (const std::function<void()>& command : current) {
-            command();
+    std::vector<std::function<void()>> current;
+    {
+        const std::lock_guard<std::mutex> lock(mutex);
+        awake = false;
+        current.swap(commands);
+        closed = stopping && current.empty();
+        if (closed) {
+            return false;
         }
     }
+    for (const std::function<void()>& command : current) {
+        command();
+    }
+    return true;
 }
 
 void Transport::perform() {
