@@ -141,7 +141,7 @@ bool Transport::launchThread() {
 void Transport::run() {
     while (runCommands()) {
         perform();
-        if (!hasCommands()) {
+        if (!isWanted()) {
             curl_multi_poll(multi.get(), nullptr, 0, LONGEST_SLEEP_MS, nullptr);
         }
     }
@@ -153,9 +153,10 @@ void Transport::run() {
     changed.notify_all();
 }
 
-bool Transport::hasCommands() {
+// The end counts, too: `stop` may have come before the last batch, without a wake-up of its own.
+bool Transport::isWanted() {
     const std::lock_guard<std::mutex> lock(mutex);
-    return !commands.empty();
+    return !commands.empty() || stopping;
 }
 
 // One batch at a time: transfers go on between commands that come in quick succession. The end

@@ -81,7 +81,7 @@ class Transport : public boost::enable_shared_from_this<Transport> {
     void wake();
     bool waitForEnd();
     void run();
-    bool hasCommands();
+    bool isWanted();
     bool runCommands();
     void perform();
     void check(const boost::shared_ptr<Transfer>& transfer);
