@@ -29,7 +29,7 @@ CepstralMean::CepstralMean(const SpeechModel& model) {
     frontEnd = fe_init_auto_r(configuration);
     cmd_ln_free_r(configuration);
     if (frontEnd == nullptr) {
-        kdLogFormatMessage("the recogniser's front end cannot be made");
+        kdLogFormatMessage("the decoder's front end cannot be made");
         return;
     }
     dimensions = static_cast<std::size_t>(fe_get_output_size(frontEnd));

@@ -7,7 +7,7 @@
 #include "gateway/FrameLevels.h"
 #include "gateway/SpeechModel.h"
 
-// Named so by the recogniser's base library.
+// The name is PocketSphinx's.
 struct fe_s;
 
 namespace Gateway {

@@ -71,7 +71,7 @@ DecoderPool::Lease DecoderPool::take(std::unique_lock<std::mutex>& lock) {
         decoder = SpeechDecoder::create(model);
     }
     if (!decoder) {
-        kdLogFormatMessage("the recogniser cannot load its model");
+        kdLogFormatMessage("the decoder cannot load its model");
         lock.lock();
         --created;
         changed.notify_all();

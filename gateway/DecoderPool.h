@@ -74,7 +74,7 @@ class DecoderPool {
     bool closed = false;
     /** One entry per waiting thread, the longest waiting first. */
     std::list<int> waiting;
-    /** Held while a model is loaded: the recogniser does not promise to load two at once. */
+    /** Held while a model is loaded: the decoder does not promise to load two at once. */
     std::mutex loading;
 };
 

@@ -73,7 +73,7 @@ void HypothesisReader::addAlternatives(std::size_t maxCount, std::vector<Hypothe
         if (text != nullptr && *text != '\0' && known.insert(text).second) {
             Hypothesis hypothesis;
             hypothesis.text = text;
-            // The recogniser is sure of its best text for reasons beyond the words' posteriors.
+            // The decoder is sure of its best text for reasons beyond the words' posteriors.
             hypothesis.confidence =
                 std::min(hypotheses.front().confidence, alternativeConfidence(ps_nbest_seg(path)));
             hypotheses.push_back(hypothesis);

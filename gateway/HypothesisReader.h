@@ -8,13 +8,13 @@
 
 #include "gateway/Hypothesis.h"
 
-// Named so by the recogniser.
+// The names are PocketSphinx's.
 struct ps_decoder_s;
 struct ps_seg_s;
 
 namespace Gateway {
 
-/** Reads the hypotheses of an utterance that has just ended out of the recogniser. */
+/** Reads the hypotheses of an utterance that has just ended out of the decoder. */
 class HypothesisReader {
   public:
     explicit HypothesisReader(ps_decoder_s* endedDecoder);

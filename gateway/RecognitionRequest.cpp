@@ -250,7 +250,7 @@ Answer RecognitionRequest::recognise() {
         if (status == Utterance::Status::BUSY) {
             refuse(BUSY_STATUS, "all decoders are busy");
         } else if (status == Utterance::Status::FAILED) {
-            refuse(500, "the recogniser failed");
+            refuse(500, "the decoder failed");
         }
     }
     const std::string document = makeResultDocument(hypotheses);
@@ -265,7 +265,7 @@ void RecognitionRequest::endUtterance() {
     if (utterance) {
         utteranceMs = utterance->getDurationMs();
         decodeMs = utterance->getDecodeMs();
-        // Others may be waiting for the recogniser that it holds.
+        // Others may be waiting for the decoder that it holds.
         utterance.reset();
     }
 }

@@ -59,7 +59,7 @@ class RecognitionRequest : private MultipartListener {
     /** Takes more of the body. @return false when the client sends absurdly more than allowed */
     bool write(const char* data, std::size_t size);
 
-    /** Ends the body, waits for the recogniser and gives the answer. Called once. */
+    /** Ends the body, waits for the decoder and gives the answer. Called once. */
     Answer finish();
 
     /** Everything about the request in one line, for the log. */

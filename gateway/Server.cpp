@@ -100,7 +100,7 @@ std::string Server::start() {
         return logProblem;
     }
     if (!pool.load()) {
-        return "the recogniser does not accept the model";
+        return "the decoder does not accept the model";
     }
     addrinfo hints{};
     hints.ai_flags = AI_PASSIVE | AI_NUMERICSERV;

@@ -13,7 +13,7 @@
 namespace Gateway {
 
 /**
- * Turns the bytes of a client's sound, as they arrive, into samples of the recogniser's rate. Sound
+ * Turns the bytes of a client's sound, as they arrive, into samples of the decoder's rate. Sound
  * that begins as an Ogg stream is Speex, also where its content type says PCM: clients that choose
  * the encoding by the connection announce the format that they were set to.
  */

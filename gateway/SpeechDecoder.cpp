@@ -58,7 +58,7 @@ std::vector<Hypothesis> SpeechDecoder::finish() {
     }
     inUtterance = false;
     if (ps_end_utt(decoder) < 0) {
-        kdLogFormatMessage("the recogniser could not end an utterance");
+        kdLogFormatMessage("the decoder could not end an utterance");
         return std::vector<Hypothesis>();
     }
     return HypothesisReader(decoder).read(MAX_HYPOTHESES);

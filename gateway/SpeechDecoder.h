@@ -8,13 +8,13 @@
 #include "gateway/Hypothesis.h"
 #include "gateway/SpeechModel.h"
 
-// Named so by the recogniser.
+// The name is PocketSphinx's.
 struct ps_decoder_s;
 
 namespace Gateway {
 
 /**
- * One recogniser with its model in memory, for one utterance after the other; not thread-safe.
+ * One decoder with its model in memory, for one utterance after the other; not thread-safe.
  *
  * Whatever an utterance leaves behind (noise floor, cepstral mean) is put back before the next,
  * so that the same samples, cut in the same way, always give the same answer.
@@ -34,11 +34,11 @@ class SpeechDecoder {
     /**
      * Begins an utterance.
      * @param cepstralMean the mean of its cepstra as far as it is known, else empty
-     * @return false when the recogniser failed
+     * @return false when the decoder failed
      */
     bool begin(const std::vector<float>& cepstralMean);
 
-    /** Decodes more of the utterance. @return false when the recogniser failed */
+    /** Decodes more of the utterance. @return false when the decoder failed */
     bool decode(const int16_t* samples, std::size_t count);
 
     /** Ends the utterance. @return what was said, best first; empty when nothing was understood */

@@ -25,7 +25,7 @@ std::string normalise(const std::string& languageTag) {
     return tag;
 }
 
-/** Keeps the recogniser's own chatter off standard error, where the request log goes. */
+/** Keeps the decoder's own chatter off standard error, where the request log goes. */
 void silenceRecogniser() {
     static const bool silenced = [] {
         err_set_logfp(nullptr);
@@ -62,7 +62,7 @@ cmd_ln_s* SpeechModel::createConfiguration() const {
     if (configuration == nullptr) {
         return nullptr;
     }
-    // The model's own parameters of the front end; the recogniser would read them too late for
+    // The model's own parameters of the front end; the decoder would read them too late for
     // who only wants the front end.
     const std::string parameters = acousticDir + "/feat.params";
     if (isReadable(parameters)) {

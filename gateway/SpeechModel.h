@@ -2,12 +2,12 @@
 
 #include <string>
 
-// Named so by the recogniser's base library.
+// The name is PocketSphinx's.
 struct cmd_ln_s;
 
 namespace Gateway {
 
-/** Which model the recogniser uses, and for which language. */
+/** Which model the decoder uses, and for which language. */
 struct SpeechModel {
     static constexpr unsigned RATE_HZ = 16000;
 
@@ -30,7 +30,7 @@ struct SpeechModel {
     /** Names the first file that cannot be read; empty when all can. */
     std::string findProblem() const;
 
-    /** A configuration of the recogniser, to be freed by the caller; null when it is refused. */
+    /** A configuration of the decoder, to be freed by the caller; null when it is refused. */
     cmd_ln_s* createConfiguration() const;
 };
 

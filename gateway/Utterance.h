@@ -30,7 +30,7 @@ class Utterance {
     static constexpr std::size_t PIECE_SAMPLES = SpeechModel::RATE_HZ / 10;
     /** Frames of speech, of 10 ms, over which the cepstral mean is measured. */
     static constexpr std::size_t MEAN_FRAMES = 150;
-    /** Longest utterance in seconds; the recogniser holds 150 s at most. */
+    /** Longest utterance in seconds; the decoder holds 150 s at most. */
     static constexpr std::size_t MAX_SECONDS = 120;
     static constexpr std::size_t MAX_SAMPLES = MAX_SECONDS * SpeechModel::RATE_HZ;
 
@@ -43,7 +43,7 @@ class Utterance {
      */
     Utterance(DecoderPool& decoderPool, Arrival soundArrival);
 
-    /** Takes more sound, at the recogniser's rate. @return false once the utterance is too long */
+    /** Takes more sound, at the decoder's rate. @return false once the utterance is too long */
     bool add(const std::vector<int16_t>& samples);
 
     /**
@@ -57,7 +57,7 @@ class Utterance {
     /** Length of the sound so far, in milliseconds. */
     uint64_t getDurationMs() const { return total * 1000 / SpeechModel::RATE_HZ; }
 
-    /** Time that the recogniser has taken so far, in milliseconds. */
+    /** Time that the decoder has taken so far, in milliseconds. */
     uint64_t getDecodeMs() const { return static_cast<uint64_t>(decodeNs / 1000000); }
 
   private:

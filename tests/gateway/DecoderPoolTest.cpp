@@ -67,7 +67,7 @@ TEST(DecoderPool, LetsNobodyPassThoseWhoWait) {
     });
     awaitWaiting(pool, 1);
     lease.reset();
-    // Whether the waiting thread has woken up or not, the recogniser is its own.
+    // Whether the waiting thread has woken up or not, the decoder is its own.
     EXPECT_FALSE(pool.tryAcquire());
     served.get_future().wait();
     EXPECT_FALSE(pool.tryAcquire());
@@ -100,7 +100,7 @@ TEST(DecoderPool, ReportsAModelThatCannotBeLoaded) {
     const TestSupport::LogCapture log;
     DecoderPool pool(model, 1, 0);
     EXPECT_FALSE(pool.load());
-    EXPECT_TRUE(log.contains("the recogniser cannot load its model"));
+    EXPECT_TRUE(log.contains("the decoder cannot load its model"));
     EXPECT_FALSE(pool.acquire());
 }
 

@@ -1,6 +1,6 @@
 /**
  * @file
- * The recognisers of the tests of one process: loading a model takes a quarter of a second.
+ * The decoders of the tests of one process: loading a model takes a quarter of a second.
  */
 #pragma once
 
