@@ -11,6 +11,7 @@ import java.util.Arrays;
 import java.util.HashSet;
 import java.util.Set;
 import java.util.stream.Collectors;
+import korvel.talvox.impl.SettingsProbe;
 import korvel.talvox.support.KitTest;
 import org.junit.Test;
 
@@ -86,28 +87,20 @@ public class TalvoxSettingsTest extends KitTest {
         assertNull(settings.get(TalvoxSettings.SAMPLE_RATE));
     }
 
+    private static Set<String> namesOfKeys(boolean areEngineOnly) {
+        return TalvoxSettings.keys().stream()
+                .filter(key -> key.isEngineOnly() == areEngineOnly)
+                .map(SettingKey::getName)
+                .collect(Collectors.toSet());
+    }
+
     @Test
-    public void theKeysOfTheEngineOnly() {
-        final Set<SettingKey<?>> engineOnly =
-                new HashSet<>(
-                        Arrays.<SettingKey<?>>asList(
-                                TalvoxSettings.URL,
-                                TalvoxSettings.UUID,
-                                TalvoxSettings.EVENTS_LOGGING,
-                                TalvoxSettings.SOUND_FORMAT,
-                                TalvoxSettings.SPEEX_QUALITY,
-                                TalvoxSettings.SAMPLE_RATE,
-                                TalvoxSettings.VAD,
-                                TalvoxSettings.SESSION_MODE,
-                                TalvoxSettings.STREAMING,
-                                TalvoxSettings.UPPER_CONFIDENCE,
-                                TalvoxSettings.WINNER_LEAD_CONFIDENCE,
-                                TalvoxSettings.LOWER_CONFIDENCE));
+    public void aKeyHasTheLevelThatNativeCodeGivesIt() {
         assertEquals(
-                engineOnly,
-                TalvoxSettings.keys().stream()
-                        .filter(SettingKey::isEngineOnly)
-                        .collect(Collectors.toSet()));
+                new HashSet<>(Arrays.asList(SettingsProbe.engineKeys())), namesOfKeys(true));
+        assertEquals(
+                new HashSet<>(Arrays.asList(SettingsProbe.recognitionKeys())),
+                namesOfKeys(false));
     }
 
     private static <T> void setAsItIs(

@@ -1,7 +1,7 @@
 package korvel.talvox.impl;
 
-/** Brings the engine into states that no Java call can, and counts broken invariants. */
-final class AssertionProbe {
+/** Counts broken invariants. */
+public final class AssertionProbe {
     static {
         NativeLibrary.load();
         System.loadLibrary("TalvoxBundleProbe");
@@ -9,12 +9,6 @@ final class AssertionProbe {
 
     private AssertionProbe() {}
 
-    /** Adds a key to the engine's settings that their table does not have. */
-    static native void addUnknownSetting();
-
-    /** Gives the engine its default settings. */
-    static native void restoreDefaults();
-
     /** Broken invariants that native code has reported since the process began. */
-    static native long count();
+    public static native long count();
 }

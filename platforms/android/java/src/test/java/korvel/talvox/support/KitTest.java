@@ -1,5 +1,6 @@
 package korvel.talvox.support;
 
+import static org.junit.Assert.assertEquals;
 import static org.junit.Assert.assertTrue;
 import static org.robolectric.Shadows.shadowOf;
 
@@ -13,6 +14,8 @@ import java.util.concurrent.FutureTask;
 import java.util.concurrent.TimeUnit;
 import java.util.concurrent.TimeoutException;
 import java.util.stream.Collectors;
+import korvel.talvox.impl.AssertionProbe;
+import org.junit.After;
 import org.junit.Before;
 import org.junit.Rule;
 import org.junit.rules.TestWatcher;
@@ -27,6 +30,8 @@ import org.robolectric.shadows.ShadowLog;
 /**
  * A test with the framework classes and, as on a device, a main looper with a thread of its own.
  * All tests have this configuration: the native library can be loaded by one class loader only.
+ *
+ * <p>A test fails if native code reports a broken invariant during it, unless it expects that.
  */
 @RunWith(RobolectricTestRunner.class)
 @Config(sdk = 34)
@@ -46,11 +51,28 @@ public abstract class KitTest {
             };
 
     protected Application application;
+    private long assertionsBefore;
+    private long expectedAssertions;
 
     @Before
-    public final void allowRecording() {
+    public final void prepare() {
+        assertionsBefore = AssertionProbe.count();
         application = RuntimeEnvironment.getApplication();
         shadowOf(application).grantPermissions(Manifest.permission.RECORD_AUDIO);
+    }
+
+    /** Compares the reports with what the test expects. The clean-up of the test comes before. */
+    @After
+    public final void compareAssertions() {
+        assertEquals(
+                "broken invariants",
+                expectedAssertions,
+                AssertionProbe.count() - assertionsBefore);
+    }
+
+    /** Expects native code to report so many more broken invariants before the test has ended. */
+    protected final void expectAssertions(long count) {
+        expectedAssertions += count;
     }
 
     /** Runs something on the main looper and waits until it has run; what it throws comes here. */
