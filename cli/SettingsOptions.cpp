@@ -143,11 +143,11 @@ void applyDocument(Talvox::Settings& settings, const std::string& path) {
             "cannot read " + path + ": " +
             (tooLarge ? "it is too large for a settings document" : std::strerror(errno)));
     }
-    const std::string fault = Bundle::findXmlFault(xml, Talvox::Settings::XML_PATH_DFLT);
+    const std::string fault = settings.updateFromWholeXml(xml, Talvox::Settings::XML_PATH_DFLT,
+                                                          Talvox::Settings::bundleSpecs);
     if (!fault.empty()) {
         throw UsageError(path + ": " + fault);
     }
-    settings.updateFromXml(xml, Talvox::Settings::XML_PATH_DFLT, Talvox::Settings::bundleSpecs);
 }
 
 }  // namespace

@@ -53,16 +53,25 @@ bool startsWith(const std::string& text, const std::string& prefix) {
     return text.compare(0, prefix.size(), prefix) == 0;
 }
 
-/** An update logs an error in the text, or a missing path, when a check finds one. */
-void requireFaultsLogged(const std::string& document, const TestSupport::LogCapture& log) {
+/**
+ * An update with a whole document is refused where one with any document logs an error, and makes
+ * the same of all others.
+ */
+void requireSameFromWhole(const std::string& document, const Settings& updated,
+                          const TestSupport::LogCapture& log) {
     const std::vector<std::string> messages = log.messages();
     const auto faults =
         std::count_if(messages.begin(), messages.end(), [](const std::string& message) {
             return startsWith(message, "Bundle::updateFromXml parse error: ") ||
                    startsWith(message, "updateFromXml: path ");
         });
-    const std::string fault = Settings::findXmlFault(document, Settings::XML_PATH_DFLT);
-    require((faults > 0) == !fault.empty(), "an update logs what a check finds");
+    Settings whole;
+    const std::string fault =
+        whole.updateFromWholeXml(document, Settings::XML_PATH_DFLT, Settings::bundleSpecs);
+    require((faults > 0) == !fault.empty(), "what is refused is what an update logs");
+    require(
+        whole.toXmlString("voice") == (fault.empty() ? updated : Settings()).toXmlString("voice"),
+        "what is refused changes nothing");
 }
 
 /** What is valid stays as it is; only what is never repaired is complained about again. */
@@ -135,7 +144,7 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, std::size_t size) {
     Settings settings;
     settings.updateFromXml(document, Settings::XML_PATH_DFLT, Settings::bundleSpecs);
     require(settings.conformsTo(Settings::bundleSpecs), "an update keeps keys and types");
-    requireFaultsLogged(document, log);
+    requireSameFromWhole(document, settings, log);
     requireSameAfterReading(settings);
     settings.validate();
     require(settings.conformsTo(Settings::bundleSpecs), "a repair keeps keys and types");

@@ -151,11 +151,12 @@ class TALVOX_API Bundle {
     void updateFromXml(const std::string& xml, const std::string& path, const ElemSpec* spec);
 
     /**
-     * Tells whether `updateFromXml` would find an error in the text itself, or not find the path;
-     * names and values are not checked. Never fails.
-     * @return an empty text when there is no error, else the first one in plain words
+     * The same for a text that is used as a whole or not at all: with an error in the text itself,
+     * or without the path, the bundle stays as it is. Names and values are repaired as above.
+     * @return an empty text when the update was made, else the first error in plain words
      */
-    static std::string findXmlFault(const std::string& xml, const std::string& path);
+    std::string updateFromWholeXml(const std::string& xml, const std::string& path,
+                                   const ElemSpec* spec);
 
   private:
     static const ElemSpec* findRow(const ElemSpec* spec, const std::string& key);

@@ -165,11 +165,15 @@ void Bundle::updateFromXml(const std::string& xml, const std::string& path, cons
     updateFromXml(document, path, spec);
 }
 
-std::string Bundle::findXmlFault(const std::string& xml, const std::string& path) {
+std::string Bundle::updateFromWholeXml(const std::string& xml, const std::string& path,
+                                       const ElemSpec* spec) {
     TiXmlDocument document;
     std::string fault = XmlUtils::loadUsable(xml, document);
     if (fault.empty() && findNode(document, path) == nullptr) {
-        return "there is no element " + path;
+        fault = "there is no element " + path;
+    }
+    if (fault.empty()) {
+        updateFromXml(document, path, spec);
     }
     return fault;
 }

@@ -210,6 +210,20 @@ TEST(BuildSettings, RefusesADocumentThatIsBrokenOrHoldsNoSettings) {
     }
 }
 
+TEST(BuildSettings, LogsOnceHowADocumentIsRead) {
+    const ScratchDirectory directory;
+    SettingsOptions options;
+    options.file = directory.write("settings.xml", "<?xml version='1.0' encoding='koi8-r'?>" +
+                                                       document("<vad>\xFF</vad><speexquality/>"));
+    const LogCapture log;
+    EXPECT_EQ(buildSettings(options)->getString("vad"), "\xC3\xBF");
+    EXPECT_THAT(log.messages(),
+                ::testing::ElementsAre(
+                    "XmlUtils: reading encoding koi8-r as ISO-8859-1", "speexquality: no body",
+                    "updateFromXml: value of speexquality not a number: , keeping the "
+                    "old value"));
+}
+
 TEST(BuildSettings, RefusesADocumentThatCannotBeRead) {
     const ScratchDirectory directory;
     SettingsOptions options;

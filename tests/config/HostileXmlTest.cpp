@@ -223,6 +223,27 @@ TEST(HostileXml, ADocumentInAnotherEncodingIsAppliedAsAWhole) {
     }
 }
 
+TEST(HostileXml, AnUpdateFromAWholeDocumentTakesAllOrNothing) {
+    const struct {
+        std::string text;
+        std::string fault;
+    } cases[] = {
+        {document("<model>maps</model>"), ""},
+        {document("<model>maps</model><odd/>"), ""},
+        {document("<model>maps</model><url>\xFF</url>"),
+         "the text is not UTF-8 (line 2, column 51)"},
+        {document("<model>maps</model>") + "more",
+         "text outside of the elements (line 2, column 75)"},
+        {"<startup><model>maps</model></startup>", "there is no element /startup/features/voice"},
+    };
+    for (const auto& each : cases) {
+        Settings settings;
+        EXPECT_EQ(each.fault, settings.updateFromWholeXml(each.text, Settings::XML_PATH_DFLT,
+                                                          Settings::bundleSpecs));
+        EXPECT_EQ(each.fault.empty() ? "maps" : "general", settings.getModel()) << each.text;
+    }
+}
+
 TEST(HostileXml, DeepNestingIsRefused) {
     const std::string deep = "elements are nested too deeply (line 1, column ";
     expectNothingApplied(repeat("<a>", 100000), deep + "195)");
