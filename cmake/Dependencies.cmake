@@ -3,7 +3,6 @@ find_package(PkgConfig REQUIRED)
 find_package(Threads REQUIRED)
 find_package(Boost 1.70 REQUIRED)
 
-pkg_check_modules(libuv REQUIRED IMPORTED_TARGET libuv)
 pkg_check_modules(libcurl REQUIRED IMPORTED_TARGET libcurl)
 pkg_check_modules(tinyxml REQUIRED IMPORTED_TARGET tinyxml)
 pkg_check_modules(speex REQUIRED IMPORTED_TARGET speex)

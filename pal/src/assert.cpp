@@ -4,28 +4,48 @@
 #include <cstddef>
 #include <cstdint>
 #include <mutex>
-#include <string>
+#include <string_view>
 
+#include "immortal.h"
 #include "pal/kd_assert.h"
 #include "pal/kd_log.h"
 
 namespace {
+
+using korvel_pal::Immortal;
+
+constexpr std::size_t PATH_BYTES_MAX = 1024;
 
 struct AssertionHandler {
     KDAssertionHandlerFuncKOR* func;
     void* user;
 };
 
-/** 64-bit FNV-1a; equal values count as the same site. */
-std::uint64_t hashOf(const char* condition, const char* filename, KDint linenumber) {
-    const std::string site =
-        std::string(filename) + ':' + std::to_string(linenumber) + ':' + condition;
-    std::uint64_t hash = 0xCBF29CE484222325U;
-    for (const char c : site) {
-        hash = (hash ^ static_cast<unsigned char>(c)) * 0x100000001B3U;
+/** 64-bit FNV-1a. Takes no memory, as all of a report: it may be about the want of it. */
+class SiteHash {
+  public:
+    SiteHash& add(const char* text) {
+        for (; *text != '\0'; ++text) {
+            addByte(static_cast<unsigned char>(*text));
+        }
+        addByte(0);
+        return *this;
     }
-    return hash;
-}
+
+    SiteHash& add(KDint number) {
+        for (auto left = static_cast<std::uint32_t>(number); left != 0; left >>= 8) {
+            addByte(left & 0xFFU);
+        }
+        return *this;
+    }
+
+    std::uint64_t get() const { return hash; }
+
+  private:
+    void addByte(std::uint32_t byte) { hash = (hash ^ byte) * 0x100000001B3U; }
+
+    std::uint64_t hash = 0xCBF29CE484222325U;
+};
 
 /** Counts reports by site, in bounded memory. */
 class SiteCounts {
@@ -63,21 +83,21 @@ bool isPowerOfTen(std::uint64_t number) {
 }
 
 void logSparsely(const char* condition, const char* filename, KDint linenumber, void* /*user*/) {
-    // Never destroyed: threads may outlive the static objects of the process.
-    static SiteCounts* const sites = new SiteCounts;
-    const std::uint64_t count = sites->add(hashOf(condition, filename, linenumber));
-    if (!isPowerOfTen(count)) {
-        return;
+    static Immortal<SiteCounts> sites;
+    // Equal values count as the same site.
+    const std::uint64_t site = SiteHash().add(condition).add(filename).add(linenumber).get();
+    const std::uint64_t count = sites.get().add(site);
+    if (count == 1) {
+        kdLogFormatMessage("assertion failed: %s (%s:%d)", condition, filename, linenumber);
+    } else if (isPowerOfTen(count)) {
+        kdLogFormatMessage("assertion failed: %s (%s:%d), %llu times", condition, filename,
+                           linenumber, static_cast<unsigned long long>(count));
     }
-    const std::string repeats = count == 1 ? "" : ", " + std::to_string(count) + " times";
-    kdLogFormatMessage("assertion failed: %s (%s:%d)%s", condition, filename, linenumber,
-                       repeats.c_str());
 }
 
-// Never destroyed, for the same reason.
 std::mutex& handlerMutex() {
-    static std::mutex* const mutex = new std::mutex;
-    return *mutex;
+    static Immortal<std::mutex> mutex;
+    return mutex.get();
 }
 
 AssertionHandler& installedHandler() {
@@ -111,15 +131,17 @@ KDint64 kdGetAssertionCountKOR(void) {
 }
 
 void kdHandleAssertionInFileKOR(const char* condition, const char* file, KDint linenumber) {
-    std::string path(file != nullptr ? file : "");
+    std::string_view path(file != nullptr ? file : "");
     // Where a compiler cache makes paths relative to the folder of the build.
-    while (path.compare(0, 3, "../") == 0) {
-        path.erase(0, 3);
+    while (path.substr(0, 3) == "../") {
+        path.remove_prefix(3);
     }
-    const std::string::size_type dot = path.rfind('.');
-    const std::string::size_type slash = path.rfind('/');
-    if (dot != std::string::npos && (slash == std::string::npos || dot > slash)) {
-        path.resize(dot);
+    const std::string_view::size_type dot = path.rfind('.');
+    const std::string_view::size_type slash = path.rfind('/');
+    if (dot != std::string_view::npos && (slash == std::string_view::npos || dot > slash)) {
+        path = path.substr(0, dot);
     }
-    kdHandleAssertion(condition, path.c_str(), linenumber);
+    std::array<char, PATH_BYTES_MAX> text = {};
+    path.copy(text.data(), text.size() - 1);
+    kdHandleAssertion(condition, text.data(), linenumber);
 }

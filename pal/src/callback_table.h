@@ -4,6 +4,7 @@
 #include <mutex>
 #include <utility>
 
+#include "immortal.h"
 #include "pal/kd_event.h"
 
 namespace korvel_pal {
@@ -13,17 +14,23 @@ class CallbackTable {
   public:
     static CallbackTable& instance();
 
-    /** A null `func` removes the registration. */
+    /** A null `func` removes the registration. May throw `std::bad_alloc`, without effect. */
     void install(KDCallbackFunc* func, KDint type, void* userptr);
 
-    /** Under the event lock; an event that nobody has registered for is dropped. */
+    /** Under the event lock; an event without a registration is dropped. */
     void deliver(const KDEvent& event);
 
+    /** As `deliver`, to every registration for the event's type, with its own user pointer. */
+    void deliverToAll(KDEvent event);
+
   private:
+    friend class Immortal<CallbackTable>;
+    using Key = std::pair<KDint, void*>;
+
     CallbackTable() = default;
 
     std::mutex mutex;
-    std::map<std::pair<KDint, void*>, KDCallbackFunc*> callbacks;
+    std::map<Key, KDCallbackFunc*> callbacks;
 };
 
 }  // namespace korvel_pal

@@ -3,16 +3,16 @@
 #include <mutex>
 #include <thread>
 
+#include "immortal.h"
 #include "pal/kd_assert.h"
 
 namespace {
 
 thread_local int levelsHeld = 0;
 
-// Never destroyed: threads may outlive the static objects of the process.
 std::mutex& eventMutex() {
-    static std::mutex* const mutex = new std::mutex;
-    return *mutex;
+    static korvel_pal::Immortal<std::mutex> mutex;
+    return mutex.get();
 }
 
 }  // namespace

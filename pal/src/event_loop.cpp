@@ -2,9 +2,12 @@
 
 #include <pthread.h>
 
+#include <algorithm>
 #include <chrono>
 #include <cstdlib>
+#include <exception>
 
+#include "callback_guard.h"
 #include "event_lock.h"
 #include "pal/SignalsBlocked.h"
 #include "pal/kd_assert.h"
@@ -17,7 +20,9 @@ namespace korvel_pal {
 namespace {
 
 constexpr std::chrono::seconds STOP_LIMIT{2};
-constexpr std::int64_t NS_PER_MS = 1000000;
+
+// Room for what a session has in flight at a time, so that posting takes no memory.
+constexpr std::size_t POSTS_RESERVED = 64;
 
 void stopAtExit() {
     EventLoop::instance().stop();
@@ -26,28 +31,40 @@ void stopAtExit() {
 }  // namespace
 
 EventLoop& EventLoop::instance() {
-    static EventLoop* const eventLoop = new EventLoop;
-    return *eventLoop;
+    static Immortal<EventLoop> eventLoop;
+    return eventLoop.get();
 }
 
-void EventLoop::post(void (*func)(void*), void* user) {
+bool EventLoop::start() {
     const std::lock_guard<std::mutex> lock(mutex);
-    if (isStopping()) {
-        pending.push_back({func, user});  // never run; kept, so that nothing counts as lost
-        return;
+    return isStopping() || startThreads();
+}
+
+bool EventLoop::post(void (*func)(void*), void* user) {
+    const std::lock_guard<std::mutex> lock(mutex);
+    if (!isStopping() && !startThreads()) {
+        return false;
     }
-    if (!start()) {
-        return;
+    try {
+        // When the process ends: never run, but kept, so that nothing counts as lost.
+        pending.push_back({func, user});
+    } catch (const std::exception&) {
+        kdLogMessage("PAL: no memory for an event");
+        return false;
     }
-    pending.push_back({func, user});
-    ++postedCount;
-    uv_async_send(&async);
+    if (!isStopping()) {
+        ++postedCount;
+        awake = true;
+        wakeSignal.notifyOne();
+    }
+    return true;
 }
 
 void EventLoop::wake() {
     const std::lock_guard<std::mutex> lock(mutex);
-    if (!isStopping() && start()) {
-        uv_async_send(&async);
+    if (!isStopping() && startThreads()) {
+        awake = true;
+        wakeSignal.notifyOne();
     }
 }
 
@@ -64,11 +81,11 @@ void EventLoop::stop() {
         if (stopping.exchange(true)) {
             return;
         }
-        if (started) {
-            uv_async_send(&async);
-        }
+        awake = true;
+        wakeSignal.notifyOne();
         changed.notify_all();
     }
+    WorkQueue::instance().end();
     if (thread.get_id() == std::this_thread::get_id()) {
         return;  // a callback ends the process
     }
@@ -97,22 +114,24 @@ bool EventLoop::waitForCallbacks() {
     return waitForEventLock(limit);
 }
 
-bool EventLoop::start() {
+bool EventLoop::startThreads() {
     if (started) {
         return true;
     }
     const SignalsBlocked signalsBlocked;
-    if (!KOR_ASSERT(uv_loop_init(&loop) == 0)) {
+    WorkQueue& workQueue = WorkQueue::instance();
+    if (!workQueue.startFirstWorker()) {
         return false;
     }
-    if (!KOR_ASSERT(uv_async_init(&loop, &async, &EventLoop::onWake) == 0)) {
-        uv_loop_close(&loop);
+    try {
+        pending.reserve(POSTS_RESERVED);
+        current.reserve(POSTS_RESERVED);
+        thread = std::thread(&EventLoop::run, this);
+    } catch (const std::exception& exception) {
+        kdLogFormatMessage("PAL: the event thread cannot start: %s", exception.what());
+        workQueue.endWorkers();
         return false;
     }
-    uv_timer_init(&loop, &timer);
-    async.data = this;
-    timer.data = this;
-    thread = std::thread(&EventLoop::run, this);
     started = true;
     std::atexit(&stopAtExit);
     return true;
@@ -123,28 +142,29 @@ void EventLoop::run() {
     // Else it would bear the name of whichever thread was the first to post.
     pthread_setname_np(pthread_self(), "talvox-events");
 #endif
-    uv_run(&loop, UV_RUN_DEFAULT);
-    uv_loop_close(&loop);
+    while (!isStopping()) {
+        runPosts();
+        WorkQueue::instance().deliverCompleted();
+        TimerTable::instance().fireDue();
+        sleep();
+    }
     const std::lock_guard<std::mutex> lock(mutex);
     finished = true;
     changed.notify_all();
 }
 
-void EventLoop::onWake(uv_async_t* handle) {
-    EventLoop& self = *static_cast<EventLoop*>(handle->data);
-    self.runPosts();
-    if (self.isStopping()) {
-        self.closeHandles();
-    } else {
-        self.serveTimers();
+void EventLoop::sleep() {
+    const std::int64_t waitNs = TimerTable::instance().timeToNext();
+    std::unique_lock<std::mutex> lock(mutex);
+    if (!awake && waitNs == TimerTable::NEVER) {
+        wakeSignal.wait(lock);
+    } else if (!awake && waitNs > 0) {
+        wakeSignal.waitFor(lock, waitNs);
     }
+    awake = false;
 }
 
-void EventLoop::onTimer(uv_timer_t* handle) {
-    static_cast<EventLoop*>(handle->data)->serveTimers();
-}
-
-// One swap for each wake-up, so that posts which post again cannot starve the timers.
+// One swap for each turn, so that posts which post again cannot starve the timers.
 void EventLoop::runPosts() {
     {
         const std::lock_guard<std::mutex> lock(mutex);
@@ -155,7 +175,7 @@ void EventLoop::runPosts() {
         if (isStopping()) {
             return;
         }
-        post.func(post.user);
+        callGuarded([&post] { post.func(post.user); });
     }
     const std::lock_guard<std::mutex> lock(mutex);
     handledCount += current.size();
@@ -163,36 +183,14 @@ void EventLoop::runPosts() {
     changed.notify_all();
 }
 
-void EventLoop::serveTimers() {
-    TimerTable::instance().fireDue();
-    const std::int64_t waitNs = TimerTable::instance().timeToNext();
-    uv_timer_stop(&timer);
-    if (waitNs == TimerTable::NEVER) {
-        return;
-    }
-    if (waitNs == 0) {
-        uv_async_send(&async);  // libuv would go on with its timers for ever
-        return;
-    }
-    const std::int64_t waitMs = waitNs / NS_PER_MS + (waitNs % NS_PER_MS != 0 ? 1 : 0);
-    uv_update_time(&loop);
-    uv_timer_start(&timer, &EventLoop::onTimer, static_cast<std::uint64_t>(waitMs), 0);
-}
-
-void EventLoop::closeHandles() {
-    WorkQueue::instance().cancelSubmitted();
-    uv_close(reinterpret_cast<uv_handle_t*>(&timer), nullptr);
-    uv_close(reinterpret_cast<uv_handle_t*>(&async), nullptr);
-    // Work that runs is not waited for here; then the loop stays open for its last signal.
-    uv_stop(&loop);
-}
-
 }  // namespace korvel_pal
 
-void kdPostKOR(void (*func)(void* user), void* user) {
-    if (KOR_ASSERT(func)) {
-        korvel_pal::EventLoop::instance().post(func, user);
-    }
+KDint kdStartEventsKOR(void) {
+    return korvel_pal::EventLoop::instance().start() ? 0 : -1;
+}
+
+KDint kdPostKOR(void (*func)(void* user), void* user) {
+    return KOR_ASSERT(func) && korvel_pal::EventLoop::instance().post(func, user) ? 0 : -1;
 }
 
 KDint kdDrainEventsKOR(void) {

@@ -1,7 +1,5 @@
 #pragma once
 
-#include <uv.h>
-
 #include <atomic>
 #include <condition_variable>
 #include <cstdint>
@@ -9,22 +7,29 @@
 #include <thread>
 #include <vector>
 
+#include "immortal.h"
 #include "pal/kd_event.h"
+#include "wake_signal.h"
 
 namespace korvel_pal {
 
 /**
- * The event thread and its queue. Started by the first use, stopped when the process ends; what is
- * asked of it later is dropped. The object itself is never destroyed, because other threads may
- * still call it then.
+ * The event thread and its queue. Started by the first use, together with the first worker, and
+ * stopped when the process ends; what is asked of it later is dropped. It needs a thread and some
+ * memory, no descriptors: a start that fails leaves nothing behind, and the next use tries again.
+ * The object itself is never destroyed, because other threads may still call it then.
  */
 class EventLoop {
   public:
     static EventLoop& instance();
 
-    void post(void (*func)(void*), void* user);
+    /** @return whether the event thread runs now; true also when the process ends */
+    bool start();
 
-    /** Makes the event thread look at the timers. */
+    /** @return false when the function will not run: no thread or no memory for it */
+    bool post(void (*func)(void*), void* user);
+
+    /** Makes the event thread look at timers and completed work. */
     void wake();
 
     /** See `kdDrainEventsKOR`. */
@@ -38,10 +43,9 @@ class EventLoop {
     /** A callback did not return in time when deliveries ended. */
     bool isBlocked() const { return blocked.load(std::memory_order_acquire); }
 
-    /** For the event thread only. */
-    uv_loop_t* uvLoop() { return &loop; }
-
   private:
+    friend class Immortal<EventLoop>;
+
     struct Post {
         void (*func)(void*);
         void* user;
@@ -49,20 +53,19 @@ class EventLoop {
 
     EventLoop() = default;
 
-    bool start();
+    bool startThreads();
     bool waitForCallbacks();
     void run();
     void runPosts();
-    void serveTimers();
-    void closeHandles();
-    static void onWake(uv_async_t* handle);
-    static void onTimer(uv_timer_t* handle);
+    void sleep();
 
     std::mutex mutex;
+    WakeSignal wakeSignal;
     std::condition_variable changed;
     // Guarded by the mutex.
     bool started = false;
     bool finished = false;
+    bool awake = false;  // something happened since the thread last looked
     std::vector<Post> pending;
     std::uint64_t postedCount = 0;
     std::uint64_t handledCount = 0;
@@ -71,10 +74,7 @@ class EventLoop {
     std::atomic<bool> blocked{false};
     std::thread thread;
 
-    // Of the event thread, apart from sending to `async`, which the mutex guards.
-    uv_loop_t loop{};
-    uv_async_t async{};
-    uv_timer_t timer{};
+    // Of the event thread.
     std::vector<Post> current;
 };
 

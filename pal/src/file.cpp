@@ -2,13 +2,16 @@
 
 #include <cstdint>
 #include <cstdio>
+#include <exception>
 #include <memory>
 #include <mutex>
 #include <string>
 
 #include "handle_table.h"
+#include "immortal.h"
 #include "mount_table.h"
 #include "pal/kd_file.h"
+#include "pal/kd_log.h"
 
 namespace {
 
@@ -16,6 +19,12 @@ using korvel_pal::HandleTable;
 using korvel_pal::MountTable;
 
 struct OpenFile {
+    ~OpenFile() {
+        if (file != nullptr) {
+            std::fclose(file);
+        }
+    }
+
     std::mutex mutex;
     std::FILE* file = nullptr;  // null once closed
 };
@@ -26,10 +35,9 @@ struct FileSystem {
     HandleTable<KDFile, std::shared_ptr<OpenFile>> files;
 };
 
-// Never destroyed: threads may outlive the static objects of the process.
 FileSystem& fileSystem() {
-    static FileSystem* const system = new FileSystem;
-    return *system;
+    static korvel_pal::Immortal<FileSystem> system;
+    return system.get();
 }
 
 std::shared_ptr<OpenFile> findFile(const KDFile* handle) {
@@ -56,11 +64,9 @@ bool fitsInMemory(KDsize size, KDsize count) {
 
 }  // namespace
 
-KDFile* kdFopen(const char* pathname, const char* mode) {
-    if (pathname == nullptr || mode == nullptr) {
-        return nullptr;
-    }
-    std::string path(pathname);
+namespace {
+
+KDFile* openFile(std::string path, const char* mode) {
     FileSystem& system = fileSystem();
     {
         const std::lock_guard<std::mutex> lock(system.mutex);
@@ -75,6 +81,20 @@ KDFile* kdFopen(const char* pathname, const char* mode) {
     }
     const std::lock_guard<std::mutex> lock(system.mutex);
     return system.files.add(open);
+}
+
+}  // namespace
+
+KDFile* kdFopen(const char* pathname, const char* mode) {
+    if (pathname == nullptr || mode == nullptr) {
+        return nullptr;
+    }
+    try {
+        return openFile(pathname, mode);
+    } catch (const std::exception&) {
+        kdLogMessage("PAL: no memory to open a file");
+        return nullptr;
+    }
 }
 
 KDint kdFclose(KDFile* file) {
@@ -127,12 +147,17 @@ KDint kdFseek(KDFile* file, KDint64 offset, KDfileSeekOrigin origin) {
 }
 
 KDint kdMountKOR(const char* virtualRoot, const char* directory) {
-    const std::string root(virtualRoot != nullptr ? virtualRoot : "");
-    if (root.empty() || root.front() != '/' || root.back() == '/') {
+    try {
+        const std::string root(virtualRoot != nullptr ? virtualRoot : "");
+        if (root.empty() || root.front() != '/' || root.back() == '/') {
+            return -1;
+        }
+        FileSystem& system = fileSystem();
+        const std::lock_guard<std::mutex> lock(system.mutex);
+        system.mounts.mount(root, directory);
+        return 0;
+    } catch (const std::exception&) {
+        kdLogMessage("PAL: no memory for a mount");
         return -1;
     }
-    FileSystem& system = fileSystem();
-    const std::lock_guard<std::mutex> lock(system.mutex);
-    system.mounts.mount(root, directory);
-    return 0;
 }

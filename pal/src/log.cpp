@@ -3,8 +3,8 @@
 #include <memory>
 #include <mutex>
 #include <new>
-#include <string>
 
+#include "immortal.h"
 #include "pal/kd_log.h"
 
 namespace {
@@ -19,10 +19,9 @@ struct LogSink {
 
 thread_local bool insideSink = false;
 
-// Never destroyed: threads may outlive the static objects of the process.
 LogSink& logSink() {
-    static LogSink* const sink = new LogSink;
-    return *sink;
+    static korvel_pal::Immortal<LogSink> sink;
+    return sink.get();
 }
 
 class InsideSink {
@@ -33,10 +32,9 @@ class InsideSink {
     InsideSink& operator=(const InsideSink&) = delete;
 };
 
+// One call, so that lines of several threads do not mix; without memory of our own.
 void writeToStandardError(const char* message) {
-    std::string line(message);
-    line += '\n';
-    std::fwrite(line.data(), 1, line.size(), stderr);
+    std::fprintf(stderr, "%s\n", message);
 }
 
 /** Formats as in the "C" locale, in whichever the host application has set. */
@@ -66,7 +64,11 @@ void kdLogMessage(const char* string) {
         return;
     }
     const InsideSink inside;
-    sink.func(message, sink.user);
+    try {
+        sink.func(message, sink.user);
+    } catch (...) {
+        writeToStandardError(message);  // logging never fails, whatever the sink lacks
+    }
 }
 
 void kdLogFormatMessage(const char* format, ...) {

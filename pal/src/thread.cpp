@@ -1,4 +1,5 @@
 #include <mutex>
+#include <new>
 
 #include "pal/kd_assert.h"
 #include "pal/kd_thread.h"
@@ -8,7 +9,7 @@ struct KDThreadMutex {
 };
 
 KDThreadMutex* kdThreadMutexCreate(const void* mutexattr) {
-    return KOR_ASSERT(mutexattr == nullptr) ? new KDThreadMutex : nullptr;
+    return KOR_ASSERT(mutexattr == nullptr) ? new (std::nothrow) KDThreadMutex : nullptr;
 }
 
 KDint kdThreadMutexFree(KDThreadMutex* mutex) {

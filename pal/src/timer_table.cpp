@@ -1,11 +1,15 @@
 #include "timer_table.h"
 
 #include <algorithm>
+#include <exception>
+#include <utility>
 
+#include "callback_guard.h"
 #include "callback_table.h"
 #include "clock.h"
 #include "event_lock.h"
 #include "event_loop.h"
+#include "pal/kd_log.h"
 
 namespace korvel_pal {
 
@@ -23,18 +27,22 @@ bool isTimerType(KDint type) {
 }  // namespace
 
 TimerTable& TimerTable::instance() {
-    static TimerTable* const table = new TimerTable;
-    return *table;
+    static Immortal<TimerTable> table;
+    return table.get();
 }
 
 KDTimer* TimerTable::start(std::int64_t intervalNs, KDint type, void* userptr) {
+    if (!Clock::isManual() && !EventLoop::instance().start()) {
+        return nullptr;
+    }
     KDTimer* handle = nullptr;
     bool isNext = false;
     {
         const std::lock_guard<std::mutex> lock(mutex);
-        const std::int64_t interval = std::max<std::int64_t>(intervalNs, 1);
-        handle = timers.add({0, startedCount++, interval, type, userptr, false});
-        enqueue(handle, *timers.find(handle), addTime(Clock::now(), interval));
+        handle = add(std::max<std::int64_t>(intervalNs, 1), type, userptr);
+        if (handle == nullptr) {
+            return nullptr;
+        }
         const std::int64_t due = queue.begin()->first.first;
         isNext = queue.begin()->second == handle && !Clock::isManual() && due < loopWakesAt;
         loopWakesAt = isNext ? due : loopWakesAt;
@@ -42,6 +50,21 @@ KDTimer* TimerTable::start(std::int64_t intervalNs, KDint type, void* userptr) {
     if (isNext) {
         EventLoop::instance().wake();
     }
+    return handle;
+}
+
+KDTimer* TimerTable::add(std::int64_t intervalNs, KDint type, void* userptr) {
+    const std::int64_t due = addTime(Clock::now(), intervalNs);
+    KDTimer* handle = nullptr;
+    try {
+        handle = timers.add({due, startedCount, intervalNs, type, userptr, true});
+        queue.emplace(std::make_pair(due, startedCount), handle);
+    } catch (const std::exception&) {
+        timers.remove(handle);
+        kdLogMessage("PAL: no memory for a timer");
+        return nullptr;
+    }
+    ++startedCount;
     return handle;
 }
 
@@ -76,7 +99,7 @@ void TimerTable::fireDue() {
         if (EventLoop::instance().isStopping() || !takeDue(now, false, event)) {
             return;
         }
-        CallbackTable::instance().deliver(event);
+        callGuarded([&event] { CallbackTable::instance().deliver(event); });
     }
 }
 
@@ -97,7 +120,7 @@ void TimerTable::advanceManualClock(std::int64_t nanoseconds) {
     const std::int64_t end = addTime(Clock::now(), std::max<std::int64_t>(nanoseconds, 0));
     KDEvent event{};
     while (takeDue(end, true, event)) {
-        CallbackTable::instance().deliver(event);
+        callGuarded([&event] { CallbackTable::instance().deliver(event); });
     }
     // A callback may have moved the clock further, or chosen the real one.
     if (Clock::isManual() && Clock::now() < end) {
@@ -105,10 +128,12 @@ void TimerTable::advanceManualClock(std::int64_t nanoseconds) {
     }
 }
 
-void TimerTable::enqueue(KDTimer* handle, Timer& timer, std::int64_t due) {
+// Moves the entry that the timer has already: what runs once can always run again.
+void TimerTable::enqueue(Queue::node_type node, Timer& timer, std::int64_t due) {
     timer.due = due;
     timer.waiting = true;
-    queue.emplace(std::make_pair(due, timer.order), handle);
+    node.key() = {due, timer.order};
+    queue.insert(std::move(node));
 }
 
 // Takes the next timer that is due up to `limit` and puts it back at its next time if it is
@@ -118,18 +143,18 @@ bool TimerTable::takeDue(std::int64_t limit, bool manual, KDEvent& event) {
     if (queue.empty() || Clock::isManual() != manual || queue.begin()->first.first > limit) {
         return false;
     }
-    KDTimer* const handle = queue.begin()->second;
-    queue.erase(queue.begin());
+    Queue::node_type node = queue.extract(queue.begin());
+    KDTimer* const handle = node.mapped();
     Timer& timer = *timers.find(handle);
     timer.waiting = false;
-    event = {timer.due, KD_EVENT_TIMER, timer.userptr, handle};
+    event = {timer.due, KD_EVENT_TIMER, timer.userptr, handle, nullptr};
     if (manual && Clock::now() < timer.due) {
         Clock::useManual(timer.due);
     }
     if (timer.type == KD_TIMER_PERIODIC_AVERAGE) {
-        enqueue(handle, timer, addTime(timer.due, timer.intervalNs));
+        enqueue(std::move(node), timer, addTime(timer.due, timer.intervalNs));
     } else if (timer.type == KD_TIMER_PERIODIC_MINIMUM) {
-        enqueue(handle, timer, addTime(Clock::now(), timer.intervalNs));
+        enqueue(std::move(node), timer, addTime(Clock::now(), timer.intervalNs));
     }
     return true;
 }
@@ -143,9 +168,11 @@ void TimerTable::switchClock(SwitchClock change) {
     const std::int64_t now = Clock::now();
     Queue waiting;
     waiting.swap(queue);
-    for (const auto& entry : waiting) {
-        const std::int64_t left = std::max<std::int64_t>(entry.first.first - before, 0);
-        enqueue(entry.second, *timers.find(entry.second), addTime(now, left));
+    while (!waiting.empty()) {
+        Queue::node_type node = waiting.extract(waiting.begin());
+        const std::int64_t left = std::max<std::int64_t>(node.key().first - before, 0);
+        Timer& timer = *timers.find(node.mapped());
+        enqueue(std::move(node), timer, addTime(now, left));
     }
 }
 

@@ -7,6 +7,7 @@
 #include <utility>
 
 #include "handle_table.h"
+#include "immortal.h"
 #include "pal/kd_event.h"
 
 namespace korvel_pal {
@@ -21,6 +22,7 @@ class TimerTable {
 
     static TimerTable& instance();
 
+    /** Null when there is no memory, or no event thread to fire it. */
     KDTimer* start(std::int64_t intervalNs, KDint type, void* userptr);
     bool cancel(KDTimer* handle);
 
@@ -38,6 +40,8 @@ class TimerTable {
     void advanceManualClock(std::int64_t nanoseconds);
 
   private:
+    friend class Immortal<TimerTable>;
+
     struct Timer {
         std::int64_t due;
         std::uint64_t order;
@@ -50,7 +54,8 @@ class TimerTable {
 
     TimerTable() = default;
 
-    void enqueue(KDTimer* handle, Timer& timer, std::int64_t due);
+    KDTimer* add(std::int64_t intervalNs, KDint type, void* userptr);
+    void enqueue(Queue::node_type node, Timer& timer, std::int64_t due);
     bool takeDue(std::int64_t limit, bool manual, KDEvent& event);
     template <typename SwitchClock>
     void switchClock(SwitchClock change);

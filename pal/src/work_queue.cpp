@@ -1,109 +1,216 @@
 #include "work_queue.h"
 
+#include <pthread.h>
+
+#include <exception>
 #include <utility>
 
+#include "callback_guard.h"
 #include "event_lock.h"
 #include "event_loop.h"
+#include "pal/SignalsBlocked.h"
 #include "pal/kd_assert.h"
+#include "pal/kd_log.h"
 
 namespace korvel_pal {
 
+void WorkQueue::Line::push(Work* work) {
+    work->next = nullptr;
+    (last != nullptr ? last->next : first) = work;
+    last = work;
+    ++count;
+}
+
+WorkQueue::Work* WorkQueue::Line::pop() {
+    Work* const work = first;
+    if (work != nullptr) {
+        remove(work);
+    }
+    return work;
+}
+
+void WorkQueue::Line::remove(Work* work) {
+    Work* before = nullptr;
+    for (Work* each = first; each != work; each = each->next) {
+        before = each;
+    }
+    (before != nullptr ? before->next : first) = work->next;
+    last = last == work ? before : last;
+    --count;
+}
+
 WorkQueue& WorkQueue::instance() {
-    static WorkQueue* const queue = new WorkQueue;
-    return *queue;
+    static Immortal<WorkQueue> queue;
+    return queue.get();
 }
 
 KDWork* WorkQueue::add(void (*work)(void*), void (*done)(void*), void* user) {
-    auto entry = std::make_unique<Work>();
-    Work& added = *entry;
-    added.work = work;
-    added.done = done;
-    added.user = user;
-    added.request.data = &added;
-    {
-        const std::lock_guard<std::mutex> lock(mutex);
-        added.handle = works.add(std::move(entry));
+    if (!EventLoop::instance().start()) {
+        return nullptr;
     }
-    // Once it is posted, the entry may end at any moment.
-    KDWork* const handle = added.handle;
-    EventLoop::instance().post(&WorkQueue::submit, handle);
+    const std::lock_guard<std::mutex> lock(mutex);
+    Work* added = nullptr;
+    KDWork* handle = nullptr;
+    try {
+        auto entry = std::make_unique<Work>();
+        added = entry.get();
+        handle = works.add(std::move(entry));
+    } catch (const std::exception&) {
+        kdLogMessage("PAL: no memory for background work");
+        return nullptr;
+    }
+    added->handle = handle;
+    added->work = work;
+    added->done = done;
+    added->user = user;
+    if (ending) {
+        return handle;
+    }
+    waiting.push(added);
+    if (waiting.size() > idleCount && workerCount < WORKERS_MAX) {
+        startWorker();
+    }
+    wakeSignal.notifyOne();
     return handle;
 }
 
 void WorkQueue::cancel(KDWork* handle, void (*release)(void*)) {
-    const EventLockGuard lock;
-    Work* const work = find(handle);
-    if (work == nullptr || work->cancelled) {
-        return;
-    }
-    work->cancelled = true;
-    work->release = release;
-    EventLoop::instance().post(&WorkQueue::takeBack, handle);
-}
-
-void WorkQueue::cancelSubmitted() {
-    const std::lock_guard<std::mutex> lock(mutex);
-    works.forEach([](KDWork*, std::unique_ptr<Work>& work) {
-        if (work->submitted) {
-            uv_cancel(reinterpret_cast<uv_req_t*>(&work->request));
+    const EventLockGuard eventLock;
+    {
+        const std::lock_guard<std::mutex> lock(mutex);
+        const std::unique_ptr<Work>* const found = works.find(handle);
+        if (found == nullptr || (*found)->cancelled) {
+            return;
         }
-    });
+        Work& work = **found;
+        work.cancelled = true;
+        work.release = release;
+        if (ending || work.state != State::WAITING) {
+            return;
+        }
+        waiting.remove(&work);
+        complete(&work);
+    }
+    EventLoop::instance().wake();
 }
 
-WorkQueue::Work* WorkQueue::find(KDWork* handle) {
-    const std::lock_guard<std::mutex> lock(mutex);
-    const std::unique_ptr<Work>* const found = works.find(handle);
-    return found == nullptr ? nullptr : found->get();
+void WorkQueue::complete(Work* finished) {
+    finished->state = State::COMPLETED;
+    completed.push(finished);
 }
 
-// Under the event lock.
-void WorkQueue::finish(KDWork* handle) {
+// No more than there is now: what completes meanwhile must not keep the timers waiting.
+void WorkQueue::deliverCompleted() {
+    std::size_t count = 0;
+    {
+        const std::lock_guard<std::mutex> lock(mutex);
+        count = completed.size();
+    }
+    while (count > 0 && deliverOne()) {
+        --count;
+    }
+}
+
+bool WorkQueue::deliverOne() {
+    const EventLockGuard eventLock;
+    // At the end of the process the owner may be gone already; the entry then stays in the table.
+    if (EventLoop::instance().isStopping()) {
+        return false;
+    }
     std::unique_ptr<Work> work;
     {
         const std::lock_guard<std::mutex> lock(mutex);
+        KDWork* const handle = completed.pop()->handle;
         work = std::move(*works.find(handle));
         works.remove(handle);
     }
     void (*const call)(void*) = work->cancelled ? work->release : work->done;
     if (call != nullptr) {
-        call(work->user);
+        callGuarded([call, &work] { call(work->user); });
+    }
+    return true;
+}
+
+bool WorkQueue::startFirstWorker() {
+    const std::lock_guard<std::mutex> lock(mutex);
+    return workerCount > 0 || startWorker();
+}
+
+bool WorkQueue::startWorker() {
+    const SignalsBlocked signalsBlocked;
+    try {
+        workers[workerCount] = std::thread(&WorkQueue::runWorker, this);
+    } catch (const std::exception& exception) {
+        kdLogFormatMessage("PAL: a worker thread cannot start: %s", exception.what());
+        return false;
+    }
+    ++workerCount;
+    ++idleCount;
+    return true;
+}
+
+void WorkQueue::endWorkers() {
+    end();
+    waitForWorkers();
+    const std::lock_guard<std::mutex> lock(mutex);
+    workerCount = 0;
+    idleCount = 0;
+    ending = false;
+}
+
+void WorkQueue::end() {
+    const std::lock_guard<std::mutex> lock(mutex);
+    ending = true;
+    wakeSignal.notifyAll();
+}
+
+void WorkQueue::waitForWorkers() {
+    for (std::thread& worker : workers) {
+        if (worker.joinable()) {
+            worker.join();
+        }
     }
 }
 
-void WorkQueue::submit(void* handle) {
-    WorkQueue& self = instance();
-    Work* const work = self.find(static_cast<KDWork*>(handle));
-    if (work->cancelled) {
-        self.finish(work->handle);
-        return;
-    }
-    work->submitted = true;
-    uv_queue_work(EventLoop::instance().uvLoop(), &work->request, &WorkQueue::onWork,
-                  &WorkQueue::onWorkDone);
-}
-
-void WorkQueue::takeBack(void* handle) {
-    Work* const work = instance().find(static_cast<KDWork*>(handle));
-    if (work != nullptr) {
-        uv_cancel(reinterpret_cast<uv_req_t*>(&work->request));
+void WorkQueue::runWorker() {
+#if defined(__linux__)
+    pthread_setname_np(pthread_self(), "talvox-worker");
+#endif
+    while (Work* const taken = takeWaiting()) {
+        callGuarded([taken] { taken->work(taken->user); });
+        {
+            const std::lock_guard<std::mutex> lock(mutex);
+            complete(taken);
+            ++idleCount;
+        }
+        EventLoop::instance().wake();
     }
 }
 
-void WorkQueue::onWork(uv_work_t* request) {
-    const Work& work = *static_cast<Work*>(request->data);
-    work.work(work.user);
+WorkQueue::Work* WorkQueue::takeWaiting() {
+    std::unique_lock<std::mutex> lock(mutex);
+    Work* taken = nullptr;
+    while (!ending && taken == nullptr) {
+        taken = waiting.pop();
+        if (taken == nullptr) {
+            wakeSignal.wait(lock);
+        }
+    }
+    if (taken != nullptr) {
+        taken->state = State::RUNNING;
+        --idleCount;
+    }
+    return taken;
 }
 
-void WorkQueue::onWorkDone(uv_work_t* request, int /*status*/) {
-    const EventLockGuard lock;
-    Work& work = *static_cast<Work*>(request->data);
-    // Libuv must not be asked for it any more.
-    work.submitted = false;
-    // At the end of the process the owner may be gone already; the entry then stays in the table.
-    if (!EventLoop::instance().isStopping()) {
-        instance().finish(work.handle);
-    }
+namespace {
+
+/** After the static objects of the process have gone: work that runs may still need its code. */
+__attribute__((destructor)) void waitForWorkersAtUnload() {
+    WorkQueue::instance().waitForWorkers();
 }
+
+}  // namespace
 
 }  // namespace korvel_pal
 

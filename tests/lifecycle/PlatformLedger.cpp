@@ -126,10 +126,10 @@ KDint kdInstallCallback(KDCallbackFunc* func, KDint eventtype, void* eventuserpt
     return real(func, eventtype, eventuserptr);
 }
 
-void kdPostKOR(void (*func)(void* user), void* user) {
+KDint kdPostKOR(void (*func)(void* user), void* user) {
     static auto* const real = findReal<decltype(kdPostKOR)>("kdPostKOR");
     books().change(&PlatformLedger::posts, 1);
-    real(&Lifecycle::Post::run, new Lifecycle::Post{func, user});
+    return real(&Lifecycle::Post::run, new Lifecycle::Post{func, user});
 }
 
 KDWork* kdQueueWorkKOR(void (*work)(void* user), void (*done)(void* user), void* user) {

@@ -1,32 +1,40 @@
-// An event thread that cannot start: the report, and that the next post tries again. Each case has
-// a process of its own, since the thread starts once.
+// Threads that the system does not give: the event thread, its first worker, and the further
+// workers. Each case has a process of its own, since the event thread starts once.
+#include <dirent.h>
 #include <dlfcn.h>
-#include <gmock/gmock.h>
-#include <sys/resource.h>
-#include <uv.h>
+#include <gtest/gtest.h>
+#include <pthread.h>
 
+#include <atomic>
+#include <cerrno>
 #include <cstdio>
 #include <cstdlib>
 #include <string>
 
-#include "pal/kd_event.h"
+#include "pal/kd.h"
 #include "support/AssertCapture.h"
 
 namespace {
 
-/** libuv makes one of these for itself; the next is ours. Below 0 none fails. */
-int asyncsUntilFailure = -1;
+enum class Threads { ALL, EVERY_OTHER, NONE };
+
+std::atomic<Threads> available{Threads::ALL};
+std::atomic<bool> isNextGiven{true};
 
 }  // namespace
 
-// Stands in front of libuv's.
-extern "C" __attribute__((visibility("default"))) int uv_async_init(uv_loop_t* loop,
-                                                                    uv_async_t* handle,
-                                                                    uv_async_cb callback) {
-    using Init = int (*)(uv_loop_t*, uv_async_t*, uv_async_cb);
-    static const auto real = reinterpret_cast<Init>(::dlsym(RTLD_NEXT, "uv_async_init"));
-    return asyncsUntilFailure >= 0 && asyncsUntilFailure-- == 0 ? UV_ENOMEM
-                                                                : real(loop, handle, callback);
+// Stands in front of the system's.
+extern "C" __attribute__((visibility("default"))) int pthread_create(pthread_t* thread,
+                                                                     const pthread_attr_t* how,
+                                                                     void* (*run)(void*),
+                                                                     void* user) noexcept {
+    if (available == Threads::NONE ||
+        (available == Threads::EVERY_OTHER && !isNextGiven.exchange(!isNextGiven))) {
+        return EAGAIN;
+    }
+    using Create = int (*)(pthread_t*, const pthread_attr_t*, void* (*)(void*), void*);
+    static const auto real = reinterpret_cast<Create>(::dlsym(RTLD_NEXT, "pthread_create"));
+    return real(thread, how, run, user);
 }
 
 namespace {
@@ -34,44 +42,103 @@ namespace {
 using ::testing::ExitedWithCode;
 using TestSupport::AssertCapture;
 
-/** Posts once with `failing` in force and once without; tells what was reported and what ran. */
-template <typename Begin, typename End>
-[[noreturn]] void postTwice(Begin beginFailing, End endFailing) {
+std::size_t countEntries(const char* directory) {
+    std::size_t count = 0;
+    DIR* const open = ::opendir(directory);
+    while (::readdir(open) != nullptr) {
+        ++count;
+    }
+    ::closedir(open);
+    return count;
+}
+
+/** Threads and descriptors of this process. */
+std::string countAll() {
+    return std::to_string(countEntries("/proc/self/task")) + " and " +
+           std::to_string(countEntries("/proc/self/fd"));
+}
+
+void addOne(void* count) {
+    ++*static_cast<int*>(count);
+}
+
+/** What each way into the event thread says. */
+std::string callEverything(int& runs) {
+    const auto nothing = [](void*) {};
+    KDTimer* const timer = kdSetTimer(1, KD_TIMER_ONESHOT, nullptr);
+    KDWork* const work = kdQueueWorkKOR(nothing, nullptr, nullptr);
+    std::string result =
+        std::to_string(kdStartEventsKOR()) + ' ' + std::to_string(kdPostKOR(&addOne, &runs)) +
+        (timer != nullptr ? " timer" : " none") + (work != nullptr ? " work" : " none");
+    kdCancelTimer(timer);
+    return result;
+}
+
+[[noreturn]] void startWithFewThreads(Threads few) {
     const AssertCapture asserts;
     int runs = 0;
-    const auto post = [&runs] {
-        kdPostKOR([](void* count) { ++*static_cast<int*>(count); }, &runs);
-    };
-    beginFailing();
-    post();
-    endFailing();
-    const std::size_t reports = asserts.count();
-    post();
+    kdSetLogSinkKOR([](const char*, void*) {}, nullptr);
+    const std::string before = countAll();
+    available = few;
+    const std::string scarce = callEverything(runs);
+    const bool nothingLeft = countAll() == before;
+    available = Threads::ALL;
+    const std::string plenty = callEverything(runs);
     kdDrainEventsKOR();
-    const std::string first = reports > 0 ? asserts.reports()[0].condition : "nothing";
-    std::fprintf(stderr, "%zu: %s, then %zu; %d ran", reports, first.c_str(), asserts.count(),
-                 runs);
+    std::fprintf(stderr, "%s, nothing left %d; %s, %d ran, %zu asserted", scarce.c_str(),
+                 nothingLeft ? 1 : 0, plenty.c_str(), runs, asserts.count());
     std::_Exit(0);
 }
 
-void allowDescriptors(rlim_t count) {
-    rlimit limit = {};
-    ::getrlimit(RLIMIT_NOFILE, &limit);
-    limit.rlim_cur = count;
-    ::setrlimit(RLIMIT_NOFILE, &limit);
+const char* const REFUSED_THEN_RIGHT =
+    "^-1 -1 none none, nothing left 1; 0 0 timer work, 1 ran, 0 asserted$";
+
+TEST(EventThreadStartDeathTest, WithoutAnyThreadEachCallSaysSoAndTheNextOneTriesAgain) {
+    GTEST_FLAG_SET(death_test_style, "threadsafe");
+    EXPECT_EXIT(startWithFewThreads(Threads::NONE), ExitedWithCode(0), REFUSED_THEN_RIGHT);
 }
 
-TEST(EventThreadStartDeathTest, WithoutDescriptorsIsReportedAndTriedAgain) {
+TEST(EventThreadStartDeathTest, WithoutAThreadBesideTheWorkerLeavesNoWorkerBehind) {
     GTEST_FLAG_SET(death_test_style, "threadsafe");
-    EXPECT_EXIT(postTwice([] { allowDescriptors(0); }, [] { allowDescriptors(64); }),
-                ExitedWithCode(0), "^1: uv_loop_init\\(&loop\\) == 0, then 1; 1 ran$");
+    // Each of the four calls gets its worker, but no event thread.
+    EXPECT_EXIT(startWithFewThreads(Threads::EVERY_OTHER), ExitedWithCode(0), REFUSED_THEN_RIGHT);
 }
 
-TEST(EventThreadStartDeathTest, WithoutASignalIsReportedAndTriedAgain) {
+[[noreturn]] void workOnOneWorker() {
+    kdStartEventsKOR();
+    available = Threads::NONE;
+    kdSetLogSinkKOR([](const char*, void*) {}, nullptr);
+    static std::atomic<int> done{0};
+    for (int i = 0; i < 20; ++i) {
+        kdQueueWorkKOR([](void*) {}, [](void*) { ++done; }, nullptr);
+    }
+    while (done < 20) {
+        kdDrainEventsKOR();
+    }
+    std::fprintf(stderr, "%d done", done.load());
+    std::_Exit(0);
+}
+
+TEST(EventThreadStartDeathTest, WithoutFurtherWorkersTheFirstOneDoesAllWork) {
     GTEST_FLAG_SET(death_test_style, "threadsafe");
-    EXPECT_EXIT(postTwice([] { asyncsUntilFailure = 1; }, [] { asyncsUntilFailure = -1; }),
-                ExitedWithCode(0),
-                "^1: uv_async_init\\(&loop, &async, &EventLoop::onWake\\) == 0, then 1; 1 ran$");
+    EXPECT_EXIT(workOnOneWorker(), ExitedWithCode(0), "^20 done$");
+}
+
+[[noreturn]] void failToStartOften() {
+    kdSetLogSinkKOR([](const char*, void*) {}, nullptr);
+    available = Threads::NONE;
+    const std::string before = countAll();
+    int failures = 0;
+    for (int i = 0; i < 1000; ++i) {
+        failures -= kdPostKOR(&addOne, nullptr);
+    }
+    std::fprintf(stderr, "%d failed, nothing left %d", failures, countAll() == before ? 1 : 0);
+    std::_Exit(0);
+}
+
+TEST(EventThreadStartDeathTest, AThousandTimesInVainLeavesNothingBehind) {
+    GTEST_FLAG_SET(death_test_style, "threadsafe");
+    EXPECT_EXIT(failToStartOften(), ExitedWithCode(0), "^1000 failed, nothing left 1$");
 }
 
 }  // namespace

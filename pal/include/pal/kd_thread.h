@@ -13,7 +13,7 @@ typedef struct KDThreadMutex KDThreadMutex;
 
 /**
  * Makes a non-recursive mutex. @param mutexattr must be null.
- * @return the mutex, to be freed with `kdThreadMutexFree`.
+ * @return the mutex, to be freed with `kdThreadMutexFree`; null when there is no memory.
  */
 KD_API KDThreadMutex* kdThreadMutexCreate(const void* mutexattr);
 
