@@ -66,6 +66,10 @@ std::string LogCollector::getUuid() const {
     return uuid;
 }
 
+bool LogCollector::openStore(const LogStoreOptions& options) {
+    return sender->openStore(options);
+}
+
 void LogCollector::startSession(const std::string& id) {
     const Util::EventLock lock;
     if (isOff("startSession")) {
@@ -154,6 +158,10 @@ std::string getUrl() {
 
 std::string getUuid() {
     return LogCollector::getInstance().getUuid();
+}
+
+bool openStore(const LogStoreOptions& options) {
+    return LogCollector::getInstance().openStore(options);
 }
 
 void startSession(const std::string& id) {

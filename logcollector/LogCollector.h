@@ -13,6 +13,7 @@
 
 #include "core/util/Singleton.h"
 #include "logcollector/LogEvent.h"
+#include "logcollector/LogStoreOptions.h"
 #include "talvox/Export.h"
 
 namespace LogCollector {
@@ -24,9 +25,10 @@ class LogSender;
  * request. One per process, made on first use; independent of the recognition engine. Off until
  * the application switches it on.
  *
- * Delivery: a record is kept in memory until the endpoint has answered 200, however long that
- * takes; it may arrive more than once, and what is not delivered when the process ends is lost.
- * Nothing is reported to the caller; what goes wrong is in the log (see core/Logger.h).
+ * Delivery: a record is kept until the endpoint has answered 200, however long that takes; it may
+ * arrive more than once. Without a store (`openStore`) records are in memory only: what is not
+ * delivered when the process ends is lost. Nothing is reported to the caller; what goes wrong is in
+ * the log (see core/Logger.h).
  *
  * Threads: any, for every operation. Each takes the event lock and none waits for the network.
  */
@@ -42,7 +44,7 @@ class TALVOX_API LogCollector : public Util::Singleton<LogCollector> {
     LogCollector(const LogCollector&) = delete;
     LogCollector& operator=(const LogCollector&) = delete;
 
-    /** Drops what is not delivered; a request that runs is given up. */
+    /** Drops what is neither delivered nor stored; a request that runs is given up. */
     ~LogCollector() override;
 
     /**
@@ -65,6 +67,38 @@ class TALVOX_API LogCollector : public Util::Singleton<LogCollector> {
 
     std::string getUrl() const;
     std::string getUuid() const;
+
+    /**
+     * Stores the records in a folder, so that they outlive the process; off without this call.
+     * Records that earlier processes left in the folder are delivered first, in the order in which
+     * they were logged, also while logging is off; then those that wait already. Call `configure`
+     * before: delivery begins at once. A store lasts as long as the collector.
+     *
+     * From then on a record is safe when `logEvent`, `logError` or `stopSession` returns: the death
+     * of the process, however sudden, costs nothing. A power failure or a fault of the system may
+     * cost the records that the system has not written to the disk by then, some seconds' worth;
+     * nothing waits for the disk. Open sessions are not stored.
+     *
+     * A delivered record leaves the store. It arrives twice if the process ends between the answer
+     * and that moment, which can happen to one record for each end of a process, or if the disk
+     * refuses to have the record marked.
+     *
+     * When a bound of `options` is reached, the oldest records go, up to 1/16 of the bound at once.
+     * A record of the session "logStore", type "error", name "logRecordsDropped", has their number
+     * in its parameter "count"; while it waits, it counts on.
+     *
+     * A record that cannot be stored (full disk, too long for the bound or for any request) stays
+     * in memory, with a line in the log. Damaged parts of a store are left out, with a line in the
+     * log; a delivered record among them may come back.
+     *
+     * Reads the folder's files on the calling thread without the event lock. Storing a record takes
+     * one write of some hundred bytes under that lock.
+     *
+     * @return false when records stay in memory only: there is a store already, the folder cannot
+     *         be made, read or written, another process uses it, or a later version wrote it. The
+     *         log says which; another folder, or the same one later, may be tried.
+     */
+    bool openStore(const LogStoreOptions& options);
 
     /** Opens a session. Any bytes; compared byte by byte. Nothing is sent. */
     void startSession(const std::string& id);
@@ -116,6 +150,7 @@ TALVOX_API void configure(const std::string& uuid);
 TALVOX_API void configure(const std::string& uuid, const std::string& url);
 TALVOX_API std::string getUrl();
 TALVOX_API std::string getUuid();
+TALVOX_API bool openStore(const LogStoreOptions& options);
 TALVOX_API void startSession(const std::string& id);
 TALVOX_API void stopSession(const std::string& id);
 TALVOX_API void logEvent(const std::string& sessionId, const std::string& name,

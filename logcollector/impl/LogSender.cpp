@@ -48,6 +48,7 @@ std::string timeToString(long long seconds) {
 LogSender::LogSender()
     : NetworkTaskHolder(EndThread::NETWORK),
       queueMutex(kdThreadMutexCreate(nullptr)),
+      keeper(queue, sent),
       pause([this] { goOn(); }) {
     kdInstallCallback(&LogSender::onTimerFired, KD_EVENT_TIMER, this);
 }
@@ -80,20 +81,31 @@ std::string LogSender::toString(const boost::shared_ptr<LogEvent>& event,
 
 void LogSender::sendLogRecord(const std::string& record) {
     const Util::EventLock lock;
-    if (isWorking() || hold != Hold::NONE) {
-        append(record);
-        return;
+    std::list<LogRecord> one(1, {record, 0});
+    {
+        const QueueLock queueLock(queueMutex);
+        keeper.keep(one.front());
     }
-    submit(
-        boost::make_shared<LogCollectorNetworkTask>(
-            record, [this](bool success, const std::string& sent,
-                           int status) { onRequestComplete(success, sent, status); }),
-        boost::make_shared<Network::NetworkTaskBasicRetryPolicy>(RETRY_DELAY_MS, ATTEMPTS, false));
+    if (isWorking() || hold != Hold::NONE) {
+        append(one);
+    } else {
+        send(one);
+    }
 }
 
-void LogSender::append(const std::string& record) {
+void LogSender::append(std::list<LogRecord>& one) {
     const QueueLock lock(queueMutex);
-    queue.push_back(record);
+    queue.splice(queue.end(), one);
+}
+
+void LogSender::send(std::list<LogRecord>& one) {
+    append(sent);  // what could not be submitted, if anything
+    sent.splice(sent.end(), one);
+    submit(
+        boost::make_shared<LogCollectorNetworkTask>(
+            sent.front().text, [this](bool success, const std::string& record,
+                                      int status) { onRequestComplete(success, record, status); }),
+        boost::make_shared<Network::NetworkTaskBasicRetryPolicy>(RETRY_DELAY_MS, ATTEMPTS, false));
 }
 
 void LogSender::sendNextRecord() {
@@ -101,9 +113,10 @@ void LogSender::sendNextRecord() {
     if (isWorking() || hold != Hold::NONE) {
         return;
     }
-    std::list<std::string> next;
+    std::list<LogRecord> next;
     {
         const QueueLock queueLock(queueMutex);
+        keeper.expire();
         if (!queue.empty()) {
             next.splice(next.end(), queue, queue.begin());
         }
@@ -111,8 +124,35 @@ void LogSender::sendNextRecord() {
     if (next.empty()) {
         stopTimer();
     } else {
-        sendLogRecord(next.front());
+        send(next);
     }
+}
+
+bool LogSender::openStore(const LogStoreOptions& options) {
+    LogStore::Rest rest;
+    // The event thread must not wait for the disk. Without the lock two calls may both get here;
+    // the folder's own lock lets one pass, and where the folders differ, the later one is closed.
+    std::unique_ptr<LogStore> store = hasStore() ? nullptr : LogStore::open(options, rest);
+    const Util::EventLock lock;
+    if (keeper.hasStore()) {
+        Logger::log(Logger::PROBLEM, "%s: there is a store already, %s is not used", TAG.c_str(),
+                    options.folder.c_str());
+        return false;
+    }
+    if (store == nullptr) {
+        return false;
+    }
+    {
+        const QueueLock queueLock(queueMutex);
+        keeper.use(std::move(store), std::move(rest));
+    }
+    sendNextRecord();
+    return true;
+}
+
+bool LogSender::hasStore() const {
+    const Util::EventLock lock;
+    return keeper.hasStore();
 }
 
 void LogSender::startTimer() {
@@ -148,8 +188,14 @@ void LogSender::goOn() {
 void LogSender::onRequestComplete(bool success, const std::string& record, int status) {
     const Util::EventLock lock;
     onFinished();
-    if (!success) {
-        append(record);
+    if (success) {
+        const QueueLock queueLock(queueMutex);
+        for (const LogRecord& delivered : sent) {
+            keeper.release(delivered);
+        }
+        sent.clear();
+    } else {
+        append(sent);
         startTimer();
         holdBack(record, status);
         Logger::log(Logger::PROBLEM, "%s: a dummy record send request fails", TAG.c_str());

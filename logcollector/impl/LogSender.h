@@ -15,6 +15,8 @@
 #include "core/network/NetworkTaskHolder.h"
 #include "core/util/Timer.h"
 #include "logcollector/LogEvent.h"
+#include "logcollector/LogStoreOptions.h"
+#include "logcollector/impl/LogKeeper.h"
 #include "pal/kd.h"
 
 namespace LogCollector {
@@ -63,6 +65,13 @@ class LogSender : public Network::NetworkTaskHolder {
     /** There is a new address: what was refused because of the old one need not wait any more. */
     void onConfigured();
 
+    /**
+     * Stores records from now on, those that wait included; what the store has goes first. Reads
+     * files before it takes the event lock.
+     * @return false when there is a store already or the folder cannot be used; the log says why
+     */
+    bool openStore(const LogStoreOptions& options);
+
     /** Records in the queue and on their way. */
     std::size_t getPendingCount() const;
 
@@ -76,16 +85,21 @@ class LogSender : public Network::NetworkTaskHolder {
         REFUSED /**< there could be no request; the timer, or a new address, goes on */
     };
 
-    void append(const std::string& record);
+    /** Puts the one record of the list at the end of the queue; nothing is allocated. */
+    void append(std::list<LogRecord>& one);
+    void send(std::list<LogRecord>& one);
+    bool hasStore() const;
     void holdBack(const std::string& record, int status);
     void goOn();
     void postDelivered();
 
-    std::list<std::string> queue;
+    std::list<LogRecord> queue;
     KDTimer* timer = nullptr;
     int64_t timerPeriodS = TIMER_PERIOD_S_DFLT;
     KDThreadMutex* const queueMutex;
 
+    std::list<LogRecord> sent; /**< the record of the request that runs */
+    LogKeeper keeper;
     Hold hold = Hold::NONE;
     Util::Timer pause;
     std::optional<int64_t> lastFailureAt;
