@@ -234,6 +234,14 @@ CLI::App* addLogCommand(CLI::App& app, LogOptions& options) {
         ->required();
     command->add_flag("--error", options.error, "Send it as an error");
     command
+        ->add_option("--store", options.store,
+                     "Folder that keeps events until they are delivered; those of earlier calls go "
+                     "first [none]")
+        ->type_name("DIR")
+        ->check([](const std::string& folder) {
+            return folder.empty() ? "the folder has no name" : std::string();
+        });
+    command
         ->add_option("--timeout", options.timeoutS,
                      "How long to wait for the delivery, in seconds [" +
                          std::to_string(LOG_TIMEOUT_S_DFLT) + "]")
@@ -250,7 +258,11 @@ CLI::App* addLogCommand(CLI::App& app, LogOptions& options) {
     command->add_option("params", options.params, "Parameters of the event")
         ->type_name("KEY=VALUE");
     command->footer(
-        "Exit status: 0 the event was delivered, 1 it was not within the time, 2 wrong usage.");
+        "Exit status: 0 all events were delivered, 1 some were not within the time, 2 wrong "
+        "usage.\n"
+        "With --store, those stay in DIR for the next call. A folder that cannot be used is a "
+        "line\n"
+        "in the log; the event is sent all the same.");
     return command;
 }
 

@@ -10,6 +10,7 @@
 #include "Interrupts.h"
 #include "UsageError.h"
 #include "core/Logger.h"
+#include "core/util/EventLock.h"
 #include "core/util/Timer.h"
 #include "pal/kd_event.h"
 
@@ -46,12 +47,19 @@ class End {
     std::promise<void> promise;
 };
 
-void submit(const LogOptions& options, const std::map<std::string, std::string>& params) {
+/** @return whether there is a store */
+bool submit(const LogOptions& options, const std::map<std::string, std::string>& params) {
     LogCollector::configure(options.uuid, options.url);
     LogCollector::setLoggingEnabled(true);
+    LogCollector::LogStoreOptions store;
+    store.folder = options.store;
+    // Under one lock: until the event is logged, the last record of the store is not the last one.
+    const Util::EventLock lock;
+    const bool isStored = !options.store.empty() && LogCollector::openStore(store);
     LogCollector::startSession(options.session);
     const auto log = options.error ? &LogCollector::logError : &LogCollector::logEvent;
     log(options.session, options.name, params);
+    return isStored;
 }
 
 }  // namespace
@@ -70,7 +78,7 @@ int runLog(const LogOptions& options, Console& console, LogOutput& log) {
     const Interrupts interrupts([&end] { end.come(); });
     LogCollector::setDeliveredCallback([&end] { end.come(); });
     timer.start(KD_TIMER_ONESHOT, options.timeoutS * NS_PER_S);
-    submit(options, params);
+    const bool isStored = submit(options, params);
     end.wait();
     LogCollector::setDeliveredCallback({});
     log.show(false);  // the verdict is the last line
@@ -79,7 +87,11 @@ int runLog(const LogOptions& options, Console& console, LogOutput& log) {
         return EXIT_OK;
     }
     console.err << "talvox: " << left << (left == 1 ? " record is" : " records are")
-                << " not delivered" << std::endl;
+                << " not delivered";
+    if (isStored) {
+        console.err << (left == 1 ? ", it stays in " : ", they stay in ") << options.store;
+    }
+    console.err << std::endl;
     return EXIT_ENDED_IN_ERROR;
 }
 

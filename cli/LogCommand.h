@@ -23,13 +23,14 @@ struct LogOptions {
     std::string name;
     std::vector<std::string> params; /**< key=value */
     bool error = false;
+    std::string store; /**< folder for records that are not delivered; empty for none */
     int timeoutS = LOG_TIMEOUT_S_DFLT;
     int verbosity = LOG_VERBOSITY_DFLT;
 };
 
 /**
- * `talvox log`: sends one event with the collector and waits until it is delivered, the time is
- * over, or Ctrl-C is pressed.
+ * `talvox log`: sends one event with the collector, after what the store has, and waits until all
+ * is delivered, the time is over, or Ctrl-C is pressed.
  * @return the exit status
  * @throws UsageError
  */

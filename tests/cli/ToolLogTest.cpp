@@ -48,6 +48,43 @@ TEST(ToolLog, SaysHowManyAreLeftWhenTheTimeIsOver) {
     EXPECT_THAT(result.err, EndsWith("talvox: 1 record is not delivered\n"));
 }
 
+TEST(ToolLog, KeepsInAStoreWhatIsNotDelivered) {
+    const ScratchDirectory directory;
+    const std::string store = directory.path("store");
+    const TestSupport::RefusingPort port;
+    const auto log = [&store](const std::string& url, const std::string& name,
+                              const std::string& timeout) {
+        return runTalvox({"log", "--url", url, "--session", "s", "--verbosity", "0", "--store",
+                          store, "--timeout", timeout, name});
+    };
+    EXPECT_EQ("talvox: 1 record is not delivered, it stays in " + store + "\n",
+              log(port.getUrl(), "one", "0").err);
+    const ToolResult second = log(port.getUrl(), "two", "0");
+    EXPECT_EQ("talvox: 2 records are not delivered, they stay in " + store + "\n", second.err);
+    EXPECT_EQ(1, second.status);
+    ScriptedHttpServer server;
+    const ToolResult third = log(server.getUrl(), "three", "30");
+    EXPECT_EQ("", third.err);
+    EXPECT_EQ(0, third.status);
+    ASSERT_EQ(3U, server.getRequestCount());
+    EXPECT_THAT(server.getRequest(0).line(), HasSubstr("name%3Done "));
+    EXPECT_THAT(server.getRequest(1).line(), HasSubstr("name%3Dtwo "));
+    EXPECT_THAT(server.getRequest(2).line(), HasSubstr("name%3Dthree "));
+    EXPECT_EQ(0, log(server.getUrl(), "four", "30").status);
+    EXPECT_EQ(4U, server.getRequestCount());
+}
+
+TEST(ToolLog, SendsAlsoWithoutTheStore) {
+    ScriptedHttpServer server;
+    const ToolResult result =
+        runTalvox({"log", "--url", server.getUrl(), "--session", "s", "--store", "/dev/null", "n"});
+    EXPECT_EQ(0, result.status);
+    EXPECT_EQ(
+        "talvox: LogStore: /dev/null is not used, records are in memory only: Not a directory\n",
+        result.err);
+    EXPECT_EQ(1U, server.getRequestCount());
+}
+
 TEST(ToolLog, EndsInTheMiddleOfARequest) {
     ScriptedHttpServer server;
     server.setDefaultAnswer(Answer::never());
@@ -74,6 +111,7 @@ TEST(ToolLog, RefusesWrongUsage) {
     expectRefused({"log", "--session", "s", "n", "k=1", "k=2"}, "parameter k is given twice");
     expectRefused({"log", "--session", "s", "--timeout", "soon", "n"}, "--timeout");
     expectRefused({"log", "--session", "s", "--verbosity", "3", "n"}, "--verbosity");
+    expectRefused({"log", "--session", "s", "--store", "", "n"}, "the folder has no name");
     expectRefused({"log", "--session", "s", "--url", "nonsense", "n"},
                   "talvox: the address \"nonsense\" is neither http nor https\n");
     expectRefused({"log", "--session", "s", "--url", "", "n"}, "talvox: the address is empty\n");
