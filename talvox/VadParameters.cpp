@@ -5,7 +5,8 @@
 
 #include "talvox/impl/BufferedVAD.h"
 #include "talvox/impl/ListeningRules.h"
-#include "talvox/impl/VadParameter.h"
+#include "talvox/impl/VadNames.h"
+#include "talvox/impl/VadNumber.h"
 #include "talvox/impl/VadParameterText.h"
 #include "talvox/impl/VoiceActivityDetectorWebRTC.h"
 #include "util/impl/NumberText.h"
@@ -14,19 +15,10 @@ namespace Talvox {
 
 namespace {
 
+using namespace VadNames;
 using Detector = VoiceActivityDetectorWebRTC;
 
-constexpr char ENGINE[] = "engine";
-constexpr char BUFFERED[] = "buffered";
-constexpr char WEBRTC[] = "wrtc";
-constexpr char SUBENGINE[] = "subengine";
-constexpr char FRAME_MS[] = "framems";
-constexpr char AGGRESSIVENESS[] = "aggressiveness";
-constexpr char SPAN_ON[] = "analyzemson";
-constexpr char SPAN_OFF[] = "analyzemsoff";
-constexpr char SPAN_OFF_TOO[] = "analyzems";
-constexpr char ACTIVITY_ON[] = "activityon";
-const char* const MODE_PARAMETERS[] = {"individual", "total", "overhangmax1", "overhangmax2"};
+const char* const MODE_PARAMETERS[] = {INDIVIDUAL, TOTAL, OVERHANG_MAX_1, OVERHANG_MAX_2};
 
 constexpr char NEVER_BEGINS[] = "speech never begins";
 constexpr char NEVER_ENDS[] = "speech never ends";
@@ -82,35 +74,36 @@ std::vector<VadParameter> makeAll() {
         makeName(ENGINE, false, "buffered or wrtc", BUFFERED,
                  "whether the decisions on frames are smoothed or taken as they are"),
         makeName(SUBENGINE, true, WEBRTC, WEBRTC, "what decides on a frame"),
-        makeTime(SPAN_ON, Detector::FRAME_MS_DFLT, "10 to 20000", BufferedVAD::ANALYZE_MS_ON_DFLT,
-                 "ms in which speech is looked for", NEVER_BEGINS,
+        makeTime(ANALYZE_MS_ON, Detector::FRAME_MS_DFLT, "10 to 20000",
+                 BufferedVAD::ANALYZE_MS_ON_DFLT, "ms in which speech is looked for", NEVER_BEGINS,
                  "a session has no more than 20 s of sound"),
         makeShare(ACTIVITY_ON, 0, std::nextafter(1.0F, 0.0F), "0 to less than 1",
                   BufferedVAD::ACTIVITY_ON_DFLT,
                   "share of speech frames in them above which speech begins",
                   "speech begins with the first buffer", NEVER_BEGINS),
-        makeTime(SPAN_OFF, Detector::FRAME_MS_DFLT, "10 to 20000", BufferedVAD::ANALYZE_MS_OFF_DFLT,
-                 "ms in which the end of speech is looked for", NEVER_ENDS, ENDS_AT_ONCE),
-        makeTime(SPAN_OFF_TOO, Detector::FRAME_MS_DFLT, "10 to 20000",
+        makeTime(ANALYZE_MS_OFF, Detector::FRAME_MS_DFLT, "10 to 20000",
+                 BufferedVAD::ANALYZE_MS_OFF_DFLT, "ms in which the end of speech is looked for",
+                 NEVER_ENDS, ENDS_AT_ONCE),
+        makeTime(ANALYZE_MS, Detector::FRAME_MS_DFLT, "10 to 20000",
                  BufferedVAD::ANALYZE_MS_OFF_DFLT, "the same as analyzemsoff", NEVER_ENDS,
                  ENDS_AT_ONCE),
-        makeShare("activityoff", FLT_MIN, 1, "more than 0 to 1", BufferedVAD::ACTIVITY_OFF_DFLT,
+        makeShare(ACTIVITY_OFF, FLT_MIN, 1, "more than 0 to 1", BufferedVAD::ACTIVITY_OFF_DFLT,
                   "share of speech frames in them below which speech ends", NEVER_ENDS,
                   ENDS_AT_ONCE),
-        makeTime("minvoicetimems", 0, "0 to 20000", BufferedVAD::MIN_VOICE_TIME_MS_DFLT,
+        makeTime(MIN_VOICE_TIME_MS, 0, "0 to 20000", BufferedVAD::MIN_VOICE_TIME_MS_DFLT,
                  "ms for which speech lasts at least", "", NEVER_ENDS),
         {FRAME_MS, VadParameter::INTEGER, false, 10, 30, 10, "10, 20 or 30",
          std::to_string(Detector::FRAME_MS_DFLT), "length of a frame in ms", IS_OFF, IS_OFF},
         {AGGRESSIVENESS, VadParameter::INTEGER, false, 0, 3, 1, "0 to 3",
          std::to_string(Detector::AGGRESSIVENESS_DFLT), "how readily a frame counts as noise",
          ZERO_IS_USED, ZERO_IS_USED},
-        makeModeParameter(MODE_PARAMETERS[0], "threshold of a frame's single features"),
-        makeModeParameter(MODE_PARAMETERS[1], "threshold of all features together"),
-        makeModeParameter(MODE_PARAMETERS[2],
+        makeModeParameter(INDIVIDUAL, "threshold of a frame's single features"),
+        makeModeParameter(TOTAL, "threshold of all features together"),
+        makeModeParameter(OVERHANG_MAX_1,
                           "frames that count as speech behind a short stretch of it"),
-        makeModeParameter(MODE_PARAMETERS[3],
+        makeModeParameter(OVERHANG_MAX_2,
                           "frames that count as speech behind a long stretch of it"),
-        {"verboselog", VadParameter::INTEGER, true, 0, 2, 1, "0 to 2", "0",
+        {VERBOSE_LOG, VadParameter::INTEGER, true, 0, 2, 1, "0 to 2", "0",
          "logs each decision (1) and the frames as well (2)", "nothing is logged",
          "no more is logged than with 2"},
     };
@@ -237,16 +230,16 @@ class Examination {
     }
 
     void checkSpans() {
-        if (text.has(SPAN_OFF) && text.has(SPAN_OFF_TOO)) {
-            mistakes.push_back(std::string(SPAN_OFF_TOO) + " has no effect beside " + SPAN_OFF);
+        if (text.has(ANALYZE_MS_OFF) && text.has(ANALYZE_MS)) {
+            mistakes.push_back(std::string(ANALYZE_MS) + " has no effect beside " + ANALYZE_MS_OFF);
         }
         const int frameMs = intOf(FRAME_MS, Detector::FRAME_MS_DFLT);
         if (frameMs != 10 && frameMs != 20 && frameMs != 30) {
             return;
         }
-        checkSpan(SPAN_ON, frameMs, NEVER_BEGINS);
-        checkSpan(SPAN_OFF, frameMs, NEVER_ENDS);
-        checkSpan(SPAN_OFF_TOO, frameMs, NEVER_ENDS);
+        checkSpan(ANALYZE_MS_ON, frameMs, NEVER_BEGINS);
+        checkSpan(ANALYZE_MS_OFF, frameMs, NEVER_ENDS);
+        checkSpan(ANALYZE_MS, frameMs, NEVER_ENDS);
         checkOnset(static_cast<unsigned>(frameMs));
     }
 
@@ -261,7 +254,7 @@ class Examination {
 
     /** Whether enough speech frames fit into the time in which speech has to begin. */
     void checkOnset(unsigned frameMs) {
-        const int spanMs = intOf(SPAN_ON, BufferedVAD::ANALYZE_MS_ON_DFLT);
+        const int spanMs = intOf(ANALYZE_MS_ON, BufferedVAD::ANALYZE_MS_ON_DFLT);
         const float share = text.has(ACTIVITY_ON) ? parseFloatParameter(text.valueOf(ACTIVITY_ON))
                                                   : BufferedVAD::ACTIVITY_ON_DFLT;
         if (spanMs < 0 || !(share >= 0 && share < 1)) {

@@ -7,7 +7,8 @@
 
 #include "pal/kd_assert.h"
 #include "pal/kd_log.h"
-#include "talvox/impl/VadParameter.h"
+#include "talvox/impl/VadNames.h"
+#include "talvox/impl/VadNumber.h"
 
 namespace {
 
@@ -148,30 +149,30 @@ void BufferedVAD::cancel() {
 }
 
 void BufferedVAD::setParameter(const std::string& name, const std::string& value) {
-    if (name == "engine") {
-        KOR_ASSERT_AT(value == "buffered", "aValue == \"buffered\"", "talvox/impl/BufferedVAD",
-                      174);
-    } else if (name == "subengine") {
+    if (name == VadNames::ENGINE) {
+        KOR_ASSERT_AT(value == VadNames::BUFFERED, "aValue == \"buffered\"",
+                      "talvox/impl/BufferedVAD", 174);
+    } else if (name == VadNames::SUBENGINE) {
         return;
-    } else if (name == "analyzems") {
+    } else if (name == VadNames::ANALYZE_MS) {
         analyzeMsOff = static_cast<unsigned>(parseIntParameter(value));
         kdLogFormatMessage("analyzeMS %d", static_cast<int>(analyzeMsOff));
-    } else if (name == "analyzemsoff") {
+    } else if (name == VadNames::ANALYZE_MS_OFF) {
         analyzeMsOff = static_cast<unsigned>(parseIntParameter(value));
         kdLogFormatMessage("analyzeMSoff %d", static_cast<int>(analyzeMsOff));
-    } else if (name == "analyzemson") {
+    } else if (name == VadNames::ANALYZE_MS_ON) {
         analyzeMsOn = static_cast<unsigned>(parseIntParameter(value));
         kdLogFormatMessage("analyzeMsOn");
-    } else if (name == "activityon") {
+    } else if (name == VadNames::ACTIVITY_ON) {
         activityOn = parseFloatParameter(value);
         kdLogFormatMessage("activityOn %f", static_cast<double>(activityOn));
-    } else if (name == "activityoff") {
+    } else if (name == VadNames::ACTIVITY_OFF) {
         activityOff = parseFloatParameter(value);
         kdLogFormatMessage("activityOff %f", static_cast<double>(activityOff));
-    } else if (name == "minvoicetimems") {
+    } else if (name == VadNames::MIN_VOICE_TIME_MS) {
         minVoiceTimeMs = static_cast<unsigned>(parseIntParameter(value));
         kdLogFormatMessage("minVoiceTimeMS %d", static_cast<int>(minVoiceTimeMs));
-    } else if (name == "verboselog") {
+    } else if (name == VadNames::VERBOSE_LOG) {
         verboseLevel = parseIntParameter(value);
         kdLogFormatMessage("verboseLevel %d", verboseLevel);
     } else {

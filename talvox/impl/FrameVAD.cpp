@@ -5,6 +5,7 @@
 #include <vector>
 
 #include "pal/kd_log.h"
+#include "talvox/impl/VadNames.h"
 #include "talvox/impl/VoiceActivityDetectorWebRTC.h"
 
 namespace Talvox {
@@ -37,7 +38,7 @@ unsigned FrameVAD::getFrameStepInBytes() const {
 }
 
 boost::shared_ptr<FrameVAD> FrameVAD::create(const std::string& subengine) {
-    if (!subengine.empty() && subengine != "wrtc") {
+    if (!subengine.empty() && subengine != VadNames::WEBRTC) {
         kdLogFormatMessage("Unknown subengine type for FrameVAD: %s", subengine.c_str());
     }
     return boost::make_shared<VoiceActivityDetectorWebRTC>();

@@ -5,17 +5,9 @@
 #include "pal/kd_log.h"
 #include "talvox/impl/BufferedVAD.h"
 #include "talvox/impl/FrameVAD.h"
+#include "talvox/impl/VadNames.h"
 #include "talvox/impl/VadParameterText.h"
 #include "talvox/impl/VoiceActivityDetectorWebRTC.h"
-
-namespace {
-
-constexpr char ENGINE[] = "engine";
-constexpr char ENGINE_BUFFERED[] = "buffered";
-constexpr char ENGINE_WEBRTC[] = "wrtc";
-constexpr char SUBENGINE[] = "subengine";
-
-}  // namespace
 
 namespace Talvox {
 
@@ -40,13 +32,13 @@ boost::shared_ptr<VoiceActivityDetector> VoiceActivityDetector::create(
     for (const std::string& setting : parsed.badSettings) {
         kdLogFormatMessage("Bad VAD parameter setting: %s", setting.c_str());
     }
-    const std::string engine = parsed.valueOf(ENGINE, ENGINE_BUFFERED);
+    const std::string engine = parsed.valueOf(VadNames::ENGINE, VadNames::BUFFERED);
     boost::shared_ptr<VoiceActivityDetector> detector;
-    if (engine == ENGINE_WEBRTC) {
+    if (engine == VadNames::WEBRTC) {
         detector = decorate(boost::make_shared<VoiceActivityDetectorWebRTC>());
     } else {
-        std::string subengine = parsed.valueOf(SUBENGINE);
-        if (engine != ENGINE_BUFFERED) {
+        std::string subengine = parsed.valueOf(VadNames::SUBENGINE);
+        if (engine != VadNames::BUFFERED) {
             kdLogFormatMessage("Unknown engine name for VoiceActivityDetector: %s", engine.c_str());
             subengine.clear();
         }

@@ -6,7 +6,8 @@
 
 #include "pal/kd_assert.h"
 #include "pal/kd_log.h"
-#include "talvox/impl/VadParameter.h"
+#include "talvox/impl/VadNames.h"
+#include "talvox/impl/VadNumber.h"
 
 namespace {
 
@@ -95,22 +96,22 @@ void VoiceActivityDetectorWebRTC::cancel() {
 }
 
 void VoiceActivityDetectorWebRTC::setParameter(const std::string& name, const std::string& value) {
-    if (name == "engine") {
+    if (name == VadNames::ENGINE) {
         return;
     }
-    if (name == "aggressiveness") {
+    if (name == VadNames::AGGRESSIVENESS) {
         store(aggressiveness, "aggressiveness", value);
-    } else if (name == "framems") {
+    } else if (name == VadNames::FRAME_MS) {
         store(frameMs, "frameMS", value);
-    } else if (name == "verboselog") {
+    } else if (name == VadNames::VERBOSE_LOG) {
         store(verboseLevel, "verboseLevel", value);
-    } else if (name == "individual") {
+    } else if (name == VadNames::INDIVIDUAL) {
         store(modeParams.individual, "individual", value);
-    } else if (name == "total") {
+    } else if (name == VadNames::TOTAL) {
         store(modeParams.total, "total", value);
-    } else if (name == "overhangmax1") {
+    } else if (name == VadNames::OVERHANG_MAX_1) {
         store(modeParams.overhangmax1, "over_hang_max_1", value);
-    } else if (name == "overhangmax2") {
+    } else if (name == VadNames::OVERHANG_MAX_2) {
         store(modeParams.overhangmax2, "over_hang_max_2", value);
     } else {
         kdLogFormatMessage("Unknown WebRTC VAD parameter setting: %s", name.c_str());

@@ -1,4 +1,4 @@
-#include "talvox/impl/VadParameter.h"
+#include "talvox/impl/VadNumber.h"
 
 #include <cstdlib>
 #include <limits>

@@ -1,4 +1,4 @@
-#include "talvox/impl/VadParameter.h"
+#include "talvox/impl/VadNumber.h"
 
 #include <gmock/gmock.h>
 
@@ -58,7 +58,7 @@ void expectFloatTexts() {
     }
 }
 
-TEST(VadParameter, ReadsNumbersAsScanfDoes) {
+TEST(VadNumber, ReadsNumbersAsScanfDoes) {
     expectFloatTexts();
     EXPECT_EQ(parseIntParameter("20"), 20);
     EXPECT_EQ(parseIntParameter(" -7ms"), -7);
@@ -69,7 +69,7 @@ TEST(VadParameter, ReadsNumbersAsScanfDoes) {
     EXPECT_EQ(parseIntParameter("4294967297"), 1);
 }
 
-TEST(VadParameter, ReadsTheSameNumbersInALocaleWithCommas) {
+TEST(VadNumber, ReadsTheSameNumbersInALocaleWithCommas) {
     const TestSupport::CommaLocale german;
     if (!TestSupport::CommaLocale::isAvailable()) {
         GTEST_SKIP() << "the sources of locales are not installed";
@@ -78,7 +78,7 @@ TEST(VadParameter, ReadsTheSameNumbersInALocaleWithCommas) {
     expectFloatTexts();
 }
 
-TEST(VadParameter, TellsWhatTheTextHolds) {
+TEST(VadNumber, TellsWhatTheTextHolds) {
     EXPECT_TRUE(Talvox::readFloatParameter("0.5").isWholeText);
     EXPECT_TRUE(Talvox::readFloatParameter("-infinity").isWholeText);
     EXPECT_TRUE(Talvox::readFloatParameter("nan").isWholeText);
@@ -92,7 +92,7 @@ TEST(VadParameter, TellsWhatTheTextHolds) {
     EXPECT_FALSE(Talvox::readIntParameter("ms").isNumber);
 }
 
-TEST(VadParameter, DetectorsHaveTheirThresholdsInALocaleWithCommas) {
+TEST(VadNumber, DetectorsHaveTheirThresholdsInALocaleWithCommas) {
     const TestSupport::CommaLocale german;
     if (!TestSupport::CommaLocale::isAvailable()) {
         GTEST_SKIP() << "the sources of locales are not installed";
