@@ -273,15 +273,7 @@ bool XmlScanner::startsWith(const std::string& prefix) const {
 }
 
 bool XmlScanner::startsWithNoCase(const std::string& lowerPrefix) const {
-    if (text.size() - position < lowerPrefix.size()) {
-        return false;
-    }
-    for (std::size_t i = 0; i < lowerPrefix.size(); ++i) {
-        if (toLower(text[position + i]) != lowerPrefix[i]) {
-            return false;
-        }
-    }
-    return true;
+    return isAtNoCase(text, position, lowerPrefix);
 }
 
 bool XmlScanner::skipName() {
