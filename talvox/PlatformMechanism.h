@@ -1,6 +1,6 @@
 /**
  * @file
- * Where the recogniser of the platform joins the engine.
+ * Where the recognizer of the platform joins the engine.
  */
 #pragma once
 
@@ -17,7 +17,7 @@ namespace Talvox {
 class Talvox;
 
 /**
- * What the platform's own recogniser offers. The layer that knows the platform installs one; the
+ * What the platform's own recognizer offers. The layer that knows the platform installs one; the
  * facade asks it under the event lock.
  *
  * Must not: block, throw.

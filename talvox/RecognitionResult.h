@@ -10,7 +10,7 @@
 
 namespace Talvox {
 
-/** What may have been said, and how sure the recogniser is; a plain value. */
+/** What may have been said, and how sure the recognizer is; a plain value. */
 class RecognitionResult {
   public:
     /** Stands for "no confidence known". */

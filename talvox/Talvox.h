@@ -33,7 +33,7 @@ class TALVOX_API Talvox : public Util::Singleton<Talvox> {
     /** What serves a recognition; the numbers are fixed. */
     enum RecognitionMechanism : int {
         MechanismKorvel = 0,   /**< the cloud service */
-        MechanismPlatform = 1, /**< the platform's own recogniser */
+        MechanismPlatform = 1, /**< the platform's own recognizer */
         MechanismDummy = 2     /**< none is available */
     };
 

@@ -1,6 +1,6 @@
 /**
  * @file
- * The device's own recogniser.
+ * The device recognizer.
  */
 #pragma once
 
@@ -17,7 +17,7 @@ class DeviceHost {
   public:
     virtual ~DeviceHost() = default;
 
-    /** An object of the device's recogniser is made. @return false when that throws */
+    /** An object of the device recognizer is made. @return false when that throws */
     virtual bool onDeviceMade(int64_t handle) = 0;
     /** @param what "start", "stop" or "cancel". @return false when that throws */
     virtual bool onDeviceAsked(int64_t handle, const std::string& what) = 0;

@@ -32,7 +32,7 @@ enum class Action {
     ODD_SOUND,          /**< one buffer; the amount says what is odd about it */
     RUDE_SOUND,         /**< one buffer, whether the recorder was stopped or not */
     RECORDER_FAILS,     /**< an error in mid-session, or after it */
-    DEVICE_SAYS,        /**< a `Saying` of the device's own recogniser */
+    DEVICE_SAYS,        /**< a `Saying` of the device recognizer */
     WAIT,               /**< so many ms, in which everything else goes on */
     JUMP,               /**< so many ms at once: timers run, nothing else does */
     CHANGE_REACHABILITY /**< to the amount */
@@ -105,7 +105,7 @@ struct AttemptPlan {
     bool pausesAfterHead = false;        /**< the end of the answer comes a turn later */
 };
 
-/** What the device's own recogniser tells the platform recognizer. */
+/** What the device recognizer tells the platform recognizer. */
 enum class Saying {
     NOTHING,
     READY,

@@ -206,7 +206,7 @@ TEST_F(PlatformRecognizerTest, ADeviceThatIsSilentWhileItListensEndsTheSession) 
     EXPECT_THAT(events, IsEmpty());
     pass(1);
     EXPECT_THAT(events, ElementsAre("ErrorNetwork"));
-    EXPECT_EQ(recognizer->getErrorReason(), "no callback of the device's recogniser for 30 s");
+    EXPECT_EQ(recognizer->getErrorReason(), "no callback of the device recognizer for 30 s");
     expectNextWorks();
 }
 
@@ -237,7 +237,7 @@ TEST_F(PlatformRecognizerTest, ADeviceThatDoesNotAnswerAfterStopEndsTheSession) 
     EXPECT_THAT(events, ElementsAre("power", "recordingDone"));
     pass(1);
     EXPECT_THAT(events, ElementsAre("power", "recordingDone", "ErrorNetwork"));
-    EXPECT_EQ(recognizer->getErrorReason(), "no answer of the device's recogniser within 20 s");
+    EXPECT_EQ(recognizer->getErrorReason(), "no answer of the device recognizer within 20 s");
     expectNextWorks();
 }
 
@@ -366,7 +366,7 @@ TEST_F(PlatformRecognizerTest, AStopThatFailsIsOneErrorAndCancelsTheDevice) {
     recognizer->start();
     recognizer->stop();
     EXPECT_THAT(events, ElementsAre("ErrorUnknown"));
-    EXPECT_EQ(recognizer->getErrorReason(), "the device's recogniser could not be stopped");
+    EXPECT_EQ(recognizer->getErrorReason(), "the device recognizer could not be stopped");
     EXPECT_THAT(asked, ElementsAre("start", "stop", "cancel"));
     expectNextWorks();
 }

@@ -61,7 +61,7 @@ class SessionModel {
     bool gone = false;
 };
 
-/** A session without a recogniser: every call is answered with one error. */
+/** A session without a recognizer: every call is answered with one error. */
 class StandInModel : public SessionModel {
   public:
     bool isActive() const override { return false; }

@@ -5,7 +5,7 @@
 
 namespace {
 
-/** Android's recogniser, as the facade sees it. */
+/** Android's recognizer, as the facade sees it. */
 class AndroidMechanism : public Talvox::PlatformMechanism {
   public:
     bool isRecognitionAvailable() override { return PlatformRecognizer::isRecognitionAvailable(); }

@@ -167,8 +167,7 @@ void PlatformRecognizer::start() {
         Jni::logAndClear(env, "PlatformRecognizer.start");
         // A listener may have cancelled meanwhile.
         KOR_ASSERT_AT(jobj || over, "jobj", ASSERT_PATH, __LINE__);
-        endWithError(SpeechError::ErrorNotAvailable,
-                     "the device's recogniser could not be started");
+        endWithError(SpeechError::ErrorNotAvailable, "the device recognizer could not be started");
     }
 }
 
@@ -195,7 +194,7 @@ void PlatformRecognizer::stop() {
     } catch (const Jni::PendingException&) {
         Jni::logAndClear(env, "PlatformRecognizer.stop");
         if (!pendingResults) {
-            giveUp(SpeechError::ErrorUnknown, "the device's recogniser could not be stopped");
+            giveUp(SpeechError::ErrorUnknown, "the device recognizer could not be stopped");
         }
     }
 }
@@ -304,8 +303,8 @@ void PlatformRecognizer::checkSilence() {
         return;
     }
     giveUp(SpeechError::ErrorNetwork, answerAwaited
-                                          ? "no answer of the device's recogniser within 20 s"
-                                          : "no callback of the device's recogniser for 30 s");
+                                          ? "no answer of the device recognizer within 20 s"
+                                          : "no callback of the device recognizer for 30 s");
 }
 
 void PlatformRecognizer::onReadyForSpeech() {

@@ -1,6 +1,6 @@
 /**
  * @file
- * The recognizer that uses the platform's own speech recogniser.
+ * The recognizer that uses the platform's own speech recognizer.
  */
 #pragma once
 
@@ -19,7 +19,7 @@
 #include "talvox/impl/ParallelEncoder.h"
 
 /**
- * Drives a Java object that drives Android's recogniser, and turns its callbacks into the events
+ * Drives a Java object that drives Android's recognizer, and turns its callbacks into the events
  * of a recognition. By policy it also uploads what was recognised, and the sound, to the service;
  * nobody waits for that upload.
  *
@@ -44,9 +44,9 @@ class PlatformRecognizer : public Talvox::Recognizer {
     void stop() override;
     void cancel() override;
 
-    /** Whether the device has a recogniser; false outside Android. */
+    /** Whether the device has a recognizer; false outside Android. */
     static bool isRecognitionAvailable();
-    /** What the device's recogniser says so far. */
+    /** What the device recognizer says so far. */
     static const std::vector<std::string>& getAvailableLanguages();
 
     void onReadyForSpeech();

@@ -1,12 +1,12 @@
 package korvel.talvox;
 
-/** The application's choice of recogniser. See {@link TalvoxSettings#ASR_POLICY}. */
+/** The application's choice of recognizer. See {@link TalvoxSettings#ASR_POLICY}. */
 public enum AsrPolicy implements SettingValue {
     /** The gateway. */
     KORVEL_ONLY("korvel_only"),
-    /** The device's own recogniser. */
+    /** The device recognizer. */
     PLATFORM_ONLY("platform_only"),
-    /** The device's own recogniser if there is one, else the gateway. */
+    /** The device recognizer if there is one, else the gateway. */
     PLATFORM_FIRST("platform_first"),
     /** None: every recognition ends with {@link SpeechError#NOT_AVAILABLE}. */
     DISABLED("disabled");

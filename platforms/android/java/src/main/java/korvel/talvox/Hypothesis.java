@@ -16,7 +16,7 @@ public final class Hypothesis {
         return text;
     }
 
-    /** As the recogniser gave it, as a rule from 0 to 1; −1 when it gave none. */
+    /** As the recognizer gave it, as a rule from 0 to 1; −1 when it gave none. */
     public float getConfidence() {
         return confidence;
     }

@@ -8,7 +8,7 @@ public enum Outcome {
     /**
      * The best hypothesis is below the lower confidence: treat as nothing recognised. Two or more
      * hypotheses, the first of them without a confidence, are always rejected, whatever they are
-     * worth: where the device's own recogniser may serve, look at {@link Hypothesis#hasConfidence}
+     * worth: where the device recognizer may serve, look at {@link Hypothesis#hasConfidence}
      * and offer those to the user.
      */
     REJECTED,

@@ -39,8 +39,8 @@ public final class Recognition {
     }
 
     /**
-     * The gateway's identifier of the request; empty if its answer had none, or if the device's own
-     * recogniser served.
+     * The gateway's identifier of the request; empty if its answer had none, or if the device
+     * recognizer served.
      */
     public String getRequestId() {
         return requestId;

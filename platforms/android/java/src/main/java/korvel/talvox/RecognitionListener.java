@@ -23,7 +23,7 @@ public interface RecognitionListener {
     default void onRecordingDone() {}
 
     /**
-     * A piece of the recorded sound. The device's own recogniser does not deliver any.
+     * A piece of the recorded sound. The device recognizer does not deliver any.
      *
      * @param pcm 16-bit little-endian mono at {@link TalvoxSettings#SAMPLE_RATE}, 100 ms; yours to
      *     keep
@@ -33,7 +33,7 @@ public interface RecognitionListener {
     /**
      * The sound level has changed.
      *
-     * @param level in decibels; the device's own recogniser has a scale of its own
+     * @param level in decibels; the device recognizer has a scale of its own
      */
     default void onPowerChanged(float level) {}
 

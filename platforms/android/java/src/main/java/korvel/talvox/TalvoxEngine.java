@@ -130,7 +130,7 @@ public final class TalvoxEngine {
     }
 
     /**
-     * Whether a recognition with these settings would find a recogniser: only {@link
+     * Whether a recognition with these settings would find a recognizer: only {@link
      * TalvoxSettings#ASR_POLICY} and {@link TalvoxSettings#ASR_OVERRIDE} count. Neither the network
      * nor the gateway is asked.
      */
@@ -139,7 +139,7 @@ public final class TalvoxEngine {
     }
 
     /**
-     * The languages that can be recognised, sorted, each once. Those of the device's own recogniser
+     * The languages that can be recognised, sorted, each once. Those of the device recognizer
      * are asked for when the engine is created and join as soon as it has answered.
      */
     public List<String> getAvailableLanguages() {

@@ -145,7 +145,7 @@ public final class TalvoxSettings {
     public static final SettingKey<RecognitionModel> MODEL =
             SettingKey.ofChoice("model", BOTH, RecognitionModel.values());
 
-    /** Which recogniser to use. */
+    /** Which recognizer to use. */
     public static final SettingKey<AsrPolicy> ASR_POLICY =
             SettingKey.ofChoice("asrpolicy", BOTH, AsrPolicy.values());
 

@@ -32,7 +32,7 @@ import org.junit.Before;
 import org.junit.Test;
 import org.robolectric.shadows.ShadowLog;
 
-/** Recognitions by the device's own recogniser. */
+/** Recognitions by the device recognizer. */
 public class PlatformRecognizerTest extends EngineTestCase {
     private static final TalvoxSettings ON_DEVICE =
             TalvoxSettings.builder()
@@ -324,7 +324,7 @@ public class PlatformRecognizerTest extends EngineTestCase {
         assertEquals(Collections.singletonList("results"), heard());
     }
 
-    /** An application whose context fails when the device's recogniser is started. */
+    /** An application whose context fails when the device recognizer is started. */
     private void startIn(Context context) throws Exception {
         TalvoxEngine.getInstance(context);
         start();
@@ -370,7 +370,7 @@ public class PlatformRecognizerTest extends EngineTestCase {
                         throw new SecurityException("refused for the test");
                     }
                 });
-        assertLogged("the device's recogniser does not start");
+        assertLogged("the device recognizer does not start");
     }
 
     @Test

@@ -15,7 +15,7 @@ import korvel.talvox.SpeechError;
  *   <tr><td>5 client, every number not listed</td><td>{@code ErrorUnknown}</td></tr>
  *   <tr><td>6 speech time-out</td><td>{@code ErrorNoVoice}</td></tr>
  *   <tr><td>7 no match</td><td>−1: empty results, not an error</td></tr>
- *   <tr><td>8 recogniser busy, 10 too many requests</td><td>{@code ErrorBusy}</td></tr>
+ *   <tr><td>8 recognizer busy, 10 too many requests</td><td>{@code ErrorBusy}</td></tr>
  *   <tr><td>12 language not supported, 13 language unavailable</td>
  *       <td>{@code ErrorNotAvailable}</td></tr>
  * </table>

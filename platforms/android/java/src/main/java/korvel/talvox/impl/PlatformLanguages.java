@@ -13,7 +13,7 @@ import java.util.ArrayList;
 import java.util.Collections;
 
 /**
- * The languages of the device's recogniser: asked for by an ordered broadcast, kept from then on.
+ * The languages of the device recognizer: asked for by an ordered broadcast, kept from then on.
  * All methods may be called from any thread and return at once.
  */
 final class PlatformLanguages {
@@ -51,7 +51,7 @@ final class PlatformLanguages {
                     null,
                     null);
         } catch (RuntimeException failure) {
-            Log.w(TAG, "asking for the languages of the device's recogniser failed", failure);
+            Log.w(TAG, "asking for the languages of the device recognizer failed", failure);
             keep(Bundle.EMPTY);
         }
     }

@@ -22,7 +22,7 @@ import korvel.talvox.SpeechError;
 import korvel.talvox.TalvoxSettings;
 
 /**
- * Drives the device's own recogniser for the native recognizer of the same name, which creates,
+ * Drives the device recognizer for the native recognizer of the same name, which creates,
  * starts, stops and cancels this object and hears its callbacks.
  *
  * <p>{@link #start}, {@link #stop} and {@link #cancel} may be called on any thread, under the event
@@ -58,17 +58,17 @@ public final class PlatformRecognizer {
                         : RecognizerIntent.LANGUAGE_MODEL_WEB_SEARCH;
     }
 
-    /** The kind of language model that the device's recogniser was asked for. */
+    /** The kind of language model that the device recognizer was asked for. */
     String getModel() {
         return model;
     }
 
-    /** The language that the device's recogniser was asked for, empty for its own choice. */
+    /** The language that the device recognizer was asked for, empty for its own choice. */
     String getLanguagePreference() {
         return language;
     }
 
-    /** The package of the device's recogniser, empty if the device does not say. */
+    /** The package of the device recognizer, empty if the device does not say. */
     String getSource() {
         return source;
     }
@@ -90,7 +90,7 @@ public final class PlatformRecognizer {
     /**
      * Begins to listen.
      *
-     * @throws IllegalStateException if there is no application or it has no recogniser
+     * @throws IllegalStateException if there is no application or it has no recognizer
      */
     void start() {
         final Context context = CoreApplication.getApplicationContext();
@@ -98,7 +98,7 @@ public final class PlatformRecognizer {
             throw new IllegalStateException("there is no application context");
         }
         if (!SpeechRecognizer.isRecognitionAvailable(context)) {
-            throw new IllegalStateException("the device has no speech recogniser");
+            throw new IllegalStateException("the device has no speech recognizer");
         }
         source = findSource(context);
         main.post(() -> startListening(context));
@@ -141,7 +141,7 @@ public final class PlatformRecognizer {
             speech.setRecognitionListener(new Callbacks());
             speech.startListening(makeIntent(context));
         } catch (RuntimeException failure) {
-            Log.e(TAG, "the device's recogniser does not start", failure);
+            Log.e(TAG, "the device recognizer does not start", failure);
             finish(() -> onErrorInternal(recognizer, SpeechError.NOT_AVAILABLE.getCode()));
         }
     }
@@ -255,7 +255,7 @@ public final class PlatformRecognizer {
         @Override
         public void onError(int error) {
             if (error == SpeechRecognizer.ERROR_INSUFFICIENT_PERMISSIONS) {
-                Log.e(TAG, "the device's recogniser was refused the permission RECORD_AUDIO");
+                Log.e(TAG, "the device recognizer was refused the permission RECORD_AUDIO");
             }
             finish(() -> onErrorInternal(recognizer, PlatformErrors.toEngine(error)));
         }

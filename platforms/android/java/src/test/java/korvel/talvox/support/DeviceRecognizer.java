@@ -18,9 +18,9 @@ import org.robolectric.shadows.ShadowPackageManager;
 import org.robolectric.shadows.ShadowSpeechRecognizer;
 import org.robolectric.util.ReflectionHelpers;
 
-/** The device's own recogniser, as a test plays it. */
+/** The device recognizer, as a test plays it. */
 public final class DeviceRecognizer {
-    public static final String PACKAGE = "com.example.recogniser";
+    public static final String PACKAGE = "com.example.recognizer";
 
     private DeviceRecognizer() {}
 
@@ -40,7 +40,7 @@ public final class DeviceRecognizer {
     private static ShadowSpeechRecognizer latest() {
         KitTest.drainMain();
         final SpeechRecognizer recognizer = ShadowSpeechRecognizer.getLatestSpeechRecognizer();
-        assertNotNull("the device's recogniser was not used", recognizer);
+        assertNotNull("the device recognizer was not used", recognizer);
         return Shadow.extract(recognizer);
     }
 
@@ -58,7 +58,7 @@ public final class DeviceRecognizer {
         return latest().isDestroyed();
     }
 
-    /** A callback of the recogniser. */
+    /** A callback of the recognizer. */
     public interface Callback {
         void call(RecognitionListener listener);
     }
@@ -77,7 +77,7 @@ public final class DeviceRecognizer {
             KitTest.drainMain();
             listener = ReflectionHelpers.getField(state, "recognitionListener");
         }
-        assertNotNull("the device's recogniser has no listener", listener);
+        assertNotNull("the device recognizer has no listener", listener);
         return listener;
     }
 
