@@ -88,6 +88,15 @@ std::size_t CepstralMean::countSpeech() const {
     return frames;
 }
 
+std::size_t CepstralMean::countLeadingSamples() const {
+    const double speechLevel = levels.findSpeechLevel();
+    std::size_t frame = 0;
+    while (frame < levels.getCount() && levels.getLevel(frame) < speechLevel) {
+        ++frame;
+    }
+    return frame * FrameLevels::STEP_SAMPLES;
+}
+
 std::vector<float> CepstralMean::get() const {
     const double speechLevel = levels.findSpeechLevel();
     std::vector<double> sums(dimensions);

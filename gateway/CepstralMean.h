@@ -36,6 +36,9 @@ class CepstralMean {
     /** Frames of speech, one each 10 ms, as far as the sound tells by now; 0 while it is noise. */
     std::size_t countSpeech() const;
 
+    /** Samples before the first frame of speech; 0 where nothing stands out from the background. */
+    std::size_t countLeadingSamples() const;
+
     /**
      * The mean over all speech so far. Where nothing stands out from the background, all sound
      * counts but digital silence.

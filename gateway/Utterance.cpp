@@ -64,7 +64,16 @@ void Utterance::measure(bool last) {
 
 bool Utterance::beginDecoding(DecoderPool::Lease lease) {
     decoder = std::move(lease);
+    skipWait();
     return decoder->begin(mean.get());
+}
+
+void Utterance::skipWait() {
+    const std::size_t leading = mean.countLeadingSamples();
+    if (leading > LEAD_SAMPLES) {
+        sound.erase(sound.begin(),
+                    sound.begin() + static_cast<std::ptrdiff_t>(leading - LEAD_SAMPLES));
+    }
 }
 
 void Utterance::decode(bool last) {

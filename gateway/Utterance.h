@@ -20,6 +20,9 @@ namespace Gateway {
  * shorter than that is decoded like a whole utterance. What is left after the last sample of a
  * longer one is the decoder's second pass.
  *
+ * The decoder does not hear the wait before the speech, apart from its last `LEAD_SAMPLES`: words
+ * should not depend on how long a speaker hesitates.
+ *
  * The sound goes to the decoder in pieces of fixed length, however it arrives, so that the answer
  * depends on the sound and the arrival only. While all decoders are busy the sound is
  * kept, for as long as it arrives, and decoded as soon as one is free.
@@ -30,6 +33,8 @@ class Utterance {
     static constexpr std::size_t PIECE_SAMPLES = SpeechModel::RATE_HZ / 10;
     /** Frames of speech, of 10 ms, over which the cepstral mean is measured. */
     static constexpr std::size_t MEAN_FRAMES = 150;
+    /** Sound before the first frame of speech that is decoded: 300 ms, for quiet first sounds. */
+    static constexpr std::size_t LEAD_SAMPLES = 3 * PIECE_SAMPLES;
     /** Longest utterance in seconds; the decoder holds 150 s at most. */
     static constexpr std::size_t MAX_SECONDS = 120;
     static constexpr std::size_t MAX_SAMPLES = MAX_SECONDS * SpeechModel::RATE_HZ;
@@ -62,6 +67,7 @@ class Utterance {
 
   private:
     void measure(bool last);
+    void skipWait();
     bool beginDecoding(DecoderPool::Lease lease);
     void decode(bool last);
 

@@ -37,6 +37,16 @@ Samples longSpeech() {
     return samples;
 }
 
+/** The noise ends the same, whatever its length. */
+Samples afterFaintNoise(const Samples& sound, std::size_t count) {
+    Samples samples;
+    for (std::size_t left = count; left > 0; --left) {
+        samples.push_back(static_cast<int16_t>(left * 7919 % 31) - 15);
+    }
+    samples.insert(samples.end(), sound.begin(), sound.end());
+    return samples;
+}
+
 void expectSame(const std::vector<Hypothesis>& expected, const std::vector<Hypothesis>& actual) {
     ASSERT_EQ(expected.size(), actual.size());
     for (std::size_t i = 0; i < expected.size(); ++i) {
@@ -108,6 +118,22 @@ TEST(Utterance, GivesTheSameAnswerWhateverThePieces) {
         const std::vector<Hypothesis> expected = recognise(sharedPool(), samples, 1600, arrival);
         for (const std::size_t piece : {97U, 5000U, 1000000U}) {
             expectSame(expected, recognise(sharedPool(), samples, piece, arrival));
+        }
+    }
+}
+
+TEST(Utterance, UnderstandsTheSameHoweverLongTheWaitBeforeTheSpeech) {
+    const Samples shortWait = afterFaintNoise(longSpeech(), 16000);
+    const Samples longWait = afterFaintNoise(longSpeech(), 48000);
+    for (const Utterance::Arrival arrival :
+         {Utterance::Arrival::STREAMED, Utterance::Arrival::WHOLE}) {
+        const std::vector<Hypothesis> expected = recognise(sharedPool(), shortWait, 1600, arrival);
+        const std::vector<Hypothesis> actual = recognise(sharedPool(), longWait, 1600, arrival);
+        ASSERT_EQ(expected.size(), actual.size());
+        for (std::size_t i = 0; i < expected.size(); ++i) {
+            EXPECT_EQ(expected[i].text, actual[i].text);
+            // The front end that measures the mean adapts to the noise, to longer noise more.
+            EXPECT_NEAR(expected[i].confidence, actual[i].confidence, 0.001);
         }
     }
 }
