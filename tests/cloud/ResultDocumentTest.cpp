@@ -134,7 +134,7 @@ TEST(ResultDocument, RefusesDeepNesting) {
 
 TEST(ResultDocument, RefusesTenMegabytes) {
     const LogCapture quiet;
-    EXPECT_FALSE(parse(wrap("<variant>" + std::string(10 * 1024 * 1024, 'x') + "</variant>")));
+    EXPECT_FALSE(parse(wrap("<variant>" + std::string(std::size_t{10} << 20, 'x') + "</variant>")));
 }
 
 TEST(ResultDocument, DoesNotExpandEntitiesOfItsOwn) {

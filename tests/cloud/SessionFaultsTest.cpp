@@ -154,7 +154,7 @@ TEST_P(SessionFaultsTest, BrokenAndHostileDocuments) {
 }
 
 TEST_P(SessionFaultsTest, HeaderBeyondEveryLimit) {
-    server.setDefaultAnswer(CloudTest::answerDocument(std::string(10 * 1024 * 1024, 'x')));
+    server.setDefaultAnswer(CloudTest::answerDocument(std::string(std::size_t{10} << 20, 'x')));
     recognise();
     ASSERT_TRUE(server.waitForRequest(1));
     advanceUntil([this] { return server.waitForHead(2, std::chrono::milliseconds(20)); });
@@ -186,14 +186,16 @@ TEST_P(SessionFaultsTest, ConfidencesOfAllKinds) {
 }
 
 TEST_P(SessionFaultsTest, AsManyVariantsAsAHeaderHolds) {
+    constexpr int COUNT = 1200;
     std::vector<std::pair<std::string, std::string>> variants;
-    for (int i = 0; i < 1200; ++i) {
+    variants.reserve(COUNT);
+    for (int i = 0; i < COUNT; ++i) {
         variants.emplace_back("w" + std::to_string(i), "0.5");
     }
     server.setDefaultAnswer(CloudTest::answerDocument(makeDocument(variants)));
     recognise();
     expectEnd("results");
-    EXPECT_EQ(events->recognition()->getResults()->size(), 1200U);
+    EXPECT_EQ(events->recognition()->getResults()->size(), static_cast<std::size_t>(COUNT));
 }
 
 TEST_P(SessionFaultsTest, DroppedWhileNobodyAnswers) {

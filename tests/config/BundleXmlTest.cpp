@@ -29,10 +29,14 @@ const Bundle::ElemSpec SPEC[] = {
     {"odd", UNKNOWN_TYPE, nullptr},     {"Spelled_Odd", Bundle::INT, nullptr},
     {nullptr, Bundle::BOOLEAN, nullptr}};
 
+std::string element(const std::string& name, const std::string& content) {
+    return "<" + name + ">" + content + "</" + name + ">";
+}
+
 /** What one element named `name` with the given text leaves in a bundle. */
 Bundle updatedWith(const std::string& name, const std::string& text) {
     Bundle bundle;
-    bundle.updateFromXml("<r><" + name + ">" + text + "</" + name + "></r>", "r", SPEC);
+    bundle.updateFromXml(element("r", element(name, text)), "r", SPEC);
     return bundle;
 }
 
@@ -160,7 +164,7 @@ TEST(BundleFromXml, ATextThatIsNotANumberKeepsTheOldValueAndIsLogged) {
         bundle.putInt("number", 7);
         bundle.putFloat("ratio", 0.5F);
         const LogCapture log;
-        bundle.updateFromXml("<r><number>" + text + "</number><ratio>" + text + "</ratio></r>", "r",
+        bundle.updateFromXml(element("r", element("number", text) + element("ratio", text)), "r",
                              SPEC);
         EXPECT_EQ(7, bundle.getInt("number")) << text;
         EXPECT_EQ(0.5F, bundle.getFloat("ratio")) << text;
@@ -217,10 +221,9 @@ TEST(BundleFromXml, ANumberBeyondTheRangeBecomesItsNearestEndAndIsLogged) {
 TEST(BundleFromXml, InfinityInAThresholdIsFoundByValidation) {
     for (const std::string text : {"inf", "-inf", "INFINITY", "1e999", "-1e999"}) {
         Settings settings;
-        settings.updateFromXml("<v><upperconfidence>" + text +
-                                   "</upperconfidence><lowerconfidence>" + text +
-                                   "</lowerconfidence></v>",
-                               "v", Settings::bundleSpecs);
+        settings.updateFromXml(
+            element("v", element("upperconfidence", text) + element("lowerconfidence", text)), "v",
+            Settings::bundleSpecs);
         settings.validate();
         EXPECT_EQ(0.9F, settings.getFloat(Settings::SKS_UPPER_CONFIDENCE)) << text;
         EXPECT_EQ(0.4F, settings.getFloat(Settings::SKS_LOWER_CONFIDENCE)) << text;

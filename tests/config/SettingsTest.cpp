@@ -11,7 +11,6 @@
 using Talvox::Settings;
 using ::testing::IsEmpty;
 using TestSupport::AssertCapture;
-using TestSupport::LogCapture;
 using Util::Bundle;
 
 namespace {

@@ -37,7 +37,7 @@ TEST_F(NetworkAssertTest, TearDownByATaskOnTheNetworkThreadIsDoneAllTheSame) {
 
 TEST_F(NetworkAssertTest, RefusedRequestIsNeitherSentNorRetried) {
     const auto task = boost::make_shared<RecordingTask>([this] {
-        const auto request = HttpRequest::create(server.getUrl(), "GET", 1000, false);
+        auto request = HttpRequest::create(server.getUrl(), "GET", 1000, false);
         request->refuse("the language is empty");
         request->refuse("the model is empty");
         return request;

@@ -134,7 +134,7 @@ TEST(Server, ServesSeveralClientsAtOnce) {
     }
 }
 
-TEST(Server, GivesBackTheRecogniserOfAClientThatVanishes) {
+TEST(Server, GivesBackTheDecoderOfAClientThatVanishes) {
     ServerOptions options = anyPort();
     options.decoders = 1;
     options.verbose = true;

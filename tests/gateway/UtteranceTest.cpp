@@ -186,7 +186,7 @@ TEST(Utterance, UnderstandsShortWords) {
     EXPECT_EQ("ten of clubs", hypotheses[0].text);
 }
 
-TEST(Utterance, EndsWhereTheRecogniserWould) {
+TEST(Utterance, EndsWhereTheDecoderWould) {
     Utterance utterance(sharedPool(), Utterance::Arrival::STREAMED);
     const Samples second(16000, 0);
     for (std::size_t i = 0; i < Utterance::MAX_SECONDS; ++i) {
@@ -196,7 +196,7 @@ TEST(Utterance, EndsWhereTheRecogniserWould) {
     EXPECT_EQ(120000U, utterance.getDurationMs());
 }
 
-TEST(Utterance, CatchesUpOnceARecogniserIsFree) {
+TEST(Utterance, CatchesUpOnceADecoderIsFree) {
     Gateway::DecoderPool pool(Gateway::SpeechModel(), 1);
     const Samples samples = GatewayTest::readRecording("goforward.raw");
     const std::vector<Hypothesis> expected = recognise(pool, samples, 1600);
@@ -211,7 +211,7 @@ TEST(Utterance, CatchesUpOnceARecogniserIsFree) {
     expectSame(expected, hypotheses);
 }
 
-TEST(Utterance, GetsNoRecogniserFromAClosedPool) {
+TEST(Utterance, GetsNoDecoderFromAClosedPool) {
     Gateway::DecoderPool pool(Gateway::SpeechModel(), 1);
     pool.close();
     Utterance utterance(pool, Utterance::Arrival::STREAMED);
