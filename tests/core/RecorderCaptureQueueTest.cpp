@@ -1,7 +1,12 @@
 #include <gtest/gtest.h>
 
+#include <algorithm>
+#include <atomic>
 #include <boost/make_shared.hpp>
+#include <condition_variable>
 #include <cstddef>
+#include <mutex>
+#include <thread>
 #include <vector>
 
 #include "core/sound/CaptureQueue.h"
@@ -107,6 +112,57 @@ TEST_F(RecorderCaptureQueue, QueueThatIsTakenInTimeNeverFills) {
         ASSERT_TRUE(queue.push(sound.data(), sound.size()));
         EXPECT_EQ(queue.take().buffers.size(), 1U);
     }
+}
+
+TEST_F(RecorderCaptureQueue, BuffersStayAsTheyAreWhileSomebodyHoldsThem) {
+    const Bytes sound = makeBytes(std::size_t{320} * 251);
+    std::vector<boost::shared_ptr<const SoundDataBuffer>> held;
+    Bytes received;
+    for (std::size_t i = 0; i < 251; ++i) {
+        ASSERT_TRUE(queue.push(sound.data() + i * 320, 320));
+        held.push_back(queue.take().buffers.at(0));
+    }
+    for (const auto& buffer : held) {
+        received.insert(received.end(), buffer->getData().begin(), buffer->getData().end());
+    }
+    EXPECT_EQ(received, sound);
+}
+
+TEST_F(RecorderCaptureQueue, SoundPassesWholeBetweenTwoThreads) {
+    const Bytes sound = makeBytes(std::size_t{320} * 2000);
+    std::mutex mutex;
+    std::condition_variable woken;
+    bool isAwake = false;
+    CaptureQueue own(FORMAT, [&] {
+        const std::lock_guard<std::mutex> lock(mutex);
+        isAwake = true;
+        woken.notify_one();
+    });
+    std::atomic<std::size_t> receivedCount{0};
+    std::thread device([&] {
+        constexpr std::size_t PIECE = 500;
+        for (std::size_t begin = 0; begin < sound.size(); begin += PIECE) {
+            // Never more than fit.
+            while (begin > receivedCount + 320 * (CaptureQueue::BUFFERS_MAX - 2)) {
+                std::this_thread::yield();
+            }
+            own.push(sound.data() + begin, std::min(PIECE, sound.size() - begin));
+        }
+    });
+    Bytes received;
+    while (received.size() < sound.size()) {
+        {
+            std::unique_lock<std::mutex> lock(mutex);
+            woken.wait(lock, [&] { return isAwake; });
+            isAwake = false;
+        }
+        for (const auto& buffer : own.take().buffers) {
+            received.insert(received.end(), buffer->getData().begin(), buffer->getData().end());
+        }
+        receivedCount = received.size();
+    }
+    device.join();
+    EXPECT_EQ(received, sound);
 }
 
 TEST_F(RecorderCaptureQueue, FirstFailureCountsAndEndsTheSound) {

@@ -1,13 +1,23 @@
 #include "core/sound/CaptureQueue.h"
 
 #include <algorithm>
-#include <boost/make_shared.hpp>
+#include <cstring>
 #include <utility>
 
 namespace Sound {
 
+namespace {
+
+std::unique_ptr<unsigned char[]> makeRing(std::size_t slots, const RecorderFormat& format) {
+    // Not initialised, as by make_unique: that would touch every page.
+    return std::unique_ptr<unsigned char[]>(
+        format.isUsable() ? new unsigned char[slots * format.getByteCount()] : nullptr);
+}
+
+}  // namespace
+
 CaptureQueue::CaptureQueue(const RecorderFormat& bufferFormat, std::function<void()> wakeFunction)
-    : format(bufferFormat), wake(std::move(wakeFunction)) {}
+    : format(bufferFormat), wake(std::move(wakeFunction)), ring(makeRing(SLOTS, bufferFormat)) {}
 
 bool CaptureQueue::push(const unsigned char* data, std::size_t size) {
     {
@@ -18,44 +28,58 @@ bool CaptureQueue::push(const unsigned char* data, std::size_t size) {
         ++arrivals;
     }
     const std::size_t bufferSize = format.getByteCount();
-    while (size > 0) {
-        const std::size_t count = std::min(size, bufferSize - partial.size());
+    while (ring && size > 0) {
+        const std::size_t count = std::min(size, bufferSize - filled);
         if (data != nullptr) {
-            partial.insert(partial.end(), data, data + count);
+            std::memcpy(slot(filling) + filled, data, count);
             data += count;
         } else {
-            partial.resize(partial.size() + count, 0);
+            std::memset(slot(filling) + filled, 0, count);
         }
+        filled += count;
         size -= count;
-        if (partial.size() == bufferSize) {
-            std::vector<unsigned char> bytes;
-            bytes.reserve(bufferSize);
-            bytes.swap(partial);
-            if (!store(boost::make_shared<SoundDataBuffer>(format.getInfo(), std::move(bytes)))) {
-                return false;
-            }
+        if (filled == bufferSize && !finishSlot()) {
+            return false;
         }
     }
     return true;
 }
 
-void CaptureQueue::fail(const std::string& reason) {
+void CaptureQueue::fail(const std::string& what) {
     {
         const std::lock_guard<std::mutex> lock(mutex);
         if (ended) {
             return;
         }
         ended = true;
-        waiting.failed = true;
-        waiting.reason = reason;
+        failed = true;
+        reason = what;
     }
     callWake();
 }
 
-CaptureQueue::Batch CaptureQueue::take() {
+// What throws changes nothing: the sound still waits, and the next piece of it wakes again.
+const CaptureQueue::Batch& CaptureQueue::take() {
+    std::size_t count = 0;
+    {
+        const std::lock_guard<std::mutex> lock(mutex);
+        awake = false;
+        count = waiting;
+    }
+    batch.buffers.clear();
+    for (std::size_t i = 0; i < count; ++i) {
+        const boost::shared_ptr<SoundDataBuffer> buffer = pool.take(format.getInfo());
+        const unsigned char* const bytes = slot(taking + i);
+        buffer->getData().assign(bytes, bytes + format.getByteCount());
+        batch.buffers.push_back(buffer);
+    }
     const std::lock_guard<std::mutex> lock(mutex);
-    awake = false;
-    return std::exchange(waiting, Batch());
+    taking += count;
+    waiting -= count;
+    // Sound that has come in between comes before the failure.
+    batch.failed = waiting == 0 && std::exchange(failed, false);
+    batch.reason = batch.failed ? reason : std::string();
+    return batch;
 }
 
 unsigned CaptureQueue::getArrivalCount() const {
@@ -63,19 +87,19 @@ unsigned CaptureQueue::getArrivalCount() const {
     return arrivals;
 }
 
-bool CaptureQueue::store(boost::shared_ptr<const SoundDataBuffer> buffer) {
+bool CaptureQueue::finishSlot() {
     bool full = false;
     {
         const std::lock_guard<std::mutex> lock(mutex);
-        full = waiting.buffers.size() >= BUFFERS_MAX;
-        if (!full) {
-            waiting.buffers.push_back(std::move(buffer));
-        }
+        full = waiting >= BUFFERS_MAX;
+        waiting += full ? 0 : 1;
     }
     if (full) {
         fail("recorded sound was not taken in time");
         return false;
     }
+    ++filling;
+    filled = 0;
     callWake();
     return true;
 }

@@ -1,7 +1,6 @@
 #include "core/sound/FileRecorder.h"
 
 #include <algorithm>
-#include <boost/make_shared.hpp>
 #include <utility>
 
 #include "core/sound/RecorderFormat.h"
@@ -70,7 +69,9 @@ void FileRecorder::awaitBuffer() {
 
 void FileRecorder::deliver() {
     const RecorderFormat format(getSampleRate(), getBufferLength());
-    std::vector<unsigned char> bytes(format.getByteCount());
+    const boost::shared_ptr<SoundDataBuffer> buffer = buffers.take(format.getInfo());
+    std::vector<unsigned char>& bytes = buffer->getData();
+    bytes.assign(format.getByteCount(), 0);
     const std::size_t count =
         std::min(sound.size() - position, static_cast<std::size_t>(format.getSampleCount()));
     for (std::size_t i = 0; i < count; ++i) {
@@ -82,7 +83,7 @@ void FileRecorder::deliver() {
     samplesDelivered += format.getSampleCount();
     // First, since a listener may stop or drop this recorder.
     awaitBuffer();
-    notifyData(boost::make_shared<SoundDataBuffer>(format.getInfo(), std::move(bytes)));
+    notifyData(buffer);
 }
 
 }  // namespace Sound

@@ -2,7 +2,7 @@
 
 #include <boost/make_shared.hpp>
 #include <cstdint>
-#include <memory>
+#include <mutex>
 #include <utility>
 
 #include "pal/kd_event.h"
@@ -19,6 +19,31 @@ const int QUIET_TICKS_AT_START_MAX = 25;
 const int QUIET_TICKS_MAX = 4;
 
 }  // namespace
+
+/** Can be posted again and again without any allocation; keeps itself while it is posted. */
+class QueuedRecorder::Delivery {
+  public:
+    explicit Delivery(const boost::weak_ptr<Recorder>& target) : recorder(target) {}
+
+    void hold(const boost::shared_ptr<Delivery>& itself) {
+        const std::lock_guard<std::mutex> lock(mutex);
+        self = itself;
+        ++posts;
+    }
+
+    /** @return what held the object for the post; never null */
+    boost::shared_ptr<Delivery> release() {
+        const std::lock_guard<std::mutex> lock(mutex);
+        return --posts == 0 ? std::move(self) : self;
+    }
+
+    const boost::weak_ptr<Recorder> recorder;
+
+  private:
+    std::mutex mutex;  // guards what follows
+    boost::shared_ptr<Delivery> self;
+    int posts = 0;
+};
 
 QueuedRecorder::QueuedRecorder(std::string recorderName)
     : name(std::move(recorderName)), watchTimer([this] { onWatchTick(); }) {}
@@ -46,7 +71,7 @@ void QueuedRecorder::startRecording() {
     }
     startWatch();
     // For a failure that showed before.
-    postDelivery(weak_from_this());
+    post(boost::make_shared<Delivery>(weak_from_this()));
     Recorder::startRecording();
 }
 
@@ -57,8 +82,8 @@ void QueuedRecorder::stopRecording() {
 
 bool QueuedRecorder::open() {
     const RecorderFormat format(getSampleRate(), getBufferLength());
-    const boost::weak_ptr<Recorder> self = weak_from_this();
-    queue = boost::make_shared<CaptureQueue>(format, [self] { postDelivery(self); });
+    const auto delivery = boost::make_shared<Delivery>(weak_from_this());
+    queue = boost::make_shared<CaptureQueue>(format, [delivery] { post(delivery); });
     if (!format.isUsable()) {
         queue->fail("unusable sample rate or buffer length");
         return false;
@@ -84,7 +109,7 @@ void QueuedRecorder::deliver() {
         return;
     }
     const boost::shared_ptr<CaptureQueue> source = queue;
-    const CaptureQueue::Batch batch = source->take();
+    const CaptureQueue::Batch& batch = source->take();
     for (const boost::shared_ptr<const SoundDataBuffer>& buffer : batch.buffers) {
         if (zeroWatch.isSuspicious(*buffer)) {
             kdLogFormatMessage("%s: the microphone delivers only zeros; is the microphone muted?",
@@ -128,14 +153,17 @@ void QueuedRecorder::onWatchTick() {
     watchTimer.start(KD_TIMER_ONESHOT, WATCH_TICK_NS);
 }
 
-void QueuedRecorder::postDelivery(const boost::weak_ptr<Recorder>& recorder) {
-    kdPostKOR(&QueuedRecorder::onDelivery, new boost::weak_ptr<Recorder>(recorder));
+// On the device's thread, which must not allocate.
+void QueuedRecorder::post(const boost::shared_ptr<Delivery>& delivery) {
+    delivery->hold(delivery);
+    if (kdPostKOR(&QueuedRecorder::onDelivery, delivery.get()) != 0) {
+        delivery->release();
+    }
 }
 
 void QueuedRecorder::onDelivery(void* user) {
-    const std::unique_ptr<boost::weak_ptr<Recorder>> target(
-        static_cast<boost::weak_ptr<Recorder>*>(user));
-    if (const boost::shared_ptr<Recorder> recorder = target->lock()) {
+    const boost::shared_ptr<Delivery> delivery = static_cast<Delivery*>(user)->release();
+    if (const boost::shared_ptr<Recorder> recorder = delivery->recorder.lock()) {
         static_cast<QueuedRecorder&>(*recorder).deliver();
     }
 }

@@ -7,11 +7,13 @@
 #include <boost/shared_ptr.hpp>
 #include <cstddef>
 #include <functional>
+#include <memory>
 #include <mutex>
 #include <string>
 #include <vector>
 
 #include "core/Export.h"
+#include "core/sound/BufferPool.h"
 #include "core/sound/RecorderFormat.h"
 #include "core/sound/SoundDataBuffer.h"
 
@@ -20,6 +22,9 @@ namespace Sound {
 /**
  * What a device's thread hands to the event thread: sound, cut into buffers of the asked length,
  * and at most one failure, behind all sound that came before it.
+ *
+ * The device's thread copies into a ring that is there from the beginning: it allocates nothing,
+ * however late the event thread takes the sound. The event thread makes the buffers.
  */
 class KORVEL_CORE_API CaptureQueue {
   public:
@@ -50,22 +55,40 @@ class KORVEL_CORE_API CaptureQueue {
     /** Appends a failure; the first one counts. Device's thread, or before it has begun. */
     void fail(const std::string& reason);
 
-    /** Moves out what has come so far. Event thread. */
-    Batch take();
+    /** What has come since the last call, valid until the next one. Event thread. */
+    const Batch& take();
 
     /** Grows whenever sound comes; wraps around. Any thread. */
     unsigned getArrivalCount() const;
 
   private:
-    bool store(boost::shared_ptr<const SoundDataBuffer> buffer);
+    /** One more than may wait: the device's thread fills it meanwhile. */
+    static constexpr std::size_t SLOTS = BUFFERS_MAX + 1;
+
+    unsigned char* slot(std::size_t index) const {
+        return ring.get() + index % SLOTS * format.getByteCount();
+    }
+    bool finishSlot();
     void callWake();
 
     const RecorderFormat format;
     const std::function<void()> wake;
-    std::vector<unsigned char> partial;  // of the device's thread
+    // Pages of it that no sound has reached yet take no memory.
+    const std::unique_ptr<unsigned char[]> ring;
+
+    // Of the device's thread.
+    std::size_t filling = 0;
+    std::size_t filled = 0;
+
+    // Of the event thread.
+    BufferPool pool;
+    Batch batch;
+    std::size_t taking = 0;
 
     mutable std::mutex mutex;  // guards what follows
-    Batch waiting;
+    std::size_t waiting = 0;
+    std::string reason;
+    bool failed = false;
     bool ended = false;
     bool awake = false;
     unsigned arrivals = 0;

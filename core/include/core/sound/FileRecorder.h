@@ -8,6 +8,7 @@
 #include <cstdint>
 #include <vector>
 
+#include "core/sound/BufferPool.h"
 #include "core/sound/Recorder.h"
 #include "core/util/Timer.h"
 
@@ -54,6 +55,7 @@ class KORVEL_CORE_API FileRecorder : public Recorder {
     bool isOpen = false;
     int64_t openTime = 0;
     int64_t samplesDelivered = 0;
+    BufferPool buffers;
     Util::Timer timer;
 };
 

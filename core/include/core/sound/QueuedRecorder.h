@@ -48,13 +48,15 @@ class KORVEL_CORE_API QueuedRecorder : public Recorder {
     virtual void endDevice() = 0;
 
   private:
+    class Delivery;
+
     bool open();
     void close();
     void deliver();
     void fail(const std::string& reason);
     void startWatch();
     void onWatchTick();
-    static void postDelivery(const boost::weak_ptr<Recorder>& recorder);
+    static void post(const boost::shared_ptr<Delivery>& delivery);
     static void onDelivery(void* user);
 
     const std::string name;

@@ -1,10 +1,12 @@
 #include "AudioRecordRecorder.h"
 
+#include <algorithm>
+#include <array>
 #include <boost/make_shared.hpp>
+#include <cstddef>
 #include <map>
 #include <mutex>
 #include <utility>
-#include <vector>
 
 #include "../EntryPoint.h"
 #include "../Text.h"
@@ -53,10 +55,15 @@ void receive(JNIEnv* env, jlong recorder, jbyteArray data, jint size) {
     if (!queue || evenSize <= 0) {
         return;
     }
-    std::vector<unsigned char> bytes(static_cast<std::size_t>(evenSize));
-    env->GetByteArrayRegion(data, 0, evenSize, reinterpret_cast<jbyte*>(bytes.data()));
-    Jni::check(env);
-    queue->push(bytes.data(), bytes.size());
+    // Piece by piece through the stack: this thread is not to allocate.
+    std::array<unsigned char, 4096> piece;
+    for (jint done = 0; done < evenSize;) {
+        const jint count = std::min(evenSize - done, static_cast<jint>(piece.size()));
+        env->GetByteArrayRegion(data, done, count, reinterpret_cast<jbyte*>(piece.data()));
+        Jni::check(env);
+        queue->push(piece.data(), static_cast<std::size_t>(count));
+        done += count;
+    }
 }
 
 }  // namespace
