@@ -4,20 +4,23 @@
 #include <unordered_map>
 #include <utility>
 
+#include "kept_nodes.h"
+
 namespace korvel_pal {
 
 /**
  * Gives objects handles that are numbers in the shape of a pointer and are never dereferenced, so
- * that a stale one is found out. Not synchronised; the addresses of the values are stable.
+ * that a stale one is found out. Not synchronised; the addresses of the values are stable. What is
+ * removed leaves its place in memory to what is added next.
  */
 template <typename Handle, typename Value>
 class HandleTable {
   public:
-    Handle* add(Value value) {
+    Handle* add(const Value& value) {
         do {
             ++lastNumber;
         } while (lastNumber == 0 || values.count(lastNumber) != 0);
-        values.emplace(lastNumber, std::move(value));
+        kept.insert(values, lastNumber, value);
         return toHandle(lastNumber);
     }
 
@@ -27,7 +30,14 @@ class HandleTable {
         return found == values.end() ? nullptr : &found->second;
     }
 
-    bool remove(const Handle* handle) { return values.erase(toNumber(handle)) != 0; }
+    bool remove(const Handle* handle) {
+        const auto found = values.find(toNumber(handle));
+        if (found == values.end()) {
+            return false;
+        }
+        kept.keep(values.extract(found));
+        return true;
+    }
 
     template <typename Call>
     void forEach(Call call) {
@@ -44,7 +54,10 @@ class HandleTable {
         return reinterpret_cast<Handle*>(number);  // NOLINT(performance-no-int-to-ptr)
     }
 
-    std::unordered_map<std::uintptr_t, Value> values;
+    using Values = std::unordered_map<std::uintptr_t, Value>;
+
+    Values values;
+    KeptNodes<Values> kept;
     std::uintptr_t lastNumber = 0;
 };
 

@@ -58,7 +58,7 @@ KDTimer* TimerTable::add(std::int64_t intervalNs, KDint type, void* userptr) {
     KDTimer* handle = nullptr;
     try {
         handle = timers.add({due, startedCount, intervalNs, type, userptr, true});
-        queue.emplace(std::make_pair(due, startedCount), handle);
+        keptEntries.insert(queue, {due, startedCount}, handle);
     } catch (const std::exception&) {
         timers.remove(handle);
         kdLogMessage("PAL: no memory for a timer");
@@ -75,7 +75,7 @@ bool TimerTable::cancel(KDTimer* handle) {
         return false;
     }
     if (timer->waiting) {
-        queue.erase({timer->due, timer->order});
+        keptEntries.keep(queue.extract({timer->due, timer->order}));
     }
     timers.remove(handle);
     return true;
@@ -155,6 +155,8 @@ bool TimerTable::takeDue(std::int64_t limit, bool manual, KDEvent& event) {
         enqueue(std::move(node), timer, addTime(timer.due, timer.intervalNs));
     } else if (timer.type == KD_TIMER_PERIODIC_MINIMUM) {
         enqueue(std::move(node), timer, addTime(Clock::now(), timer.intervalNs));
+    } else {
+        keptEntries.keep(std::move(node));
     }
     return true;
 }

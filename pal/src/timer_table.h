@@ -8,6 +8,7 @@
 
 #include "handle_table.h"
 #include "immortal.h"
+#include "kept_nodes.h"
 #include "pal/kd_event.h"
 
 namespace korvel_pal {
@@ -63,6 +64,7 @@ class TimerTable {
     std::mutex mutex;
     HandleTable<KDTimer, Timer> timers;
     Queue queue;
+    KeptNodes<Queue> keptEntries;
     std::uint64_t startedCount = 0;
     std::int64_t loopWakesAt = std::numeric_limits<std::int64_t>::max();
 };

@@ -3,7 +3,6 @@
 #include <pthread.h>
 
 #include <exception>
-#include <utility>
 
 #include "callback_guard.h"
 #include "event_lock.h"
@@ -49,16 +48,14 @@ KDWork* WorkQueue::add(void (*work)(void*), void (*done)(void*), void* user) {
         return nullptr;
     }
     const std::lock_guard<std::mutex> lock(mutex);
-    Work* added = nullptr;
     KDWork* handle = nullptr;
     try {
-        auto entry = std::make_unique<Work>();
-        added = entry.get();
-        handle = works.add(std::move(entry));
+        handle = works.add(Work());
     } catch (const std::exception&) {
         kdLogMessage("PAL: no memory for background work");
         return nullptr;
     }
+    Work* const added = works.find(handle);
     added->handle = handle;
     added->work = work;
     added->done = done;
@@ -78,18 +75,17 @@ void WorkQueue::cancel(KDWork* handle, void (*release)(void*)) {
     const EventLockGuard eventLock;
     {
         const std::lock_guard<std::mutex> lock(mutex);
-        const std::unique_ptr<Work>* const found = works.find(handle);
-        if (found == nullptr || (*found)->cancelled) {
+        Work* const work = works.find(handle);
+        if (work == nullptr || work->cancelled) {
             return;
         }
-        Work& work = **found;
-        work.cancelled = true;
-        work.release = release;
-        if (ending || work.state != State::WAITING) {
+        work->cancelled = true;
+        work->release = release;
+        if (ending || work->state != State::WAITING) {
             return;
         }
-        waiting.remove(&work);
-        complete(&work);
+        waiting.remove(work);
+        complete(work);
     }
     EventLoop::instance().wake();
 }
@@ -117,16 +113,17 @@ bool WorkQueue::deliverOne() {
     if (EventLoop::instance().isStopping()) {
         return false;
     }
-    std::unique_ptr<Work> work;
+    void (*call)(void*) = nullptr;
+    void* user = nullptr;
     {
         const std::lock_guard<std::mutex> lock(mutex);
-        KDWork* const handle = completed.pop()->handle;
-        work = std::move(*works.find(handle));
-        works.remove(handle);
+        const Work* const work = completed.pop();
+        call = work->cancelled ? work->release : work->done;
+        user = work->user;
+        works.remove(work->handle);
     }
-    void (*const call)(void*) = work->cancelled ? work->release : work->done;
     if (call != nullptr) {
-        callGuarded([call, &work] { call(work->user); });
+        callGuarded([call, user] { call(user); });
     }
     return true;
 }

@@ -2,7 +2,6 @@
 
 #include <array>
 #include <cstddef>
-#include <memory>
 #include <mutex>
 #include <thread>
 
@@ -83,7 +82,7 @@ class WorkQueue {
     std::mutex mutex;
     WakeSignal wakeSignal;
     // Guarded by the mutex; `cancelled` and `release` of an entry by the event lock.
-    HandleTable<KDWork, std::unique_ptr<Work>> works;
+    HandleTable<KDWork, Work> works;
     Line waiting;
     Line completed;
     std::array<std::thread, WORKERS_MAX> workers;
