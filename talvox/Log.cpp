@@ -5,10 +5,14 @@
 #include "pal/kd_log.h"
 #include "talvox/Talvox.h"
 
-void tvLogFormatMessage(int level, const char* format, ...) {
+bool tvIsLogged(int level) {
     using ::Talvox::Settings;
     const auto settings = Talvox::Talvox::getInstance().getTalvoxSettings();
-    if (level > settings->getInt(Settings::SKS_VERBOSE_LEVEL)) {
+    return level <= settings->getInt(Settings::SKS_VERBOSE_LEVEL);
+}
+
+void tvLogFormatMessage(int level, const char* format, ...) {
+    if (!tvIsLogged(level)) {
         return;
     }
     va_list args;

@@ -38,8 +38,10 @@ void writeOutput(RecognizeRequest& request, const Sound::SoundDataBuffer* output
         return;
     }
     const std::vector<unsigned char>& bytes = output->getData();
-    tvLogFormatMessage(LOG_LEVEL, "ParallelEncoder writes %s%d bytes at %s", position,
-                       static_cast<int>(bytes.size()), timeOfDay().data());
+    if (tvIsLogged(LOG_LEVEL)) {
+        tvLogFormatMessage(LOG_LEVEL, "ParallelEncoder writes %s%d bytes at %s", position,
+                           static_cast<int>(bytes.size()), timeOfDay().data());
+    }
     request.write(bytes.data(), static_cast<unsigned>(bytes.size()));
 }
 
@@ -80,6 +82,7 @@ void ParallelEncoder::taskDone() {
             writeOutput(*request, encoder->takeOutput(TAKE_ALL).get(), "");
         }
     }
+    currentTask->setBuffer(nullptr);
     currentTask.reset();
     taskQueueStep();
 }
@@ -96,9 +99,23 @@ void ParallelEncoder::taskQueueStep() {
 }
 
 void ParallelEncoder::startNextTask() {
-    currentTask = boost::make_shared<ParallelEncoderTask>(this, encoder, queue.front());
+    currentTask = takeTask();
+    currentTask->setBuffer(queue.front());
     queue.pop_front();
     Tasking::TaskManager::getInstance().addTask(currentTask, 0);
+}
+
+boost::shared_ptr<ParallelEncoderTask> ParallelEncoder::takeTask() {
+    for (boost::shared_ptr<ParallelEncoderTask>& task : keptTasks) {
+        if (!task) {
+            task = boost::make_shared<ParallelEncoderTask>(this, encoder);
+            return task;
+        }
+        if (task.use_count() == 1) {
+            return task;
+        }
+    }
+    return boost::make_shared<ParallelEncoderTask>(this, encoder);
 }
 
 void ParallelEncoder::finishStream() {

@@ -8,9 +8,12 @@
 namespace Talvox {
 
 ParallelEncoderTask::ParallelEncoderTask(ParallelEncoder* owner,
-                                         boost::shared_ptr<Sound::Encoder> target,
-                                         boost::shared_ptr<const Sound::SoundDataBuffer> sound)
-    : parent(owner), encoder(std::move(target)), buffer(std::move(sound)) {}
+                                         boost::shared_ptr<Sound::Encoder> target)
+    : parent(owner), encoder(std::move(target)) {}
+
+void ParallelEncoderTask::setBuffer(boost::shared_ptr<const Sound::SoundDataBuffer> sound) {
+    buffer = std::move(sound);
+}
 
 void ParallelEncoderTask::runTask() {
     if (isPresent(encoder) && isPresent(buffer)) {

@@ -4,7 +4,6 @@
  */
 #pragma once
 
-#include <boost/scoped_ptr.hpp>
 #include <boost/shared_ptr.hpp>
 
 #include "core/Export.h"
@@ -39,7 +38,7 @@ class KORVEL_CORE_API TaskManager : public Util::Singleton<TaskManager> {
     TaskManager();
 
     class Impl;
-    boost::scoped_ptr<Impl> impl;
+    const boost::shared_ptr<Impl> impl;
 };
 
 }  // namespace Tasking
