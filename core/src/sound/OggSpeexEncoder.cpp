@@ -1,11 +1,11 @@
 #include "core/sound/OggSpeexEncoder.h"
 
 #include <algorithm>
-#include <boost/make_shared.hpp>
 #include <cstdint>
 #include <string>
 #include <vector>
 
+#include "core/sound/BufferPool.h"
 #include "pal/kd_log.h"
 #include "sound/OggWriter.h"
 #include "sound/SpeexCoder.h"
@@ -88,8 +88,10 @@ class OggSpeexEncoder::Impl {
         }
         const std::size_t count =
             maxBytes < 0 ? writer.getSize() : static_cast<std::size_t>(maxBytes);
-        return boost::make_shared<SoundDataBuffer>(
-            SoundDataInfo(SoundDataInfo::SPEEX, 1, info.getSampleRate(), 2), writer.take(count));
+        boost::shared_ptr<SoundDataBuffer> output =
+            outputs.take(SoundDataInfo(SoundDataInfo::SPEEX, 1, info.getSampleRate(), 2));
+        writer.take(count, output->getData());
+        return output;
     }
 
     void finish() {
@@ -154,7 +156,7 @@ class OggSpeexEncoder::Impl {
         if (!headersWritten) {
             writeHeaders(false);
         }
-        const std::vector<unsigned char> packet = coder->encodeFrame(frame.data());
+        const std::vector<unsigned char>& packet = coder->encodeFrame(frame.data());
         frame.clear();
         ++frameCount;
         if (finished) {
@@ -167,6 +169,7 @@ class OggSpeexEncoder::Impl {
 
     const SoundDataInfo info;
     OggWriter writer;
+    BufferPool outputs;
     boost::scoped_ptr<SpeexCoder> coder;
     std::vector<int16_t> frame;
     int64_t sampleCount = 0;

@@ -52,16 +52,15 @@ void OggWriter::flush() {
     }
 }
 
-std::vector<unsigned char> OggWriter::take(std::size_t maxBytes) {
+void OggWriter::take(std::size_t maxBytes, std::vector<unsigned char>& bytes) {
     const std::size_t count = std::min(maxBytes, getSize());
     const auto first = pages.begin() + static_cast<std::ptrdiff_t>(taken);
-    std::vector<unsigned char> bytes(first, first + static_cast<std::ptrdiff_t>(count));
+    bytes.assign(first, first + static_cast<std::ptrdiff_t>(count));
     taken += count;
     if (taken == pages.size()) {
         pages.clear();
         taken = 0;
     }
-    return bytes;
 }
 
 void OggWriter::append(const ogg_page& page) {

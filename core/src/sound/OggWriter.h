@@ -28,8 +28,8 @@ class OggWriter {
     /** Bytes of closed pages that were not taken yet. */
     std::size_t getSize() const { return pages.size() - taken; }
 
-    /** Takes up to `maxBytes`, oldest first. */
-    std::vector<unsigned char> take(std::size_t maxBytes);
+    /** Takes up to `maxBytes`, oldest first, in place of what `bytes` holds. */
+    void take(std::size_t maxBytes, std::vector<unsigned char>& bytes);
 
   private:
     void append(const ogg_page& page);

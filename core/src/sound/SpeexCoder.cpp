@@ -62,20 +62,20 @@ std::vector<unsigned char> SpeexCoder::makeHeader() const {
     speex_init_header(&header, sampleRate, 1, mode);
     header.frames_per_packet = 1;
     int size = 0;
-    char* packet = speex_header_to_packet(&header, &size);
-    if (packet == nullptr) {
+    char* text = speex_header_to_packet(&header, &size);
+    if (text == nullptr) {
         return {};
     }
-    std::vector<unsigned char> bytes(packet, packet + size);
-    speex_header_free(packet);
+    std::vector<unsigned char> bytes(text, text + size);
+    speex_header_free(text);
     return bytes;
 }
 
-std::vector<unsigned char> SpeexCoder::encodeFrame(int16_t* samples) {
+const std::vector<unsigned char>& SpeexCoder::encodeFrame(int16_t* samples) {
     speex_bits_reset(&bits);
     speex_encode_int(state, samples, &bits);
     speex_bits_insert_terminator(&bits);
-    std::vector<unsigned char> packet(static_cast<std::size_t>(speex_bits_nbytes(&bits)));
+    packet.resize(static_cast<std::size_t>(speex_bits_nbytes(&bits)));
     const int written = speex_bits_write(&bits, reinterpret_cast<char*>(packet.data()),
                                          static_cast<int>(packet.size()));
     packet.resize(static_cast<std::size_t>(written));

@@ -31,14 +31,18 @@ class SpeexCoder {
     /** The packet that begins a Speex stream. */
     std::vector<unsigned char> makeHeader() const;
 
-    /** Encodes `getFrameSize()` samples into one packet; the samples may be changed. */
-    std::vector<unsigned char> encodeFrame(int16_t* samples);
+    /**
+     * Encodes `getFrameSize()` samples into one packet, which is valid until the next call; the
+     * samples may be changed.
+     */
+    const std::vector<unsigned char>& encodeFrame(int16_t* samples);
 
   private:
     const int sampleRate;
     const SpeexMode* const mode;
     void* const state;
     SpeexBits bits;
+    std::vector<unsigned char> packet;
     int frameSize = 0;
     int lookAhead = 0;
     int decoderLag = 0;
