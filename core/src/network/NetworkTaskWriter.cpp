@@ -1,6 +1,7 @@
 #include "core/network/NetworkTaskWriter.h"
 
 #include <algorithm>
+#include <boost/make_shared.hpp>
 #include <cstring>
 #include <limits>
 #include <utility>
@@ -12,7 +13,7 @@ NetworkTaskWriter::NetworkTaskWriter() = default;
 NetworkTaskWriter::~NetworkTaskWriter() = default;
 
 int NetworkTaskWriter::write(const void* data, std::size_t size) {
-    std::function<void()> notify;
+    boost::shared_ptr<const std::function<void()>> notify;
     {
         const std::lock_guard<std::mutex> lock(mutex);
         if (closed || size > static_cast<std::size_t>(std::numeric_limits<int>::max())) {
@@ -24,13 +25,13 @@ int NetworkTaskWriter::write(const void* data, std::size_t size) {
         }
     }
     if (notify) {
-        notify();
+        (*notify)();
     }
     return static_cast<int>(size);
 }
 
 void NetworkTaskWriter::close() {
-    std::function<void()> notify;
+    boost::shared_ptr<const std::function<void()>> notify;
     {
         const std::lock_guard<std::mutex> lock(mutex);
         if (!closed) {
@@ -39,7 +40,7 @@ void NetworkTaskWriter::close() {
         }
     }
     if (notify) {
-        notify();
+        (*notify)();
     }
 }
 
@@ -64,9 +65,13 @@ std::size_t NetworkTaskWriter::read(std::size_t offset, void* data, std::size_t 
 }
 
 void NetworkTaskWriter::setWakeUp(std::function<void()> wakeUp) {
+    boost::shared_ptr<const std::function<void()>> next;
+    if (wakeUp) {
+        next = boost::make_shared<const std::function<void()>>(std::move(wakeUp));
+    }
     // The old function dies outside the lock: it may hold the last reference to a transfer.
     const std::lock_guard<std::mutex> lock(mutex);
-    onChange.swap(wakeUp);
+    onChange.swap(next);
 }
 
 }  // namespace Network

@@ -201,8 +201,7 @@ void Transfer::abandon() {
 // Writes may come faster than the network thread wakes up: one command serves them all.
 void Transfer::wake() {
     if (!wakeUpPosted.exchange(true)) {
-        const boost::shared_ptr<Transfer> self = shared_from_this();
-        transport->post([self] { self->resume(); });
+        transport->requestResume(shared_from_this());
     }
 }
 

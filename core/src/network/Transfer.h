@@ -65,6 +65,9 @@ class Transfer : public boost::enable_shared_from_this<Transfer> {
      */
     bool takeNewConnection();
 
+    /** Goes on with a body that had nothing more to send. */
+    void resume();
+
     /** Frees the handle, which is in no multi handle any more; tells the listener. */
     void end(const TransferEnd& how);
 
@@ -85,7 +88,6 @@ class Transfer : public boost::enable_shared_from_this<Transfer> {
     void setUpHeaders();
     void addHeaderLine(const std::string& line);
     void wake();
-    void resume();
     void handleHeadEnd();
     bool isAnswered() const;
     std::string describe(CURLcode result) const;

@@ -56,14 +56,30 @@ Transport::~Transport() = default;
 
 bool Transport::post(std::function<void()> command) {
     const std::lock_guard<std::mutex> lock(mutex);
-    if (closed || kdEventsHaveEndedKOR() != 0 || !launchThread()) {
+    if (!takesCommands()) {
         return false;
     }
     commands.push_back(std::move(command));
+    wakeFromOutside();
+    return true;
+}
+
+void Transport::requestResume(const boost::shared_ptr<Transfer>& transfer) {
+    const std::lock_guard<std::mutex> lock(mutex);
+    if (takesCommands()) {
+        resumed.push_back(transfer);
+        wakeFromOutside();
+    }
+}
+
+bool Transport::takesCommands() {
+    return !closed && kdEventsHaveEndedKOR() == 0 && launchThread();
+}
+
+void Transport::wakeFromOutside() {
     if (thread.get_id() != std::this_thread::get_id()) {
         wake();
     }
-    return true;
 }
 
 // A wake-up that fails is tried again with the next command.
@@ -156,25 +172,33 @@ void Transport::run() {
 // The end counts, too: `stop` may have come before the last batch, without a wake-up of its own.
 bool Transport::isWanted() {
     const std::lock_guard<std::mutex> lock(mutex);
-    return !commands.empty() || stopping;
+    return !commands.empty() || !resumed.empty() || stopping;
 }
 
 // One batch at a time: transfers go on between commands that come in quick succession. The end
 // comes when nothing is left to run, so that each command that was accepted is run.
 bool Transport::runCommands() {
-    std::vector<std::function<void()>> current;
+    // Empty, unless a command has thrown.
+    currentCommands.clear();
+    currentResumed.clear();
     {
         const std::lock_guard<std::mutex> lock(mutex);
         awake = false;
-        current.swap(commands);
-        closed = stopping && current.empty();
+        currentCommands.swap(commands);
+        currentResumed.swap(resumed);
+        closed = stopping && currentCommands.empty() && currentResumed.empty();
         if (closed) {
             return false;
         }
     }
-    for (const std::function<void()>& command : current) {
+    for (const std::function<void()>& command : currentCommands) {
         command();
     }
+    currentCommands.clear();
+    for (const boost::shared_ptr<Transfer>& transfer : currentResumed) {
+        transfer->resume();
+    }
+    currentResumed.clear();
     return true;
 }
 

@@ -41,6 +41,9 @@ class Transport : public boost::enable_shared_from_this<Transport> {
     /** Has the network thread look whether the peer keeps this transfer waiting. Any thread. */
     void requestCheck(const boost::shared_ptr<Transfer>& transfer);
 
+    /** Has a paused transfer look for more to send. Any thread. */
+    void requestResume(const boost::shared_ptr<Transfer>& transfer);
+
     /**
      * Ends all transfers and the thread, and waits for that, two seconds at most: a thread that
      * hangs is left behind. The event lock, where the caller holds it, is lent to the network
@@ -78,7 +81,9 @@ class Transport : public boost::enable_shared_from_this<Transport> {
     using Transfers = std::map<CURL*, boost::shared_ptr<Transfer>>;
 
     bool launchThread();
+    bool takesCommands();
     void wake();
+    void wakeFromOutside();
     bool waitForEnd();
     void run();
     bool isWanted();
@@ -93,6 +98,7 @@ class Transport : public boost::enable_shared_from_this<Transport> {
     std::condition_variable changed;
     // Guarded by the mutex.
     std::vector<std::function<void()>> commands;
+    std::vector<boost::shared_ptr<Transfer>> resumed;
     bool awake = false;  // a wake-up is on its way to the thread
     bool closed = false;
     bool finished = false;
@@ -106,6 +112,9 @@ class Transport : public boost::enable_shared_from_this<Transport> {
     std::unique_ptr<CURLM, MultiDeleter> multi;
     std::unique_ptr<CURL, EasyDeleter> spareHandle;
     Transfers transfers;
+    // Kept for their room: sound that comes piece by piece needs none of its own.
+    std::vector<std::function<void()>> currentCommands;
+    std::vector<boost::shared_ptr<Transfer>> currentResumed;
 };
 
 }  // namespace Network

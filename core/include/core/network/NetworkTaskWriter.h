@@ -54,7 +54,8 @@ class KORVEL_CORE_API NetworkTaskWriter {
     mutable std::mutex mutex;
     std::string body;
     bool closed = false;
-    std::function<void()> onChange;
+    // Shared, so that each write can call it without the lock and without a copy.
+    boost::shared_ptr<const std::function<void()>> onChange;
 };
 
 }  // namespace Network
