@@ -65,7 +65,8 @@ void HumanVad::printSegments(const std::vector<Talvox::VadSegment>& segments, bo
     for (const Talvox::VadSegment& segment : segments) {
         out << timeColumn(segment.startMs) << "to" << timeColumn(segment.endMs) << '('
             << segment.endMs - segment.startMs << " ms)"
-            << (lastIsOpen && &segment == &segments.back() ? ", not ended with the sound" : "")
+            << (lastIsOpen && &segment == &segments.back() ? ", still open at the end of the sound"
+                                                           : "")
             << '\n';
     }
 }

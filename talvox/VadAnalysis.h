@@ -16,7 +16,7 @@
 
 namespace Talvox {
 
-/** What a session that hears the same sound does after a buffer. */
+/** What a session with the same sound does after a buffer. */
 enum class ListeningStep {
     /** Nothing; it goes on listening. */
     GO_ON,
@@ -72,8 +72,8 @@ struct VadSegment {
 };
 
 /**
- * Runs a detector over sound and shows what a session does that hears it through a
- * `Sound::FileRecorder`, by the session's own rules. Goes on where a session stops listening.
+ * Runs a detector over sound and shows what a session does when a `Sound::FileRecorder` plays that
+ * sound to it. Both go by the same rules; the analysis goes on where a session stops listening.
  *
  * A buffer arrives the device's delay after its last sample. The detector learns from each buffer
  * up to the first one that arrives more than its leading noise (200 ms) after the start. With

@@ -78,7 +78,7 @@ TEST(HumanVad, PrintsATableAndTheSegments) {
         "\n"
         "segments of speech:\n"
         "   300 ms  to   900 ms  (600 ms)\n"
-        "  1200 ms  to  1500 ms  (300 ms), not ended with the sound\n");
+        "  1200 ms  to  1500 ms  (300 ms), still open at the end of the sound\n");
 }
 
 TEST(HumanVad, SaysThatLevelsAreAboveTheNoiseInGeneralMode) {

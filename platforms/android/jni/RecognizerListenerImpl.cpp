@@ -126,7 +126,7 @@ void RecognizerListenerImpl::onResults(Talvox::Recognizer* source,
     }
 }
 
-void RecognizerListenerImpl::tellReason(const std::string& reason) {
+void RecognizerListenerImpl::reportReason(const std::string& reason) {
     deliver("onErrorReason", FRAME_SIZE, [this, &reason](JNIEnv* env) {
         const jmethodID method =
             env->GetMethodID(javaClass.getClass(), "onErrorReason", "(Ljava/lang/String;)V");
@@ -141,7 +141,7 @@ void RecognizerListenerImpl::tellReason(const std::string& reason) {
 }
 
 void RecognizerListenerImpl::onError(Talvox::Recognizer* source, Talvox::SpeechError error) {
-    tellReason(source->getErrorReason());
+    reportReason(source->getErrorReason());
     deliver("onError", FRAME_SIZE, [this, error](JNIEnv* env) {
         callJava(env, "onError", "(I)V", static_cast<jint>(error.getCode()));
     });

@@ -48,7 +48,7 @@ class RecognizerListenerImpl : public Talvox::RecognizerListener {
     void deliver(const char* name, jint localReferences, Event event);
 
     /** Hands the reason of the error that follows to a Java object that wants to know it. */
-    void tellReason(const std::string& reason);
+    void reportReason(const std::string& reason);
 
     /** Calls a method of exactly the kept class. */
     template <typename... Args>

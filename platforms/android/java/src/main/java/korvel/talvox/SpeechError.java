@@ -2,10 +2,13 @@ package korvel.talvox;
 
 /**
  * Why a recognition ended without results. The device recognizer, Android's own, reports errors of
- * its own choice; the cloud recognizer uses all but {@link #UNKNOWN}, {@link #ENCODING} and {@link #SERVER}.
+ * its own choice; the cloud recognizer uses all but {@link #ENCODING} and {@link #SERVER}.
  */
 public enum SpeechError {
-    /** The device recognizer failed without a cause that has a value here. */
+    /**
+     * The device recognizer failed without a cause that has a value here; or, with either
+     * recognizer, there is no memory for the results.
+     */
     UNKNOWN("ErrorUnknown"),
     /**
      * The microphone could not be opened, may not be used, failed or delivered too little, or the
@@ -17,8 +20,8 @@ public enum SpeechError {
     /**
      * Everything between the engine and results: no network at the start, no address or identifier
      * configured, no connection, no answer within 20 s, and every answer without readable results,
-     * whatever its HTTP status. The device recognizer: network errors, and no
-     * callback of it within its time limits.
+     * whatever its HTTP status. The device recognizer: network errors, and no callback of it within
+     * its time limits.
      */
     NETWORK("ErrorNetwork"),
     /** The service of the device recognizer failed. Failures of the gateway are NETWORK. */
@@ -33,8 +36,8 @@ public enum SpeechError {
      */
     NOT_AVAILABLE("ErrorNotAvailable"),
     /**
-     * Another recognition is running, or this one was started a second time. The device
-     * recognizer: it is in use elsewhere.
+     * Another recognition is running, or this one was started a second time. The device recognizer:
+     * it is in use elsewhere.
      */
     BUSY("ErrorBusy");
 
