@@ -361,6 +361,18 @@ TEST_F(PlatformRecognizerTest, ResultsWithoutAnObjectReportItAndArrive) {
     whenAsked = nullptr;
 }
 
+TEST_F(PlatformRecognizerTest, ASecondSessionIsBusyUntilTheFirstIsCancelled) {
+    recognizer->start();
+    const boost::shared_ptr<Talvox::Recognizer> second = create();
+    second->start();
+    EXPECT_THAT(events, ElementsAre("ErrorBusy"));
+    EXPECT_EQ(second->getErrorReason(), "another session is active");
+    recognizer->cancel();
+    EXPECT_THAT(events, ElementsAre("ErrorBusy", "ErrorCanceled"));
+    EXPECT_EQ(recognizer->getErrorReason(), "the application cancelled");
+    expectNextWorks();
+}
+
 TEST_F(PlatformRecognizerTest, AStopThatFailsIsOneErrorAndCancelsTheDevice) {
     whenAsked = [](const std::string& what) { return what != "stop"; };
     recognizer->start();

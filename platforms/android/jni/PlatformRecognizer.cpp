@@ -147,12 +147,12 @@ void PlatformRecognizer::start() {
         return;
     }
     if (!Talvox::Talvox::getInstance().registerRecognizer(this)) {
-        endWithError(SpeechError::ErrorBusy);
+        endWithError(SpeechError::ErrorBusy, "another session is active");
         return;
     }
     JNIEnv* const env = kdGetJNIEnvKOR();
     if (env == nullptr) {
-        endWithError(SpeechError::ErrorNotAvailable);
+        endWithError(SpeechError::ErrorNotAvailable, "there is no Java VM");
         return;
     }
     hear();
@@ -202,7 +202,7 @@ void PlatformRecognizer::stop() {
 void PlatformRecognizer::cancel() {
     const Util::EventLock lock;
     const boost::shared_ptr<Recognizer> self = shared_from_this();
-    giveUp(SpeechError::ErrorCanceled);
+    giveUp(SpeechError::ErrorCanceled, "the application cancelled");
 }
 
 void PlatformRecognizer::giveUp(int code, const std::string& reason) {

@@ -71,7 +71,7 @@ class PlatformRecognizer : public Talvox::Recognizer {
     void prepareSound(bool isWifi);
     void createJavaObject();
     void cancelSilently();
-    void giveUp(int code, const std::string& reason = std::string());
+    void giveUp(int code, const std::string& reason);
     void endWithError(int code, const std::string& reason = std::string());
     void reportError(int code, const std::string& reason);
     template <typename Call>
