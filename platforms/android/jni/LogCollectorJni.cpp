@@ -94,6 +94,20 @@ JNIEXPORT void JNICALL Java_korvel_talvox_util_LogCollector_configure(JNIEnv* /*
     });
 }
 
+JNIEXPORT jboolean JNICALL Java_korvel_talvox_util_LogCollector_openStore(
+    JNIEnv* /*env*/, jclass /*type*/, jstring folder, jlong maxBytes, jlong maxAgeS) {
+    bool isOpen = false;
+    // The files are read without the event lock.
+    Jni::enterUnlocked([&isOpen, folder, maxBytes, maxAgeS](JNIEnv* env) {
+        LogCollector::LogStoreOptions options;
+        options.folder = readText(env, folder, "folder");
+        options.maxBytes = maxBytes;
+        options.maxAgeS = maxAgeS;
+        isOpen = LogCollector::openStore(options);
+    });
+    return static_cast<jboolean>(isOpen ? JNI_TRUE : JNI_FALSE);
+}
+
 JNIEXPORT void JNICALL Java_korvel_talvox_util_LogCollector_logEvent(JNIEnv* /*env*/,
                                                                      jclass /*type*/,
                                                                      jstring session, jstring name,

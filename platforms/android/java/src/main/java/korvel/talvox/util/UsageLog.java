@@ -17,7 +17,8 @@ import korvel.talvox.impl.SafetyNet;
  * }
  * }</pre>
  *
- * <p>Each event becomes one record. Records are kept in memory until the endpoint has taken them.
+ * <p>Each event becomes one record. Records are kept until the endpoint has taken them: in memory, or
+ * in a folder if {@link LogCollector#openStore(java.io.File)} names one.
  * Any thread may call any method; none waits for the network. One session of a name may be open at a
  * time.
  *
@@ -27,7 +28,8 @@ import korvel.talvox.impl.SafetyNet;
  * the year counts from 1900, the month from 0. So one nanosecond is one second of the text:
  * {@code time=114149-05-16 16:00:00} was logged an hour after the start. To read it, add 1900 to the
  * year and 1 to the month and take the seconds since 1970: that is the number of nanoseconds. Times
- * of one device between two starts can be compared with each other, nothing else. Where the date
+ * of one device between two starts can be compared with each other, nothing else; a stored record may
+ * be of an earlier start than those that follow it. Where the date
  * matters, log it as a parameter, or let the endpoint note when a record arrives.
  */
 public final class UsageLog implements AutoCloseable {

@@ -1,23 +1,34 @@
 package korvel.talvox.util;
 
+import static java.nio.charset.StandardCharsets.UTF_8;
 import static org.junit.Assert.assertEquals;
 import static org.junit.Assert.assertFalse;
 import static org.junit.Assert.assertThrows;
 import static org.junit.Assert.assertTrue;
 
 import android.os.Bundle;
+import java.io.File;
+import java.io.IOException;
+import java.nio.file.Files;
 import java.time.LocalDateTime;
 import java.time.ZoneOffset;
+import java.util.Arrays;
+import java.util.HashSet;
+import java.util.Set;
 import java.util.regex.Matcher;
 import java.util.regex.Pattern;
 import korvel.talvox.support.EngineTestCase;
 import korvel.talvox.support.RecordingGateway;
 import org.junit.After;
 import org.junit.Before;
+import org.junit.Rule;
 import org.junit.Test;
+import org.junit.rules.TemporaryFolder;
 import org.robolectric.shadows.ShadowLog;
 
 public class UsageLogTest extends EngineTestCase {
+    @Rule public final TemporaryFolder temporary = new TemporaryFolder();
+
     private RecordingGateway endpoint;
 
     @Before
@@ -79,6 +90,59 @@ public class UsageLogTest extends EngineTestCase {
             log.event("page");
         }
         assertTrue(endpoint.isEmpty());
+    }
+
+    /** All bytes of the files in a folder; those of a record are among them as they are. */
+    private static String bytesOf(File folder) throws IOException {
+        final StringBuilder bytes = new StringBuilder();
+        for (File file : folder.listFiles()) {
+            bytes.append(new String(Files.readAllBytes(file.toPath()), UTF_8));
+        }
+        return bytes.toString();
+    }
+
+    @Test
+    public void keepsRecordsInAFolderUntilTheyAreDelivered() throws Exception {
+        final File folder = new File(temporary.getRoot(), "usage");
+        LogCollector.configure(UUID, "http://"); // where no record can go
+        final File file = temporary.newFile();
+        assertFalse(LogCollector.openStore(file));
+        assertLogged(
+                "LogStore: " + file + " is not used, records are in memory only: Not a directory");
+        assertTrue(LogCollector.openStore(folder));
+        assertFalse(LogCollector.openStore(folder));
+        assertLogged("LogSender: there is a store already, " + folder + " is not used");
+        try (UsageLog log = UsageLog.open("stored")) {
+            log.event("page");
+        }
+        assertTrue(bytesOf(folder).contains(";sessionId=stored;type=event;name=page"));
+        assertTrue(bytesOf(folder).contains(";sessionId=stored;type=event;name=logSessionStopped"));
+        LogCollector.configure(UUID, endpoint.getUrl() + "/log");
+        final Set<String> records = new HashSet<>(Arrays.asList(takeRecord(), takeRecord()));
+        assertEquals(
+                new HashSet<>(
+                        Arrays.asList(
+                                "sessionId=stored;type=event;name=page",
+                                "sessionId=stored;type=event;name=logSessionStopped")),
+                records);
+    }
+
+    @Test
+    public void refusesBoundsOutOfRange() {
+        final File folder = new File(temporary.getRoot(), "usage");
+        final long bytes = LogCollector.STORE_BYTES;
+        final long age = LogCollector.STORE_AGE_S;
+        for (long bad : new long[] {-1, 4095, (1L << 30) + 1}) {
+            assertThrows(
+                    IllegalArgumentException.class,
+                    () -> LogCollector.openStore(folder, bad, age));
+        }
+        for (long bad : new long[] {-1, 59, 100L * 365 * 24 * 60 * 60 + 1}) {
+            assertThrows(
+                    IllegalArgumentException.class,
+                    () -> LogCollector.openStore(folder, bytes, bad));
+        }
+        assertFalse(folder.exists());
     }
 
     private static long timesSaid(String text) {
@@ -154,6 +218,7 @@ public class UsageLogTest extends EngineTestCase {
         assertThrows(NullPointerException.class, () -> LogCollector.startLogSession(null));
         assertThrows(NullPointerException.class, () -> LogCollector.stopLogSession(null));
         assertThrows(NullPointerException.class, () -> LogCollector.setUuid(null));
+        assertThrows(NullPointerException.class, () -> LogCollector.openStore(null));
         assertThrows(NullPointerException.class, () -> LogCollector.configure(null, ""));
         assertThrows(NullPointerException.class, () -> LogCollector.configure("", null));
         assertThrows(
