@@ -1,5 +1,6 @@
 // Usage records: how many a second go through the collector over one loopback connection, next to a
-// bare libcurl handle that asks for the same addresses; and what a record costs while it waits.
+// bare libcurl handle that asks for the same addresses; what a record costs while it waits; and
+// what a store adds: to the call that logs a record, and to the rate of delivery.
 #include <curl/curl.h>
 #include <malloc.h>
 #include <sched.h>
@@ -7,6 +8,7 @@
 #include <algorithm>
 #include <cstdio>
 #include <cstdlib>
+#include <filesystem>
 #include <future>
 #include <string>
 #include <vector>
@@ -48,19 +50,27 @@ double perSecond(std::size_t count, int64_t nanoseconds) {
     return static_cast<double>(count) * 1e9 / static_cast<double>(nanoseconds);
 }
 
-double measureCollector() {
+struct Round {
+    double usPerCall = 0;
+    double perSecond = 0;
+};
+
+Round measureCollector() {
     std::promise<void> delivered;
+    Round round;
     // Until all are logged, a record may find itself the last one.
     {
         const Util::EventLock lock;
         LogCollector::setDeliveredCallback([&delivered] { delivered.set_value(); });
+        const int64_t start = kdGetTimeUST();
         logRecords(RECORDS);
+        round.usPerCall = static_cast<double>(kdGetTimeUST() - start) / 1000 / RECORDS;
     }
     const int64_t start = kdGetTimeUST();
     delivered.get_future().wait();
-    const int64_t time = kdGetTimeUST() - start;
+    round.perSecond = perSecond(RECORDS, kdGetTimeUST() - start);
     LogCollector::setDeliveredCallback({});
-    return perSecond(RECORDS, time);
+    return round;
 }
 
 std::size_t dropBody(char* /*data*/, std::size_t size, std::size_t count, void* /*user*/) {
@@ -100,7 +110,7 @@ void measureRate() {
     int connections = 0;
     int bareConnections = 0;
     for (int round = 0; round < ROUNDS; ++round) {
-        collected.push_back(measureCollector());
+        collected.push_back(measureCollector().perSecond);
         const Bench::HttpSink::Traffic traffic = sink.takeTraffic();
         bare.push_back(measureBareCurl(handle, host, traffic.targets));
         ratios.push_back(collected.back() / bare.back());
@@ -115,6 +125,50 @@ void measureRate() {
     std::printf("collector / baseline               %8.2f (wanted: at least 0.80)\n",
                 median(ratios));
     Util::SingletonStorage::destroyAll();
+}
+
+struct Figures {
+    std::vector<double> usPerCall;
+    std::vector<double> perSecond;
+};
+
+/** A collector of its own, with a store in `folder` unless that is empty. */
+Round measureAlone(const Bench::HttpSink& sink, const std::string& folder) {
+    LogCollector::configure(UUID, "http://127.0.0.1:" + std::to_string(sink.getPort()) + "/log");
+    LogCollector::setLoggingEnabled(true);
+    LogCollector::startSession("bench");
+    LogCollector::LogStoreOptions options;
+    options.folder = folder;
+    if (!folder.empty() && !LogCollector::openStore(options)) {
+        std::fprintf(stderr, "log_rate: no store in %s\n", folder.c_str());
+        std::exit(1);
+    }
+    const Round round = measureCollector();
+    Util::SingletonStorage::destroyAll();
+    return round;
+}
+
+void measureStore() {
+    std::string folder = (std::filesystem::temp_directory_path() / "log_rate-XXXXXX").string();
+    if (mkdtemp(folder.data()) == nullptr) {
+        std::perror("log_rate: no folder for the store");
+        std::exit(1);
+    }
+    const Bench::HttpSink sink;
+    Figures memory;
+    Figures stored;
+    for (int round = 0; round < ROUNDS; ++round) {
+        for (Figures* figures : {&memory, &stored}) {
+            const Round one = measureAlone(sink, figures == &stored ? folder : std::string());
+            figures->usPerCall.push_back(one.usPerCall);
+            figures->perSecond.push_back(one.perSecond);
+        }
+    }
+    std::filesystem::remove_all(folder);
+    std::printf("baseline: memory only              %8.2f us a call, %8.0f records/s\n",
+                median(memory.usPerCall), median(memory.perSecond));
+    std::printf("store                              %8.2f us a call, %8.0f records/s\n",
+                median(stored.usPerCall), median(stored.perSecond));
 }
 
 void measureMemory() {
@@ -138,6 +192,7 @@ int main() {
     LogCollector::setLoggingEnabled(true);
     LogCollector::startSession("bench");
     measureRate();
+    measureStore();
     measureMemory();
     return 0;
 }
