@@ -34,6 +34,7 @@ set(korvel_documents ${CMAKE_INSTALL_DATADIR}/doc/korveltalvox)
 install(FILES LICENSE README.md ARCHITECTURE.md CHANGELOG.md CONTRIBUTING.md
         DESTINATION ${korvel_documents})
 install(DIRECTORY docs/ DESTINATION ${korvel_documents}/docs FILES_MATCHING PATTERN "*.md")
+install(PROGRAMS samples/gateway/gateway.py DESTINATION ${korvel_documents}/samples/gateway)
 install(FILES platforms/android/BUILDING.md DESTINATION ${korvel_documents}/platforms/android)
 
 if(TALVOX_BUILD_TOOLS)
