@@ -143,10 +143,13 @@ void applyDocument(Talvox::Settings& settings, const std::string& path) {
             "cannot read " + path + ": " +
             (tooLarge ? "it is too large for a settings document" : std::strerror(errno)));
     }
-    const std::string fault = settings.updateFromWholeXml(xml, Talvox::Settings::XML_PATH_DFLT,
-                                                          Talvox::Settings::bundleSpecs);
+    const std::string fault =
+        xml.find('<') == std::string::npos
+            ? "it is not XML"
+            : settings.updateFromWholeXml(xml, Talvox::Settings::XML_PATH_DFLT,
+                                          Talvox::Settings::bundleSpecs);
     if (!fault.empty()) {
-        throw UsageError(path + ": " + fault);
+        throw UsageError("cannot use " + path + ": " + fault);
     }
 }
 

@@ -192,11 +192,11 @@ TEST(BuildSettings, RefusesADocumentThatIsBrokenOrHoldsNoSettings) {
         std::string text;
         std::string reason;
     } cases[] = {
-        {"", "Error document empty. (line 1, column 1)"},
+        {"", "it is not XML"},
+        {"not XML at all", "it is not XML"},
         {"<startup>", "Error reading Element value. (line 1, column 10)"},
-        {"not XML at all", "Error document empty. (line 1, column 15)"},
         {"<startup/>", "there is no element /startup/features/voice"},
-        {"\xC3", "the text is not UTF-8 (line 1, column 1)"},
+        {"<\xC3", "the text is not UTF-8 (line 1, column 2)"},
         {document("<url>\xFF</url>"), "the text is not UTF-8 (line 1, column 32)"},
         {document("<url>http://h/?a&b</url>"),
          "an unknown entity loses its \"&\" (line 1, column 43)"},
@@ -205,7 +205,7 @@ TEST(BuildSettings, RefusesADocumentThatIsBrokenOrHoldsNoSettings) {
     for (const auto& each : cases) {
         const LogCapture log;
         const std::string file = directory.write("settings.xml", each.text);
-        EXPECT_EQ(documentRefusal(file), file + ": " + each.reason);
+        EXPECT_EQ(documentRefusal(file), "cannot use " + file + ": " + each.reason);
         EXPECT_TRUE(log.messages().empty()) << each.text;
     }
 }

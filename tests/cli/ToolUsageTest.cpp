@@ -161,9 +161,11 @@ TEST(Tool, RefusesSettingsDocumentsThatItCannotUseAsAWhole) {
                                                     {"recognize", "--file", sound}}) {
         std::vector<std::string> arguments = command;
         arguments.insert(arguments.end(), {"--settings", cut});
-        expectRefused(arguments, cut + ": Error reading Element value. (line 1, column 54)");
+        expectRefused(arguments,
+                      "cannot use " + cut + ": Error reading Element value. (line 1, column 54)");
         arguments.back() = other;
-        expectRefused(arguments, other + ": there is no element /startup/features/voice");
+        expectRefused(arguments,
+                      "cannot use " + other + ": there is no element /startup/features/voice");
     }
 }
 
