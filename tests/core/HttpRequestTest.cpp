@@ -78,6 +78,20 @@ TEST(HttpRequest, SaysWhyNothingCanBeSentToAUrl) {
     }
 }
 
+TEST(HttpRequest, LooksAtEachAddressWhateverTheLastOneWas) {
+    const auto fault = [](const std::string& url) { return HttpRequest::findUrlFault(url); };
+    for (const char* const url : {"http://[::1", "http://host:99999/", "http://host:port"}) {
+        EXPECT_EQ("", fault("http://host/?a=b"));
+        EXPECT_EQ("", fault("http://host?a=c"));
+        EXPECT_THAT(fault(url), StartsWith("is not well-formed (")) << url;
+        EXPECT_THAT(fault(std::string(url) + "?a=b"), StartsWith("is not well-formed (")) << url;
+    }
+    EXPECT_EQ("", fault("http://host/?a=" + std::string(100000, 'b')));
+    EXPECT_THAT(fault("http://host:port?a=" + std::string(100000, 'b')),
+                StartsWith("is not well-formed ("));
+    EXPECT_EQ("has a blank or control character", fault("http://host/?a=b c"));
+}
+
 TEST(MultipartBuilder, BuildsABodyByteForByte) {
     const auto builder = HttpRequest::MultipartBuilder::create("1BEF0A57BE110FD467A");
     EXPECT_EQ("1BEF0A57BE110FD467A", builder->getBoundary());

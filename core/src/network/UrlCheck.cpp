@@ -2,7 +2,9 @@
 #include <curl/curl.h>
 
 #include <algorithm>
+#include <cstddef>
 #include <memory>
+#include <mutex>
 #include <string>
 
 #include "core/network/HttpRequest.h"
@@ -11,6 +13,9 @@
 namespace Network {
 
 namespace {
+
+// Far below the length that libcurl refuses.
+constexpr std::size_t LONGEST_WITHOUT_PARSING = std::size_t{64} * 1024;
 
 bool isBlankOrControl(char c) {
     const auto byte = static_cast<unsigned char>(c);
@@ -25,12 +30,53 @@ bool hasUserInformation(const std::string& url) {
     return mark != std::string::npos && (end == std::string::npos || mark < end);
 }
 
-std::string findSyntaxFault(const std::string& url) {
+/** The last address that was well-formed, up to its query. */
+class LastWellFormed {
+  public:
+    bool matches(const std::string& address) {
+        const std::lock_guard<std::mutex> lock(mutex);
+        return address == last;
+    }
+
+    void remember(const std::string& address) {
+        const std::lock_guard<std::mutex> lock(mutex);
+        last = address;
+    }
+
+    /** Never destroyed: threads may outlive the static objects of the process. */
+    static LastWellFormed& instance() {
+        static auto* const known = new LastWellFormed;
+        return *known;
+    }
+
+  private:
+    std::mutex mutex;
+    std::string last;
+};
+
+std::string parse(const std::string& url) {
     const std::unique_ptr<CURLU, void (*)(CURLU*)> parser(curl_url(), &curl_url_cleanup);
     const CURLUcode code =
         parser ? curl_url_set(parser.get(), CURLUPART_URL, url.c_str(), 0) : CURLUE_OUT_OF_MEMORY;
     return code == CURLUE_OK ? ""
                              : std::string("is not well-formed (") + curl_url_strerror(code) + ')';
+}
+
+// Parsing costs as much as the rest of a small request's preparation, and most requests go where
+// the last one went. A query without blanks and control characters has no syntax.
+std::string findSyntaxFault(const std::string& url) {
+    if (url.size() > LONGEST_WITHOUT_PARSING) {
+        return parse(url);
+    }
+    const std::string address = url.substr(0, url.find('?'));
+    if (LastWellFormed::instance().matches(address)) {
+        return "";
+    }
+    std::string fault = parse(url);
+    if (fault.empty()) {
+        LastWellFormed::instance().remember(address);
+    }
+    return fault;
 }
 
 }  // namespace
