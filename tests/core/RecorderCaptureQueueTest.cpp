@@ -92,17 +92,21 @@ TEST_F(RecorderCaptureQueue, WakesOncePerTake) {
 }
 
 TEST_F(RecorderCaptureQueue, FullQueueFailsBehindTheSoundThatWaits) {
-    const Bytes sound = makeBytes(320);
-    for (std::size_t i = 0; i < CaptureQueue::BUFFERS_MAX; ++i) {
-        ASSERT_TRUE(queue.push(sound.data(), sound.size()));
-    }
-    EXPECT_FALSE(queue.push(sound.data(), sound.size()));
-    EXPECT_FALSE(queue.push(sound.data(), 2));
+    const Bytes sound = makeBytes(CaptureQueue::BUFFERS_MAX * 320);
+    const Bytes more(320, 255);
+    ASSERT_TRUE(queue.push(sound.data(), sound.size()));
+    EXPECT_FALSE(queue.push(more.data(), more.size()));
+    EXPECT_FALSE(queue.push(more.data(), 2));
     const CaptureQueue::Batch batch = queue.take();
-    EXPECT_EQ(batch.buffers.size(), CaptureQueue::BUFFERS_MAX);
+    ASSERT_EQ(batch.buffers.size(), CaptureQueue::BUFFERS_MAX);
+    Bytes received;
+    for (const auto& buffer : batch.buffers) {
+        received.insert(received.end(), buffer->getData().begin(), buffer->getData().end());
+    }
+    EXPECT_EQ(received, sound);
     EXPECT_TRUE(batch.failed);
     EXPECT_EQ(batch.reason, "recorded sound was not taken in time");
-    EXPECT_FALSE(queue.push(sound.data(), sound.size()));
+    EXPECT_FALSE(queue.push(more.data(), more.size()));
     EXPECT_FALSE(queue.take().failed);
 }
 
