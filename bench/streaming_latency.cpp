@@ -30,7 +30,8 @@ void pause() {
     nanosleep(&time, nullptr);
 }
 
-void print(const char* what, std::vector<int64_t> times) {
+/** @return the median, in microseconds */
+double print(const char* what, std::vector<int64_t> times) {
     if (times.empty()) {
         std::printf("%-34s no measurement\n", what);
         std::exit(1);
@@ -43,6 +44,7 @@ void print(const char* what, std::vector<int64_t> times) {
     };
     std::printf("%-34s %5zu buffers  p50 %7.1f us  p99 %7.1f us\n", what, times.size(), at(0.5),
                 at(0.99));
+    return at(0.5);
 }
 
 boost::shared_ptr<Talvox::Settings> sessionSettings(int port) {
@@ -128,7 +130,8 @@ int main() {
         const std::vector<int64_t> session = measureSession(speech);
         times.insert(times.end(), session.begin(), session.end());
     }
-    print("baseline: bare send over TCP", measureBareSend());
-    print("session: recorder to server", times);
+    const double bare = print("baseline: bare send over TCP", measureBareSend());
+    const double session = print("session: recorder to server", times);
+    std::printf("%-34s %13.2f (wanted: at most 3)\n", "session / baseline, p50", session / bare);
     return 0;
 }

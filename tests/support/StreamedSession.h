@@ -17,8 +17,11 @@ struct BufferAllocations {
     double underEventLock = 0;
 };
 
-/** The most that is wanted. */
-constexpr BufferAllocations BUFFER_ALLOCATIONS_MAX = {5, 0, 1};
+/**
+ * The most that is wanted. What is left in steady state is room for what has been sent, which is
+ * kept for a second attempt.
+ */
+constexpr BufferAllocations BUFFER_ALLOCATIONS_MAX = {1, 0, 1};
 
 /**
  * Runs a chunked session whose recorder has a device thread of its own and whose server is on
