@@ -1,0 +1,41 @@
+/**
+ * @file
+ * Points that are known to have faults: a debt, kept in one place.
+ */
+#pragma once
+
+#include <vector>
+
+#include "Plan.h"
+
+namespace Torture {
+
+struct Open {
+    Kind kind;
+    const char* session; /**< null: all of them */
+    const char* reason;
+};
+
+/** What the sample of the tests leaves out. */
+inline const std::vector<Open>& getOpen() {
+    static const std::vector<Open> open = {
+        {Kind::MEMORY, nullptr,
+         "exceptions leave the API and the engine's threads, see the table below"},
+        {Kind::THREADS, "usage-log", "records wait for ever for a thread that could not start"},
+        {Kind::THREADS, "file", "an event that cannot be posted is lost, and its memory with it"},
+        {Kind::PULSE, nullptr, "a connection that fails half way keeps a descriptor"},
+    };
+    return open;
+}
+
+inline bool isOpen(Kind kind, const Plan& plan) {
+    for (const Open& open : getOpen()) {
+        if (open.kind == kind &&
+            (open.session == nullptr || plan.name == std::string(open.session))) {
+            return true;
+        }
+    }
+    return false;
+}
+
+}  // namespace Torture
