@@ -102,7 +102,7 @@ class ProtocolDocumentTest : public CloudTest::SessionTest {
 
     /** What the page's examples are made with. */
     static boost::shared_ptr<Settings> makeRecognizerSettings() {
-        const auto settings = boost::make_shared<Settings>();
+        auto settings = boost::make_shared<Settings>();
         settings->putString(Settings::RS_LANGUAGE, "en-US");
         settings->putString(Settings::RS_MODEL, Settings::MODEL_MAPS);
         settings->putString(Settings::RS_SESSION_ID, "ride-7");
