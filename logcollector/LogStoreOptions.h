@@ -31,7 +31,9 @@ struct LogStoreOptions {
 
     /**
      * How long a record is kept, in seconds of the calendar clock; `MAX_AGE_S_LEAST` to `_MOST`.
-     * A record goes when it is between 1 and 17/16 times as old.
+     * A record goes when it is between 1 and 17/16 times as old. A clock that is set back, and put
+     * right again, ages nothing as long as the store or the process has an earlier record; the
+     * first records of a wrong clock are as old as that clock says.
      */
     int64_t maxAgeS = MAX_AGE_S_DFLT;
 };
