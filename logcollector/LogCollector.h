@@ -85,7 +85,8 @@ class TALVOX_API LogCollector : public Util::Singleton<LogCollector> {
      *
      * When a bound of `options` is reached, the oldest records go, up to 1/16 of the bound at once.
      * A record of the session "logStore", type "error", name "logRecordsDropped", has their number
-     * in its parameter "count"; while it waits, it counts on.
+     * in its parameter "count"; while it waits, it counts on. If the process ends as that record
+     * arrives, the next one counts the same records again.
      *
      * A record that cannot be stored (full disk, too long for the bound or for any request) stays
      * in memory, with a line in the log. Damaged parts of a store are left out, with a line in the

@@ -23,17 +23,17 @@ void LogKeeper::use(std::unique_ptr<LogStore> openStore, LogStore::Rest rest) {
     store = std::move(openStore);
     noticeTicket = rest.noticeTicket;
     noticeLost = rest.noticeLost;
-    std::list<LogRecord> unstored;
-    unstored.swap(queue);
-    queue.swap(rest.records);
+    queue.splice(queue.begin(), rest.records);
     expire();
     makeRoom(0);
     for (LogRecord& record : sent) {
         keep(record);
     }
-    while (!unstored.empty()) {
-        keep(unstored.front());
-        queue.splice(queue.end(), unstored, unstored.begin());
+    // What is dropped meanwhile has a ticket; the record in hand has none yet.
+    for (LogRecord& record : queue) {
+        if (record.ticket == 0) {
+            keep(record);
+        }
     }
 }
 

@@ -201,6 +201,26 @@ TEST(StoreKillTest, CountsWhatItDropsWhateverTheMoment) {
     killAtTheBound(2, 30);
 }
 
+TEST(StoreKillTest, KeepsASecondProcessOutUntilTheFirstHasEnded) {
+    const ScriptedHttpServer server;
+    const StoreFolder folder;
+    const std::string bound = std::to_string(ROOMY);
+    const auto command = [&](const char* burst) {
+        return std::vector<std::string>{LOG_STORE_APP, server.getUrl(), folder.path(), bound, "1",
+                                        burst};
+    };
+    ChildProcess first(command("1000"));
+    ASSERT_NE("", first.read());
+    const ChildProcess::Result second = ChildProcess::run(command("0"));
+    EXPECT_EQ(1, second.exitStatus);
+    EXPECT_EQ("LogStore: " + folder.path() +
+                  " is not used, records are in memory only: another process uses it\n",
+              second.output);
+    first.sendSignal(SIGKILL);
+    EXPECT_EQ(-1, first.wait());
+    EXPECT_EQ(0, ChildProcess::run(command("0")).exitStatus);
+}
+
 /** The same at 1,000 moments, in four parts. */
 class LongStoreKillTest : public ::testing::TestWithParam<unsigned> {};
 
