@@ -181,6 +181,27 @@ TEST_F(RecorderCaptureQueue, FirstFailureCountsAndEndsTheSound) {
     EXPECT_EQ(batch.reason, "one");
 }
 
+TEST_F(RecorderCaptureQueue, FailureStaysBehindSoundThatComesWhileSomeIsTaken) {
+    constexpr std::size_t COUNT = 40;
+    const Bytes sound = makeBytes(COUNT * 320);
+    for (int round = 0; round < 300; ++round) {
+        CaptureQueue own(FORMAT, [] {});
+        std::thread device([&] {
+            own.push(sound.data(), sound.size());
+            own.fail("gone");
+        });
+        std::size_t count = 0;
+        bool failed = false;
+        while (!failed) {
+            const CaptureQueue::Batch& batch = own.take();
+            count += batch.buffers.size();
+            failed = batch.failed;
+        }
+        device.join();
+        ASSERT_EQ(count, COUNT) << round;
+    }
+}
+
 TEST_F(RecorderCaptureQueue, EveryPieceCountsAsAnArrival) {
     const unsigned before = queue.getArrivalCount();
     queue.push(nullptr, 2);
