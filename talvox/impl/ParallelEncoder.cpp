@@ -83,7 +83,7 @@ void ParallelEncoder::taskDone() {
         }
     }
     currentTask->setBuffer(nullptr);
-    currentTask.reset();
+    spareTask = std::move(currentTask);
     taskQueueStep();
 }
 
@@ -99,23 +99,11 @@ void ParallelEncoder::taskQueueStep() {
 }
 
 void ParallelEncoder::startNextTask() {
-    currentTask = takeTask();
+    currentTask =
+        spareTask ? std::move(spareTask) : boost::make_shared<ParallelEncoderTask>(this, encoder);
     currentTask->setBuffer(queue.front());
     queue.pop_front();
     Tasking::TaskManager::getInstance().addTask(currentTask, 0);
-}
-
-boost::shared_ptr<ParallelEncoderTask> ParallelEncoder::takeTask() {
-    for (boost::shared_ptr<ParallelEncoderTask>& task : keptTasks) {
-        if (!task) {
-            task = boost::make_shared<ParallelEncoderTask>(this, encoder);
-            return task;
-        }
-        if (task.use_count() == 1) {
-            return task;
-        }
-    }
-    return boost::make_shared<ParallelEncoderTask>(this, encoder);
 }
 
 void ParallelEncoder::finishStream() {

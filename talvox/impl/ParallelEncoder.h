@@ -4,7 +4,6 @@
  */
 #pragma once
 
-#include <array>
 #include <boost/shared_ptr.hpp>
 #include <deque>
 #include <functional>
@@ -59,7 +58,6 @@ class ParallelEncoder {
   private:
     void taskQueueStep();
     void startNextTask();
-    boost::shared_ptr<ParallelEncoderTask> takeTask();
     void finishStream();
     void callBack(const boost::shared_ptr<Sound::SoundDataBuffer>& output);
 
@@ -70,8 +68,8 @@ class ParallelEncoder {
     std::deque<boost::shared_ptr<const Sound::SoundDataBuffer>> queue;
     boost::shared_ptr<ParallelEncoderTask> currentTask;
     bool closed = false;
-    /** Tasks to be used again: one that completes still has its owner when the next one starts. */
-    std::array<boost::shared_ptr<ParallelEncoderTask>, 2> keptTasks;
+    /** The last task that has completed, to be used again. */
+    boost::shared_ptr<ParallelEncoderTask> spareTask;
 };
 
 }  // namespace Talvox
