@@ -1,6 +1,6 @@
 # Installs the build into a staging directory, checks the links of the installed documents, builds the
-# consumer project against it and runs its programs. The example is taken out of the README, so that
-# what stands there compiles.
+# consumer project against it and runs its programs. The examples are taken out of the documents, so
+# that what stands there compiles.
 file(REMOVE_RECURSE ${WORK_DIR})
 file(MAKE_DIRECTORY ${WORK_DIR})
 
@@ -12,12 +12,15 @@ function(run)
     endif()
 endfunction()
 
-file(READ ${SOURCE_DIR}/README.md readme)
-string(REGEX MATCH "```cpp\n([^`]*)```" block "${readme}")
-if(NOT block)
-    message(FATAL_ERROR "README.md has no C++ example")
-endif()
-file(WRITE ${WORK_DIR}/example.cpp "${CMAKE_MATCH_1}")
+foreach(document README docs/FAQ)
+    file(READ ${SOURCE_DIR}/${document}.md text)
+    string(REGEX MATCH "```cpp\n([^`]*)```" block "${text}")
+    if(NOT block)
+        message(FATAL_ERROR "${document}.md has no C++ example")
+    endif()
+    get_filename_component(name ${document} NAME)
+    file(WRITE ${WORK_DIR}/${name}.cpp "${CMAKE_MATCH_1}")
+endforeach()
 
 run(${CMAKE_COMMAND} --install ${BUILD_DIR} --prefix ${WORK_DIR}/install)
 run(${SOURCE_DIR}/tests/package/check_links ${WORK_DIR}/install)
@@ -27,7 +30,7 @@ run(${CMAKE_COMMAND} -S ${SOURCE_DIR}/tests/package/consumer -B ${WORK_DIR}/buil
     -DCMAKE_CXX_COMPILER=${CXX_COMPILER}
     -DCMAKE_CXX_FLAGS=${CXX_FLAGS}
     -DJNI_INCLUDES=${JNI_INCLUDES}
-    -DREADME_EXAMPLE=${WORK_DIR}/example.cpp
+    -DEXAMPLES=${WORK_DIR}
     -DAPI_TESTS=${SOURCE_DIR}/tests/api)
 run(${CMAKE_COMMAND} --build ${WORK_DIR}/build)
 run(${WORK_DIR}/build/api_tests)
