@@ -21,8 +21,8 @@ using TestSupport::ScriptedHttpServer;
 namespace {
 
 const char* const NOTICE = ";sessionId=logStore;type=error;name=logRecordsDropped;count=";
-constexpr int64_t ROOMY = 128 * 1024;
-constexpr int64_t TIGHT = 4 * 1024;
+constexpr int64_t ROOMY = 128 << 10;
+constexpr int64_t TIGHT = 4 << 10;
 
 std::string bodyOf(int number) {
     std::string body = std::string(";sessionId=") + KILLED_SESSION + ";type=event;name=killed";

@@ -15,9 +15,10 @@ using TestSupport::ScriptedHttpServer;
 namespace {
 
 constexpr int64_t NS_PER_S = 1000000000;
-constexpr int64_t DAY_S = 24 * 60 * 60;
+constexpr int64_t DAY_S = int64_t{24} * 60 * 60;
 constexpr int64_t NOW_S = 20000 * DAY_S;
 constexpr int64_t RETRY_MS = 3000;
+constexpr int64_t BOUND = 8 << 10;
 const char* const NOTICE = ";sessionId=logStore;type=error;name=logRecordsDropped;count=";
 
 class StoredDeliveryTest : public LogFixture {
@@ -235,11 +236,11 @@ TEST_F(StoredDeliveryTest, DoesNotStoreWhatCanNeverBeSentOrDoesNotFit) {
 }
 
 TEST_F(StoredDeliveryTest, DropsTheOldestAndTellsHowManyInOneRecord) {
-    const LogStoreOptions options = folder.options(8 * 1024);
+    const LogStoreOptions options = folder.options(BOUND);
     ASSERT_TRUE(open(options));
     for (int i = 1; i <= 200; ++i) {
         logEvents(i, i, std::string(100, 'x'));
-        ASSERT_LE(folder.size(), 8U * 1024) << i;
+        ASSERT_LE(folder.size(), static_cast<std::size_t>(BOUND)) << i;
     }
     deliver();
     expectAllAreThereOrCounted(200);
@@ -247,7 +248,7 @@ TEST_F(StoredDeliveryTest, DropsTheOldestAndTellsHowManyInOneRecord) {
 }
 
 TEST_F(StoredDeliveryTest, CountsOnFromTheNoticeOfAnEarlierProcess) {
-    const LogStoreOptions options = folder.options(8 * 1024);
+    const LogStoreOptions options = folder.options(BOUND);
     ASSERT_TRUE(open(options));
     for (int round = 0; round < 10; ++round) {
         logEvents(20 * round + 1, 20 * round + 20, std::string(100, 'x'));
@@ -259,7 +260,7 @@ TEST_F(StoredDeliveryTest, CountsOnFromTheNoticeOfAnEarlierProcess) {
 
 TEST_F(StoredDeliveryTest, NeverDropsTheRecordThatIsOnItsWay) {
     server.script({Answer::status(200).held(), Answer::status(200).held()});
-    const LogStoreOptions options = folder.options(8 * 1024);
+    const LogStoreOptions options = folder.options(BOUND);
     ASSERT_TRUE(open(options));
     LogCollector::configure(UUID, server.getUrl() + "/log");
     logEvents(1, 1, std::string(100, 'x'));
@@ -276,7 +277,7 @@ TEST_F(StoredDeliveryTest, NeverDropsTheRecordThatIsOnItsWay) {
 }
 
 TEST_F(StoredDeliveryTest, DoesNotCountTwiceWhatANoticeOnItsWayTells) {
-    const LogStoreOptions options = folder.options(8 * 1024);
+    const LogStoreOptions options = folder.options(BOUND);
     ASSERT_TRUE(open(options));
     logEvents(1, 100, std::string(100, 'x'));
     // The oldest record fails and so waits behind the notice, which is of a newer segment.

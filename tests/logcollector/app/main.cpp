@@ -70,12 +70,13 @@ int main(int argc, char** argv) {
     if (!LogCollector::openStore(store)) {
         return 1;
     }
-    while (burst > 0) {
+    for (;;) {
         for (int i = 0; i < burst; ++i) {
             logOne(number++);
         }
         drain.wait();
+        if (burst == 0) {
+            return 0;
+        }
     }
-    drain.wait();
-    return 0;
 }
