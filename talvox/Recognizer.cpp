@@ -1,14 +1,44 @@
 #include "talvox/Recognizer.h"
 
 #include <boost/make_shared.hpp>
+#include <exception>
+#include <new>
 #include <utility>
 
 #include "core/util/EventLock.h"
 #include "pal/kd_assert.h"
+#include "pal/kd_event.h"
 #include "pal/kd_log.h"
 #include "talvox/Talvox.h"
 
 namespace Talvox {
+
+namespace {
+
+/** Makes one listener's call of a terminal event: the other listeners get theirs in any case. */
+template <typename Call>
+void callListener(Call call) noexcept {
+    try {
+        call();
+    } catch (const std::exception& exception) {
+        kdReportExceptionKOR(exception.what());
+    } catch (...) {
+        kdReportExceptionKOR(nullptr);
+    }
+}
+
+/** Null when there is no memory. */
+boost::shared_ptr<Recognition> makeRecognition(
+    Recognition::Outcome outcome, const boost::shared_ptr<const RecognitionResults>& results,
+    const std::string& requestId) {
+    try {
+        return boost::make_shared<Recognition>(outcome, results, requestId);
+    } catch (const std::bad_alloc&) {
+        return nullptr;
+    }
+}
+
+}  // namespace
 
 RecognizerListener::~RecognizerListener() = default;
 
@@ -34,16 +64,28 @@ std::string Recognizer::getErrorReason() const {
     return errorReason;
 }
 
-void Recognizer::callOnError(SpeechError error, const std::string& reason) {
+void Recognizer::callOnError(SpeechError error, std::string_view reason) {
     kdLogFormatMessage("Recognizer error: %d, %s", error.getCode(), error.getErrorString().c_str());
-    if (!reason.empty()) {
-        kdLogFormatMessage("Recognizer error reason: %s", reason.c_str());
-    }
-    errorReason = reason;
+    keepReason(reason);
     // A listener may drop the last reference, and those after it are given this recognizer too.
     const boost::shared_ptr<Recognizer> self = weak_from_this().lock();
-    listeners.notify(
-        [this, error](RecognizerListener& listener) { listener.onError(this, error); });
+    listeners.notify([this, error](RecognizerListener& listener) {
+        callListener([&] { listener.onError(this, error); });
+    });
+}
+
+void Recognizer::keepReason(std::string_view reason) noexcept {
+    errorReason.clear();
+    if (reason.empty()) {
+        return;
+    }
+    kdLogFormatMessage("Recognizer error reason: %.*s", static_cast<int>(reason.size()),
+                       reason.data());
+    try {
+        errorReason = reason;
+    } catch (const std::bad_alloc&) {
+        kdLogFormatMessage("Recognizer: no memory to keep the reason");
+    }
 }
 
 void Recognizer::callOnResults(const boost::shared_ptr<const RecognitionResults>& results,
@@ -54,7 +96,15 @@ void Recognizer::callOnResults(const boost::shared_ptr<const RecognitionResults>
         Recognition::decideOutcome(*hypotheses, *engine->getTalvoxSettings());
     const boost::shared_ptr<Recognizer> self = weak_from_this().lock();
     listeners.notify([&](RecognizerListener& listener) {
-        listener.onResults(this, boost::make_shared<Recognition>(outcome, hypotheses, requestId));
+        callListener([&] {
+            if (const boost::shared_ptr<Recognition> own =
+                    makeRecognition(outcome, hypotheses, requestId)) {
+                listener.onResults(this, own);
+            } else {
+                keepReason("no memory for the results");
+                listener.onError(this, SpeechError(SpeechError::ErrorUnknown));
+            }
+        });
     });
 }
 

@@ -8,6 +8,7 @@
 #include <boost/shared_ptr.hpp>
 #include <boost/weak_ptr.hpp>
 #include <string>
+#include <string_view>
 
 #include "core/util/ListenerList.h"
 #include "talvox/Export.h"
@@ -67,10 +68,17 @@ class TALVOX_API Recognizer : public boost::enable_shared_from_this<Recognizer> 
      * recognizer; both this and `callOnResults` keep it alive until the last listener has been
      * called.
      * @param reason for `getErrorReason`; empty when the cause is unknown
+     *
+     * Takes no memory but for the reason, and goes without that. An exception of a listener is
+     * reported, and the others are called.
      */
-    void callOnError(SpeechError error, const std::string& reason = std::string());
+    void callOnError(SpeechError error, std::string_view reason = std::string_view());
 
-    /** Judges the results by the engine's thresholds and hands them to all live listeners. */
+    /**
+     * Judges the results by the engine's thresholds and hands them to all live listeners. A
+     * listener for whose object there is no memory gets `ErrorUnknown` instead. Exceptions as
+     * above.
+     */
     void callOnResults(const boost::shared_ptr<const RecognitionResults>& results,
                        const std::string& requestId);
 
@@ -78,6 +86,8 @@ class TALVOX_API Recognizer : public boost::enable_shared_from_this<Recognizer> 
     Util::ListenerList<RecognizerListener> listeners;
 
   private:
+    void keepReason(std::string_view reason) noexcept;
+
     boost::shared_ptr<const Settings> validatedSettings;
     const Talvox* engine;
     std::string errorReason;

@@ -20,6 +20,7 @@ const char* const BLANKS = " \t\n\v\f\r";
 std::vector<std::string> splitPath(const std::string& path) {
     std::vector<std::string> pieces;
     std::istringstream stream(path);
+    stream.exceptions(std::ios::badbit);
     for (std::string piece; std::getline(stream, piece, '/');) {
         if (!piece.empty()) {
             pieces.push_back(piece);

@@ -58,6 +58,8 @@ void ChunkedRecognizeProtocol::encode(
             boost::make_shared<Sound::OggSpeexEncoder>(buffer->getInfo(), getSpeexQuality(),
                                                        PAGE_FILL_BYTES),
             request);
+        // The encoder belongs to the protocol and calls back only while that lives.
+        encoder->setFailureCallback([this] { notifyEncodingFailed(); });
     }
     encoder->write(buffer);
 }

@@ -1,6 +1,7 @@
 #include "talvox/impl/KorvelRecognizer.h"
 
 #include <boost/make_shared.hpp>
+#include <exception>
 #include <utility>
 
 #include "core/network/NetworkManager.h"
@@ -33,11 +34,50 @@ KorvelRecognizer::KorvelRecognizer(const Talvox* facade,
 
 KorvelRecognizer::~KorvelRecognizer() {
     const Util::EventLock lock;
-    getEngine()->unregisterRecognizer(this);
+    leaveEngine();
     watchdog.reset();
-    stopRecorder();
-    dropProtocol();
+    try {
+        stopRecorder();
+        dropProtocol();
+    } catch (const std::exception& exception) {
+        kdLogFormatMessage("KorvelRecognizer: an exception at the end: %s", exception.what());
+    }
     wavDump.reset();
+}
+
+template <typename Call>
+void KorvelRecognizer::enter(Call call) noexcept {
+    const Util::EventLock lock;
+    const boost::shared_ptr<Recognizer> self = weak_from_this().lock();
+    if (!self) {
+        return;  // the last reference is going on another thread, and that is the end
+    }
+    try {
+        call();
+    } catch (const std::exception& exception) {
+        endUnexpectedly(exception.what());
+    } catch (...) {
+        endUnexpectedly("an exception of an unknown type");
+    }
+}
+
+// The last reference may be going on another thread; then there is nothing to end.
+void KorvelRecognizer::onException(const char* what) {
+    const boost::shared_ptr<Recognizer> self = weak_from_this().lock();
+    if (self && !isOver()) {
+        endUnexpectedly(what);
+    }
+}
+
+void KorvelRecognizer::endUnexpectedly(const char* what) noexcept {
+    kdLogFormatMessage("KorvelRecognizer: the session cannot go on: %s", what);
+    try {
+        stopWithError(SpeechError::ErrorUnknown, what);
+    } catch (const std::exception& exception) {
+        kdLogFormatMessage("KorvelRecognizer: an exception at the end: %s", exception.what());
+    } catch (...) {
+        kdLogFormatMessage("KorvelRecognizer: an exception at the end");
+    }
 }
 
 const std::vector<std::string>& KorvelRecognizer::getAvailableLanguages() {
@@ -46,8 +86,10 @@ const std::vector<std::string>& KorvelRecognizer::getAvailableLanguages() {
 }
 
 void KorvelRecognizer::start() {
-    const Util::EventLock lock;
-    const boost::shared_ptr<Recognizer> self = shared_from_this();
+    enter([this] { begin(); });
+}
+
+void KorvelRecognizer::begin() {
     if (isOver()) {
         kdLogFormatMessage("KorvelRecognizer: the session is over, start is ignored");
         return;
@@ -64,6 +106,11 @@ void KorvelRecognizer::start() {
         stopWithError(SpeechError::ErrorNetwork, obstacle);
         return;
     }
+    if (kdStartEventsKOR() != 0) {
+        stopWithError(SpeechError::ErrorUnknown, "the system has no thread for the engine");
+        return;
+    }
+    exceptionWatch.emplace(static_cast<ExceptionWatch::Owner&>(*this));
     chooseSessionMode(*engineSettings);
     if (!startRecorder(engineSettings->getSampleRate())) {
         return;
@@ -78,6 +125,11 @@ void KorvelRecognizer::start() {
     recordedMs = 0;
     startDump(format);
     startWatchdog();
+}
+
+void KorvelRecognizer::leaveEngine() {
+    exceptionWatch.reset();
+    getEngine()->unregisterRecognizer(this);
 }
 
 bool KorvelRecognizer::statusIsReasonable(const Settings& engineSettings, std::string& obstacle) {
@@ -120,7 +172,7 @@ bool KorvelRecognizer::startRecorder(int sampleRateHz) {
     }
     if (!works) {
         recorderRefused = true;
-        getEngine()->unregisterRecognizer(this);
+        leaveEngine();
         callOnError(SpeechError::ErrorAudio, "the recorder could not be started");
         return false;
     }
@@ -159,7 +211,7 @@ void KorvelRecognizer::startDump(const Sound::SoundDataInfo& format) {
 
 void KorvelRecognizer::startWatchdog() {
     lastSoundTime = startTime;
-    watchdog = boost::make_shared<Util::Timer>([this] { checkRecorder(); });
+    watchdog = boost::make_shared<Util::Timer>([this] { enter([this] { checkRecorder(); }); });
     watchdog->start(KD_TIMER_PERIODIC_AVERAGE, NO_SOUND_LIMIT_NS);
 }
 
@@ -177,7 +229,10 @@ void KorvelRecognizer::checkRecorder() {
 
 void KorvelRecognizer::onRecorderDataReceived(
     Sound::Recorder* /*source*/, boost::shared_ptr<const Sound::SoundDataBuffer> buffer) {
-    const boost::shared_ptr<Recognizer> self = shared_from_this();
+    enter([this, &buffer] { take(buffer); });
+}
+
+void KorvelRecognizer::take(const boost::shared_ptr<const Sound::SoundDataBuffer>& buffer) {
     if (!isListening()) {
         return;
     }
@@ -187,7 +242,11 @@ void KorvelRecognizer::onRecorderDataReceived(
     const unsigned durationMs = ListeningRules::getDurationMs(*buffer);
     recordedMs += durationMs;
     lastSoundTime = durationMs > 0 ? kdGetTimeUST() : lastSoundTime;
-    protocol->handle(buffer);
+    const boost::shared_ptr<RecognizeProtocol> receiver = protocol;
+    receiver->handle(buffer);
+    if (!isListening()) {
+        return;
+    }
     if (!leadingNoiseDone) {
         learnLeadingNoise(*buffer);
         return;
@@ -252,18 +311,17 @@ void KorvelRecognizer::detectVoice(const Sound::SoundDataBuffer& buffer) {
 }
 
 void KorvelRecognizer::stop() {
-    const Util::EventLock lock;
-    const boost::shared_ptr<Recognizer> self = shared_from_this();
-    stopRecorder();
-    if (protocol) {
-        const boost::shared_ptr<RecognizeProtocol> sending = protocol;
-        sending->sendRequest();
-    }
+    enter([this] {
+        stopRecorder();
+        if (protocol) {
+            const boost::shared_ptr<RecognizeProtocol> sending = protocol;
+            sending->sendRequest();
+        }
+    });
 }
 
 void KorvelRecognizer::cancel() {
-    const Util::EventLock lock;
-    stopWithError(SpeechError::ErrorCanceled, "the application cancelled");
+    enter([this] { stopWithError(SpeechError::ErrorCanceled, "the application cancelled"); });
 }
 
 void KorvelRecognizer::stopRecorder() {
@@ -287,7 +345,7 @@ void KorvelRecognizer::dropProtocol() {
     }
 }
 
-void KorvelRecognizer::stopWithError(SpeechError error, const std::string& reason) {
+void KorvelRecognizer::stopWithError(SpeechError error, std::string_view reason) {
     const boost::shared_ptr<Recognizer> self = shared_from_this();
     if (recorder || watchdog) {
         stopListening();
@@ -295,13 +353,13 @@ void KorvelRecognizer::stopWithError(SpeechError error, const std::string& reaso
     dropProtocol();
     if (!isOver()) {
         errorReported = true;
-        getEngine()->unregisterRecognizer(this);
+        leaveEngine();
         callOnError(error, reason);
     }
 }
 
 void KorvelRecognizer::onRecorderError(Sound::Recorder* /*source*/) {
-    stopWithError(SpeechError::ErrorAudio, "the recorder failed");
+    enter([this] { stopWithError(SpeechError::ErrorAudio, "the recorder failed"); });
 }
 
 void KorvelRecognizer::onProtocolVoiceBegin() {
@@ -332,15 +390,16 @@ void KorvelRecognizer::onProtocolResults(boost::shared_ptr<const RecognitionResu
     tvLogFormatMessage(LOG_LEVEL, "Request %s finished in %d msec", requestId.c_str(),
                        static_cast<int>((kdGetTimeUST() - listeningStoppedTime) / NS_PER_MS));
     dropProtocol();
-    getEngine()->unregisterRecognizer(this);
+    leaveEngine();
     callOnResults(results, requestId);
 }
 
 void KorvelRecognizer::onProtocolError(SpeechError error) {
-    fail(error, protocol ? protocol->getErrorReason() : std::string());
+    const boost::shared_ptr<RecognizeProtocol> failed = protocol;
+    fail(error, failed ? std::string_view(failed->getErrorReason()) : std::string_view());
 }
 
-void KorvelRecognizer::fail(SpeechError error, const std::string& reason) {
+void KorvelRecognizer::fail(SpeechError error, std::string_view reason) {
     const boost::shared_ptr<Recognizer> self = shared_from_this();
     if (isOver()) {
         return;

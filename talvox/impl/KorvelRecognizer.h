@@ -6,12 +6,15 @@
 
 #include <boost/shared_ptr.hpp>
 #include <cstdint>
+#include <optional>
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include "core/sound/Recorder.h"
 #include "core/util/Timer.h"
 #include "talvox/Recognizer.h"
+#include "talvox/impl/ExceptionWatch.h"
 #include "talvox/impl/RecognizeProtocol.h"
 #include "talvox/impl/RecognizeProtocolListener.h"
 #include "talvox/impl/VoiceActivityDetector.h"
@@ -31,12 +34,16 @@ namespace Talvox {
  */
 class KorvelRecognizer : public Recognizer,
                          public Sound::RecorderListener,
-                         public RecognizeProtocolListener {
+                         public RecognizeProtocolListener,
+                         private ExceptionWatch::Owner {
   public:
     KorvelRecognizer(const Talvox* facade, boost::shared_ptr<const Settings> recognizerSettings);
     ~KorvelRecognizer() override;
 
-    /** Begins the session, once; an object whose session is over only logs the call. */
+    /**
+     * Begins the session, once; an object whose session is over only logs the call. What the engine
+     * needs of the system is there when this has returned without an error.
+     */
     void start() override;
     /** Ends listening; what was heard is recognised. Does nothing outside a session. */
     void stop() override;
@@ -56,6 +63,14 @@ class KorvelRecognizer : public Recognizer,
     static const std::vector<std::string>& getAvailableLanguages();
 
   private:
+    /** An exception, also of a listener, ends the session; it goes no further. */
+    template <typename Call>
+    void enter(Call call) noexcept;
+    void onException(const char* what) override;
+    void endUnexpectedly(const char* what) noexcept;
+    void begin();
+    /** Another session may begin; to be called right before the end is reported. */
+    void leaveEngine();
     /** Whether a session can begin; if not, logs it and says why in `obstacle`. */
     static bool statusIsReasonable(const Settings& engineSettings, std::string& obstacle);
     void chooseSessionMode(const Settings& engineSettings);
@@ -70,6 +85,7 @@ class KorvelRecognizer : public Recognizer,
     /** Calls every listener, until one of them ends the session. */
     template <typename Call>
     void announce(Call call);
+    void take(const boost::shared_ptr<const Sound::SoundDataBuffer>& buffer);
     bool isOver() const { return resultsReported || errorReported || recorderRefused; }
     bool isListening() const { return recorder && protocol; }
     void learnLeadingNoise(const Sound::SoundDataBuffer& buffer);
@@ -79,9 +95,9 @@ class KorvelRecognizer : public Recognizer,
     void stopRecorder();
     void stopListening();
     void dropProtocol();
-    void stopWithError(SpeechError error, const std::string& reason);
+    void stopWithError(SpeechError error, std::string_view reason);
     /** The end by an error of the protocol, or of what counts as one. */
-    void fail(SpeechError error, const std::string& reason);
+    void fail(SpeechError error, std::string_view reason);
 
     Sound::Recorder::Mode sessionMode = Sound::Recorder::MODE_VOICE_RECOGNITION;
     boost::shared_ptr<Sound::Recorder> recorder;
@@ -101,6 +117,7 @@ class KorvelRecognizer : public Recognizer,
     bool recorderRefused = false;
     int64_t lastSoundTime = 0;
     boost::shared_ptr<Util::Timer> watchdog;
+    std::optional<ExceptionWatch> exceptionWatch;
 };
 
 }  // namespace Talvox

@@ -60,6 +60,9 @@ ParallelEncoder::~ParallelEncoder() {
 }
 
 void ParallelEncoder::write(const boost::shared_ptr<const Sound::SoundDataBuffer>& buffer) {
+    if (failed) {
+        return;
+    }
     queue.push_back(buffer);
     wroteAny = true;
     taskQueueStep();
@@ -76,7 +79,11 @@ void ParallelEncoder::cancel() {
     }
 }
 
-void ParallelEncoder::taskDone() {
+void ParallelEncoder::taskDone(bool encoded) {
+    if (!encoded || hasLostSound()) {
+        giveUp();
+        return;
+    }
     if (request) {
         if (isPresent(encoder)) {
             writeOutput(*request, encoder->takeOutput(TAKE_ALL).get(), "");
@@ -103,13 +110,37 @@ void ParallelEncoder::startNextTask() {
         spareTask ? std::move(spareTask) : boost::make_shared<ParallelEncoderTask>(this, encoder);
     currentTask->setBuffer(queue.front());
     queue.pop_front();
-    Tasking::TaskManager::getInstance().addTask(currentTask, 0);
+    if (!Tasking::TaskManager::getInstance().addTask(currentTask, 0)) {
+        giveUp();
+    }
+}
+
+// What is called may destroy this.
+void ParallelEncoder::giveUp() {
+    kdLogFormatMessage("ParallelEncoder: sound could not be encoded");
+    failed = true;
+    queue.clear();
+    currentTask.reset();
+    if (onFailure) {
+        const std::function<void()> target = std::move(onFailure);
+        onFailure = nullptr;
+        target();
+    } else {
+        taskQueueStep();
+    }
 }
 
 void ParallelEncoder::finishStream() {
     boost::shared_ptr<Sound::SoundDataBuffer> output;
-    if (isPresent(encoder)) {
+    if (failed) {
+        output = boost::make_shared<Sound::SoundDataBuffer>(
+            Sound::SoundDataInfo(Sound::SoundDataInfo::SPEEX, 1, 0, 2));
+    } else if (isPresent(encoder)) {
         encoder->finish();
+        if (wroteAny && hasLostSound()) {
+            giveUp();
+            return;
+        }
         output = encoder->takeOutput(TAKE_ALL);
     }
     if (request) {

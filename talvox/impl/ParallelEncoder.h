@@ -7,6 +7,7 @@
 #include <boost/shared_ptr.hpp>
 #include <deque>
 #include <functional>
+#include <utility>
 
 #include "core/sound/Encoder.h"
 #include "core/sound/SoundDataBuffer.h"
@@ -52,13 +53,25 @@ class ParallelEncoder {
     /** Gives up the task in flight; what is left is to drop the parallel encoder. */
     void cancel();
 
-    /** The task in flight has encoded its buffer; for the task. */
-    void taskDone();
+    /**
+     * Sets what is called, once, when sound is lost because there is no memory or thread to encode
+     * it; it may destroy the parallel encoder. The request is not closed then. Without it, the
+     * callback mode ends with a stream without bytes.
+     */
+    void setFailureCallback(std::function<void()> whenFailed) { onFailure = std::move(whenFailed); }
+
+    /**
+     * The task in flight has encoded its buffer; for the task.
+     * @param encoded false when encoding threw
+     */
+    void taskDone(bool encoded);
 
   private:
     void taskQueueStep();
     void startNextTask();
     void finishStream();
+    void giveUp();
+    bool hasLostSound() const { return encoder && encoder->hasFailed(); }
     void callBack(const boost::shared_ptr<Sound::SoundDataBuffer>& output);
 
     boost::shared_ptr<Sound::Encoder> encoder;
@@ -68,6 +81,8 @@ class ParallelEncoder {
     std::deque<boost::shared_ptr<const Sound::SoundDataBuffer>> queue;
     boost::shared_ptr<ParallelEncoderTask> currentTask;
     bool closed = false;
+    bool failed = false;
+    std::function<void()> onFailure;
     /** The last task that has completed, to be used again. */
     boost::shared_ptr<ParallelEncoderTask> spareTask;
 };

@@ -1,7 +1,9 @@
 #include "talvox/impl/ParallelEncoderTask.h"
 
+#include <exception>
 #include <utility>
 
+#include "pal/kd_log.h"
 #include "talvox/impl/IsPresent.h"
 #include "talvox/impl/ParallelEncoder.h"
 
@@ -16,13 +18,19 @@ void ParallelEncoderTask::setBuffer(boost::shared_ptr<const Sound::SoundDataBuff
 }
 
 void ParallelEncoderTask::runTask() {
-    if (isPresent(encoder) && isPresent(buffer)) {
-        encoder->encode(*buffer);
+    encoded = false;
+    try {
+        if (isPresent(encoder) && isPresent(buffer)) {
+            encoder->encode(*buffer);
+        }
+        encoded = true;
+    } catch (const std::exception& exception) {
+        kdLogFormatMessage("ParallelEncoder: a buffer could not be encoded: %s", exception.what());
     }
 }
 
 void ParallelEncoderTask::onTaskCompleted() {
-    parent->taskDone();
+    parent->taskDone(encoded);
 }
 
 }  // namespace Talvox

@@ -32,6 +32,7 @@ class ParallelEncoderTask : public Tasking::Task {
     ParallelEncoder* parent;
     boost::shared_ptr<Sound::Encoder> encoder;
     boost::shared_ptr<const Sound::SoundDataBuffer> buffer;
+    bool encoded = false;
 };
 
 }  // namespace Talvox

@@ -48,6 +48,13 @@ void RecognizeProtocol::notifyError(SpeechError error, const std::string& reason
         [&error](RecognizeProtocolListener& listener) { listener.onProtocolError(error); });
 }
 
+void RecognizeProtocol::notifyEncodingFailed() {
+    if (!abandoned) {
+        const boost::shared_ptr<RecognizeProtocol> self = shared_from_this();
+        notifyError(SpeechError(SpeechError::ErrorEncoding), "the sound could not be encoded");
+    }
+}
+
 bool RecognizeProtocol::announceVoiceCaptured() {
     if (abandoned || announcing) {
         return false;

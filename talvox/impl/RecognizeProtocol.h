@@ -78,6 +78,8 @@ class RecognizeProtocol : public boost::enable_shared_from_this<RecognizeProtoco
      */
     bool announceVoiceCaptured();
     void notifyError(SpeechError error, const std::string& reason);
+    /** Ends the utterance with `ErrorEncoding`; the request is not completed. */
+    void notifyEncodingFailed();
 
     /** Whether the sound is sent as Speex, as settings and connection say now. */
     bool choosesSpeex() const;

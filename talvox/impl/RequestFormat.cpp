@@ -1,9 +1,7 @@
 #include "talvox/impl/RequestFormat.h"
 
 #include <array>
-#include <iomanip>
-#include <locale>
-#include <sstream>
+#include <cstddef>
 
 #include "pal/kd.h"
 #include "util/impl/NumberText.h"
@@ -13,6 +11,9 @@ namespace Talvox {
 namespace {
 
 const char* const SOURCE = "talvox/impl/RecognizeRequest";
+
+/** Two floats, of 39 digits before the point at most, as "%f,%f". */
+constexpr std::size_t LOCATION_BYTES_MAX = 128;
 
 const std::string WHOLE_PATH = "/asrgw";
 const std::string CHUNKED_PATH = "/asrgw_chunked";
@@ -60,11 +61,10 @@ std::string makeRequestUrl(const Settings& talvoxSettings, const Settings& recog
 }
 
 std::string formatLocation(const Util::Bundle::LatLon& location) {
-    std::ostringstream text;
-    text.imbue(std::locale::classic());
-    text << std::fixed << std::setprecision(6) << static_cast<double>(location.lat) << ','
-         << static_cast<double>(location.lon);
-    return text.str();
+    std::array<char, LOCATION_BYTES_MAX> text = {};
+    kdSprintf_s(text.data(), text.size(), "%f,%f", static_cast<double>(location.lat),
+                static_cast<double>(location.lon));
+    return text.data();
 }
 
 std::string removeSeparators(const std::string& name, const std::string& value,

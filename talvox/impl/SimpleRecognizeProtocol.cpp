@@ -41,10 +41,11 @@ void SimpleRecognizeProtocol::encode(
         encoder = boost::make_shared<ParallelEncoder>(
             boost::make_shared<Sound::OggSpeexEncoder>(
                 buffer->getInfo(), getSpeexQuality(), Sound::OggSpeexEncoder::PAGE_FILL_BYTES_DFLT),
-            // The encoder belongs to the protocol and calls back only while that lives.
             [this](const boost::shared_ptr<const Sound::SoundDataBuffer>& utterance) {
                 makeHttpRequest(utterance);
             });
+        // The encoder belongs to the protocol and calls back only while that lives.
+        encoder->setFailureCallback([this] { notifyEncodingFailed(); });
     }
     encoder->write(buffer);
 }

@@ -2,6 +2,7 @@
 
 #include <gmock/gmock.h>
 
+#include <array>
 #include <boost/make_shared.hpp>
 #include <condition_variable>
 #include <cstdlib>
@@ -112,14 +113,24 @@ TEST_F(Tasks, RunOffTheEventThread) {
 }
 
 TEST_F(Tasks, CancelledBeforeTheyRunNeverDo) {
+    std::array<Record, 4> busy;  // as many as there are workers
+    for (Record& each : busy) {
+        const auto blocker = boost::make_shared<TestTask>(each);
+        blocker->waits = true;
+        EXPECT_TRUE(manager.addTask(blocker, 0));
+        each.waitFor("r");
+    }
     {
-        const Util::EventLock lock;
         const auto task = boost::make_shared<TestTask>(record);
-        manager.addTask(task, 0);
+        EXPECT_TRUE(manager.addTask(task, 0));
         manager.cancelTask(task);
     }
     record.waitFor("~");
     EXPECT_EQ(record.get(), "~");
+    for (Record& each : busy) {
+        each.openGate();
+        each.waitFor("rc~");
+    }
 }
 
 TEST_F(Tasks, CancelledWhileRunningStayAliveAndNeverComplete) {

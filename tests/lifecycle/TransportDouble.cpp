@@ -62,6 +62,11 @@ void Transport::abandon(const boost::shared_ptr<Transfer>& transfer) {
     transfer->abandon();
 }
 
+void Transport::requestAbandon(const boost::shared_ptr<Transfer>& transfer) noexcept {
+    const boost::shared_ptr<Transport> self = shared_from_this();
+    post([self, transfer] { self->abandon(transfer); });
+}
+
 void Transport::stop() {
     stopping = true;
     while (runCommands()) {

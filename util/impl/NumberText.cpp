@@ -139,6 +139,7 @@ bool skipDecimal(Cursor& cursor) {
 /** @param written a whole decimal number */
 double convertDecimal(const std::string& written) {
     std::istringstream stream(written);
+    stream.exceptions(std::ios::badbit);  // else a want of memory would pass for a number
     stream.imbue(std::locale::classic());
     // Reading a float, not a double, rounds once. A number out of range gives the largest float or
     // infinity, depending on the library, and fails.
@@ -197,6 +198,7 @@ NumberText::Reading<float> NumberText::readFloat(const std::string& text, std::s
 
 std::string NumberText::writeFloat(float value) {
     std::ostringstream stream;
+    stream.exceptions(std::ios::badbit);
     stream.imbue(std::locale::classic());
     stream << static_cast<double>(value);
     return stream.str();

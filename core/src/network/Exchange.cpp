@@ -2,10 +2,11 @@
 
 #include <algorithm>
 #include <boost/make_shared.hpp>
+#include <exception>
+#include <new>
 #include <utility>
 
 #include "core/util/EventLock.h"
-#include "network/EventThread.h"
 #include "network/FailureText.h"
 #include "network/RequestCheck.h"
 #include "network/Transport.h"
@@ -27,7 +28,7 @@ Exchange::Exchange(boost::shared_ptr<Transport> owner, boost::shared_ptr<Network
       task(std::move(what)),
       policy(std::move(when)),
       endsHere(endHere),
-      retryTimer([this] { postAttempt(); }) {}
+      retryTimer([this] { retry(); }) {}
 
 void Exchange::start() {
     postAttempt();
@@ -40,27 +41,73 @@ void Exchange::cancel() {
     active = false;
     retryTimer.cancel();
     if (const boost::shared_ptr<Transfer> ended = std::move(transfer)) {
-        const boost::shared_ptr<Transport> runner = transport;
-        runner->post([runner, ended] { runner->abandon(ended); });
+        transport->requestAbandon(ended);
     }
     policy.reset();
     // Last: the task's destructor may do anything.
     task.reset();
 }
 
+void Exchange::retry() {
+    if (!callTask([this] { postAttempt(); })) {
+        endWithException();
+    }
+}
+
 void Exchange::postAttempt() {
     const boost::shared_ptr<Exchange> self = shared_from_this();
-    if (!transport->post([self] { self->attempt(); })) {
-        task->failureReason = "the network thread does not run";
-        // Never from inside `start`, so never on the caller's thread.
-        postEnd(NetworkTask::NO_RESPONSE);
+    if (transport->post([self] { self->attempt(); })) {
+        return;
+    }
+    task->failureReason = "the network thread does not run";
+    // Never from inside `start`, so never on the caller's thread.
+    if (!postEnd(NetworkTask::NO_RESPONSE)) {
+        throw std::bad_alloc();
+    }
+}
+
+template <typename Call>
+bool Exchange::callTask(Call call) noexcept {
+    try {
+        call();
+        return true;
+    } catch (const std::exception& exception) {
+        noteException(exception.what());
+    } catch (...) {
+        noteException("an exception of an unknown type");
+    }
+    return false;
+}
+
+void Exchange::noteException(const char* what) noexcept {
+    kdLogFormatMessage("Network: a task cannot go on: %s", what);
+    const Util::EventLock lock;
+    try {
+        attemptReason = makeReason(what);
+    } catch (const std::exception&) {
+        attemptReason.clear();
     }
 }
 
 void Exchange::attempt() {
-    if (const boost::shared_ptr<Transfer> next = makeTransfer()) {
-        transport->start(next);
+    const bool begun = callTask([this] {
+        if (const boost::shared_ptr<Transfer> next = makeTransfer()) {
+            transport->start(next);
+        }
+    });
+    if (!begun) {
+        endWithException();
     }
+}
+
+// The last resort: no retry, whose way would lead through the same want.
+void Exchange::endWithException() noexcept {
+    const Util::EventLock lock;
+    if (!isHeard()) {
+        return;
+    }
+    callTask([this] { task->failureReason.swap(attemptReason); });
+    callTask([this] { finish(NetworkTask::NO_RESPONSE); });
 }
 
 boost::shared_ptr<Transfer> Exchange::makeTransfer() {
@@ -99,17 +146,24 @@ bool Exchange::prepareTask(const boost::shared_ptr<NetworkTask>& current) {
     return active;
 }
 
-void Exchange::onTransferHead(const boost::shared_ptr<HttpResponse>& response) {
+bool Exchange::onTransferHead(const boost::shared_ptr<HttpResponse>& response) {
     const Util::EventLock lock;
     const boost::shared_ptr<NetworkTask> current = task;
-    if (isHeard()) {
-        attemptReason = describeStatus(*response);
-        current->onResponseRecieved(response);
-    }
+    return callTask([&] {
+        if (isHeard()) {
+            attemptReason = describeStatus(*response);
+            current->onResponseRecieved(response);
+        }
+    });
 }
 
 bool Exchange::onTransferBytes(const unsigned char* bytes, std::size_t size) {
     const Util::EventLock lock;
+    bool wanted = false;
+    return callTask([&] { wanted = takeBytes(bytes, size); }) && wanted;
+}
+
+bool Exchange::takeBytes(const unsigned char* bytes, std::size_t size) {
     const boost::shared_ptr<NetworkTask> current = task;
     if (!isHeard()) {
         return false;
@@ -137,11 +191,17 @@ bool Exchange::collect(const unsigned char* bytes, std::size_t size) {
 
 void Exchange::onTransferEnd(const TransferEnd& how) {
     const Util::EventLock lock;
+    transfer.reset();
+    if (!callTask([&] { takeEnd(how); })) {
+        endWithException();
+    }
+}
+
+void Exchange::takeEnd(const TransferEnd& how) {
     const boost::shared_ptr<NetworkTask> current = task;
     if (!isHeard()) {
         return;
     }
-    transfer.reset();
     // Ours is more precise than what libcurl says about an end that we caused.
     current->failureReason = attemptReason.empty() ? how.reason : attemptReason;
     if (how.code > 0 && !collected.empty()) {
@@ -165,25 +225,43 @@ void Exchange::retryOrFinish(int code) {
     }
 }
 
+// Where there is no way to the event thread the end is delivered here, under the same lock.
 void Exchange::finish(int code) {
-    if (endsHere) {
+    if (endsHere || !postEnd(code)) {
         deliverEnd(code);
-    } else {
-        postEnd(code);
     }
 }
 
-void Exchange::postEnd(int code) {
-    const boost::shared_ptr<Exchange> self = shared_from_this();
-    postToEventThread([self, code] { self->deliverEnd(code); });
+bool Exchange::postEnd(int code) {
+    if (posted) {
+        return true;
+    }
+    posted = shared_from_this();
+    postedCode = code;
+    const bool isOnItsWay = kdPostKOR(&Exchange::onPosted, this) == 0;
+    if (!isOnItsWay) {
+        posted.reset();
+    }
+    return isOnItsWay;
+}
+
+void Exchange::onPosted(void* user) {
+    const boost::shared_ptr<Exchange> self = std::move(static_cast<Exchange*>(user)->posted);
+    self->deliverEnd(self->postedCode);
 }
 
 void Exchange::deliverEnd(int code) {
     const boost::shared_ptr<NetworkTask> current = task;
-    if (isHeard()) {
-        current->onFinished(code);
-        cancel();
+    if (!isHeard()) {
+        return;
     }
+    try {
+        current->onFinished(code);
+    } catch (...) {
+        cancel();
+        throw;
+    }
+    cancel();
 }
 
 // At the end of the process nothing is delivered any more, whatever becomes of the transfers.

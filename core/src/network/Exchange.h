@@ -33,19 +33,28 @@ class Exchange : public boost::enable_shared_from_this<Exchange>, public Transfe
 
     bool isActive() const { return active; }
 
-    void onTransferHead(const boost::shared_ptr<HttpResponse>& response) override;
+    bool onTransferHead(const boost::shared_ptr<HttpResponse>& response) override;
     bool onTransferBytes(const unsigned char* bytes, std::size_t size) override;
     void onTransferEnd(const TransferEnd& how) override;
 
   private:
+    /** Makes one of the network thread's calls. @return false when it threw */
+    template <typename Call>
+    bool callTask(Call call) noexcept;
+    void endWithException() noexcept;
+    void noteException(const char* what) noexcept;
+    void retry();
     void postAttempt();
     void attempt();
     boost::shared_ptr<Transfer> makeTransfer();
     bool prepareTask(const boost::shared_ptr<NetworkTask>& current);
+    bool takeBytes(const unsigned char* bytes, std::size_t size);
+    void takeEnd(const TransferEnd& how);
     bool collect(const unsigned char* bytes, std::size_t size);
     void retryOrFinish(int code);
     void finish(int code);
-    void postEnd(int code);
+    bool postEnd(int code);
+    static void onPosted(void* user);
     void deliverEnd(int code);
     bool isHeard() const;
 
@@ -60,6 +69,10 @@ class Exchange : public boost::enable_shared_from_this<Exchange>, public Transfe
     Util::Timer retryTimer;
     int attempts = 0;
     bool active = true;
+    /** Keeps this alive while its end is on its way to the event thread; posting takes no memory.
+     */
+    boost::shared_ptr<Exchange> posted;
+    int postedCode = 0;
 };
 
 }  // namespace Network

@@ -7,6 +7,8 @@
 
 #include <algorithm>
 
+#include "network/CurlGuard.h"
+
 namespace Network {
 
 namespace {
@@ -46,11 +48,17 @@ bool OpenSockets::hasArrivals(int ownPort) const {
 curl_socket_t OpenSockets::onOpen(void* self, curlsocktype, curl_sockaddr* address) {
     const curl_socket_t socket =
         ::socket(address->family, address->socktype | SOCK_CLOEXEC, address->protocol);
-    if (socket >= 0) {
+    if (socket < 0) {
+        return CURL_SOCKET_BAD;
+    }
+    const curl_socket_t known = guardForCurl(CURL_SOCKET_BAD, [self, socket] {
         static_cast<OpenSockets*>(self)->sockets.insert(socket);
         return socket;
+    });
+    if (known == CURL_SOCKET_BAD) {
+        ::close(socket);
     }
-    return CURL_SOCKET_BAD;
+    return known;
 }
 
 int OpenSockets::onClose(void* self, curl_socket_t socket) {

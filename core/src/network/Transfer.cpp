@@ -6,6 +6,7 @@
 #include <utility>
 
 #include "core/network/NetworkTask.h"
+#include "network/CurlGuard.h"
 #include "network/FailureText.h"
 #include "network/Transport.h"
 #include "pal/kd_log.h"
@@ -38,65 +39,76 @@ Transfer::Transfer(boost::shared_ptr<Transport> owner, boost::shared_ptr<HttpReq
       body(request) {}
 
 CURL* Transfer::open(const std::string& certificateFile) {
-    easy.reset(transport->takeHandle());
+    easy.reset(transport->takeHandle(certificateFile));
     if (easy) {
         setUpConnection(certificateFile);
         setUpRequest();
         setUpHeaders();
     }
+    if (hadNoMemory) {
+        easy.reset();  // half set up, it must not serve again
+    }
     return easy.get();
 }
 
+// A handle serves one request after the other without a reset, which could fail and not say so:
+// each request sets every option that any of them sets.
+template <typename Value>
+void Transfer::set(CURLoption option, Value value) {
+    // Options that this libcurl does not know are no obstacle.
+    hadNoMemory =
+        hadNoMemory || (curl_easy_setopt)(easy.get(), option, value) == CURLE_OUT_OF_MEMORY;
+}
+
 void Transfer::setUpConnection(const std::string& certificateFile) {
-    CURL* const handle = easy.get();
-    curl_easy_setopt(handle, CURLOPT_NOSIGNAL, 1L);
+    set(CURLOPT_NOSIGNAL, 1L);
     // Otherwise the end of a transfer waits for a name server that does not answer.
-    curl_easy_setopt(handle, CURLOPT_QUICK_EXIT, 1L);
-    curl_easy_setopt(handle, CURLOPT_CONNECTTIMEOUT_MS, NO_CONNECT_LIMIT_MS);
+    set(CURLOPT_QUICK_EXIT, 1L);
+    set(CURLOPT_CONNECTTIMEOUT_MS, NO_CONNECT_LIMIT_MS);
     // Settings come from the application only, never from the environment.
-    curl_easy_setopt(handle, CURLOPT_PROXY, "");
-    curl_easy_setopt(handle, CURLOPT_HTTP_VERSION, static_cast<long>(CURL_HTTP_VERSION_1_1));
-    curl_easy_setopt(handle, CURLOPT_SSLVERSION, static_cast<long>(CURL_SSLVERSION_TLSv1_2));
-    transport->getSockets().attach(handle);
-    curl_easy_setopt(handle, CURLOPT_PREREQFUNCTION, &Transfer::onConnection);
-    curl_easy_setopt(handle, CURLOPT_PREREQDATA, this);
+    set(CURLOPT_PROXY, "");
+    set(CURLOPT_HTTP_VERSION, static_cast<long>(CURL_HTTP_VERSION_1_1));
+    set(CURLOPT_SSLVERSION, static_cast<long>(CURL_SSLVERSION_TLSv1_2));
+    transport->getSockets().attach(easy.get());
+    set(CURLOPT_PREREQFUNCTION, &Transfer::onConnection);
+    set(CURLOPT_PREREQDATA, this);
+    set(CURLOPT_FRESH_CONNECT, 0L);
     if (!certificateFile.empty()) {
-        curl_easy_setopt(handle, CURLOPT_CAINFO, certificateFile.c_str());
-        curl_easy_setopt(handle, CURLOPT_CAPATH, nullptr);
+        set(CURLOPT_CAINFO, certificateFile.c_str());
+        set(CURLOPT_CAPATH, static_cast<const char*>(nullptr));
     }
-    curl_easy_setopt(handle, CURLOPT_ERRORBUFFER, errorText.data());
-    curl_easy_setopt(handle, CURLOPT_NOPROGRESS, 0L);
-    curl_easy_setopt(handle, CURLOPT_XFERINFOFUNCTION, &Transfer::onProgress);
-    curl_easy_setopt(handle, CURLOPT_XFERINFODATA, this);
+    set(CURLOPT_ERRORBUFFER, errorText.data());
+    set(CURLOPT_NOPROGRESS, 0L);
+    set(CURLOPT_XFERINFOFUNCTION, &Transfer::onProgress);
+    set(CURLOPT_XFERINFODATA, this);
 }
 
 void Transfer::setUpRequest() {
-    CURL* const handle = easy.get();
     const std::string& url = request->getUrl();
-    curl_easy_setopt(handle, CURLOPT_URL, url.c_str());
-    curl_easy_setopt(handle, CURLOPT_PATH_AS_IS, 1L);
-    curl_easy_setopt(handle, CURLOPT_PROTOCOLS_STR, "http,https");
-    if (request->getMethod() == "POST") {
+    set(CURLOPT_URL, url.c_str());
+    set(CURLOPT_PATH_AS_IS, 1L);
+    set(CURLOPT_PROTOCOLS_STR, "http,https");
+    const bool isPost = request->getMethod() == "POST";
+    set(CURLOPT_FOLLOWLOCATION, !isPost && request->getFollowRedirects() ? 1L : 0L);
+    set(CURLOPT_MAXREDIRS, MOST_REDIRECTS);
+    set(CURLOPT_REDIR_PROTOCOLS_STR, isSecure(url) ? "https" : "http,https");
+    if (isPost) {
         setUpBody();
-    } else if (request->getFollowRedirects()) {
-        curl_easy_setopt(handle, CURLOPT_FOLLOWLOCATION, 1L);
-        curl_easy_setopt(handle, CURLOPT_MAXREDIRS, MOST_REDIRECTS);
-        curl_easy_setopt(handle, CURLOPT_REDIR_PROTOCOLS_STR,
-                         isSecure(url) ? "https" : "http,https");
+    } else {
+        set(CURLOPT_HTTPGET, 1L);
     }
-    curl_easy_setopt(handle, CURLOPT_HEADERFUNCTION, &Transfer::onHeader);
-    curl_easy_setopt(handle, CURLOPT_HEADERDATA, this);
-    curl_easy_setopt(handle, CURLOPT_WRITEFUNCTION, &Transfer::onWrite);
-    curl_easy_setopt(handle, CURLOPT_WRITEDATA, this);
+    set(CURLOPT_HEADERFUNCTION, &Transfer::onHeader);
+    set(CURLOPT_HEADERDATA, this);
+    set(CURLOPT_WRITEFUNCTION, &Transfer::onWrite);
+    set(CURLOPT_WRITEDATA, this);
 }
 
 void Transfer::setUpBody() {
-    CURL* const handle = easy.get();
-    curl_easy_setopt(handle, CURLOPT_POST, 1L);
-    curl_easy_setopt(handle, CURLOPT_READFUNCTION, &Transfer::onRead);
-    curl_easy_setopt(handle, CURLOPT_READDATA, this);
-    curl_easy_setopt(handle, CURLOPT_SEEKFUNCTION, &Transfer::onSeek);
-    curl_easy_setopt(handle, CURLOPT_SEEKDATA, this);
+    set(CURLOPT_POST, 1L);
+    set(CURLOPT_READFUNCTION, &Transfer::onRead);
+    set(CURLOPT_READDATA, this);
+    set(CURLOPT_SEEKFUNCTION, &Transfer::onSeek);
+    set(CURLOPT_SEEKDATA, this);
     if (request->isChunked()) {
         const boost::weak_ptr<Transfer> weak(shared_from_this());
         request->getWriter()->setWakeUp([weak] {
@@ -104,10 +116,9 @@ void Transfer::setUpBody() {
                 self->wake();
             }
         });
-    } else {
-        curl_easy_setopt(handle, CURLOPT_POSTFIELDSIZE_LARGE,
-                         static_cast<curl_off_t>(request->getBody().size()));
     }
+    set(CURLOPT_POSTFIELDSIZE_LARGE,
+        request->isChunked() ? curl_off_t{-1} : static_cast<curl_off_t>(request->getBody().size()));
 }
 
 void Transfer::setUpHeaders() {
@@ -127,15 +138,17 @@ void Transfer::setUpHeaders() {
             addHeaderLine("Content-Type:");  // none, instead of libcurl's default
         }
     }
-    curl_easy_setopt(easy.get(), CURLOPT_HTTPHEADER, headerLines.get());
+    set(CURLOPT_HTTPHEADER, headerLines.get());
 }
 
 void Transfer::addHeaderLine(const std::string& line) {
     curl_slist* const longer = curl_slist_append(headerLines.get(), line.c_str());
-    if (longer != nullptr) {
-        static_cast<void>(headerLines.release());
-        headerLines.reset(longer);
+    if (longer == nullptr) {
+        hadNoMemory = true;
+        return;
     }
+    static_cast<void>(headerLines.release());
+    headerLines.reset(longer);
 }
 
 TransferEnd Transfer::judge(CURLcode result) const {
@@ -156,6 +169,9 @@ std::string Transfer::describe(CURLcode result) const {
     if (refusal != nullptr) {
         return refusal;
     }
+    if (!easy) {
+        return "no memory for the request";
+    }
     if (result == CURLE_OPERATION_TIMEDOUT) {
         return describeTimeout(request->getTimeoutMs());
     }
@@ -168,6 +184,9 @@ std::string Transfer::describe(CURLcode result) const {
 
 long Transfer::getStatus() const {
     long status = 0;
+    if (!easy) {
+        return status;
+    }
     curl_easy_getinfo(easy.get(), CURLINFO_RESPONSE_CODE, &status);
     return status;
 }
@@ -238,19 +257,19 @@ void Transfer::noteProgress() {
     }
 }
 
-void Transfer::handleHeadEnd() {
+bool Transfer::handleHeadEnd() {
     const long status = getStatus();
     const bool interim = status < 200;
     const bool redirected = status >= 300 && status < 400 && request->getMethod() != "POST" &&
                             request->getFollowRedirects() && head.has("Location");
     if (headDelivered || interim || redirected) {
-        return;
+        return true;
     }
-    headDelivered = true;
     if (paused) {
         wake();
     }
-    listener->onTransferHead(head.makeResponse(static_cast<int>(status)));
+    headDelivered = listener->onTransferHead(head.makeResponse(static_cast<int>(status)));
+    return headDelivered;
 }
 
 // On a kept connection something may have arrived since the last answer: whatever it is, it would
@@ -274,12 +293,15 @@ bool Transfer::takeNewConnection() {
 }
 
 int Transfer::onConnection(void* self, char*, char*, int, int ownPort) {
-    return static_cast<Transfer*>(self)->canUseConnection(ownPort) ? CURL_PREREQFUNC_OK
-                                                                   : CURL_PREREQFUNC_ABORT;
+    return guardForCurl(CURL_PREREQFUNC_ABORT, [self, ownPort] {
+        return static_cast<Transfer*>(self)->canUseConnection(ownPort) ? CURL_PREREQFUNC_OK
+                                                                       : CURL_PREREQFUNC_ABORT;
+    });
 }
 
 std::size_t Transfer::onRead(char* data, std::size_t size, std::size_t count, void* self) {
-    return static_cast<Transfer*>(self)->readBody(data, size * count);
+    return guardForCurl(std::size_t{CURL_READFUNC_ABORT},
+                        [=] { return static_cast<Transfer*>(self)->readBody(data, size * count); });
 }
 
 int Transfer::onSeek(void* self, curl_off_t offset, int origin) {
@@ -291,18 +313,20 @@ int Transfer::onSeek(void* self, curl_off_t offset, int origin) {
 }
 
 std::size_t Transfer::onHeader(char* data, std::size_t size, std::size_t count, void* self) {
-    Transfer& transfer = *static_cast<Transfer*>(self);
-    const std::size_t bytes = size * count;
-    transfer.noteProgress();
-    if (!transfer.head.hasRoom(bytes)) {
+    return guardForCurl(std::size_t{0}, [=] {
+        return static_cast<Transfer*>(self)->takeHeaderLine(data, size * count);
+    });
+}
+
+std::size_t Transfer::takeHeaderLine(const char* data, std::size_t size) {
+    noteProgress();
+    if (!head.hasRoom(size)) {
         kdLogMessage("Network: the head of a response is too large");
-        transfer.refusal = "the head of the response is too large";
+        refusal = "the head of the response is too large";
         return 0;
     }
-    if (transfer.head.addLine(std::string_view(data, bytes))) {
-        transfer.handleHeadEnd();
-    }
-    return bytes;
+    const bool isWanted = !head.addLine(std::string_view(data, size)) || handleHeadEnd();
+    return isWanted ? size : 0;
 }
 
 std::size_t Transfer::onWrite(char* data, std::size_t size, std::size_t count, void* self) {
@@ -324,7 +348,7 @@ int Transfer::onProgress(void* self, curl_off_t, curl_off_t downNow, curl_off_t,
         transfer.movedBytes = moved;
         transfer.noteProgress();
     }
-    return 0;
+    return transfer.unwanted ? 1 : 0;
 }
 
 }  // namespace Network

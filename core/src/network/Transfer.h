@@ -26,12 +26,16 @@ struct TransferEnd {
     std::string reason; /**< why there was no complete response; empty when there was one */
 };
 
-/** Hears of one transfer. All operations are called on the network thread without any lock. */
+/**
+ * Hears of one transfer. All operations are called on the network thread without any lock, and none
+ * throws.
+ */
 class TransferListener {
   public:
     virtual ~TransferListener() = default;
 
-    virtual void onTransferHead(const boost::shared_ptr<HttpResponse>& response) = 0;
+    /** @return false to end the transfer */
+    virtual bool onTransferHead(const boost::shared_ptr<HttpResponse>& response) = 0;
     /** @return false to end the transfer */
     virtual bool onTransferBytes(const unsigned char* bytes, std::size_t size) = 0;
     virtual void onTransferEnd(const TransferEnd& how) = 0;
@@ -51,8 +55,11 @@ class Transfer : public boost::enable_shared_from_this<Transfer> {
     /** Starts to measure the time. Any thread, under the event lock. */
     void startWatchdog() { watchdog.start(); }
 
-    /** Sets up the handle; null when it cannot be done. */
+    /** Sets up the handle; null when it cannot be done for want of memory. */
     CURL* open(const std::string& certificateFile);
+
+    /** Makes the transfer end with its next progress. Any thread. */
+    void endSoon() { unwanted = true; }
 
     /** What the listener is to hear of an end with this result, before the handle is freed. */
     TransferEnd judge(CURLcode result) const;
@@ -82,13 +89,15 @@ class Transfer : public boost::enable_shared_from_this<Transfer> {
         void operator()(curl_slist* list) const { curl_slist_free_all(list); }
     };
 
+    template <typename Value>
+    void set(CURLoption option, Value value);
     void setUpConnection(const std::string& certificateFile);
     void setUpRequest();
     void setUpBody();
     void setUpHeaders();
     void addHeaderLine(const std::string& line);
     void wake();
-    void handleHeadEnd();
+    bool handleHeadEnd();
     bool isAnswered() const;
     std::string describe(CURLcode result) const;
     long getStatus() const;
@@ -96,6 +105,7 @@ class Transfer : public boost::enable_shared_from_this<Transfer> {
     bool canUseConnection(int ownPort);
 
     std::size_t readBody(char* data, std::size_t size);
+    std::size_t takeHeaderLine(const char* data, std::size_t size);
     static int onConnection(void* self, char* peerAddress, char* ownAddress, int peerPort,
                             int ownPort);
     static std::size_t onRead(char* data, std::size_t size, std::size_t count, void* self);
@@ -110,9 +120,11 @@ class Transfer : public boost::enable_shared_from_this<Transfer> {
     boost::shared_ptr<TransferListener> listener;
     Watchdog watchdog;
     std::atomic<bool> wakeUpPosted{false};
+    std::atomic<bool> unwanted{false};
 
     std::unique_ptr<curl_slist, ListDeleter> headerLines;
     std::array<char, CURL_ERROR_SIZE> errorText{};
+    bool hadNoMemory = false;
     /** Set when we ended the transfer ourselves; libcurl only knows that a callback failed. */
     const char* refusal = nullptr;
     std::unique_ptr<CURL, EasyDeleter> easy;

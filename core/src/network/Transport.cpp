@@ -2,9 +2,11 @@
 
 #include <algorithm>
 #include <chrono>
-#include <system_error>
+#include <exception>
+#include <new>
 #include <utility>
 
+#include "core/network/NetworkTask.h"
 #include "network/Transfer.h"
 #include "pal/SignalsBlocked.h"
 #include "pal/kd_assert.h"
@@ -22,7 +24,11 @@ constexpr std::chrono::seconds STOP_LIMIT{2};
 void initialiseCurl() {
     static std::once_flag once;
     // For the rest of the process: the application may use libcurl as well.
-    std::call_once(once, [] { curl_global_init(CURL_GLOBAL_DEFAULT); });
+    std::call_once(once, [] {
+        if (curl_global_init(CURL_GLOBAL_DEFAULT) != CURLE_OK) {
+            throw std::bad_alloc();  // the next use tries again
+        }
+    });
 }
 
 /** Releases the event lock for its own lifetime, however often it is held. */
@@ -45,6 +51,14 @@ class EventLockLoan {
   private:
     int levels = 0;
 };
+
+TransferEnd judge(const Transfer& transfer, CURLcode result) noexcept {
+    try {
+        return transfer.judge(result);
+    } catch (const std::exception&) {
+        return {NetworkTask::NO_RESPONSE, {}};
+    }
+}
 
 }  // namespace
 
@@ -146,7 +160,7 @@ bool Transport::launchThread() {
     const boost::shared_ptr<Transport> self = shared_from_this();
     try {
         thread = std::thread([self] { self->run(); });
-    } catch (const std::system_error& error) {
+    } catch (const std::exception& error) {
         kdLogFormatMessage("Network: the network thread cannot start: %s", error.what());
         multi.reset();
         return false;
@@ -178,9 +192,6 @@ bool Transport::isWanted() {
 // One batch at a time: transfers go on between commands that come in quick succession. The end
 // comes when nothing is left to run, so that each command that was accepted is run.
 bool Transport::runCommands() {
-    // Empty, unless a command has thrown.
-    currentCommands.clear();
-    currentResumed.clear();
     {
         const std::lock_guard<std::mutex> lock(mutex);
         awake = false;
@@ -192,7 +203,13 @@ bool Transport::runCommands() {
         }
     }
     for (const std::function<void()>& command : currentCommands) {
-        command();
+        try {
+            command();
+        } catch (const std::exception& exception) {
+            kdReportExceptionKOR(exception.what());
+        } catch (...) {
+            kdReportExceptionKOR(nullptr);
+        }
     }
     currentCommands.clear();
     for (const boost::shared_ptr<Transfer>& transfer : currentResumed) {
@@ -221,20 +238,39 @@ void Transport::start(const boost::shared_ptr<Transfer>& transfer) {
         certificates = certificateFile;
     }
     CURL* const easy = transfer->open(certificates);
+    if (easy == nullptr) {
+        transfer->end(judge(*transfer, CURLE_OUT_OF_MEMORY));
+        return;
+    }
     const auto entry = transfers.emplace(easy, transfer).first;
-    if (easy == nullptr || curl_multi_add_handle(multi.get(), easy) != CURLM_OK) {
+    if (curl_multi_add_handle(multi.get(), easy) != CURLM_OK) {
         finish(entry, CURLE_FAILED_INIT);
     }
 }
 
 // Making a handle costs as much as the rest of a small request.
-CURL* Transport::takeHandle() {
+CURL* Transport::takeHandle(const std::string& certificates) {
+    if (certificates != spareCertificateFile) {
+        spareHandle.reset();
+        spareCertificateFile = certificates;
+    }
     return spareHandle ? spareHandle.release() : curl_easy_init();
 }
 
 void Transport::giveBack(CURL* handle) {
-    curl_easy_reset(handle);
+    // What the next request sets may be written there.
+    curl_easy_setopt(handle, CURLOPT_ERRORBUFFER, nullptr);
     spareHandle.reset(handle);
+}
+
+void Transport::requestAbandon(const boost::shared_ptr<Transfer>& transfer) noexcept {
+    try {
+        const boost::shared_ptr<Transport> self = shared_from_this();
+        post([self, transfer] { self->abandon(transfer); });
+    } catch (const std::exception&) {
+        kdLogMessage("Network: no memory to end a transfer at once");
+        transfer->endSoon();
+    }
 }
 
 void Transport::abandon(const boost::shared_ptr<Transfer>& transfer) {
@@ -262,7 +298,7 @@ void Transport::finish(Transfers::iterator entry, CURLcode result) {
         curl_multi_add_handle(multi.get(), entry->first) == CURLM_OK) {
         return;
     }
-    const TransferEnd how = transfer->judge(result);
+    const TransferEnd how = judge(*transfer, result);
     transfers.erase(entry);
     transfer->end(how);
 }

@@ -59,14 +59,20 @@ class Transport : public boost::enable_shared_from_this<Transport> {
     /** Network thread only. */
     void start(const boost::shared_ptr<Transfer>& transfer);
 
-    /** A handle without any settings, owned by the caller; null on failure. Network thread only. */
-    CURL* takeHandle();
+    /**
+     * A handle, owned by the caller; null on failure. It keeps what its last request set, of the
+     * authorities apart: these are the default or this file. Network thread only.
+     */
+    CURL* takeHandle(const std::string& certificateFile);
 
     /** Takes back a handle, to be used again. Network thread only. */
     void giveBack(CURL* handle);
 
     /** Network thread only. */
     OpenSockets& getSockets() { return sockets; }
+
+    /** Has `abandon` called on the network thread. Any thread; does not block, and cannot fail. */
+    void requestAbandon(const boost::shared_ptr<Transfer>& transfer) noexcept;
 
     /** Network thread only; a transfer that is over or was never started is accepted. */
     void abandon(const boost::shared_ptr<Transfer>& transfer);
@@ -111,6 +117,7 @@ class Transport : public boost::enable_shared_from_this<Transport> {
     OpenSockets sockets;
     std::unique_ptr<CURLM, MultiDeleter> multi;
     std::unique_ptr<CURL, EasyDeleter> spareHandle;
+    std::string spareCertificateFile;
     Transfers transfers;
     // Kept for their room: sound that comes piece by piece needs none of its own.
     std::vector<std::function<void()>> currentCommands;

@@ -5,8 +5,8 @@
 #include <algorithm>
 #include <chrono>
 #include <condition_variable>
+#include <exception>
 #include <mutex>
-#include <system_error>
 #include <thread>
 #include <vector>
 
@@ -58,12 +58,13 @@ AudioThreads::~AudioThreads() {
 bool AudioThreads::start(const boost::shared_ptr<PulseCapture>& capture) {
     const korvel_pal::SignalsBlocked signalsBlocked;
     const std::lock_guard<std::mutex> lock(running().mutex);
+    running().captures.push_back(capture);
     try {
         std::thread(&runCapture, capture).detach();
-    } catch (const std::system_error&) {
+    } catch (const std::exception&) {
+        running().captures.pop_back();
         return false;
     }
-    running().captures.push_back(capture);
     return true;
 }
 

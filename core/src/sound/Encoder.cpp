@@ -4,4 +4,8 @@ namespace Sound {
 
 Encoder::~Encoder() = default;
 
+bool Encoder::hasFailed() const {
+    return false;
+}
+
 }  // namespace Sound

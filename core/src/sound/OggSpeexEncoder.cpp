@@ -65,6 +65,7 @@ class OggSpeexEncoder::Impl {
         if (!coder->isReady()) {
             kdLogFormatMessage("OggSpeexEncoder: no memory for an encoder");
             coder.reset();
+            hasNoCoder = true;
         }
     }
 
@@ -81,6 +82,8 @@ class OggSpeexEncoder::Impl {
             }
         }
     }
+
+    bool hasFailed() const { return hasNoCoder || writer.hasFailed(); }
 
     boost::shared_ptr<SoundDataBuffer> takeOutput(int maxBytes) {
         if (!headersWritten && !finished) {
@@ -171,6 +174,7 @@ class OggSpeexEncoder::Impl {
     OggWriter writer;
     BufferPool outputs;
     boost::scoped_ptr<SpeexCoder> coder;
+    bool hasNoCoder = false;
     std::vector<int16_t> frame;
     int64_t sampleCount = 0;
     int64_t frameCount = 0;
@@ -193,6 +197,10 @@ boost::shared_ptr<SoundDataBuffer> OggSpeexEncoder::takeOutput(int maxBytes) {
 
 void OggSpeexEncoder::finish() {
     impl->finish();
+}
+
+bool OggSpeexEncoder::hasFailed() const {
+    return impl->hasFailed();
 }
 
 }  // namespace Sound

@@ -15,7 +15,7 @@ const int PAGE_BYTES_MAX = 65025;
 }  // namespace
 
 OggWriter::OggWriter(int pageFillBytes) : pageFill(std::max(pageFillBytes, 1)), stream() {
-    ogg_stream_init(&stream, SERIAL_NUMBER);
+    failed = ogg_stream_init(&stream, SERIAL_NUMBER) != 0;
 }
 
 OggWriter::~OggWriter() {
@@ -32,7 +32,7 @@ void OggWriter::write(const std::vector<unsigned char>& packet, int64_t granuleP
     item.e_o_s = last ? 1 : 0;
     item.granulepos = granulePosition;
     item.packetno = packetCount++;
-    ogg_stream_packetin(&stream, &item);
+    failed = ogg_stream_packetin(&stream, &item) != 0 || failed;
     if (last) {
         flush();
     }

@@ -25,6 +25,9 @@ class OggWriter {
     /** Closes a page with all packets that are on none yet. */
     void flush();
 
+    /** Whether the library had no memory for the stream or for a packet. */
+    bool hasFailed() const { return failed; }
+
     /** Bytes of closed pages that were not taken yet. */
     std::size_t getSize() const { return pages.size() - taken; }
 
@@ -36,6 +39,7 @@ class OggWriter {
 
     const int pageFill;
     ogg_stream_state stream;
+    bool failed = false;
     int64_t packetCount = 0;
     std::vector<unsigned char> pages;
     std::size_t taken = 0;

@@ -3,6 +3,8 @@
 #include <pulse/error.h>
 #include <pulse/proplist.h>
 
+#include <new>
+
 namespace Sound {
 
 namespace {
@@ -27,7 +29,7 @@ PulseCapture::PulseCapture(int sampleRateHz, int fragmentBytes, Recorder::Mode r
 void PulseCapture::run() {
     pa_mainloop* const own = pa_mainloop_new();
     if (own == nullptr) {
-        queue->fail("no resources for an audio loop");
+        fail("no resources for an audio loop");
         return;
     }
     {
@@ -143,10 +145,14 @@ void PulseCapture::disconnect() {
     }
 }
 
-void PulseCapture::fail(const char* what) {
-    const int error = context != nullptr ? pa_context_errno(context) : PA_ERR_INTERNAL;
-    queue->fail(std::string(what) + ": " + pa_strerror(error));
+void PulseCapture::fail(const char* what) noexcept {
     ended = true;
+    const int error = context != nullptr ? pa_context_errno(context) : PA_ERR_INTERNAL;
+    try {
+        queue->fail(std::string(what) + ": " + pa_strerror(error));
+    } catch (const std::bad_alloc&) {
+        queue->fail("no memory");  // short enough to take none
+    }
 }
 
 void PulseCapture::onContextState(pa_context* context, void* user) {

@@ -43,7 +43,7 @@ class PulseCapture {
     void openStream();
     void readStream();
     void disconnect();
-    void fail(const char* what);
+    void fail(const char* what) noexcept;
     static void onContextState(pa_context* context, void* user);
     static void onStreamState(pa_stream* stream, void* user);
     static void onStreamReadable(pa_stream* stream, size_t size, void* user);

@@ -139,6 +139,11 @@ void QueuedRecorder::startWatch() {
 }
 
 void QueuedRecorder::onWatchTick() {
+    // For sound whose wake-up was lost for want of memory.
+    deliver();
+    if (!isRecording()) {
+        return;
+    }
     const unsigned arrivals = queue->getArrivalCount();
     if (arrivals != arrivalsSeen) {
         arrivalsSeen = arrivals;

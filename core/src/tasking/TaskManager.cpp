@@ -21,18 +21,20 @@ class TaskManager::Impl : public boost::enable_shared_from_this<TaskManager::Imp
   public:
     Impl() { spareJobs.reserve(SPARE_JOBS_MAX); }
 
-    void add(const boost::shared_ptr<Task>& task) {
+    bool add(const boost::shared_ptr<Task>& task) {
         if (!KOR_ASSERT(find(task) == jobs.end())) {
-            return;
+            return false;
         }
         jobs.reserve(jobs.size() + 1);
         std::unique_ptr<Job> job = makeJob();
         job->impl = shared_from_this();
         job->task = task;
         job->work = kdQueueWorkKOR(&Job::run, &Job::complete, job.get());
-        if (job->work != nullptr) {
+        const bool isQueued = job->work != nullptr;
+        if (isQueued) {
             jobs.push_back(job.release());
         }
+        return isQueued;
     }
 
     void cancel(const boost::shared_ptr<Task>& task) {
@@ -110,11 +112,9 @@ TaskManager::~TaskManager() {
     impl->cancelAll();
 }
 
-void TaskManager::addTask(const boost::shared_ptr<Task>& task, int /*priority*/) {
+bool TaskManager::addTask(const boost::shared_ptr<Task>& task, int /*priority*/) {
     const Util::EventLock lock;
-    if (KOR_ASSERT(task)) {
-        impl->add(task);
-    }
+    return KOR_ASSERT(task) && impl->add(task);
 }
 
 void TaskManager::cancelTask(const boost::shared_ptr<Task>& task) {

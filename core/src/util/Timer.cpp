@@ -2,6 +2,7 @@
 
 #include <boost/enable_shared_from_this.hpp>
 #include <boost/make_shared.hpp>
+#include <new>
 #include <utility>
 
 #include "core/util/EventLock.h"
@@ -9,6 +10,15 @@
 #include "pal/kd_event.h"
 
 namespace Util {
+
+namespace {
+
+bool isTimerType(int type) {
+    return type == KD_TIMER_ONESHOT || type == KD_TIMER_PERIODIC_AVERAGE ||
+           type == KD_TIMER_PERIODIC_MINIMUM;
+}
+
+}  // namespace
 
 struct Timer::State : boost::enable_shared_from_this<Timer::State> {
     explicit State(std::function<void()> function) : callback(std::move(function)) {}
@@ -38,7 +48,9 @@ struct Timer::State : boost::enable_shared_from_this<Timer::State> {
 Timer::Timer(std::function<void()> callback)
     : state(boost::make_shared<State>(std::move(callback))) {
     KOR_ASSERT(state->callback);
-    kdInstallCallback(&State::onTimer, KD_EVENT_TIMER, state.get());
+    if (kdInstallCallback(&State::onTimer, KD_EVENT_TIMER, state.get()) != 0) {
+        throw std::bad_alloc();
+    }
 }
 
 Timer::~Timer() {
@@ -55,6 +67,9 @@ void Timer::start(int type, int64_t periodNs) {
     state->cancel();
     state->type = type;
     state->handle = kdSetTimer(periodNs, type, state.get());
+    if (state->handle == nullptr && isTimerType(type)) {
+        throw std::bad_alloc();
+    }
     KOR_ASSERT(state->handle);
 }
 

@@ -31,6 +31,9 @@ class KORVEL_CORE_API Encoder {
 
     /** Ends the stream: pads and encodes what is left and flushes the last page. */
     virtual void finish() = 0;
+
+    /** Whether sound was lost for want of memory. Default: no. */
+    virtual bool hasFailed() const;
 };
 
 }  // namespace Sound

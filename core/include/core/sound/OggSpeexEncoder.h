@@ -42,6 +42,7 @@ class KORVEL_CORE_API OggSpeexEncoder : public Encoder {
     void encode(const SoundDataBuffer& buffer) override;
     boost::shared_ptr<SoundDataBuffer> takeOutput(int maxBytes) override;
     void finish() override;
+    bool hasFailed() const override;
 
   private:
     class Impl;

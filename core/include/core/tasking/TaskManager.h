@@ -24,8 +24,10 @@ class KORVEL_CORE_API TaskManager : public Util::Singleton<TaskManager> {
     /**
      * Queues a task; it is kept alive until it has completed or its cancellation has taken effect.
      * @param priority reserved; pass 0
+     * @return false when the task will not run: there is no memory or no thread for it, or it is a
+     *         broken invariant (no task, or one that is queued already)
      */
-    void addTask(const boost::shared_ptr<Task>& task, int priority);
+    bool addTask(const boost::shared_ptr<Task>& task, int priority);
 
     /**
      * Guarantees that the task's `onTaskCompleted` is not called any more; never waits for the

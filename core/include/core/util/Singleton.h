@@ -5,6 +5,7 @@
 #pragma once
 
 #include <atomic>
+#include <memory>
 
 #include "core/Export.h"
 #include "core/util/EventLock.h"
@@ -71,9 +72,9 @@ class Singleton : public SingletonBase {
         }
         const EventLock lock;
         if (pointer.load(std::memory_order_relaxed) == nullptr) {
-            T* made = new T();
-            pointer.store(made, std::memory_order_release);
-            SingletonStorage::addSingleton(made);
+            std::unique_ptr<T> made(new T());
+            SingletonStorage::addSingleton(made.get());
+            pointer.store(made.release(), std::memory_order_release);
             static const EndOfLibrary endOfLibrary;
             static const bool endsEvents = (SingletonStorage::endEventsFirst(), true);
             static_cast<void>(endsEvents);

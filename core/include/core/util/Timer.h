@@ -21,7 +21,11 @@ namespace Util {
  */
 class KORVEL_CORE_API Timer {
   public:
-    /** @param callback must not be empty and must not throw */
+    /**
+     * Throws `std::bad_alloc` when there is no memory.
+     * @param callback must not be empty. What it throws ends the call only; see
+     *                 `kdReportExceptionKOR`.
+     */
     explicit Timer(std::function<void()> callback);
     ~Timer();
     Timer(const Timer&) = delete;
@@ -31,6 +35,9 @@ class KORVEL_CORE_API Timer {
      * Starts the timer, anew if it runs.
      * @param type     `KD_TIMER_ONESHOT` (61) or `KD_TIMER_PERIODIC_AVERAGE` (62)
      * @param periodNs time to the first call, and between further ones, in nanoseconds
+     *
+     * Throws `std::bad_alloc` when there is no memory, or no event thread to call the function; the
+     * timer does not run then. A periodic timer that runs needs neither.
      */
     void start(int type, int64_t periodNs);
 
