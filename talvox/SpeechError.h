@@ -18,14 +18,17 @@ class TALVOX_API SpeechError {
   public:
     /** The numbers are fixed. */
     enum Code {
-        /** The device recognizer failed without a cause that has a code here. */
+        /**
+         * The engine got no thread, memory ran out, or a listener threw. The device recognizer: it
+         * failed without a cause that has a code here.
+         */
         ErrorUnknown = 0,
         /**
          * The recorder could not be started, failed, or delivered too little; or the session was
          * stopped before any sound. The device recognizer: no microphone, or no permission.
          */
         ErrorAudio = 1,
-        /** Reserved: nothing reports it. */
+        /** There was no memory or thread for the Speex encoder. */
         ErrorEncoding = 2,
         /**
          * Everything between the engine and results: no network at the start, no address or

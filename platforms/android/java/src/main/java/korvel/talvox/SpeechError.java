@@ -2,12 +2,12 @@ package korvel.talvox;
 
 /**
  * Why a recognition ended without results. The device recognizer, Android's own, reports errors of
- * its own choice; the cloud recognizer uses all but {@link #ENCODING} and {@link #SERVER}.
+ * its own choice; the cloud recognizer uses all but {@link #SERVER}.
  */
 public enum SpeechError {
     /**
-     * The device recognizer failed without a cause that has a value here; or, with either
-     * recognizer, there is no memory for the results.
+     * The engine got no thread, or memory ran out, also for the results of either recognizer. The
+     * device recognizer: it failed without a cause that has a value here.
      */
     UNKNOWN("ErrorUnknown"),
     /**
@@ -15,7 +15,7 @@ public enum SpeechError {
      * recognition was stopped before any sound; the log says which.
      */
     AUDIO("ErrorAudio"),
-    /** Reserved: nothing reports it. */
+    /** There was no memory or thread for the Speex encoder. */
     ENCODING("ErrorEncoding"),
     /**
      * Everything between the engine and results: no network at the start, no address or identifier
