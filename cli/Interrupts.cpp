@@ -5,6 +5,7 @@
 #include <atomic>
 #include <cerrno>
 #include <csignal>
+#include <system_error>
 #include <utility>
 
 namespace Cli {
@@ -46,7 +47,13 @@ Interrupts::Interrupts(std::function<void()> onInterrupt) : callback(std::move(o
     pipeReadEnd = ends[0];
     pipeWriteEnd = ends[1];
     signalCount = 0;
-    watcher = std::thread([this] { watch(); });
+    try {
+        watcher = std::thread([this] { watch(); });
+    } catch (const std::system_error&) {
+        close(pipeWriteEnd.exchange(-1));
+        close(pipeReadEnd);
+        return;
+    }
 
     struct sigaction action = {};
     action.sa_handler = onSignal;
