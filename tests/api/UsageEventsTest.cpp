@@ -46,6 +46,17 @@ TEST_F(UsageEvents, WaitForAnEndpointThatCanBeAsked) {
     EXPECT_EQ("no address", LogCollector::getUrl());
 }
 
+TEST_F(UsageEvents, AreNotStoredWhereThereIsNoFolder) {
+    LogCollector::LogStoreOptions options;
+    EXPECT_EQ(4 << 20, options.maxBytes);
+    EXPECT_EQ(int64_t{30} * 24 * 60 * 60, options.maxAgeS);
+    options.folder = "/dev/null";
+    EXPECT_FALSE(LogCollector::openStore(options));
+    EXPECT_THAT(messages,
+                ElementsAre("LogStore: /dev/null is not used, records are in memory only: "
+                            "Not a directory"));
+}
+
 TEST_F(UsageEvents, AreLoggedAtALevelThatTheApplicationSets) {
     LogCollector::LogEvent event(LogCollector::LogEvent::error, "lost", {{"code", "7"}});
     event.addParam("code", "8");
