@@ -55,6 +55,16 @@ class File {
                bytes.compare(from, record.end - from, sound, from, record.end - from) == 0;
     }
 
+    /** Whether a change makes a frame of its own: the fuzzer sees the check sums. */
+    bool isForged(const Segment& segment) const {
+        return std::any_of(
+            segment.frames.begin(), segment.frames.end(), [this](const Frame& frame) {
+                return std::none_of(
+                    records.begin(), records.end(),
+                    [&frame](const Written& record) { return record.offset == frame.offset; });
+            });
+    }
+
     std::string bytes;
     std::vector<Written> records;
 
@@ -120,7 +130,8 @@ void checkReader(const File& file) {
             std::find_if(segment.frames.begin(), segment.frames.end(),
                          [&record](const Frame& frame) { return frame.offset == record.offset; });
         const bool isFound = found != segment.frames.end() && found->text == record.text;
-        require(isFound || !file.isUntouched(record) || segment.head == Segment::Head::NEWER,
+        require(isFound || !file.isUntouched(record) || segment.head == Segment::Head::NEWER ||
+                    file.isForged(segment),
                 "a record that no change touches is found");
     }
 }

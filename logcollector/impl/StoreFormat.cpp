@@ -89,15 +89,13 @@ class Reader {
     /** @return where to go on */
     std::size_t readFrame(std::size_t offset) {
         const std::optional<std::size_t> size = sizeOfSoundFront(offset);
-        if (!size) {
+        const std::size_t payload = offset + FRONT_BYTES;
+        if (!size || *size > bytes.size() - payload ||
+            !readPayload(offset, bytes.substr(payload, *size))) {
             ++segment.badBytes;
             return offset + 1;
         }
-        const std::size_t left = bytes.size() - offset - FRONT_BYTES;
-        if (*size > left || !readPayload(offset, bytes.substr(offset + FRONT_BYTES, *size))) {
-            segment.badBytes += FRONT_BYTES + std::min(*size, left);
-        }
-        return offset + FRONT_BYTES + std::min(*size, left);
+        return payload + *size;
     }
 
     std::optional<std::size_t> sizeOfSoundFront(std::size_t offset) const {

@@ -5,17 +5,23 @@
  * A store is a row of segments, files with ascending numbers. A segment is a head and then frames,
  * one per record, without gaps. All numbers are little-endian.
  *
- *     head (16 bytes):  8 magic, 4 version, 4 check sum of these 12 bytes and the segment's number
- *     frame:            4 mark: 0, or DONE when the record has left the store
- *                       4 check sum of the next 20 bytes, the segment's number and the frame's
- * offset 4 kind, 4 size of the payload, 8 time in seconds since 1970 4 check sum of the payload
- *                       then the payload
+ *     head, 16 bytes:
+ *       8  magic
+ *       4  version
+ *       4  check sum of these 12 bytes and the number of the segment
+ *
+ *     front of a frame, 28 bytes:
+ *       4  mark: 0, or DONE when the record has left the store
+ *       4  check sum of the next 20 bytes, the number of the segment and the offset of the frame
+ *       4  kind
+ *       4  size of the payload
+ *       8  time in seconds since 1970
+ *       4  check sum of the payload, which follows
  *
  * Frames are appended and never change, but for the mark, which one write of four bytes sets. Of a
- * damaged mark the record counts as not yet delivered. A frame with a sound front and a damaged
- * payload is skipped as a whole; after a damaged front the reader looks for the next sound one,
- * byte by byte. Number and offset are part of the check sum, so that bytes are a frame only where
- * they were written.
+ * damaged mark the record counts as not yet delivered. After any other damage the reader looks for
+ * the next sound frame, byte by byte. Number and offset are part of the check sum, so that bytes
+ * are a frame only where they were written.
  */
 #pragma once
 
