@@ -2,31 +2,26 @@
 #include <gtest/gtest.h>
 
 #include <filesystem>
-#include <fstream>
 #include <sstream>
 #include <string>
 #include <vector>
 
+#include "support/ScratchDirectory.h"
+
 namespace {
 
-const std::filesystem::path PROJECT(PROJECT_DIR);
+using TestSupport::ScratchDirectory;
 
-std::string readFile(const std::filesystem::path& path) {
-    std::ifstream file(path);
-    std::ostringstream text;
-    text << file.rdbuf();
-    EXPECT_FALSE(text.str().empty()) << path;
-    return text.str();
-}
+const std::filesystem::path PROJECT(PROJECT_DIR);
 
 /** The text of a file, or of all files of a folder. */
 std::string readSources(const std::filesystem::path& path) {
     if (!std::filesystem::is_directory(path)) {
-        return readFile(path);
+        return ScratchDirectory::read(path);
     }
     std::string sources;
     for (const auto& entry : std::filesystem::directory_iterator(path)) {
-        sources += entry.is_regular_file() ? readFile(entry.path()) : std::string();
+        sources += entry.is_regular_file() ? ScratchDirectory::read(entry.path()) : std::string();
     }
     return sources;
 }
@@ -43,7 +38,7 @@ std::vector<std::string> readCells(const std::string& row) {
 }
 
 TEST(CompatibilityDocument, NamesOnlyWhatTheSourcesHave) {
-    std::istringstream page(readFile(PROJECT / "docs/COMPATIBILITY.md"));
+    std::istringstream page(ScratchDirectory::read(PROJECT / "docs/COMPATIBILITY.md"));
     int rows = 0;
     for (std::string line; std::getline(page, line);) {
         if (line.compare(0, 3, "| `") != 0) {

@@ -2,27 +2,20 @@
 #include <gmock/gmock.h>
 
 #include <filesystem>
-#include <fstream>
 #include <regex>
 #include <set>
-#include <sstream>
 #include <string>
 #include <vector>
+
+#include "support/ScratchDirectory.h"
 
 namespace {
 
 using ::testing::HasSubstr;
+using TestSupport::ScratchDirectory;
 
 const std::filesystem::path PROJECT(PROJECT_DIR);
 const std::string ELLIPSIS = "…";
-
-std::string readFile(const std::filesystem::path& path) {
-    std::ifstream file(path);
-    std::ostringstream text;
-    text << file.rdbuf();
-    EXPECT_FALSE(text.str().empty()) << path;
-    return text.str();
-}
 
 /** The recognizers' sources. */
 const std::vector<std::string> RECOGNIZERS = {"talvox", "platforms/android/jni"};
@@ -35,7 +28,7 @@ std::string readSources(const std::vector<std::string>& folders) {
         for (const auto& entry : std::filesystem::recursive_directory_iterator(PROJECT / folder)) {
             const std::filesystem::path& path = entry.path();
             if (path.extension() == ".cpp" || path.extension() == ".h") {
-                sources += readFile(path);
+                sources += ScratchDirectory::read(path);
             }
         }
     }
@@ -80,11 +73,11 @@ std::set<std::string> findReportedReasons(const std::string& sources) {
 }
 
 TEST(ErrorsDocument, HasEveryCodeWithItsJavaName) {
-    const std::string page = readFile(PROJECT / "docs/ERRORS.md");
-    const std::string java =
-        readFile(PROJECT / "platforms/android/java/src/main/java/korvel/talvox/SpeechError.java");
+    const std::string page = ScratchDirectory::read(PROJECT / "docs/ERRORS.md");
+    const std::string java = ScratchDirectory::read(
+        PROJECT / "platforms/android/java/src/main/java/korvel/talvox/SpeechError.java");
     int codes = 0;
-    findAll(readFile(PROJECT / "talvox/SpeechError.h"), "(Error[A-Za-z]+) = ([0-8]),",
+    findAll(ScratchDirectory::read(PROJECT / "talvox/SpeechError.h"), "(Error[A-Za-z]+) = ([0-8]),",
             [&](const std::smatch& match) {
                 ++codes;
                 const std::string name = match[1];
@@ -100,7 +93,8 @@ TEST(ErrorsDocument, HasEveryCodeWithItsJavaName) {
 
 TEST(ErrorsDocument, NamesOnlyReasonsThatTheSourcesHave) {
     const std::string sources = readSources(ALL);
-    for (const std::string& reason : readReasons(readFile(PROJECT / "docs/ERRORS.md"))) {
+    for (const std::string& reason :
+         readReasons(ScratchDirectory::read(PROJECT / "docs/ERRORS.md"))) {
         std::string literal = reason.substr(0, reason.find(ELLIPSIS));
         literal = literal.substr(0, literal.find(" 503"));
         literal = std::regex_replace(literal, std::regex("\""), "\\\"");
@@ -109,7 +103,8 @@ TEST(ErrorsDocument, NamesOnlyReasonsThatTheSourcesHave) {
 }
 
 TEST(ErrorsDocument, NamesEveryReasonThatARecognizerReports) {
-    const std::set<std::string> listed = readReasons(readFile(PROJECT / "docs/ERRORS.md"));
+    const std::set<std::string> listed =
+        readReasons(ScratchDirectory::read(PROJECT / "docs/ERRORS.md"));
     const std::set<std::string> reported = findReportedReasons(readSources(RECOGNIZERS));
     EXPECT_GE(reported.size(), 15U);
     for (const std::string& reason : reported) {
