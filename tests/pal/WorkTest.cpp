@@ -1,5 +1,6 @@
 #include <gmock/gmock.h>
 
+#include <array>
 #include <condition_variable>
 #include <memory>
 #include <mutex>
@@ -70,11 +71,21 @@ class Job {
     bool gateOpen;
 };
 
-/** Lets the event thread go through what is queued behind completions that are under way. */
+/**
+ * Waits until all work that has begun is over, also that of which nothing is heard: only then are
+ * all workers free at a time.
+ */
 void settle() {
-    Job last;
-    last.queue();
-    last.waitFor("wd");
+    std::array<std::unique_ptr<Job>, 4> all;
+    for (std::unique_ptr<Job>& each : all) {
+        each = std::make_unique<Job>(true);
+        each->queue();
+        each->waitFor("w");
+    }
+    for (const std::unique_ptr<Job>& each : all) {
+        each->letGo();
+        each->waitFor("wd");
+    }
     EXPECT_EQ(kdDrainEventsKOR(), 0);
 }
 
