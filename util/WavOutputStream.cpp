@@ -49,6 +49,7 @@ bool WavOutputStream::init(const std::string& path, const Sound::SoundDataInfo& 
         return false;
     }
     dataBytes = 0;
+    hasFailed = false;
     return true;
 }
 
@@ -64,6 +65,10 @@ int WavOutputStream::write(const void* data, int size) {
     if (written >= 1) {
         dataBytes = WavHeader::grow(dataBytes, written);
     }
+    if (written < size && !hasFailed) {
+        hasFailed = true;
+        kdLogFormatMessage("%s: error in write", "write");
+    }
     return written;
 }
 
@@ -72,8 +77,10 @@ void WavOutputStream::close() {
         logFileNotOpened("close");
         return;
     }
-    patchHeader();
-    kdFclose(file);
+    const bool isPatched = patchHeader();
+    if (kdFclose(file) != 0 && isPatched) {
+        kdLogFormatMessage("%s: error in close", "close");
+    }
     kdLogFormatMessage("%s: after kdFclose", "close");
 }
 

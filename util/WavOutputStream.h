@@ -41,7 +41,8 @@ class TALVOX_API WavOutputStream : public IO::OutputStream {
     bool init(const std::string& path, const Sound::SoundDataInfo& format);
 
     /**
-     * Appends sample bytes.
+     * Appends sample bytes. The first failure is logged; what a disk has no room for is not in the
+     * file, and the header does not count it.
      * @return the number of bytes written, or -1 without a file or with a negative size
      */
     int write(const void* data, int size) override;
@@ -58,6 +59,7 @@ class TALVOX_API WavOutputStream : public IO::OutputStream {
     Sound::SoundDataInfo info;
     KDFile* file = nullptr;
     std::uint32_t dataBytes = 0;
+    bool hasFailed = false;
 };
 
 }  // namespace Util

@@ -2,6 +2,7 @@
 
 #include <cstdint>
 #include <cstdio>
+#include <cstring>
 #include <exception>
 #include <memory>
 #include <mutex>
@@ -78,6 +79,10 @@ KDFile* openFile(std::string path, const char* mode) {
     open->file = std::fopen(path.c_str(), mode);
     if (open->file == nullptr) {
         return nullptr;
+    }
+    if (std::strpbrk(mode, "wa+") != nullptr) {
+        // What a write returns is what the file has, also when the disk is full.
+        std::setvbuf(open->file, nullptr, _IONBF, 0);
     }
     const std::lock_guard<std::mutex> lock(system.mutex);
     return system.files.add(open);

@@ -2,6 +2,8 @@
 
 #include <dlfcn.h>
 #include <gmock/gmock.h>
+#include <signal.h>
+#include <sys/resource.h>
 #include <unistd.h>
 
 #include <cstdint>
@@ -29,7 +31,7 @@ KDsize failingSize = 0;
 
 }  // namespace
 
-/** Stands in front of the platform layer's own: a buffered file hides a full device from us. */
+/** Stands in front of the platform layer's own. */
 KDsize kdFwrite(const void* buffer, KDsize size, KDsize count, KDFile* file) {
     static const auto real = reinterpret_cast<decltype(&kdFwrite)>(dlsym(RTLD_NEXT, "kdFwrite"));
     return size == failingSize ? 0 : real(buffer, size, count, file);
@@ -38,6 +40,26 @@ KDsize kdFwrite(const void* buffer, KDsize size, KDsize count, KDFile* file) {
 namespace {
 
 const Sound::SoundDataInfo WIDE(Sound::SoundDataInfo::NONE, 1, 16000, 2);
+
+/** Files of this process have room for so many bytes while it lives. */
+class FileSizeLimit {
+  public:
+    explicit FileSizeLimit(rlim_t bytes) : handler(signal(SIGXFSZ, SIG_IGN)) {
+        getrlimit(RLIMIT_FSIZE, &before);
+        const rlimit limit{bytes, before.rlim_max};
+        setrlimit(RLIMIT_FSIZE, &limit);
+    }
+    ~FileSizeLimit() {
+        setrlimit(RLIMIT_FSIZE, &before);
+        signal(SIGXFSZ, handler);
+    }
+    FileSizeLimit(const FileSizeLimit&) = delete;
+    FileSizeLimit& operator=(const FileSizeLimit&) = delete;
+
+  private:
+    rlimit before{};
+    void (*const handler)(int);
+};
 
 class WavOutputStreamTest : public ::testing::Test {
   protected:
@@ -213,15 +235,28 @@ TEST_F(WavOutputStreamTest, AFullDeviceIsReported) {
     if (access("/dev/full", W_OK) != 0) {
         GTEST_SKIP() << "no /dev/full";
     }
-    const std::vector<char> megabyte(1U << 20U);
-    WavOutputStream stream;
-    ASSERT_TRUE(stream.init("/dev/full", WIDE));
-    EXPECT_LT(stream.write(megabyte.data(), static_cast<int>(megabyte.size())),
-              static_cast<int>(megabyte.size()));
     const LogCapture log;
-    stream.close();
-    EXPECT_TRUE(log.containsPart("patchHeader: error in "));
-    EXPECT_TRUE(log.contains("close: after kdFclose"));
+    WavOutputStream stream;
+    EXPECT_FALSE(stream.init("/dev/full", WIDE));
+    EXPECT_THAT(log.messages(), ElementsAre("writeHeader: error in write"));
+}
+
+TEST_F(WavOutputStreamTest, TheHeaderCountsWhatAFullFileHolds) {
+    const int size = 3200;
+    const std::vector<char> buffer(size, 7);
+    const LogCapture log;
+    {
+        const FileSizeLimit limit(4096);
+        WavOutputStream stream;
+        ASSERT_TRUE(stream.init(path, WIDE));
+        EXPECT_EQ(size, stream.write(buffer.data(), size));
+        EXPECT_EQ(4096 - 44 - size, stream.write(buffer.data(), size));
+        EXPECT_EQ(0, stream.write(buffer.data(), size));
+    }
+    EXPECT_EQ(4096U, bytes().size());
+    EXPECT_EQ(4096U - 8, number(bytes(), 4, 4));
+    EXPECT_EQ(4096U - 44, number(bytes(), 40, 4));
+    EXPECT_THAT(log.messages(), ElementsAre("write: error in write", "close: after kdFclose"));
 }
 
 TEST_F(WavOutputStreamTest, AHeaderThatCannotBeWrittenIsReported) {

@@ -36,7 +36,11 @@ KD_API KDint kdFclose(KDFile* file);
 /** Reads up to `count` items of `size` bytes. @return the number of whole items read. */
 KD_API KDsize kdFread(void* buffer, KDsize size, KDsize count, KDFile* file);
 
-/** Writes `count` items of `size` bytes. @return the number of whole items written. */
+/**
+ * Writes `count` items of `size` bytes. Nothing is buffered: what a full disk refuses is missing in
+ * the result of the call that wrote it.
+ * @return the number of whole items written.
+ */
 KD_API KDsize kdFwrite(const void* buffer, KDsize size, KDsize count, KDFile* file);
 
 /** Moves the position. @return 0, or -1 on failure. */
