@@ -131,6 +131,9 @@ void checkRest(const Holdings& wanted, const Report& report, Faults& faults) {
     if (report.holdings.connections > std::max(wanted.connections, CONNECTIONS_KEPT)) {
         checkCount(report.holdings.connections, wanted.connections, "connections", faults);
     }
+    if (report.dumpFault[0] != '\0') {
+        faults.emplace_back(report.dumpFault);
+    }
     if (report.pendingRecords > 0) {
         faults.push_back(std::to_string(report.pendingRecords) + " usage records stick");
     }

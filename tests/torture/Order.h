@@ -61,6 +61,7 @@ struct Report {
     char failed[TEXT_MAX] = {};           /**< the same; empty when no call failed */
     Holdings holdings;
     std::size_t pendingRecords = 0;
+    char dumpFault[TEXT_MAX] = {}; /**< what is wrong with the dumped sound */
     std::int64_t exitBeganNs = 0;
     std::size_t logSize = 0;
     char log[LOG_MAX] = {};

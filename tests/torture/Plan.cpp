@@ -7,7 +7,8 @@ namespace Torture {
 namespace {
 
 const std::array<const char*, KIND_COUNT> KIND_NAMES = {
-    "memory", "threads", "descriptors", "sockets", "files", "clock", "names", "pulse", "tls"};
+    "memory", "threads", "descriptors", "sockets", "files",
+    "clock",  "names",   "pulse",       "tls",     "space"};
 
 Plan make(const char* name, const char* title, void (*change)(Plan&)) {
     Plan plan{name, title};

@@ -25,6 +25,7 @@
 #include "Order.h"
 #include "Pipe.h"
 #include "Plan.h"
+#include "Room.h"
 #include "SessionCourse.h"
 #include "core/sound/Recorder.h"
 #include "logcollector/LogCollector.h"
@@ -51,6 +52,9 @@ constexpr int POINT_LIMIT_MS = 60000;
 constexpr std::int64_t NS_PER_MS = 1000000;
 constexpr std::int64_t CLOCK_START_NS = 1000000 * NS_PER_MS;
 constexpr std::int64_t RECORDS_WAIT_MS = 120000;
+
+/** The sound of an utterance, its header, and a little more. */
+constexpr long PAGES_OF_A_DUMP = 12;
 constexpr std::size_t OUTPUT_MAX = 65536;
 constexpr unsigned REST_STEP_US = 5000;
 constexpr int REST_STEPS_MAX = 1000;
@@ -178,6 +182,26 @@ void settle(const Order& order, Report& report) {
     awaitRest(order, report);
 }
 
+void checkDump(const Plan& plan, const Order& order, Report& report, bool isWhole) {
+    if (plan.dumps && report.dumpFault[0] == '\0') {
+        const std::string fault = findDumpFault(std::string(order.directory) + "/in.wav", isWhole);
+        std::snprintf(report.dumpFault, sizeof(report.dumpFault), "%s", fault.c_str());
+    }
+}
+
+/** The session in which something fails. */
+void runFirst(const Plan& plan, const Order& order, Report& report) {
+    const Room room(order, report);
+    report.stage = Stage::SESSION;
+    arm(order, report);
+    runCourse(plan, order, SessionCourse::Turn::FIRST, report.first);
+    disarm(report);
+    report.calls[static_cast<int>(Kind::SPACE)] = plan.dumps ? PAGES_OF_A_DUMP : 0;
+    if (order.kind == static_cast<int>(Kind::SPACE)) {
+        checkDump(plan, order, report, false);
+    }
+}
+
 void runPoint(const Order& order, Report& report) {
     const Plan& plan = getPlans()[static_cast<std::size_t>(order.session)];
     static const Harness harness;
@@ -189,15 +213,13 @@ void runPoint(const Order& order, Report& report) {
     if (plan.warm) {
         runCourse(plan, order, SessionCourse::Turn::NEXT, warmUp);
     }
-    report.stage = Stage::SESSION;
-    arm(order, report);
-    runCourse(plan, order, SessionCourse::Turn::FIRST, report.first);
-    disarm(report);
+    runFirst(plan, order, report);
     printFailure();
     report.stage = Stage::NEXT_SESSION;
     runCourse(plan, order, SessionCourse::Turn::NEXT, report.next);
     current = nullptr;
     report.stage = Stage::SETTLES;
+    checkDump(plan, order, report, true);
     settle(order, report);
     Sound::Recorder::setFactory({});
     report.stage = Stage::EXITS;
