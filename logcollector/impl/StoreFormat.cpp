@@ -34,14 +34,14 @@ Number get(std::string_view bytes, std::size_t offset) {
 uint32_t sumOfHead(std::string_view bytes, uint32_t segment) {
     std::string place;
     put(place, segment);
-    return crc32(place, crc32(bytes.substr(0, HEAD_BYTES - sizeof(uint32_t))));
+    return crc32({bytes.substr(0, HEAD_BYTES - sizeof(uint32_t)), place});
 }
 
 uint32_t sumOfFront(std::string_view front, uint32_t segment, uint32_t offset) {
     std::string place;
     put(place, segment);
     put(place, offset);
-    return crc32(place, crc32(front.substr(SUMMED_FROM, FRONT_BYTES - SUMMED_FROM)));
+    return crc32({front.substr(SUMMED_FROM, FRONT_BYTES - SUMMED_FROM), place});
 }
 
 /** Makes a frame of the payload that follows the room for its front. */
@@ -53,7 +53,7 @@ void fillFront(std::string& frame, Kind kind, uint32_t segment, uint32_t offset,
     put(front, static_cast<uint32_t>(kind));
     put(front, static_cast<uint32_t>(payload.size()));
     put(front, time);
-    put(front, crc32(payload));
+    put(front, crc32({payload}));
     std::string sum;
     put(sum, sumOfFront(front, segment, offset));
     front.replace(MARK_BYTES, sum.size(), sum);
@@ -116,7 +116,7 @@ class Reader {
     bool readPayload(std::size_t offset, std::string_view payload) {
         const auto kind = static_cast<Kind>(get<uint32_t>(bytes, offset + 8));
         const std::size_t before = kind == Kind::NOTICE ? NOTICE_BYTES : 0;
-        if (crc32(payload) != get<uint32_t>(bytes, offset + 24) || payload.size() < before) {
+        if (crc32({payload}) != get<uint32_t>(bytes, offset + 24) || payload.size() < before) {
             return false;
         }
         Frame frame;

@@ -276,7 +276,7 @@ TEST_F(LogStoreTest, RefusesAFolderOfALaterVersion) {
     std::string bytes = folder.read(1);
     bytes[8] = 2;
     const std::string place("\1\0\0\0", 4);
-    const uint32_t sum = LogCollector::crc32(place, LogCollector::crc32(bytes.substr(0, 12)));
+    const uint32_t sum = LogCollector::crc32({std::string_view(bytes).substr(0, 12), place});
     std::memcpy(&bytes[12], &sum, sizeof(sum));
     folder.write(1, bytes);
     EXPECT_FALSE(open());
