@@ -9,6 +9,7 @@
 #include <fstream>
 #include <optional>
 
+#include "LogOutput.h"
 #include "Text.h"
 #include "UsageError.h"
 #include "WavHead.h"
@@ -20,6 +21,8 @@ namespace {
 
 // The root below which a session writes.
 const char* const DUMP_ROOT = "/removable";
+// "write: error in write", "close: error in close" and the like.
+const char* const WRITE_FAILURE = ": error in ";
 const mode_t FILE_MODE = 0666;
 
 [[noreturn]] void refuse(const std::string& path, const std::string& reason) {
@@ -58,13 +61,17 @@ Dump::Dump(const std::string& directory) : directoryPath(directory), path(direct
     checkFile(path);
 }
 
-void Dump::begin() const {
+void Dump::begin(LogOutput& log) const {
+    log.watchFor(WRITE_FAILURE);
     // What an earlier session left must not pass for this one's.
     std::ofstream(path, std::ios::binary | std::ios::trunc).close();
     kdMountKOR(DUMP_ROOT, directoryPath.c_str());
 }
 
-bool Dump::isComplete() const {
+bool Dump::isComplete(LogOutput& log) const {
+    if (log.hasSeenWatched()) {
+        return false;
+    }
     std::ifstream file(path, std::ios::binary);
     const std::optional<WavHead> head = readWavHead(file);
     file.clear();

@@ -4,9 +4,12 @@
 
 namespace Cli {
 
+class LogOutput;
+
 /**
  * The file "in.wav" of a directory, in which a session leaves what it heard. The engine writes it
- * and reports no failure; so the tool looks at the file before and after.
+ * and reports a failure to the log only; so the tool looks at the file before and after, and
+ * watches the log.
  */
 class Dump {
   public:
@@ -17,10 +20,10 @@ class Dump {
     explicit Dump(const std::string& directory);
 
     /** Empties the file and makes the sessions from now on write it. */
-    void begin() const;
+    void begin(LogOutput& log) const;
 
-    /** Whether the file holds all of the sound that its header promises; valid after a session. */
-    bool isComplete() const;
+    /** Whether the file holds all that was heard; valid after a session. */
+    bool isComplete(LogOutput& log) const;
 
     const std::string& getPath() const { return path; }
 

@@ -2,6 +2,7 @@
 
 #include <mutex>
 #include <ostream>
+#include <string>
 
 namespace Cli {
 
@@ -19,12 +20,23 @@ class LogOutput {
     /** Any thread. After `show(false)` has returned no message is written any more. */
     void show(bool value);
 
+    /**
+     * From now on looks for `text` in each message, shown or not: some failures are known to the
+     * log only. Any thread.
+     */
+    void watchFor(const std::string& text);
+
+    /** Whether the text of the latest `watchFor` has come. Any thread. */
+    bool hasSeenWatched();
+
   private:
     static void receive(const char* message, void* self);
 
     std::ostream& out;
     std::mutex mutex;
     bool shown = false;
+    std::string watched;
+    bool seenWatched = false;
 };
 
 }  // namespace Cli

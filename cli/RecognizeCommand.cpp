@@ -137,7 +137,7 @@ int runRecognize(const RecognizeOptions& options, Console& console, LogOutput& l
     Session session(settings);
     const Interrupts interrupts([&session] { session.interrupt(); });
     if (dump) {
-        dump->begin();
+        dump->begin(log);
     }
     const SessionEvent last = session.run(printers);
     int status = EXIT_OK;
@@ -149,7 +149,7 @@ int runRecognize(const RecognizeOptions& options, Console& console, LogOutput& l
         console.err << "talvox: cannot write to " << printable(options.eventsFile) << std::endl;
         status = EXIT_ENDED_IN_ERROR;
     }
-    if (dump && !dump->isComplete()) {
+    if (dump && !dump->isComplete(log)) {
         console.err << "talvox: the dump " << printable(dump->getPath()) << " is not complete"
                     << std::endl;
         status = EXIT_ENDED_IN_ERROR;

@@ -8,6 +8,7 @@
 
 #include "RecognizeRun.h"
 #include "ToolProcess.h"
+#include "support/ScratchDirectory.h"
 #include "support/ScriptedHttpServer.h"
 
 namespace {
@@ -74,6 +75,28 @@ INSTANTIATE_TEST_SUITE_P(Limits, ToolDescriptorsTest,
                          ::testing::Values(3, 4, 5, 6, 7, 8, 9, 10, 11, 12, 13, 14, 16, 20, 32,
                                            64));
 
+class ToolFileSizeTest : public ToolLimitsTest {};
+
+TEST_P(ToolFileSizeTest, SaysThatTheDumpIsNotCompleteThoughItsHeaderIsTrue) {
+    const TestSupport::ScratchDirectory directory;
+    ScriptedHttpServer server;
+    server.setDefaultAnswer(TestSupport::resultAnswer("<variant confidence=\"0.9\">go</variant>"));
+    std::vector<std::string> words = {"--fsize=" + std::to_string(GetParam()), TALVOX_BINARY};
+    const std::vector<std::string> arguments =
+        recognize(server.getUrl(), {"--json", "--dump", directory.path()});
+    words.insert(words.end(), arguments.begin(), arguments.end());
+    ToolProcess tool(PRLIMIT, words, voice());
+    const ToolResult result = tool.wait();
+    EXPECT_EQ(result.status, ENDED_IN_ERROR);
+    EXPECT_THAT(TestSupport::lines(result.out).back(), HasSubstr("\"event\":\"results\""));
+    const std::string path = directory.path("in.wav");
+    EXPECT_EQ(result.err, "talvox: the dump " + path + " is not complete\n");
+    EXPECT_EQ(TestSupport::ScratchDirectory::read(path).size(),
+              static_cast<std::size_t>(GetParam()));
+}
+
+INSTANTIATE_TEST_SUITE_P(Limits, ToolFileSizeTest, ::testing::Values(44, 45, 20000));
+
 class ToolThreadsTest : public ToolLimitsTest {};
 
 TEST_P(ToolThreadsTest, EndsOnceAndSaysHow) {
@@ -82,13 +105,10 @@ TEST_P(ToolThreadsTest, EndsOnceAndSaysHow) {
     }
     ScriptedHttpServer server;
     server.setDefaultAnswer(TestSupport::resultAnswer("<variant confidence=\"0.9\">go</variant>"));
-    // No other process has this user: the limit counts the threads of the tool alone.
-    std::vector<std::string> words = {"--reuid=54321",
-                                      "--regid=54321",
-                                      "--clear-groups",
-                                      PRLIMIT,
-                                      "--nproc=" + std::to_string(GetParam()),
-                                      TALVOX_BINARY};
+    // The limit counts the threads of a user, so each test has its own: they run side by side.
+    std::vector<std::string> words = {
+        "--reuid=" + std::to_string(54321 + GetParam()), "--regid=54321", "--clear-groups", PRLIMIT,
+        "--nproc=" + std::to_string(GetParam()),         TALVOX_BINARY};
     const std::vector<std::string> arguments =
         recognize(server.getUrl(), {"--json", "--format", "speex"});
     words.insert(words.end(), arguments.begin(), arguments.end());
