@@ -41,7 +41,6 @@ namespace {
 using CloudTest::EventRecorder;
 using CloudTest::Texts;
 using Talvox::Settings;
-using ::testing::ElementsAre;
 using TestSupport::AllocationFault;
 
 /** Counts the terminal events, without any memory of its own. */
@@ -90,7 +89,7 @@ class ScarcityTest : public CloudTest::SessionTest {
 
     /** A session whose listener takes no memory. */
     boost::shared_ptr<EndCounter> makeCountedSession() {
-        const auto counter = boost::make_shared<EndCounter>();
+        auto counter = boost::make_shared<EndCounter>();
         session = engine().createRecognizer(counter, boost::make_shared<Settings>());
         return counter;
     }

@@ -125,8 +125,10 @@ TEST(Server, ServesASlowClientByteByByte) {
 TEST(Server, ServesSeveralClientsAtOnce) {
     const uint16_t port = shared().server.getPort();
     const std::string expected = document(post(port, body()));
+    constexpr int CLIENTS = 4;
     std::vector<std::future<HttpAnswer>> answers;
-    for (int i = 0; i < 4; ++i) {
+    answers.reserve(CLIENTS);
+    for (int i = 0; i < CLIENTS; ++i) {
         answers.push_back(std::async(std::launch::async, [port] { return post(port, body()); }));
     }
     for (std::future<HttpAnswer>& answer : answers) {

@@ -1,5 +1,6 @@
 // The network thread's own class, with the scripted gateway in the place of libcurl: commands wait
 // until a test lets the gateway take a turn, and then run on the test's thread.
+#include <exception>
 #include <utility>
 
 #include "ScriptedGateway.h"
@@ -63,8 +64,12 @@ void Transport::abandon(const boost::shared_ptr<Transfer>& transfer) {
 }
 
 void Transport::requestAbandon(const boost::shared_ptr<Transfer>& transfer) noexcept {
-    const boost::shared_ptr<Transport> self = shared_from_this();
-    post([self, transfer] { self->abandon(transfer); });
+    try {
+        const boost::shared_ptr<Transport> self = shared_from_this();
+        post([self, transfer] { self->abandon(transfer); });
+    } catch (const std::exception&) {
+        std::terminate();
+    }
 }
 
 void Transport::stop() {
