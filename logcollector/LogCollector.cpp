@@ -1,6 +1,7 @@
 #include "logcollector/LogCollector.h"
 
 #include <boost/make_shared.hpp>
+#include <exception>
 #include <utility>
 
 #include "core/Logger.h"
@@ -13,6 +14,19 @@ namespace LogCollector {
 namespace {
 
 const char* const END_OF_SESSION = "logSessionStopped";
+
+/** Makes a call for the application, which gets no exception: its usage log is not worth its end.
+ */
+template <typename Call>
+void record(const char* operation, Call call) {
+    const Util::EventLock lock;
+    try {
+        call();
+    } catch (const std::exception& exception) {
+        Logger::log(Logger::PROBLEM, "%s::%s: nothing is recorded: %s", LogCollector::TAG.c_str(),
+                    operation, exception.what());
+    }
+}
 
 /** Makes the network's singleton the older one, so that it outlives the sender. */
 boost::shared_ptr<LogSender> makeSender() {
@@ -71,38 +85,39 @@ bool LogCollector::openStore(const LogStoreOptions& options) {
 }
 
 void LogCollector::startSession(const std::string& id) {
-    const Util::EventLock lock;
-    if (isOff("startSession")) {
-        return;
-    }
-    if (!sessions.insert(id).second) {
-        Logger::log(Logger::PROBLEM, "%s: session %s already exists.", TAG.c_str(), id.c_str());
-    }
+    record("startSession", [this, &id] {
+        if (!isOff("startSession") && !sessions.insert(id).second) {
+            Logger::log(Logger::PROBLEM, "%s: session %s already exists.", TAG.c_str(), id.c_str());
+        }
+    });
 }
 
 void LogCollector::stopSession(const std::string& id) {
-    const Util::EventLock lock;
-    if (isOff("stopSession") || !isOpen(id)) {
-        return;
-    }
-    sender->sendLogRecord(boost::make_shared<LogEvent>(LogEvent::event, END_OF_SESSION), id);
-    sessions.erase(id);
+    record("stopSession", [this, &id] {
+        if (!isOff("stopSession") && isOpen(id)) {
+            sender->sendLogRecord(boost::make_shared<LogEvent>(LogEvent::event, END_OF_SESSION),
+                                  id);
+            sessions.erase(id);
+        }
+    });
 }
 
 void LogCollector::logEvent(const std::string& sessionId, const std::string& name,
                             const std::map<std::string, std::string>& params) {
-    const Util::EventLock lock;
-    if (!isOff("logEvent")) {
-        log(LogEvent::event, sessionId, name, params);
-    }
+    record("logEvent", [&] {
+        if (!isOff("logEvent")) {
+            log(LogEvent::event, sessionId, name, params);
+        }
+    });
 }
 
 void LogCollector::logError(const std::string& sessionId, const std::string& name,
                             const std::map<std::string, std::string>& params) {
-    const Util::EventLock lock;
-    if (!isOff("logError")) {
-        log(LogEvent::error, sessionId, name, params);
-    }
+    record("logError", [&] {
+        if (!isOff("logError")) {
+            log(LogEvent::error, sessionId, name, params);
+        }
+    });
 }
 
 void LogCollector::log(LogEvent::EventType type, const std::string& sessionId,

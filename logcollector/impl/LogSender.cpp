@@ -2,6 +2,7 @@
 
 #include <boost/make_shared.hpp>
 #include <boost/weak_ptr.hpp>
+#include <exception>
 #include <memory>
 #include <utility>
 
@@ -82,14 +83,19 @@ std::string LogSender::toString(const boost::shared_ptr<LogEvent>& event,
 void LogSender::sendLogRecord(const std::string& record) {
     const Util::EventLock lock;
     std::list<LogRecord> one(1, {record, 0});
-    {
-        const QueueLock queueLock(queueMutex);
-        keeper.keep(one.front());
-    }
-    if (isWorking() || hold != Hold::NONE) {
-        append(one);
-    } else {
-        send(one);
+    useStore([this, &one] { keeper.keep(one.front()); });
+    append(one);
+    sendNextRecord();
+}
+
+template <typename Call>
+void LogSender::useStore(Call call) {
+    const QueueLock lock(queueMutex);
+    try {
+        call();
+    } catch (const std::exception& exception) {
+        Logger::log(Logger::PROBLEM, "%s: the store stays as it is: %s", TAG.c_str(),
+                    exception.what());
     }
 }
 
@@ -99,13 +105,25 @@ void LogSender::append(std::list<LogRecord>& one) {
 }
 
 void LogSender::send(std::list<LogRecord>& one) {
-    append(sent);  // what could not be submitted, if anything
     sent.splice(sent.end(), one);
-    submit(
-        boost::make_shared<LogCollectorNetworkTask>(
-            sent.front().text, [this](bool success, const std::string& record,
-                                      int status) { onRequestComplete(success, record, status); }),
-        boost::make_shared<Network::NetworkTaskBasicRetryPolicy>(RETRY_DELAY_MS, ATTEMPTS, false));
+    try {
+        submit(boost::make_shared<LogCollectorNetworkTask>(
+                   sent.front().text,
+                   [this](bool success, const std::string& record, int status) {
+                       onRequestComplete(success, record, status);
+                   }),
+               boost::make_shared<Network::NetworkTaskBasicRetryPolicy>(RETRY_DELAY_MS, ATTEMPTS,
+                                                                        false));
+    } catch (const std::exception& exception) {
+        Logger::log(Logger::PROBLEM, "%s: a record cannot be sent now: %s", TAG.c_str(),
+                    exception.what());
+        {
+            const QueueLock lock(queueMutex);
+            queue.splice(queue.begin(), sent);
+        }
+        // The timer tries again; where there is none to be had, the next record does.
+        startTimer();
+    }
 }
 
 void LogSender::sendNextRecord() {
@@ -113,10 +131,10 @@ void LogSender::sendNextRecord() {
     if (isWorking() || hold != Hold::NONE) {
         return;
     }
+    useStore([this] { keeper.expire(); });
     std::list<LogRecord> next;
     {
         const QueueLock queueLock(queueMutex);
-        keeper.expire();
         if (!queue.empty()) {
             next.splice(next.end(), queue, queue.begin());
         }

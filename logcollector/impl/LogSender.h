@@ -88,6 +88,9 @@ class LogSender : public Network::NetworkTaskHolder {
     /** Puts the one record of the list at the end of the queue; nothing is allocated. */
     void append(std::list<LogRecord>& one);
     void send(std::list<LogRecord>& one);
+    /** For want of memory, the records are those in memory only. */
+    template <typename Call>
+    void useStore(Call call);
     bool hasStore() const;
     void holdBack(const std::string& record, int status);
     void goOn();

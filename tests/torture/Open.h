@@ -21,7 +21,6 @@ inline const std::vector<Open>& getOpen() {
     static const std::vector<Open> open = {
         {Kind::MEMORY, nullptr,
          "exceptions leave the API and the engine's threads, see the table below"},
-        {Kind::THREADS, "usage-log", "an exception leaves the usage log when no thread can start"},
         {Kind::SOCKETS, "pulse", "a connection that fails half way keeps a descriptor"},
         {Kind::PULSE, nullptr, "a connection that fails half way keeps a descriptor"},
     };
