@@ -176,7 +176,8 @@ bool LogStore::load(Rest& rest) {
 
 void LogStore::loadSegment(uint32_t number, std::size_t size, const StoreFormat::Segment& read,
                            Loaded& loaded) {
-    if (!read.isSound()) {
+    // A process that ends before it writes the head leaves an empty file; it had nothing in it.
+    if (size > 0 && !read.isSound()) {
         Logger::log(Logger::PROBLEM,
                     "%s: %s is damaged: %s%zu bytes are no record, %zu marks cannot be read, %zu "
                     "records are whole",
