@@ -1,31 +1,18 @@
 #include "talvox/Recognizer.h"
 
 #include <boost/make_shared.hpp>
-#include <exception>
 #include <new>
 #include <utility>
 
 #include "core/util/EventLock.h"
+#include "pal/CallGuarded.h"
 #include "pal/kd_assert.h"
-#include "pal/kd_event.h"
 #include "pal/kd_log.h"
 #include "talvox/Talvox.h"
 
 namespace Talvox {
 
 namespace {
-
-/** Makes one listener's call of a terminal event: the other listeners get theirs in any case. */
-template <typename Call>
-void callListener(Call call) noexcept {
-    try {
-        call();
-    } catch (const std::exception& exception) {
-        kdReportExceptionKOR(exception.what());
-    } catch (...) {
-        kdReportExceptionKOR(nullptr);
-    }
-}
 
 /** Null when there is no memory. */
 boost::shared_ptr<Recognition> makeRecognition(
@@ -70,7 +57,7 @@ void Recognizer::callOnError(SpeechError error, std::string_view reason) {
     // A listener may drop the last reference, and those after it are given this recognizer too.
     const boost::shared_ptr<Recognizer> self = weak_from_this().lock();
     listeners.notify([this, error](RecognizerListener& listener) {
-        callListener([&] { listener.onError(this, error); });
+        korvel_pal::callGuarded([&] { listener.onError(this, error); });
     });
 }
 
@@ -96,7 +83,7 @@ void Recognizer::callOnResults(const boost::shared_ptr<const RecognitionResults>
         Recognition::decideOutcome(*hypotheses, *engine->getTalvoxSettings());
     const boost::shared_ptr<Recognizer> self = weak_from_this().lock();
     listeners.notify([&](RecognizerListener& listener) {
-        callListener([&] {
+        korvel_pal::callGuarded([&] {
             if (const boost::shared_ptr<Recognition> own =
                     makeRecognition(outcome, hypotheses, requestId)) {
                 listener.onResults(this, own);

@@ -7,8 +7,8 @@
 #include <cstdlib>
 #include <exception>
 
-#include "callback_guard.h"
 #include "event_lock.h"
+#include "pal/CallGuarded.h"
 #include "pal/SignalsBlocked.h"
 #include "pal/kd_assert.h"
 #include "pal/kd_log.h"

@@ -4,11 +4,11 @@
 #include <exception>
 #include <utility>
 
-#include "callback_guard.h"
 #include "callback_table.h"
 #include "clock.h"
 #include "event_lock.h"
 #include "event_loop.h"
+#include "pal/CallGuarded.h"
 #include "pal/kd_log.h"
 
 namespace korvel_pal {

@@ -4,9 +4,9 @@
 
 #include <exception>
 
-#include "callback_guard.h"
 #include "event_lock.h"
 #include "event_loop.h"
+#include "pal/CallGuarded.h"
 #include "pal/SignalsBlocked.h"
 #include "pal/kd_assert.h"
 #include "pal/kd_log.h"

@@ -1,3 +1,7 @@
+/**
+ * @file
+ * Calls whose exceptions go no further.
+ */
 #pragma once
 
 #include <exception>
@@ -6,7 +10,7 @@
 
 namespace korvel_pal {
 
-/** Makes a call whose exception is reported and goes no further. */
+/** Makes a call whose exception is reported by `kdReportExceptionKOR` and goes no further. */
 template <typename Call>
 void callGuarded(Call call) noexcept {
     try {
