@@ -1,6 +1,6 @@
 #include "LogCommand.h"
 
-#include <future>
+#include <condition_variable>
 #include <map>
 #include <mutex>
 
@@ -38,13 +38,19 @@ std::map<std::string, std::string> readParams(const std::vector<std::string>& te
 class End {
   public:
     void come() {
-        std::call_once(once, [this] { promise.set_value(); });
+        const std::lock_guard<std::mutex> lock(mutex);
+        isHere = true;
+        changed.notify_all();
     }
-    void wait() { promise.get_future().wait(); }
+    void wait() {
+        std::unique_lock<std::mutex> lock(mutex);
+        changed.wait(lock, [this] { return isHere; });
+    }
 
   private:
-    std::once_flag once;
-    std::promise<void> promise;
+    std::mutex mutex;
+    std::condition_variable changed;
+    bool isHere = false;
 };
 
 /** @return whether there is a store */
