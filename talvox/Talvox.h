@@ -94,6 +94,7 @@ class TALVOX_API Talvox : public Util::Singleton<Talvox> {
      * @param listener held weakly
      * @param settings not null; never changed
      * @return the recognizer, owned by the caller; never null
+     * @throws std::bad_alloc, without effect, when there is no memory
      */
     boost::shared_ptr<Recognizer> createRecognizer(
         const boost::shared_ptr<RecognizerListener>& listener,

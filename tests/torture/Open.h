@@ -20,7 +20,8 @@ struct Open {
 inline const std::vector<Open>& getOpen() {
     static const std::vector<Open> open = {
         {Kind::MEMORY, nullptr,
-         "exceptions leave the API and the engine's threads, see the table below"},
+         "`std::bad_alloc` leaves `createRecognizer`, and the settings' own operations, see the "
+         "table below"},
         {Kind::SOCKETS, "pulse", "a connection that fails half way keeps a descriptor"},
         {Kind::PULSE, nullptr, "a connection that fails half way keeps a descriptor"},
     };
