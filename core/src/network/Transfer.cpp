@@ -77,6 +77,7 @@ void Transfer::setUpConnection(const std::string& certificateFile) {
         set(CURLOPT_CAINFO, certificateFile.c_str());
         set(CURLOPT_CAPATH, static_cast<const char*>(nullptr));
     }
+    set(CURLOPT_CA_CACHE_TIMEOUT, transport->getAuthorityCacheS());
     set(CURLOPT_ERRORBUFFER, errorText.data());
     set(CURLOPT_NOPROGRESS, 0L);
     set(CURLOPT_XFERINFOFUNCTION, &Transfer::onProgress);

@@ -60,6 +60,11 @@ TransferEnd judge(const Transfer& transfer, CURLcode result) noexcept {
     }
 }
 
+bool isTlsFailure(CURLcode result) {
+    return result == CURLE_SSL_CONNECT_ERROR || result == CURLE_PEER_FAILED_VERIFICATION ||
+           result == CURLE_SSL_CERTPROBLEM || result == CURLE_SSL_CACERT_BADFILE;
+}
+
 }  // namespace
 
 Transport::Transport() {
@@ -298,6 +303,9 @@ void Transport::finish(Transfers::iterator entry, CURLcode result) {
         curl_multi_add_handle(multi.get(), entry->first) == CURLM_OK) {
         return;
     }
+    // Authorities that were read while memory was short are kept with what is missing in them. So
+    // after a failure each connection reads them anew.
+    hasFailedTls = hasFailedTls || isTlsFailure(result);
     const TransferEnd how = judge(*transfer, result);
     transfers.erase(entry);
     transfer->end(how);

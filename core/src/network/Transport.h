@@ -65,6 +65,10 @@ class Transport : public boost::enable_shared_from_this<Transport> {
      */
     CURL* takeHandle(const std::string& certificateFile);
 
+    /** How long libcurl may use the authorities that it has read, in seconds. Network thread only.
+     */
+    long getAuthorityCacheS() const { return hasFailedTls ? 0 : AUTHORITY_CACHE_S; }
+
     /** Takes back a handle, to be used again. Network thread only. */
     void giveBack(CURL* handle);
 
@@ -85,6 +89,8 @@ class Transport : public boost::enable_shared_from_this<Transport> {
         void operator()(CURL* handle) const { curl_easy_cleanup(handle); }
     };
     using Transfers = std::map<CURL*, boost::shared_ptr<Transfer>>;
+
+    static constexpr long AUTHORITY_CACHE_S = 24L * 60 * 60;
 
     bool launchThread();
     bool takesCommands();
@@ -118,6 +124,7 @@ class Transport : public boost::enable_shared_from_this<Transport> {
     std::unique_ptr<CURLM, MultiDeleter> multi;
     std::unique_ptr<CURL, EasyDeleter> spareHandle;
     std::string spareCertificateFile;
+    bool hasFailedTls = false;
     Transfers transfers;
     // Kept for their room: sound that comes piece by piece needs none of its own.
     std::vector<std::function<void()>> currentCommands;
