@@ -1,5 +1,6 @@
 #include <gtest/gtest.h>
 
+#include <atomic>
 #include <boost/make_shared.hpp>
 #include <chrono>
 #include <cstdio>
@@ -8,6 +9,7 @@
 #include <memory>
 #include <random>
 #include <string>
+#include <thread>
 
 #include "MemoryCurve.h"
 #include "cloud/EngineTest.h"
@@ -68,6 +70,33 @@ const std::map<Course, std::string> NAMES = {
     {Course::BAD_HEADER, "bad header"},
     {Course::NEVER_ANSWERED, "never answered"},
 };
+
+/** What the engine's workers do at a time. */
+struct Crowd {
+    static constexpr int WORKERS = 4;
+
+    std::atomic<int> running{0};
+    std::atomic<int> finished{0};
+
+    static void work(void* user) {
+        auto& crowd = *static_cast<Crowd*>(user);
+        ++crowd.running;
+        while (crowd.running < WORKERS) {
+            std::this_thread::yield();
+        }
+    }
+
+    static void done(void* user) { ++static_cast<Crowd*>(user)->finished; }
+};
+
+/** The engine makes a worker when there is work that no other is free for: now all of them. */
+void startAllWorkers() {
+    Crowd crowd;
+    for (int i = 0; i < Crowd::WORKERS; ++i) {
+        ASSERT_NE(kdQueueWorkKOR(&Crowd::work, &Crowd::done, &crowd), nullptr);
+    }
+    ASSERT_TRUE(TestSupport::waitForThreads([&] { return crowd.finished == Crowd::WORKERS; }));
+}
 
 unsigned readNumber(const char* variable, unsigned fallback) {
     const char* const text = std::getenv(variable);
@@ -254,6 +283,7 @@ TEST_F(SoakTest, LeavesNothingBehind) {
     const int sessions = static_cast<int>(readNumber("SOAK_SESSIONS", SESSIONS_DFLT));
     std::printf("seed %u, %d sessions\n", readNumber("SOAK_SEED", SEED_DFLT), sessions);
     std::printf("| sessions | live bytes | resident KiB | descriptors | threads |\n");
+    startAllWorkers();
     MemoryCurve live(SESSIONS_PER_POINT);
     MemoryCurve resident(SESSIONS_PER_POINT);
     std::size_t descriptors = 0;

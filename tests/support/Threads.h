@@ -42,6 +42,11 @@ inline std::size_t countThreads(const std::string& name = "") {
     return count;
 }
 
+/** Without the engine's workers: of them there are one to four, by how much was to do at a time. */
+inline std::size_t countThreadsButWorkers() {
+    return countThreads() - countThreads("talvox-worker");
+}
+
 /** Waits until something that threads of the process change holds; false when it takes too long. */
 template <typename Condition>
 bool waitForThreads(Condition condition) {

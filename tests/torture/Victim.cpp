@@ -130,8 +130,7 @@ bool isConnection(int descriptor) {
 
 Holdings countHoldings() {
     Holdings holdings;
-    // Of workers there are one to four, by how much was to do at a time.
-    holdings.threads = TestSupport::countThreads() - TestSupport::countThreads("talvox-worker");
+    holdings.threads = TestSupport::countThreadsButWorkers();
     std::error_code ignored;
     for (const auto& entry : std::filesystem::directory_iterator("/proc/self/fd", ignored)) {
         const int descriptor = std::atoi(entry.path().filename().c_str());
