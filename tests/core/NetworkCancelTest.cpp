@@ -24,7 +24,7 @@ TEST_F(NetworkCancelTest, EndsTheTransferAndSilencesTheTask) {
     EXPECT_FALSE(holder.isWorking());
     EXPECT_TRUE(server.waitForClosed(1));
     settle();
-    advanceMs(10 * REQUEST_TIMEOUT_MS);
+    advanceMs(int64_t{10} * REQUEST_TIMEOUT_MS);
     settle();
     EXPECT_THAT(task->getEvents(), ElementsAre("ready?", "issue"));
 }
