@@ -164,7 +164,7 @@ void awaitRest(const Order& order, Report& report) {
         if (isKnown && isWithin(now, order.holdings)) {
             return;
         }
-        usleep(REST_STEP_US);
+        usleep(REST_STEP_US);  // nothing signals what /proc shows
     }
 }
 
@@ -175,7 +175,7 @@ void settle(const Order& order, Report& report) {
              LogCollector::getPendingCount() > 0 && waited < RECORDS_WAIT_MS; waited += 1000) {
             kdAdvanceClockKOR(1000 * NS_PER_MS);
             kdDrainEventsKOR();
-            usleep(2000);
+            usleep(2000);  // the network thread and the server have work, in real time
         }
         report.pendingRecords = LogCollector::getPendingCount();
     }
@@ -267,7 +267,7 @@ int serveOrders(int input, int output) {
         verdict.timedOut = waitForEnd(pid) ? 0 : 1;
         if (verdict.timedOut != 0) {
             kill(pid, SIGABRT);
-            usleep(300000);
+            usleep(300000);  // for the stack that the sanitizer writes
             kill(pid, SIGKILL);
         }
         waitpid(pid, &verdict.status, 0);
