@@ -30,7 +30,9 @@ struct LogRecord {
  * most 1/16 of the bound in size and in age. A record that leaves is marked in its place; a segment
  * without records left is removed, or cut to its head if it is the newest. So nothing is ever
  * written twice, no operation takes longer for a long journal, and each takes effect with one call
- * of the system: a process may be killed before or after it, not within.
+ * of the system. A process that is killed within such a call may leave a part of a record where the
+ * file goes from one page of memory to the next; the check sums show it, and the record was not yet
+ * safe.
  *
  * Safe means in the hands of the system: the death of the process costs nothing. Nothing waits for
  * the disk itself (no fsync): a power failure may cost what the system has not written by then, and

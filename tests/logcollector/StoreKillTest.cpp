@@ -14,13 +14,18 @@
 #include "support/ChildProcess.h"
 #include "support/ScriptedHttpServer.h"
 
+using ::testing::Each;
 using ::testing::IsEmpty;
+using ::testing::MatchesRegex;
 using TestSupport::ChildProcess;
 using TestSupport::ScriptedHttpServer;
 
 namespace {
 
 const char* const NOTICE = ";sessionId=logStore;type=error;name=logRecordsDropped;count=";
+const char* const LEFT_BY_A_CUT_WRITE =
+    "LogStore: [^ ]+ is damaged: [0-9][0-9]?[0-9]? bytes are no record, [01] marks cannot be read, "
+    "[0-9]+ records are whole";
 constexpr int64_t ROOMY = 128 << 10;
 constexpr int64_t TIGHT = 4 << 10;
 
@@ -157,7 +162,10 @@ void killInARoomyStore(unsigned seed, int kills) {
     const Arrivals arrivals(killer.server);
     EXPECT_THAT(arrivals.torn, IsEmpty());
     EXPECT_THAT(arrivals.notices, IsEmpty());
-    EXPECT_THAT(killer.messages, IsEmpty());
+    // A write that crosses two pages of the file may end between them. Few do: of writes that all
+    // crossed, one of fifty kills cut one.
+    EXPECT_THAT(killer.messages, Each(MatchesRegex(LEFT_BY_A_CUT_WRITE)));
+    EXPECT_LE(killer.messages.size(), static_cast<std::size_t>(kills) / 10);
     std::vector<int> lost;
     for (const int number : killer.safe) {
         if (arrivals.times.count(number) == 0) {
