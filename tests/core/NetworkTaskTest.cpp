@@ -188,7 +188,7 @@ TEST_F(NetworkTaskTest, FailsCleanlyOnHeadersWithoutEnd) {
 }
 
 TEST_F(NetworkTaskTest, FailsOnABodyBeyondWhatItCollects) {
-    const std::string most(1024 * 1024, 'b');
+    const std::string most(std::size_t{1024} * 1024, 'b');
     server.script({Answer::status(200, {}, most), Answer::status(200, {}, most + "b")});
     const auto fitting = makeTask(server.getUrl());
     EXPECT_EQ("finished 200", run(fitting));

@@ -58,7 +58,7 @@ TEST_F(NetworkUploadTest, StreamsEachWriteAsItComes) {
     const std::string url = server.getUrl();
     const WriterPtr source = writer;
     const auto task = boost::make_shared<RecordingTask>([url, source] {
-        const auto request =
+        auto request =
             HttpRequest::create(url + "/asrgw_chunked?uuid=1", "POST", REQUEST_TIMEOUT_MS, false);
         request->setChunked(true);
         request->setBoundary("BOUNDARY");
@@ -110,6 +110,7 @@ TEST_F(NetworkUploadTest, StreamsWhatSeveralThreadsWriteWithoutLosingAByte) {
     const auto task = makeStream(server.getUrl(), writer);
     holder.submitNoRetries(task);
     std::vector<std::thread> threads;
+    threads.reserve(THREADS);
     for (int i = 0; i < THREADS; ++i) {
         threads.emplace_back([this, i] {
             const std::string piece(7, static_cast<char>('a' + i));

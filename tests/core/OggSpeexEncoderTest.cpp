@@ -183,7 +183,7 @@ double qualityAt(const Samples& original, const Samples& decoded, int shift) {
     double noise = 1;
     for (std::size_t i = 1000; i + 1000 < original.size(); ++i) {
         const double wanted = original[i];
-        const double got = decoded[static_cast<std::size_t>(static_cast<int>(i) + shift)];
+        const double got = decoded[i + static_cast<std::size_t>(shift)];
         signal += wanted * wanted;
         noise += (wanted - got) * (wanted - got);
     }

@@ -151,8 +151,8 @@ class RecorderFactoryTest : public ::testing::Test {
 };
 
 TEST_F(RecorderFactoryTest, InstalledFactoryMakesTheRecorders) {
-    const auto made = boost::make_shared<HandRecorder>();
-    Recorder::setFactory([&made] { return made; });
+    auto made = boost::make_shared<HandRecorder>();
+    Recorder::setFactory([made] { return made; });
     EXPECT_EQ(Recorder::createRecorder(), made);
 }
 
