@@ -352,10 +352,10 @@ std::vector<std::string> keysWithoutEffect(const LogCapture& log) {
     std::vector<std::string> keys;
     for (const std::string& line : log.messages()) {
         if (line.rfind(begin, 0) == 0) {
-            EXPECT_EQ(begin +
-                          line.substr(begin.size(), line.find(' ', begin.size()) - begin.size()) +
-                          end,
-                      line);
+            std::string expected = begin;
+            expected.append(line, begin.size(), line.find(' ', begin.size()) - begin.size());
+            expected += end;
+            EXPECT_EQ(expected, line);
             keys.push_back(line.substr(begin.size(), line.size() - begin.size() - end.size()));
         }
     }

@@ -2,7 +2,6 @@
 
 namespace FaultTest {
 
-using CloudTest::answerGoForward;
 using TestSupport::Answer;
 
 namespace {

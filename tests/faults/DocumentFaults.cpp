@@ -31,7 +31,10 @@ std::string makeEntityBomb() {
     std::string document = "<!DOCTYPE r [<!ENTITY a0 \"ha\">";
     for (int i = 1; i < 30; ++i) {
         const std::string before = "&a" + std::to_string(i - 1) + ";";
-        document += "<!ENTITY a" + std::to_string(i) + " \"" + before + before + "\">";
+        document += "<!ENTITY a" + std::to_string(i) + " \"";
+        document += before;
+        document += before;
+        document += "\">";
     }
     return document + "]>" + results("<variant confidence=\"0.95\">&a29;</variant>");
 }
