@@ -14,7 +14,7 @@ using Gateway::Answer;
 using Gateway::RecognitionRequest;
 using Gateway::RequestHead;
 
-constexpr std::size_t MAX_BODY = 1024 * 1024;
+constexpr std::size_t MAX_BODY = std::size_t{1024} * 1024;
 
 RequestHead usualHead(const std::string& soundType = "") {
     RequestHead head;
@@ -356,11 +356,14 @@ TEST(RecognitionRequest, NamesTheFirstMistakeOfABodyThatIsTooLongHoweverItArrive
 }
 
 TEST(RecognitionRequest, RefusesSoundThatIsTooLong) {
-    const std::string sound = part("audio", std::string(121 * 32000, '\0'), PCM16K) + closing();
+    const std::string sound =
+        part("audio", std::string(std::size_t{121} * 32000, '\0'), PCM16K) + closing();
     // Sound that is only logged has the same limit as sound that is recognised.
     for (const std::string& transcripts : {std::string(), part("transcripts", "<a/>")}) {
         RecognitionRequest request(usualHead(), BOUNDARY, sharedPool(), 16 * MAX_BODY);
-        const std::string body = parts(usualFields()) + transcripts + sound;
+        std::string body = parts(usualFields());
+        body += transcripts;
+        body += sound;
         EXPECT_TRUE(request.write(body.data(), body.size()));
         const Answer answer = request.finish();
         EXPECT_EQ(413U, answer.status) << transcripts;
