@@ -11,6 +11,7 @@
 #include <fstream>
 
 #include "UsageError.h"
+#include "talvox/SettingsTable.h"
 
 namespace Cli {
 
@@ -111,16 +112,6 @@ const char* typeName(Bundle::ElemType type) {
     }
 }
 
-const Bundle::ElemSpec* findSpec(const std::string& key) {
-    const std::string normalized = Bundle::normalizeKey(key);
-    for (const Bundle::ElemSpec* row = Talvox::Settings::bundleSpecs; row->name != nullptr; ++row) {
-        if (normalized == row->name) {
-            return row;
-        }
-    }
-    return nullptr;
-}
-
 void applyAssignment(Talvox::Settings& settings, const std::string& assignment) {
     const std::size_t equals = assignment.find('=');
     if (equals == std::string::npos) {
@@ -156,12 +147,12 @@ void applyDocument(Talvox::Settings& settings, const std::string& path) {
 }  // namespace
 
 void assign(Talvox::Settings& settings, const std::string& key, const std::string& text) {
-    const Bundle::ElemSpec* row = findSpec(key);
+    const Talvox::SettingRow* row = Talvox::SettingsTable::find(key);
     if (row == nullptr) {
         throw UsageError("there is no setting \"" + key + "\"");
     }
-    if (!store(settings, row->name, row->type, text)) {
-        throw UsageError("setting \"" + std::string(row->name) + "\": \"" + text + "\" is not " +
+    if (!store(settings, row->key, row->type, text)) {
+        throw UsageError("setting \"" + std::string(row->key) + "\": \"" + text + "\" is not " +
                          typeName(row->type));
     }
 }

@@ -2,31 +2,137 @@
 
 #include <algorithm>
 #include <boost/make_shared.hpp>
+#include <iterator>
 
 #include "pal/kd_assert.h"
 #include "pal/kd_log.h"
+#include "talvox/SettingsTable.h"
 #include "talvox/impl/SettingsCheck.h"
 
 namespace Talvox {
 
 namespace {
 
-constexpr int SAMPLE_RATE_DFLT = 16000;
-constexpr int SAMPLE_RATE_MIN = 8000;
-constexpr int SAMPLE_RATE_MAX = 44100;
-constexpr float UPPER_CONFIDENCE_DFLT = 0.9F;
-constexpr float WINNER_LEAD_CONFIDENCE_DFLT = 0.2F;
-constexpr float LOWER_CONFIDENCE_DFLT = 0.4F;
-constexpr int SPEEX_QUALITY_DFLT = 8;
-constexpr int SPEEX_QUALITY_MAX = 10;
-constexpr int VERBOSE_LEVEL_DFLT = 0;
-constexpr int VERBOSE_LEVEL_MAX = 10;
-const char* const LANGUAGE_DFLT = "ru-RU";
-constexpr unsigned UUID_LENGTH = 32;
+/** What is stored under a key that has a rule. */
+struct Value {
+    const std::string* text = nullptr; /**< of a text */
+    double number = 0;                 /**< of an integer or a float */
+};
 
-/** The default if the upper threshold leaves room for it. */
-float defaultBelow(float upper, float dflt) {
-    return upper > dflt ? dflt : 0.0F;
+Value readValue(const Settings& settings, const SettingRow& row) {
+    Value value;
+    if (row.type == Util::Bundle::STRING) {
+        value.text = &settings.getString(row.key);
+    } else if (row.type == Util::Bundle::INT) {
+        value.number = settings.getInt(row.key);
+    } else if (row.type == Util::Bundle::FLOAT) {
+        value.number = static_cast<double>(settings.getFloat(row.key));
+    }
+    return value;
+}
+
+void writeNumber(Settings& settings, const SettingRow& row, double number) {
+    if (row.type == Util::Bundle::INT) {
+        settings.putInt(row.key, static_cast<int>(number));
+    } else {
+        settings.putFloat(row.key, static_cast<float>(number));
+    }
+}
+
+void writeDefault(Settings& settings, const SettingRow& row) {
+    switch (row.type) {
+        case Util::Bundle::BOOLEAN:
+            settings.putBoolean(row.key, row.numberDefault != 0);
+            break;
+        case Util::Bundle::STRING:
+            settings.putString(row.key, *row.textDefault);
+            break;
+        case Util::Bundle::LATLON:
+            settings.putLatLon(row.key, Util::Bundle::LatLon());
+            break;
+        default:
+            writeNumber(settings, row, row.numberDefault);
+    }
+}
+
+bool isOneOf(const std::string& text, const SettingRule& rule) {
+    return std::any_of(
+        std::begin(rule.values), std::end(rule.values),
+        [&text](const std::string* value) { return value != nullptr && text == *value; });
+}
+
+/** Written so that a number that is none is out of range. */
+bool isInRange(const Settings& settings, double number, const SettingRule& rule) {
+    return number >= rule.lowest && number <= rule.highest &&
+           (!rule.isUpToUpperConfidence ||
+            number <= static_cast<double>(settings.getFloat(Settings::SKS_UPPER_CONFIDENCE)));
+}
+
+bool isGood(const Settings& settings, const SettingRule& rule, const Value& value) {
+    switch (rule.kind) {
+        case SettingRule::ANY:
+            return true;
+        case SettingRule::NOT_EMPTY:
+            return !value.text->empty();
+        case SettingRule::UUID_LENGTH:
+            return value.text->size() == SettingsTable::UUID_BYTES;
+        case SettingRule::ONE_OF:
+            return isOneOf(*value.text, rule);
+        case SettingRule::RANGE:
+            return isInRange(settings, value.number, rule);
+    }
+    return true;
+}
+
+void complain(const SettingRow& row, const Value& value) {
+    const SettingRule& rule = row.rule;
+    if (rule.kind == SettingRule::NOT_EMPTY) {
+        kdLogFormatMessage("%s", rule.complaint);
+    } else if (rule.repair == SettingRule::NONE) {
+        kdLogFormatMessage("%s %s", rule.complaint, value.text->c_str());
+    } else if (row.type == Util::Bundle::STRING) {
+        kdLogFormatMessage("%s: %s, setting to %s", rule.complaint, value.text->c_str(),
+                           rule.settingTo);
+    } else if (row.type == Util::Bundle::INT) {
+        kdLogFormatMessage("%s: %d, setting to %s", rule.complaint, static_cast<int>(value.number),
+                           rule.settingTo);
+    } else {
+        kdLogFormatMessage("%s: %f, setting to %s", rule.complaint, value.number, rule.settingTo);
+    }
+}
+
+/** The default if the upper confidence leaves room for it. */
+double defaultBelowUpper(const Settings& settings, const SettingRow& row) {
+    const auto byDefault = static_cast<float>(row.numberDefault);
+    return settings.getFloat(Settings::SKS_UPPER_CONFIDENCE) > byDefault ? row.numberDefault : 0.0;
+}
+
+void repair(Settings& settings, const SettingRow& row, const Value& value) {
+    const SettingRule& rule = row.rule;
+    switch (rule.repair) {
+        case SettingRule::NONE:
+            break;
+        case SettingRule::TO_REPLACEMENT:
+            settings.putString(row.key, *rule.replacement);
+            break;
+        case SettingRule::TO_DEFAULT:
+            writeNumber(settings, row, row.numberDefault);
+            break;
+        case SettingRule::TO_NEARER_END:
+            writeNumber(settings, row, value.number < rule.lowest ? rule.lowest : rule.highest);
+            break;
+        case SettingRule::TO_DEFAULT_OR_ZERO:
+            writeNumber(settings, row, defaultBelowUpper(settings, row));
+            break;
+    }
+}
+
+void validateKey(Settings& settings, const SettingRow& row) {
+    const Value value = readValue(settings, row);
+    if (!isGood(settings, row.rule, value)) {
+        complain(row, value);
+        repair(settings, row, value);
+    }
 }
 
 }  // namespace
@@ -37,27 +143,9 @@ void requireConformance(const Settings& settings) {
 }
 
 Settings::Settings() {
-    putString(SKS_URL, "");
-    putString(SKS_UUID, "");
-    putString(SKS_ASR_POLICY_OVERRIDE, ASRO_DEFAULT);
-    putString(SKS_LOGGING_POLICY, LOG_DISABLED);
-    putString(SKS_EVENTS_LOGGING_POLICY, EVENTS_LOG_DISABLED);
-    putString(SKS_SOUND_FORMAT, SOUND_FORMAT_PCM_IF_WIFI);
-    putInt(SKS_SAMPLE_RATE, SAMPLE_RATE_DFLT);
-    putString(SKS_VAD_SETTINGS, "");
-    putString(SKS_SESSION_MODE, SESSION_MODE_VOICE_RECOGNITION);
-    putBoolean(SKS_STREAMING, false);
-    putFloat(SKS_UPPER_CONFIDENCE, UPPER_CONFIDENCE_DFLT);
-    putFloat(SKS_WINNER_LEAD_CONFIDENCE, WINNER_LEAD_CONFIDENCE_DFLT);
-    putFloat(SKS_LOWER_CONFIDENCE, LOWER_CONFIDENCE_DFLT);
-    putInt(SKS_SPEEX_QUALITY, SPEEX_QUALITY_DFLT);
-    putInt(SKS_VERBOSE_LEVEL, VERBOSE_LEVEL_DFLT);
-    putString(RS_LANGUAGE, LANGUAGE_DFLT);
-    putString(RS_MODEL, MODEL_GENERAL);
-    putString(RS_ASR_POLICY, ASRP_KORVEL_ONLY);
-    putLatLon(RS_MY_LL, LatLon());
-    putLatLon(RS_CENTER_LL, LatLon());
-    putString(RS_SESSION_ID, "");
+    for (const SettingRow* row = SettingsTable::rows; row->key != nullptr; ++row) {
+        writeDefault(*this, *row);
+    }
     requireConformance(*this);
 }
 
@@ -92,104 +180,13 @@ int Settings::getSampleRate() const {
 }
 
 void Settings::validate() {
-    validateEngineTexts();
-    validateConfidences();
-    validateNumbers();
-    validateRecognizerTexts();
-}
-
-void Settings::validateEngineTexts() {
-    if (getUrl().empty()) {
-        kdLogFormatMessage("TalvoxSettings::validate: empty url");
-    }
-    if (getUuid().size() != UUID_LENGTH) {
-        kdLogFormatMessage("TalvoxSettings::validate: bad uuid %s", getUuid().c_str());
-    }
-    repairText(SKS_ASR_POLICY_OVERRIDE,
-               {&ASRO_DEFAULT, &ASRO_KORVEL_ONLY_IF_ENABLED, &ASRO_KORVEL_ONLY_EVERYWHERE,
-                &ASRO_PLATFORM_ONLY_IF_ENABLED, &ASRO_PLATFORM_ONLY_EVERYWHERE,
-                &ASRO_PLATFORM_FIRST_IF_ENABLED, &ASRO_PLATFORM_FIRST_EVERYWHERE, &ASRO_DISABLED},
-               ASRO_DEFAULT, "TalvoxSettings::validate: bad asrPolicyOverride", "default");
-    repairText(
-        SKS_LOGGING_POLICY,
-        {&LOG_WITH_SOUND_ALWAYS, &LOG_WITH_SOUND_IF_WIFI, &LOG_WITHOUT_SOUND_ALWAYS, &LOG_DISABLED},
-        LOG_DISABLED, "TalvoxSettings::validate: bad loggingPolicy", "default");
-    // The replacement is not the constructor's default, on purpose.
-    repairText(SKS_EVENTS_LOGGING_POLICY, {&EVENTS_LOG_DISABLED, &EVENTS_LOG_ENABLED},
-               EVENTS_LOG_ENABLED, "TalvoxSettings::validate: bad eventsLoggingPolicy", "default");
-    repairText(SKS_SOUND_FORMAT,
-               {&SOUND_FORMAT_SPEEX, &SOUND_FORMAT_PCM_IF_WIFI, &SOUND_FORMAT_PCM},
-               SOUND_FORMAT_PCM_IF_WIFI, "TalvoxSettings::validate: bad soundFormat", "default");
-    repairText(SKS_SESSION_MODE, {&SESSION_MODE_GENERAL, &SESSION_MODE_VOICE_RECOGNITION},
-               SESSION_MODE_VOICE_RECOGNITION, "TalvoxSettings::validate: bad sessionMode",
-               "default");
-}
-
-void Settings::validateConfidences() {
-    // Written so that a value that is not a number is bad.
-    float upper = getFloat(SKS_UPPER_CONFIDENCE);
-    if (!(upper >= 0.0F && upper <= 1.0F)) {
-        kdLogFormatMessage("TalvoxSettings::validate: bad upperConfidence: %f, setting to default",
-                           static_cast<double>(upper));
-        upper = UPPER_CONFIDENCE_DFLT;
-        putFloat(SKS_UPPER_CONFIDENCE, upper);
-    }
-    const float winnerLead = getFloat(SKS_WINNER_LEAD_CONFIDENCE);
-    if (!(winnerLead >= 0.0F)) {
-        kdLogFormatMessage(
-            "TalvoxSettings::validate: bad winnerLeadConfidence: %f, setting to default",
-            static_cast<double>(winnerLead));
-        putFloat(SKS_WINNER_LEAD_CONFIDENCE, defaultBelow(upper, WINNER_LEAD_CONFIDENCE_DFLT));
-    }
-    const float lower = getFloat(SKS_LOWER_CONFIDENCE);
-    if (!(lower >= 0.0F && lower <= upper)) {
-        kdLogFormatMessage("TalvoxSettings::validate: bad lowerConfidence: %f, setting to default",
-                           static_cast<double>(lower));
-        putFloat(SKS_LOWER_CONFIDENCE, defaultBelow(upper, LOWER_CONFIDENCE_DFLT));
-    }
-}
-
-void Settings::validateNumbers() {
-    const int sampleRate = getSampleRate();
-    if (sampleRate < SAMPLE_RATE_MIN || sampleRate > SAMPLE_RATE_MAX) {
-        kdLogFormatMessage("TalvoxSettings::validate: bad sampleRate: %d, setting to default",
-                           sampleRate);
-        putInt(SKS_SAMPLE_RATE, SAMPLE_RATE_DFLT);
-    }
-    const int speexQuality = getInt(SKS_SPEEX_QUALITY);
-    if (speexQuality < 0 || speexQuality > SPEEX_QUALITY_MAX) {
-        kdLogFormatMessage("TalvoxSettings::validate: bad speexQuality: %d, setting to default",
-                           speexQuality);
-        // The nearer end, not the default.
-        putInt(SKS_SPEEX_QUALITY, speexQuality < 0 ? 0 : SPEEX_QUALITY_MAX);
-    }
-    const int verboseLevel = getInt(SKS_VERBOSE_LEVEL);
-    if (verboseLevel < 0 || verboseLevel > VERBOSE_LEVEL_MAX) {
-        kdLogFormatMessage("TalvoxSettings::validate: bad verboseLevel: %d, setting to default",
-                           verboseLevel);
-        putInt(SKS_VERBOSE_LEVEL, VERBOSE_LEVEL_DFLT);
-    }
-}
-
-void Settings::validateRecognizerTexts() {
-    repairText(RS_MODEL, {&MODEL_GENERAL, &MODEL_MAPS, &MODEL_MAPSKVRI, &MODEL_IRONLADY},
-               MODEL_GENERAL, "RecognizerSettings::validate:: bad value for model", "general");
-    repairText(RS_ASR_POLICY,
-               {&ASRP_DISABLED, &ASRP_KORVEL_ONLY, &ASRP_PLATFORM_ONLY, &ASRP_PLATFORM_FIRST},
-               ASRP_KORVEL_ONLY, "RecognizerSettings::validate:: bad value for asrPolicy",
-               "korvel_only");
-}
-
-void Settings::repairText(const std::string& key, const TextList& admissible,
-                          const std::string& replacement, const char* complaint,
-                          const char* settingTo) {
-    const std::string& value = getString(key);
-    const bool isAdmissible =
-        std::any_of(admissible.begin(), admissible.end(),
-                    [&value](const std::string* text) { return value == *text; });
-    if (!isAdmissible) {
-        kdLogFormatMessage("%s: %s, setting to %s", complaint, value.c_str(), settingTo);
-        putString(key, replacement);
+    for (const SettingRule::Turn turn : {SettingRule::ENGINE_TEXTS, SettingRule::CONFIDENCES,
+                                         SettingRule::NUMBERS, SettingRule::RECOGNIZER_TEXTS}) {
+        for (const SettingRow* row = SettingsTable::rows; row->key != nullptr; ++row) {
+            if (row->rule.turn == turn && row->rule.kind != SettingRule::ANY) {
+                validateKey(*this, *row);
+            }
+        }
     }
 }
 

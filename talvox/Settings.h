@@ -5,7 +5,6 @@
 #pragma once
 
 #include <boost/shared_ptr.hpp>
-#include <initializer_list>
 #include <string>
 
 #include "talvox/Export.h"
@@ -165,16 +164,6 @@ class TALVOX_API Settings : public Util::Bundle {
     const std::string& getSessionId() const;
     /** In Hz. */
     int getSampleRate() const;
-
-  private:
-    void validateEngineTexts();
-    void validateConfidences();
-    void validateNumbers();
-    void validateRecognizerTexts();
-
-    using TextList = std::initializer_list<const std::string*>;
-    void repairText(const std::string& key, const TextList& admissible,
-                    const std::string& replacement, const char* complaint, const char* settingTo);
 };
 
 }  // namespace Talvox

@@ -66,7 +66,7 @@ public class TalvoxEngineTest extends EngineTestCase {
                         Files.readAllBytes(
                                 Paths.get(
                                         System.getProperty("talvox.root"),
-                                        "talvox/SettingsSchema.cpp")));
+                                        "talvox/SettingsTable.cpp")));
         for (Map.Entry<String, SettingValue[]> choice : choices.entrySet()) {
             final Matcher constant =
                     Pattern.compile("Settings::" + choice.getKey() + "(\\w+)\\(\\s*\"([^\"]*)\"\\)")
