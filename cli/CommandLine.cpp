@@ -3,10 +3,12 @@
 #include <CLI/CLI.hpp>
 #include <string>
 
+#include "DetectorPage.h"
 #include "ExitStatus.h"
 #include "LevelBar.h"
 #include "LogCommand.h"
 #include "SettingsCommand.h"
+#include "SettingsPage.h"
 #include "SoundInput.h"
 #include "UsageError.h"
 #include "VadCommand.h"
@@ -24,6 +26,9 @@ const char* const RATE_HELP =
     "Sample rate in Hz of the recognition, and of raw sound on standard input; at others than "
     "8000, 16000 and 32000 the speech detector takes everything for speech [16000]";
 
+const char* const SETTINGS_PAGE = "settings";
+const char* const DETECTOR_PAGE = "detector";
+
 /** What the arguments are read into. */
 struct Arguments {
     Arguments() {
@@ -36,6 +41,7 @@ struct Arguments {
     RecognizeOptions recognize;
     VadOptions vad;
     SettingsOptions settings;
+    std::string page;
     LogOptions log;
 };
 
@@ -209,14 +215,26 @@ CLI::App* addVadCommand(CLI::App& app, VadOptions& options) {
     return command;
 }
 
-CLI::App* addSettingsCommand(CLI::App& app, SettingsOptions& options) {
+CLI::App* addSettingsCommand(CLI::App& app, SettingsOptions& options, std::string& page) {
     CLI::App* command =
         app.add_subcommand("settings", "Show the settings that would result, as XML");
     addSettingsSources(*command, options);
+    command
+        ->add_option("--markdown", page,
+                     "Print a page about all settings, or about the parameters of the speech "
+                     "detector, instead")
+        ->check(CLI::IsMember({SETTINGS_PAGE, DETECTOR_PAGE}));
     command->footer(
         "The engine's own defaults, then --settings, then --set; printed as validation leaves\n"
-        "them. Each of its repairs is told on standard error.");
+        "them. Each repair is a line on standard error.\n\n"
+        "Settings (key, values, [default], effect):\n" +
+        settingsHelp());
     return command;
+}
+
+int printPage(const std::string& page, std::ostream& out) {
+    out << (page == SETTINGS_PAGE ? settingsPage() : detectorPage());
+    return EXIT_OK;
 }
 
 CLI::App* addLogCommand(CLI::App& app, LogOptions& options) {
@@ -280,7 +298,7 @@ int runTool(int argc, const char* const* argv, Console& console, LogOutput& log)
     app.require_subcommand(0, 1);
     const CLI::App* recognize = addRecognize(app, arguments.recognize);
     const CLI::App* vad = addVadCommand(app, arguments.vad);
-    const CLI::App* settings = addSettingsCommand(app, arguments.settings);
+    const CLI::App* settings = addSettingsCommand(app, arguments.settings, arguments.page);
     const CLI::App* logEvent = addLogCommand(app, arguments.log);
     try {
         app.parse(argc, argv);
@@ -290,6 +308,9 @@ int runTool(int argc, const char* const* argv, Console& console, LogOutput& log)
         }
         if (vad->parsed()) {
             return runVad(arguments.vad, console, log);
+        }
+        if (settings->parsed() && !arguments.page.empty()) {
+            return printPage(arguments.page, console.out);
         }
         if (settings->parsed()) {
             return runSettings(arguments.settings, console.out, log);

@@ -75,20 +75,21 @@ std::vector<VadParameter> makeAll() {
                  "whether the decisions on frames are smoothed or taken as they are"),
         makeName(SUBENGINE, true, WEBRTC, WEBRTC, "what decides on a frame"),
         makeTime(ANALYZE_MS_ON, Detector::FRAME_MS_DFLT, "10 to 20000",
-                 BufferedVAD::ANALYZE_MS_ON_DFLT, "ms in which speech is looked for", NEVER_BEGINS,
+                 BufferedVAD::ANALYZE_MS_ON_DFLT,
+                 "latest ms of sound that decide on the begin of speech", NEVER_BEGINS,
                  "a session has no more than 20 s of sound"),
         makeShare(ACTIVITY_ON, 0, std::nextafter(1.0F, 0.0F), "0 to less than 1",
                   BufferedVAD::ACTIVITY_ON_DFLT,
-                  "share of speech frames in them above which speech begins",
+                  "speech begins when more than this share of analyzemson is speech",
                   "speech begins with the first buffer", NEVER_BEGINS),
         makeTime(ANALYZE_MS_OFF, Detector::FRAME_MS_DFLT, "10 to 20000",
-                 BufferedVAD::ANALYZE_MS_OFF_DFLT, "ms in which the end of speech is looked for",
+                 BufferedVAD::ANALYZE_MS_OFF_DFLT, "latest ms of sound that decide on its end",
                  NEVER_ENDS, ENDS_AT_ONCE),
         makeTime(ANALYZE_MS, Detector::FRAME_MS_DFLT, "10 to 20000",
-                 BufferedVAD::ANALYZE_MS_OFF_DFLT, "the same as analyzemsoff", NEVER_ENDS,
+                 BufferedVAD::ANALYZE_MS_OFF_DFLT, "another name of analyzemsoff", NEVER_ENDS,
                  ENDS_AT_ONCE),
         makeShare(ACTIVITY_OFF, FLT_MIN, 1, "more than 0 to 1", BufferedVAD::ACTIVITY_OFF_DFLT,
-                  "share of speech frames in them below which speech ends", NEVER_ENDS,
+                  "speech ends when less than this share of analyzemsoff is speech", NEVER_ENDS,
                   ENDS_AT_ONCE),
         makeTime(MIN_VOICE_TIME_MS, 0, "0 to 20000", BufferedVAD::MIN_VOICE_TIME_MS_DFLT,
                  "ms for which speech lasts at least", "", NEVER_ENDS),
@@ -295,6 +296,15 @@ class Examination {
 const std::vector<VadParameter>& VadParameters::all() {
     static const std::vector<VadParameter> parameters = makeAll();
     return parameters;
+}
+
+std::vector<VadNoiseThresholds> VadParameters::byNoise() {
+    std::vector<VadNoiseThresholds> rows;
+    for (const Detector::NoiseRow& row : Detector::NOISE_ROWS) {
+        rows.push_back({static_cast<double>(row.noiseLevelDb), row.params.individual,
+                        row.params.total, row.params.overhangmax1, row.params.overhangmax2});
+    }
+    return rows;
 }
 
 std::vector<std::string> VadParameters::findMistakes(const std::string& text, int sampleRateHz) {

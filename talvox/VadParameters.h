@@ -42,11 +42,23 @@ struct VadParameter {
     std::string above;
 };
 
+/** Thresholds of the frame detector, which it uses from a level of the leading noise on. */
+struct VadNoiseThresholds {
+    double noiseLevelDb = 0;
+    int individual = 0;
+    int total = 0;
+    int overhangMax1 = 0;
+    int overhangMax2 = 0;
+};
+
 /** What may stand in the "vad" setting. Any thread; never blocks. */
 class TALVOX_API VadParameters {
   public:
     /** Every parameter, in the order in which a reader wants to know them. */
     static const std::vector<VadParameter>& all();
+
+    /** The thresholds where the text gives none, from the highest noise level down. */
+    static std::vector<VadNoiseThresholds> byNoise();
 
     /**
      * Everything in a parameter text that switches detection off, changes nothing or means

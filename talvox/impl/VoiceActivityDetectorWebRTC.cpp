@@ -16,18 +16,6 @@ constexpr char PATH[] = "talvox/impl/VoiceActivityDetectorWebRTC";
 /** Samples of the longest frame that the library takes: 30 ms at 32 kHz. */
 constexpr std::size_t LONGEST_FRAME = 960;
 
-struct NoiseRow {
-    float noiseLevel;
-    WebRtc_ModeParams params;
-};
-
-/** The louder the noise, the stricter the thresholds. */
-constexpr NoiseRow NOISE_ROWS[] = {
-    {12.0F, {98, 1200, 5, 8}},
-    {9.0F, {97, 1150, 6, 9}},
-    {7.0F, {95, 1100, 6, 9}},
-};
-
 /** Stores the value of a parameter and logs what was stored. */
 template <typename Field>
 void store(Field& field, const char* logName, const std::string& value) {
@@ -82,7 +70,7 @@ void VoiceActivityDetectorWebRTC::processNoise(const Sound::SoundDataBuffer& buf
         return;
     }
     for (const NoiseRow& row : NOISE_ROWS) {
-        if (row.noiseLevel <= powerEstimator.getNoiseLevel()) {
+        if (row.noiseLevelDb <= powerEstimator.getNoiseLevel()) {
             WebRtcVad_set_mode_fine_grained(handle, &row.params);
             return;
         }

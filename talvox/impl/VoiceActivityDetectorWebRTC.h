@@ -28,6 +28,18 @@ class VoiceActivityDetectorWebRTC : public FrameVAD {
     static constexpr int FRAME_MS_DFLT = 10;
     static constexpr int LEADING_NOISE_MS_DFLT = 200;
 
+    /** Thresholds from a level of the leading noise on. */
+    struct NoiseRow {
+        float noiseLevelDb;
+        WebRtc_ModeParams params;
+    };
+    /** From the highest level down: the louder the noise, the stricter the thresholds. */
+    static constexpr NoiseRow NOISE_ROWS[] = {
+        {12.0F, {98, 1200, 5, 8}},
+        {9.0F, {97, 1150, 6, 9}},
+        {7.0F, {95, 1100, 6, 9}},
+    };
+
     ~VoiceActivityDetectorWebRTC() override;
 
     void setSoundDataInfo(const Sound::SoundDataInfo& format) override;
