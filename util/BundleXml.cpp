@@ -1,5 +1,4 @@
 #include <boost/make_shared.hpp>
-#include <sstream>
 #include <vector>
 
 #include "core/util/XmlUtils.h"
@@ -19,12 +18,10 @@ const char* const BLANKS = " \t\n\v\f\r";
 
 std::vector<std::string> splitPath(const std::string& path) {
     std::vector<std::string> pieces;
-    std::istringstream stream(path);
-    stream.exceptions(std::ios::badbit);
-    for (std::string piece; std::getline(stream, piece, '/');) {
-        if (!piece.empty()) {
-            pieces.push_back(piece);
-        }
+    for (std::size_t start = path.find_first_not_of('/'); start != std::string::npos;) {
+        const std::size_t end = path.find('/', start);
+        pieces.push_back(path.substr(start, end - start));
+        start = path.find_first_not_of('/', end);
     }
     return pieces;
 }

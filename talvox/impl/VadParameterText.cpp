@@ -1,7 +1,7 @@
 #include "talvox/impl/VadParameterText.h"
 
 #include <algorithm>
-#include <locale>
+#include <cctype>
 
 namespace Talvox {
 
@@ -22,9 +22,8 @@ std::vector<std::string> split(const std::string& text, char separator) {
 std::string normaliseName(std::string name) {
     name.erase(std::remove(name.begin(), name.end(), '_'), name.end());
     name.erase(std::remove(name.begin(), name.end(), ' '), name.end());
-    const std::locale locale;
     std::transform(name.begin(), name.end(), name.begin(),
-                   [&locale](char letter) { return std::tolower(letter, locale); });
+                   [](unsigned char letter) { return static_cast<char>(std::tolower(letter)); });
     return name;
 }
 

@@ -1,14 +1,17 @@
 #include "util/impl/NumberText.h"
 
+#include <locale.h>
+
 #include <algorithm>
+#include <array>
 #include <cerrno>
 #include <cfloat>
 #include <cmath>
 #include <cstdint>
+#include <cstdio>
 #include <cstdlib>
 #include <limits>
-#include <locale>
-#include <sstream>
+#include <new>
 
 #include "util/impl/Ascii.h"
 
@@ -136,16 +139,39 @@ bool skipDecimal(Cursor& cursor) {
     return true;
 }
 
+/**
+ * Makes the C library's conversions in this thread use a decimal point while the object lives.
+ * Streams are avoided: with a static C++ run time they add its locales to the library.
+ */
+class DecimalPoint {
+  public:
+    DecimalPoint() : old(uselocale(classic())) {}
+    ~DecimalPoint() { uselocale(old); }
+    DecimalPoint(const DecimalPoint&) = delete;
+    DecimalPoint& operator=(const DecimalPoint&) = delete;
+
+  private:
+    static locale_t classic() {
+        // Kept for the rest of the process.
+        static const locale_t made = [] {
+            const locale_t locale = newlocale(LC_ALL_MASK, "C", nullptr);
+            if (locale == nullptr) {
+                throw std::bad_alloc();  // the next use tries again
+            }
+            return locale;
+        }();
+        return made;
+    }
+
+    const locale_t old;
+};
+
 /** @param written a whole decimal number */
 double convertDecimal(const std::string& written) {
-    std::istringstream stream(written);
-    stream.exceptions(std::ios::badbit);  // else a want of memory would pass for a number
-    stream.imbue(std::locale::classic());
-    // Reading a float, not a double, rounds once. A number out of range gives the largest float or
-    // infinity, depending on the library, and fails.
-    float value = 0;
-    const bool isInRange = static_cast<bool>(stream >> value);
-    return !isInRange && value >= FLT_MAX ? HUGE_VAL : static_cast<double>(value);
+    const DecimalPoint decimalPoint;
+    // Reading a float, not a double, rounds once.
+    const float value = std::strtof(written.c_str(), nullptr);
+    return std::isinf(value) ? HUGE_VAL : static_cast<double>(value);
 }
 
 }  // namespace
@@ -197,11 +223,10 @@ NumberText::Reading<float> NumberText::readFloat(const std::string& text, std::s
 }
 
 std::string NumberText::writeFloat(float value) {
-    std::ostringstream stream;
-    stream.exceptions(std::ios::badbit);
-    stream.imbue(std::locale::classic());
-    stream << static_cast<double>(value);
-    return stream.str();
+    const DecimalPoint decimalPoint;
+    std::array<char, 32> text = {};
+    std::snprintf(text.data(), text.size(), "%g", static_cast<double>(value));
+    return text.data();
 }
 
 }  // namespace Util
