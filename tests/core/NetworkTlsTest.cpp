@@ -6,6 +6,7 @@
 #include "NetworkFixture.h"
 #include "support/ChildProcess.h"
 #include "support/TlsRelay.h"
+#include "support/TlsServer.h"
 
 using Network::NetworkManager;
 using TestSupport::ChildProcess;
@@ -22,8 +23,8 @@ class NetworkTlsTest : public NetworkFixture {
         char pattern[] = "/tmp/talvox-tls-XXXXXX";
         ASSERT_NE(nullptr, ::mkdtemp(pattern));
         folder = pattern;
-        makeCertificate("server", "IP:127.0.0.1");
-        startServer();
+        makeCertificate("server", "DNS:localhost");
+        tls = std::make_unique<TestSupport::TlsServer>(path("server"));
     }
 
     void TearDown() override {
@@ -43,62 +44,45 @@ class NetworkTlsTest : public NetworkFixture {
         ASSERT_EQ("", TestSupport::makeCertificate(path(name), subject));
     }
 
-    void startServer() {
-        tls = std::make_unique<ChildProcess>(
-            std::vector<std::string>{"openssl", "s_server", "-accept", "127.0.0.1:0", "-www",
-                                     "-cert", path("server.pem"), "-key", path("server.key")});
-        const std::string mark = "ACCEPT 127.0.0.1:";
-        std::string output;
-        std::size_t start = std::string::npos;
-        while (start == std::string::npos || output.find('\n', start) == std::string::npos) {
-            const std::string piece = tls->read();
-            ASSERT_NE("", piece) << output;
-            output += piece;
-            start = output.find(mark);
-        }
-        port = std::atoi(output.c_str() + start + mark.size());
-    }
-
     std::string fetch(const std::string& host) {
-        const auto task = makeTask("https://" + host + ":" + std::to_string(port) + "/");
+        const auto task = makeTask(tls->getUrl(host));
         holder.submitNoRetries(task);
         return task->waitForEnd();
     }
 
     std::string folder;
-    std::unique_ptr<ChildProcess> tls;
-    int port = 0;
+    std::unique_ptr<TestSupport::TlsServer> tls;
 };
 
 TEST_F(NetworkTlsTest, RefusesACertificateThatNobodyVouchesFor) {
-    EXPECT_EQ("finished -1", fetch("127.0.0.1"));
+    EXPECT_EQ("finished -1", fetch("localhost"));
 }
 
 TEST_F(NetworkTlsTest, AcceptsTheCertificatesOfTheFileThatWasSet) {
     NetworkManager::getInstance().setCertificateFile(path("server.pem"));
-    EXPECT_EQ("finished 200", fetch("127.0.0.1"));
+    EXPECT_EQ("finished 200", fetch("localhost"));
 }
 
 TEST_F(NetworkTlsTest, ReturnsToTheAuthoritiesOfTheSystem) {
     NetworkManager::getInstance().setCertificateFile(path("server.pem"));
     NetworkManager::getInstance().setCertificateFile("");
-    EXPECT_EQ("finished -1", fetch("127.0.0.1"));
+    EXPECT_EQ("finished -1", fetch("localhost"));
 }
 
 TEST_F(NetworkTlsTest, RefusesACertificateOfAnotherAuthority) {
-    makeCertificate("other", "IP:127.0.0.1");
+    makeCertificate("other", "DNS:localhost");
     NetworkManager::getInstance().setCertificateFile(path("other.pem"));
-    EXPECT_EQ("finished -1", fetch("127.0.0.1"));
+    EXPECT_EQ("finished -1", fetch("localhost"));
 }
 
 TEST_F(NetworkTlsTest, RefusesACertificateForAnotherHost) {
     NetworkManager::getInstance().setCertificateFile(path("server.pem"));
-    EXPECT_EQ("finished -1", fetch("localhost"));
+    EXPECT_EQ("finished -1", fetch("127.0.0.1"));
 }
 
 TEST_F(NetworkTlsTest, FailsWithoutTheFileThatWasSet) {
     NetworkManager::getInstance().setCertificateFile(path("missing.pem"));
-    EXPECT_EQ("finished -1", fetch("127.0.0.1"));
+    EXPECT_EQ("finished -1", fetch("localhost"));
 }
 
 }  // namespace

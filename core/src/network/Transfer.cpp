@@ -73,11 +73,7 @@ void Transfer::setUpConnection(const std::string& certificateFile) {
     set(CURLOPT_PREREQFUNCTION, &Transfer::onConnection);
     set(CURLOPT_PREREQDATA, this);
     set(CURLOPT_FRESH_CONNECT, 0L);
-    if (!certificateFile.empty()) {
-        set(CURLOPT_CAINFO, certificateFile.c_str());
-        set(CURLOPT_CAPATH, static_cast<const char*>(nullptr));
-    }
-    set(CURLOPT_CA_CACHE_TIMEOUT, transport->getAuthorityCacheS());
+    hadNoMemory = hadNoMemory || !transport->setAuthorities(easy.get(), certificateFile);
     set(CURLOPT_ERRORBUFFER, errorText.data());
     set(CURLOPT_NOPROGRESS, 0L);
     set(CURLOPT_XFERINFOFUNCTION, &Transfer::onProgress);

@@ -262,6 +262,21 @@ CURL* Transport::takeHandle(const std::string& certificates) {
     return spareHandle ? spareHandle.release() : curl_easy_init();
 }
 
+bool Transport::setAuthorities(CURL* handle, const std::string& file) {
+    // How long libcurl may use what it has read.
+    const long cacheS = hasFailedTls ? 0 : AUTHORITY_CACHE_S;
+    // A libcurl that keeps nothing does not know the option.
+    if (curl_easy_setopt(handle, CURLOPT_CA_CACHE_TIMEOUT, cacheS) == CURLE_OUT_OF_MEMORY) {
+        return false;
+    }
+    if (file.empty()) {
+        return authorities.attach(handle, hasFailedTls);
+    }
+    PlatformAuthorities::detach(handle);
+    return curl_easy_setopt(handle, CURLOPT_CAINFO, file.c_str()) == CURLE_OK &&
+           curl_easy_setopt(handle, CURLOPT_CAPATH, nullptr) != CURLE_OUT_OF_MEMORY;
+}
+
 void Transport::giveBack(CURL* handle) {
     // What the next request sets may be written there.
     curl_easy_setopt(handle, CURLOPT_ERRORBUFFER, nullptr);

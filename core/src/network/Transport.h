@@ -15,6 +15,7 @@
 #include <vector>
 
 #include "network/OpenSockets.h"
+#include "network/PlatformAuthorities.h"
 
 namespace Network {
 
@@ -65,9 +66,12 @@ class Transport : public boost::enable_shared_from_this<Transport> {
      */
     CURL* takeHandle(const std::string& certificateFile);
 
-    /** How long libcurl may use the authorities that it has read, in seconds. Network thread only.
+    /**
+     * Sets the authorities that a handle's request trusts: those of the file, or the platform's if
+     * there is none. Network thread only.
+     * @return false if memory is short
      */
-    long getAuthorityCacheS() const { return hasFailedTls ? 0 : AUTHORITY_CACHE_S; }
+    bool setAuthorities(CURL* handle, const std::string& certificateFile);
 
     /** Takes back a handle, to be used again. Network thread only. */
     void giveBack(CURL* handle);
@@ -119,8 +123,10 @@ class Transport : public boost::enable_shared_from_this<Transport> {
 
     std::atomic<bool> stopping{false};
 
-    // Network thread. The sockets are the last to go.
+    // Network thread. The sockets are the last to go, and the connections go before the
+    // authorities.
     OpenSockets sockets;
+    PlatformAuthorities authorities;
     std::unique_ptr<CURLM, MultiDeleter> multi;
     std::unique_ptr<CURL, EasyDeleter> spareHandle;
     std::string spareCertificateFile;

@@ -1,0 +1,16 @@
+#include "network/PlatformAuthorities.h"
+
+namespace Network {
+
+struct PlatformAuthorities::Store {};
+
+PlatformAuthorities::PlatformAuthorities() = default;
+PlatformAuthorities::~PlatformAuthorities() = default;
+
+bool PlatformAuthorities::attach(CURL*, bool) {
+    return true;
+}
+
+void PlatformAuthorities::detach(CURL*) {}
+
+}  // namespace Network
