@@ -5,8 +5,10 @@ if(NOT ANDROID)
     find_program(JAVAC_PROGRAM javac)
     get_filename_component(javac_path "${JAVAC_PROGRAM}" REALPATH)
     get_filename_component(javac_home "${javac_path}/../.." ABSOLUTE)
-    find_path(JNI_H_DIR jni.h HINTS $ENV{JAVA_HOME}/include ${javac_home}/include)
-    find_path(JNI_MD_H_DIR jni_md.h HINTS ${JNI_H_DIR} ${JNI_H_DIR}/linux)
+    # The JDK is this machine's, also when the build is for another.
+    find_path(JNI_H_DIR jni.h HINTS $ENV{JAVA_HOME}/include ${javac_home}/include
+              NO_CMAKE_FIND_ROOT_PATH)
+    find_path(JNI_MD_H_DIR jni_md.h HINTS ${JNI_H_DIR} ${JNI_H_DIR}/linux NO_CMAKE_FIND_ROOT_PATH)
 endif()
 if(ANDROID OR (JNI_H_DIR AND JNI_MD_H_DIR))
     set(korvel_has_jni ON)
