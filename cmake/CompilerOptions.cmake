@@ -51,3 +51,16 @@ endif()
 # one, ours or a consumer's.
 add_library(korvel_boost_assert INTERFACE)
 target_compile_definitions(korvel_boost_assert INTERFACE BOOST_ENABLE_ASSERT_HANDLER)
+
+# For a library that is downloaded to phones: link-time optimisation, and size before speed for all
+# but the sound (KORVEL_FAST). Needs clang and lld.
+option(TALVOX_SMALL "Optimise for size" OFF)
+if(TALVOX_SMALL)
+    target_compile_options(korvel_options INTERFACE
+        -flto -ffunction-sections -fdata-sections
+        $<$<NOT:$<BOOL:$<TARGET_PROPERTY:KORVEL_FAST>>>:-Oz>)
+    target_link_options(korvel_options INTERFACE
+        -flto -Wl,--gc-sections -Wl,--icf=safe -Wl,--build-id=sha1
+        # Android's own packed form, which its linker reads since API 23.
+        $<$<PLATFORM_ID:Android>:-Wl,--pack-dyn-relocs=android>)
+endif()
