@@ -112,6 +112,7 @@ TEST(Assertion, CountRisesWithEachReportWhateverTheHandler) {
     const DefaultAssertionHandler shipped;
     const LogCapture log;
     std::vector<std::thread> threads;
+    threads.reserve(4);
     for (int i = 0; i < 4; ++i) {
         threads.emplace_back([] {
             for (int j = 0; j < 500; ++j) {
