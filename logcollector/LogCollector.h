@@ -34,11 +34,13 @@ class LogSender;
  */
 class TALVOX_API LogCollector : public Util::Singleton<LogCollector> {
   public:
+    /** How the collector's lines in the log begin. */
     static const std::string TAG;
 
     /** Where records go until the application says otherwise: a gateway on this machine. */
     static const std::string URL_DFLT;
 
+    /** The one of the process, made on first use. */
     static LogCollector& getInstance();
 
     LogCollector(const LogCollector&) = delete;
@@ -65,6 +67,7 @@ class TALVOX_API LogCollector : public Util::Singleton<LogCollector> {
      */
     void configure(const std::string& clientUuid, const std::string& endpointUrl);
 
+    /** What records are sent with; the defaults until `configure`. */
     std::string getUrl() const;
     std::string getUuid() const;
 

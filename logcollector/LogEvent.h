@@ -20,8 +20,10 @@ class TALVOX_API LogEvent {
     /** The numbers are fixed. */
     enum EventType { event = 0, error = 1 };
 
+    /** Values by their names. */
     using Params = std::map<std::string, std::string>;
 
+    /** How the lines of events in the log begin. */
     static const std::string TAG;
 
     /** The words of the types in records. */
@@ -39,6 +41,7 @@ class TALVOX_API LogEvent {
     /** Adds a parameter; an earlier value of that name is replaced, with a line in the log. */
     void addParam(const std::string& paramName, const std::string& value);
 
+    /** As given to the constructor. */
     EventType getType() const { return type; }
     const std::string& getName() const { return name; }
 

@@ -11,10 +11,12 @@ namespace LogCollector {
 
 /** The folder and the bounds of a store of usage records. Plain values. */
 struct LogStoreOptions {
+    /** The default and the range of `maxBytes`. */
     static constexpr int64_t MAX_BYTES_DFLT = 4 << 20;
     static constexpr int64_t MAX_BYTES_LEAST = 4 << 10;
     static constexpr int64_t MAX_BYTES_MOST = 1 << 30;
 
+    /** The default and the range of `maxAgeS`. */
     static constexpr int64_t MAX_AGE_S_DFLT = int64_t{30} * 24 * 60 * 60;
     static constexpr int64_t MAX_AGE_S_LEAST = 60;
     static constexpr int64_t MAX_AGE_S_MOST = int64_t{100} * 365 * 24 * 60 * 60;

@@ -14,6 +14,7 @@ namespace Talvox {
 /** Answers at once: `start` and `stop` with `ErrorNotAvailable`, `cancel` with `ErrorCanceled`. */
 class TALVOX_API DummyRecognizer : public Recognizer {
   public:
+    /** As `Recognizer`'s. */
     DummyRecognizer(const Talvox* facade, const boost::shared_ptr<const Settings>& settings);
     ~DummyRecognizer() override;
 

@@ -36,6 +36,7 @@ class TALVOX_API Recognition {
      */
     static Outcome decideOutcome(const RecognitionResults& hypotheses, const Settings& settings);
 
+    /** As given to the constructor. */
     const boost::shared_ptr<const RecognitionResults>& getResults() const { return results; }
     Outcome getOutcome() const { return outcome; }
     const std::string& getRequestId() const { return requestId; }

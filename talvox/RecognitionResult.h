@@ -16,6 +16,7 @@ class RecognitionResult {
     /** Stands for "no confidence known". */
     static constexpr float UNKNOWN_CONFIDENCE = -1.0F;
 
+    /** A text in UTF-8, and a confidence from 0 to 1 or `UNKNOWN_CONFIDENCE`. */
     RecognitionResult(std::string utterance, float confidenceValue)
         : text(std::move(utterance)), confidence(confidenceValue) {}
 

@@ -133,7 +133,9 @@ class TALVOX_API Settings : public Util::Bundle {
 
     /** A row of `keyLevels`. */
     struct KeyLevel {
+        /** As normalised. */
         const char* key;
+        /** Whose value counts. */
         Level level;
     };
 

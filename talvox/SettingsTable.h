@@ -36,11 +36,14 @@ struct SettingRule {
     /** `validate` checks all keys of one turn before those of the next. */
     enum Turn { ENGINE_TEXTS, CONFIDENCES, NUMBERS, RECOGNIZER_TEXTS };
 
+    /** The most texts in `values`. */
     static constexpr unsigned VALUES_MAX = 8;
 
+    /** Which values are good, what becomes of others, and when they are checked. */
     Kind kind = ANY;
     Repair repair = NONE;
     Turn turn = ENGINE_TEXTS;
+    /** The ends of a range; both belong to it. */
     double lowest = 0;
     double highest = 0;
     /** The upper confidence limits the value as well. */
@@ -56,16 +59,16 @@ struct SettingRule {
 
 /** One key. Texts point to constants, which are there before all static initialisers run. */
 struct SettingRow {
-    const char* constant; /**< the name of the constant of `Settings` with the key */
-    const char* key;      /**< as normalised */
-    Util::Bundle::ElemType type;
-    Settings::Level level;
+    const char* constant;           /**< the name of the constant of `Settings` with the key */
+    const char* key;                /**< as normalised */
+    Util::Bundle::ElemType type;    /**< of the value */
+    Settings::Level level;          /**< whose value counts */
     const std::string* textDefault; /**< of a text; else null */
     double numberDefault;           /**< of a boolean, 0 or 1, and of a number */
-    SettingRule rule;
-    const char* javaConstant; /**< the name of the constant of Java's `TalvoxSettings` */
-    const char* unit;         /**< may be empty */
-    const char* effect;       /**< what the setting changes; whole sentences */
+    SettingRule rule;               /**< for `Settings::validate` */
+    const char* javaConstant;       /**< the name of the constant of Java's `TalvoxSettings` */
+    const char* unit;               /**< may be empty */
+    const char* effect;             /**< what the setting changes; whole sentences */
 };
 
 /**
@@ -74,6 +77,7 @@ struct SettingRow {
  */
 class TALVOX_API SettingsTable {
   public:
+    /** Length of the value of "uuid". */
     static constexpr unsigned UUID_BYTES = 32;
 
     /** Every key in the order of `Settings::bundleSpecs`; ended by a row with a null key. */

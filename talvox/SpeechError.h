@@ -64,6 +64,7 @@ class TALVOX_API SpeechError {
     /** Not explicit: a code is an error. */
     SpeechError(int errorCode) : code(errorCode) {}
 
+    /** As given to the constructor; any number. */
     int getCode() const { return code; }
 
     /**

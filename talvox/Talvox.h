@@ -43,6 +43,7 @@ class TALVOX_API Talvox : public Util::Singleton<Talvox> {
     /** The engine's version, "133". */
     static const std::string VERSION;
 
+    /** The one of the process, made on first use. */
     static Talvox& getInstance();
 
     Talvox(const Talvox&) = delete;

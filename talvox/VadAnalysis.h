@@ -67,6 +67,7 @@ struct VadBufferAnalysis {
  * which ended it.
  */
 struct VadSegment {
+    /** In ms. */
     int64_t startMs = 0;
     int64_t endMs = 0;
 };

@@ -13,6 +13,7 @@ namespace Talvox {
 
 /** One parameter of the "vad" setting. */
 struct VadParameter {
+    /** How a value is read. */
     enum Type {
         NAME,
         INTEGER,
@@ -44,7 +45,9 @@ struct VadParameter {
 
 /** Thresholds of the frame detector, which it uses from a level of the leading noise on. */
 struct VadNoiseThresholds {
+    /** Level of the leading noise in dB, as `VadBufferAnalysis::level` has it. */
     double noiseLevelDb = 0;
+    /** The parameters of these names. */
     int individual = 0;
     int total = 0;
     int overhangMax1 = 0;

@@ -37,12 +37,14 @@ class TALVOX_API Bundle {
 
     /** A position in degrees. */
     struct LatLon {
+        /** Latitude and longitude. */
         float lat = 0.0F;
         float lon = 0.0F;
     };
 
     /** One element. Only the payload that `type` names means something. */
     struct TALVOX_API Elem {
+        /** Which payload counts. */
         ElemType type = BOOLEAN;
         /** Payload of three types: a boolean as 0 or 1, an integer's bits, a float's bits. */
         std::uint32_t scalar = 0;

@@ -19,6 +19,7 @@ class KORVEL_CORE_API Logger {
         PROGRESS = 2, /**< what is going on, step by step, request addresses included */
     };
 
+    /** The level until it is set. */
     static constexpr int LEVEL_DFLT = PROBLEM;
 
     /** Writes a printf-style message of any length when `level` is not above the set level. */

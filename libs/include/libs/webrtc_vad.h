@@ -10,12 +10,14 @@
 
 #include <stdint.h>
 
+/** Marks what the library exports. */
 #define KORVEL_LIBS_API __attribute__((visibility("default")))
 
 #ifdef __cplusplus
 extern "C" {
 #endif
 
+/** A detector; made by `WebRtcVad_Create`. */
 typedef struct KorvelVadInst VadInst;
 
 /** Decision thresholds and hang-over maxima, used for frames of every length alike. */

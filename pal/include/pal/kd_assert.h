@@ -74,6 +74,7 @@ KD_EXTERN_C_END
 
 namespace korvel_pal_detail {
 
+/** Reports where `holds` is false. @return `holds` */
 inline bool check(bool holds, const char* text, const char* file, int line) {
     if (!holds) {
         kdHandleAssertionInFileKOR(text, file, line);
@@ -81,6 +82,7 @@ inline bool check(bool holds, const char* text, const char* file, int line) {
     return holds;
 }
 
+/** Reports where `holds` is false. @return `holds` */
 inline bool checkAt(bool holds, const char* text, const char* path, int line) {
     if (!holds) {
         kdHandleAssertion(text, path, line);

@@ -35,6 +35,7 @@ KD_EXTERN_C_BEGIN
 #define KD_TIMER_PERIODIC_AVERAGE 62 /**< keeps the average period: a late tick is caught up */
 #define KD_TIMER_PERIODIC_MINIMUM 63 /**< at least one period between two ticks */
 
+/** A running timer; made by `kdSetTimer`. */
 typedef struct KDTimer KDTimer;
 
 /** What a callback is told. Valid during the callback only. */
@@ -46,6 +47,7 @@ typedef struct KDEvent {
     const char* text; /**< of an exception, what it says; null for other events */
 } KDEvent;
 
+/** Receives events; see `kdInstallCallback`. */
 typedef void(KDCallbackFunc)(const KDEvent* event);
 
 /**

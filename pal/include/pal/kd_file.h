@@ -16,8 +16,10 @@
 
 KD_EXTERN_C_BEGIN
 
+/** An open file; made by `kdFopen`. */
 typedef struct KDFile KDFile;
 
+/** Where an offset of `kdFseek` begins; as C's `SEEK_SET`, `SEEK_CUR` and `SEEK_END`. */
 typedef enum KDfileSeekOrigin {
     KD_SEEK_SET = 0,
     KD_SEEK_CUR = 1,

@@ -9,6 +9,7 @@
 
 KD_EXTERN_C_BEGIN
 
+/** A mutex; made by `kdThreadMutexCreate`. */
 typedef struct KDThreadMutex KDThreadMutex;
 
 /**

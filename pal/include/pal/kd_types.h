@@ -12,19 +12,24 @@
 #include <stddef.h>
 #include <stdint.h>
 
+/** Marks what the library exports. */
 #define KD_API __attribute__((visibility("default")))
 
 #ifdef __cplusplus
+/** Encloses declarations of C functions. */
 #define KD_EXTERN_C_BEGIN extern "C" {
+/** The end of `KD_EXTERN_C_BEGIN`. */
 #define KD_EXTERN_C_END }
 #else
 #define KD_EXTERN_C_BEGIN
 #define KD_EXTERN_C_END
 #endif
 
+/** Integers of a fixed size. */
 typedef int32_t KDint;
 typedef uint32_t KDuint;
 typedef int64_t KDint64;
+/** A size in bytes. */
 typedef size_t KDsize;
 
 /** Unadjusted system time: nanoseconds since an arbitrary fixed point; never goes backwards. */

@@ -24,8 +24,10 @@ class KORVEL_CORE_API HttpRequest {
      */
     class KORVEL_CORE_API MultipartBuilder {
       public:
+        /** A builder without fields. The boundary is not checked. */
         static boost::shared_ptr<MultipartBuilder> create(const std::string& boundary);
 
+        /** The boundary, without the leading hyphens. */
         const std::string& getBoundary() const { return boundary; }
 
         /**
@@ -94,6 +96,7 @@ class KORVEL_CORE_API HttpRequest {
     void setWriter(const boost::shared_ptr<NetworkTaskWriter>& source) { writer = source; }
     const boost::shared_ptr<NetworkTaskWriter>& getWriter() const { return writer; }
 
+    /** The boundary that `addBoundaryHeader` announces. */
     void setBoundary(const std::string& text) { boundary = text; }
 
     /** Adds the header `Content-Type: multipart/form-data; boundary=...` with the set boundary. */
@@ -114,6 +117,7 @@ class KORVEL_CORE_API HttpRequest {
     /** The reason given to `refuse`; empty for a request that may be sent. */
     const std::string& getRefusal() const { return refusal; }
 
+    /** What was given to the constructor and the operations above. */
     const std::string& getUrl() const { return url; }
     const std::string& getMethod() const { return method; }
     int getTimeoutMs() const { return timeoutMs; }

@@ -15,6 +15,7 @@ namespace Network {
 /** Status and headers of one response. Immutable once handed out; any thread. */
 class KORVEL_CORE_API HttpResponse {
   public:
+    /** A response without headers. */
     explicit HttpResponse(int statusCode);
 
     /** The HTTP status. */

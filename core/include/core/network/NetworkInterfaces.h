@@ -14,7 +14,9 @@ namespace Network {
 
 /** One interface of the host. */
 struct NetworkInterface {
+    /** The name that the system gives it, such as "eth0". */
     std::string name;
+    /** It leads back to this host. */
     bool loopback = false;
     bool usable = false; /**< up and running, with an address that reaches further than the link */
 };

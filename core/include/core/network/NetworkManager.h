@@ -24,6 +24,7 @@ class KORVEL_CORE_API NetworkManager : public Util::Singleton<NetworkManager> {
     /** Reachability: 0 and 1 are fixed; every other value is a connection that is metered. */
     enum Reachability { UNREACHABLE = 0, WIFI = 1, METERED = 2 };
 
+    /** The one of the process, made on first use. */
     static NetworkManager& getInstance();
 
     /**

@@ -28,6 +28,7 @@ class KORVEL_CORE_API NetworkTaskHolder {
                      from `onFinished` follows without a change of threads */
     };
 
+    /** A holder without a task. */
     explicit NetworkTaskHolder(EndThread endThread = EndThread::EVENT);
     NetworkTaskHolder(const NetworkTaskHolder&) = delete;
     NetworkTaskHolder& operator=(const NetworkTaskHolder&) = delete;

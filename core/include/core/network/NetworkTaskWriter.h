@@ -33,6 +33,7 @@ class KORVEL_CORE_API NetworkTaskWriter {
     /** Ends the body; further writes are refused. Repeated calls do nothing. */
     void close();
 
+    /** Whether `close` was called. */
     bool isClosed() const;
 
     /** Bytes written so far. */

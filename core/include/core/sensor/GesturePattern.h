@@ -16,7 +16,9 @@ namespace Sensor {
 
 /** A time during which the sensor said the same. */
 struct ProximitySpan {
+    /** Whether something was near. */
     bool isNear;
+    /** How long. */
     int64_t durationMs;
 };
 
@@ -36,6 +38,7 @@ struct ProximitySpan {
  */
 class KORVEL_CORE_API GesturePattern {
   public:
+    /** The most spans, and the longest time, in a pattern. */
     static constexpr std::size_t SPANS_MAX = 16;
     static constexpr int64_t MILLISECONDS_MAX = 60000;
 
@@ -45,6 +48,7 @@ class KORVEL_CORE_API GesturePattern {
      */
     static std::optional<GesturePattern> parse(const std::string& text, std::string& error);
 
+    /** How many spans the pattern has. */
     std::size_t getSpanCount() const { return spans.size(); }
 
     /** Whether the gesture is complete with the end of the last span of `history`. */

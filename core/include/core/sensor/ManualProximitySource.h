@@ -21,6 +21,7 @@ class KORVEL_CORE_API ManualProximitySource : public ProximitySource {
      */
     void feed(bool isNear);
 
+    /** Whether somebody listens. */
     bool isStarted() const { return static_cast<bool>(target); }
 
   private:

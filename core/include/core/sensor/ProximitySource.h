@@ -16,6 +16,7 @@ class KORVEL_CORE_API ProximitySource {
   public:
     /** Told of every sample under the event lock: whether something is near. */
     using Callback = std::function<void(bool isNear)>;
+    /** Makes the platform's source; returns null where there is none. */
     using Factory = std::function<boost::shared_ptr<ProximitySource>()>;
 
     virtual ~ProximitySource();

@@ -31,9 +31,13 @@ class KORVEL_CORE_API CaptureQueue {
     /** The most buffers that wait; one more is a failure, because sound would be lost. */
     static constexpr std::size_t BUFFERS_MAX = 64;
 
+    /** What the event thread takes at once. */
     struct Batch {
+        /** Full buffers, in order. */
         std::vector<boost::shared_ptr<const SoundDataBuffer>> buffers;
+        /** No sound follows the buffers. */
         bool failed = false;
+        /** Of the failure; empty without one. */
         std::string reason;
     };
 

@@ -44,7 +44,9 @@ class KORVEL_CORE_API RecorderListener {
  */
 class KORVEL_CORE_API Recorder : public boost::enable_shared_from_this<Recorder> {
   public:
+    /** What a recording is for. */
     enum Mode { MODE_GENERAL = 0, MODE_VOICE_RECOGNITION = 1 };
+    /** Makes a recorder; called under the event lock. */
     using Factory = std::function<boost::shared_ptr<Recorder>()>;
 
     Recorder();
@@ -95,6 +97,7 @@ class KORVEL_CORE_API Recorder : public boost::enable_shared_from_this<Recorder>
     /** Adds a listener; it is held weakly and called in the order of addition. */
     void addListener(const boost::weak_ptr<RecorderListener>& listener);
 
+    /** Whether buffers are delivered. */
     bool isRecording() const { return recording; }
 
   protected:

@@ -15,6 +15,7 @@ namespace Sound {
 /** The buffers that a recorder is asked for: 16-bit mono of a rate and a length. */
 class KORVEL_CORE_API RecorderFormat {
   public:
+    /** Takes any values; `isUsable` says whether they can be recorded. */
     RecorderFormat(int sampleRateHz, int bufferLengthMs);
 
     /** False where no device could deliver this: rates outside 1 to 384 kHz, buffers outside

@@ -17,12 +17,15 @@ namespace Sound {
  */
 class SoundDataBuffer {
   public:
+    /** A buffer without bytes, or with the given ones. */
     explicit SoundDataBuffer(const SoundDataInfo& format) : info(format) {}
     SoundDataBuffer(const SoundDataInfo& format, std::vector<unsigned char> bytes)
         : info(format), data(std::move(bytes)) {}
 
+    /** The format. */
     const SoundDataInfo& getInfo() const { return info; }
     SoundDataInfo& getInfo() { return info; }
+    /** The bytes, in the format's own order. */
     const std::vector<unsigned char>& getData() const { return data; }
     std::vector<unsigned char>& getData() { return data; }
 

@@ -9,6 +9,7 @@ namespace Sound {
 /** Five words that describe sound; a plain value. */
 class SoundDataInfo {
   public:
+    /** How samples are encoded; the numbers are fixed. */
     enum Codec { NONE = 0, SPEEX = 2 };
 
     /** Unknown format: no codec, everything else -1. */
@@ -27,6 +28,7 @@ class SoundDataInfo {
           sampleSize(sampleSizeInBytes),
           sampleCount(samplesPerChannel) {}
 
+    /** As given to the constructor. */
     Codec getCodec() const { return codec; }
     int getChannelCount() const { return channelCount; }
     /** In Hz. */

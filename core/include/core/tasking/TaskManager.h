@@ -18,6 +18,7 @@ namespace Tasking {
  */
 class KORVEL_CORE_API TaskManager : public Util::Singleton<TaskManager> {
   public:
+    /** The one of the process, made on first use. */
     static TaskManager& getInstance();
     ~TaskManager() override;
 

@@ -14,6 +14,7 @@ namespace Util {
 /** Base64 of RFC 4648 with padding. Stateless; any thread. */
 class KORVEL_CORE_API Base64Coder {
   public:
+    /** Encodes with padding and without line ends. */
     static std::string encode(const std::vector<unsigned char>& bytes);
 
     /**

@@ -27,6 +27,7 @@ namespace Util {
 template <typename Listener>
 class ListenerList {
   public:
+    /** Appends an entry, held weakly. The same listener may have several. */
     void add(const boost::weak_ptr<Listener>& listener) {
         change([&listener](Entries& changed) { changed.push_back(listener); });
     }

@@ -84,6 +84,7 @@ class Singleton : public SingletonBase {
 
     ~Singleton() override { pointer.store(nullptr, std::memory_order_release); }
 
+    /** A class that hides this with true is not destroyed at the end of the process. */
     static constexpr bool STAYS_AT_PROCESS_END = false;
 
   protected:

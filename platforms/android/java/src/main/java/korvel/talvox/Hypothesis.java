@@ -12,6 +12,7 @@ public final class Hypothesis {
         this.confidence = confidence;
     }
 
+    /** What may have been said; not null. */
     public String getText() {
         return text;
     }
@@ -21,6 +22,7 @@ public final class Hypothesis {
         return confidence;
     }
 
+    /** Whether the recognizer gave a confidence. */
     public boolean hasConfidence() {
         return confidence != UNKNOWN;
     }

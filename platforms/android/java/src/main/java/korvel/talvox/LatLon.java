@@ -5,15 +5,18 @@ public final class LatLon {
     private final float latitude;
     private final float longitude;
 
+    /** Takes any values; a builder of settings refuses those that are out of range. */
     public LatLon(double latitude, double longitude) {
         this.latitude = (float) latitude;
         this.longitude = (float) longitude;
     }
 
+    /** In degrees; north is positive. */
     public float getLatitude() {
         return latitude;
     }
 
+    /** In degrees; east is positive. */
     public float getLongitude() {
         return longitude;
     }

@@ -38,6 +38,7 @@ public final class ProximityGestureRecognizer implements AutoCloseable {
         this(listener, new Handler(Looper.getMainLooper())::post);
     }
 
+    /** Gestures are reported on the executor, one after the other. */
     public ProximityGestureRecognizer(Listener listener, Executor executor) {
         events =
                 new Events(

@@ -37,6 +37,7 @@ public final class LogCollector {
      */
     public static native void setLoggingEnabled(boolean enabled);
 
+    /** Whether events are collected. */
     public static native boolean isLoggingEnabled();
 
     /** Opens the session {@code id}; nothing happens while logging is off. */
