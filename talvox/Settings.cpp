@@ -15,14 +15,14 @@ namespace {
 
 /** What is stored under a key that has a rule. */
 struct Value {
-    const std::string* text = nullptr; /**< of a text */
-    double number = 0;                 /**< of an integer or a float */
+    std::string text;
+    double number = 0; /**< of an integer or a float */
 };
 
 Value readValue(const Settings& settings, const SettingRow& row) {
     Value value;
     if (row.type == Util::Bundle::STRING) {
-        value.text = &settings.getString(row.key);
+        value.text = settings.getString(row.key);
     } else if (row.type == Util::Bundle::INT) {
         value.number = settings.getInt(row.key);
     } else if (row.type == Util::Bundle::FLOAT) {
@@ -73,11 +73,11 @@ bool isGood(const Settings& settings, const SettingRule& rule, const Value& valu
         case SettingRule::ANY:
             return true;
         case SettingRule::NOT_EMPTY:
-            return !value.text->empty();
+            return !value.text.empty();
         case SettingRule::UUID_LENGTH:
-            return value.text->size() == SettingsTable::UUID_BYTES;
+            return value.text.size() == SettingsTable::UUID_BYTES;
         case SettingRule::ONE_OF:
-            return isOneOf(*value.text, rule);
+            return isOneOf(value.text, rule);
         case SettingRule::RANGE:
             return isInRange(settings, value.number, rule);
     }
@@ -89,9 +89,9 @@ void complain(const SettingRow& row, const Value& value) {
     if (rule.kind == SettingRule::NOT_EMPTY) {
         kdLogFormatMessage("%s", rule.complaint);
     } else if (rule.repair == SettingRule::NONE) {
-        kdLogFormatMessage("%s %s", rule.complaint, value.text->c_str());
+        kdLogFormatMessage("%s %s", rule.complaint, value.text.c_str());
     } else if (row.type == Util::Bundle::STRING) {
-        kdLogFormatMessage("%s: %s, setting to %s", rule.complaint, value.text->c_str(),
+        kdLogFormatMessage("%s: %s, setting to %s", rule.complaint, value.text.c_str(),
                            rule.settingTo);
     } else if (row.type == Util::Bundle::INT) {
         kdLogFormatMessage("%s: %d, setting to %s", rule.complaint, static_cast<int>(value.number),
