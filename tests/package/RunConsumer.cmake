@@ -34,3 +34,12 @@ run(${CMAKE_COMMAND} -S ${SOURCE_DIR}/tests/package/consumer -B ${WORK_DIR}/buil
     -DAPI_TESTS=${SOURCE_DIR}/tests/api)
 run(${CMAKE_COMMAND} --build ${WORK_DIR}/build)
 run(${WORK_DIR}/build/api_tests)
+
+# The examples as they are installed.
+run(${CMAKE_COMMAND} -S ${WORK_DIR}/install/share/doc/korveltalvox/samples/cpp -B ${WORK_DIR}/samples
+    -G Ninja
+    -DCMAKE_PREFIX_PATH=${WORK_DIR}/install
+    -DCMAKE_BUILD_TYPE=Debug
+    -DCMAKE_CXX_COMPILER=${CXX_COMPILER}
+    "-DCMAKE_CXX_FLAGS=${CXX_FLAGS} -Wall -Wextra -Werror")
+run(${CMAKE_COMMAND} --build ${WORK_DIR}/samples)
