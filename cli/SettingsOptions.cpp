@@ -1,8 +1,6 @@
 #include "SettingsOptions.h"
 
-#include <algorithm>
 #include <boost/make_shared.hpp>
-#include <cctype>
 #include <cerrno>
 #include <climits>
 #include <cmath>
@@ -11,6 +9,7 @@
 #include <fstream>
 
 #include "UsageError.h"
+#include "core/util/Ascii.h"
 #include "talvox/SettingsTable.h"
 
 namespace Cli {
@@ -23,10 +22,8 @@ using Util::Bundle;
 const std::size_t DOCUMENT_MAX_BYTES = std::size_t{16} * 1024 * 1024;
 
 /** Words that leave no doubt; a document takes any word that it does not know for true. */
-bool parseBoolean(std::string text, bool& value) {
-    std::transform(text.begin(), text.end(), text.begin(), [](char character) {
-        return static_cast<char>(std::tolower(static_cast<unsigned char>(character)));
-    });
+bool parseBoolean(const std::string& given, bool& value) {
+    const std::string text = Util::toLower(given);
     value = text == "1" || text == "true" || text == "yes" || text == "on";
     return value || text == "0" || text == "false" || text == "no" || text == "off";
 }

@@ -3,6 +3,8 @@
 #include <algorithm>
 #include <cstdio>
 
+#include "core/util/Ascii.h"
+
 namespace Cli {
 
 namespace {
@@ -46,7 +48,7 @@ std::string printable(const std::string& text) {
             result += '?';
             ++index;
         } else {
-            result += byte < 0x20U || byte == 0x7FU ? '?' : text[index];
+            result += Util::isControl(text[index]) ? '?' : text[index];
         }
     }
     return result;

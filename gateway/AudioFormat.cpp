@@ -2,6 +2,7 @@
 
 #include <algorithm>
 
+#include "core/util/Ascii.h"
 #include "gateway/HeaderValue.h"
 
 namespace Gateway {
@@ -10,8 +11,7 @@ namespace {
 
 /** Decimal digits only; 0 for anything else and for what cannot be a rate. */
 unsigned parseNumber(const std::string& text) {
-    const bool digits =
-        std::all_of(text.begin(), text.end(), [](char c) { return c >= '0' && c <= '9'; });
+    const bool digits = std::all_of(text.begin(), text.end(), &Util::isDigit);
     if (text.empty() || text.size() > 8 || !digits) {
         return 0;
     }

@@ -3,6 +3,8 @@
 #include <algorithm>
 #include <cstddef>
 
+#include "core/util/Ascii.h"
+
 namespace Gateway {
 
 namespace {
@@ -40,7 +42,7 @@ bool readParameter(const std::string& text, std::size_t& position,
     if (equals == std::string::npos) {
         return false;
     }
-    parameter.first = toLowerAscii(trimBlanks(text.substr(position, equals - position)));
+    parameter.first = Util::toLower(trimBlanks(text.substr(position, equals - position)));
     if (parameter.first.empty() || parameter.first.find(';') != std::string::npos) {
         return false;
     }
@@ -69,7 +71,7 @@ const std::string* HeaderValue::find(const std::string& name) const {
 bool HeaderValue::parse(const std::string& text, HeaderValue& result) {
     result = HeaderValue();
     std::size_t position = std::min(text.find(';'), text.size());
-    result.value = toLowerAscii(trimBlanks(text.substr(0, position)));
+    result.value = Util::toLower(trimBlanks(text.substr(0, position)));
     if (result.value.empty()) {
         return false;
     }
@@ -90,15 +92,6 @@ bool HeaderValue::parse(const std::string& text, HeaderValue& result) {
         skipBlanks(text, position);
     }
     return true;
-}
-
-std::string toLowerAscii(std::string text) {
-    for (char& c : text) {
-        if (c >= 'A' && c <= 'Z') {
-            c = static_cast<char>(c - 'A' + 'a');
-        }
-    }
-    return text;
 }
 
 std::string trimBlanks(const std::string& text) {

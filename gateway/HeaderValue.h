@@ -23,9 +23,6 @@ struct HeaderValue {
     static bool parse(const std::string& text, HeaderValue& result);
 };
 
-/** ASCII letters in lower case, whatever the locale. */
-std::string toLowerAscii(std::string text);
-
 /** The text without blanks and tabs around it. */
 std::string trimBlanks(const std::string& text);
 

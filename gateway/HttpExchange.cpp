@@ -2,9 +2,9 @@
 
 #include <microhttpd.h>
 
-#include <cctype>
 #include <cstdlib>
 
+#include "core/util/Ascii.h"
 #include "core/util/UrlCoder.h"
 #include "gateway/LogText.h"
 #include "pal/kd_log.h"
@@ -20,8 +20,8 @@ std::string toText(const char* text) {
 /** Every "%" introduces two hexadecimal digits. */
 bool isWellCoded(const std::string& text) {
     for (std::size_t i = text.find('%'); i != std::string::npos; i = text.find('%', i + 1)) {
-        if (text.size() - i < 3 || std::isxdigit(static_cast<unsigned char>(text[i + 1])) == 0 ||
-            std::isxdigit(static_cast<unsigned char>(text[i + 2])) == 0) {
+        if (text.size() - i < 3 || Util::hexValue(text[i + 1]) < 0 ||
+            Util::hexValue(text[i + 2]) < 0) {
             return false;
         }
     }

@@ -3,6 +3,7 @@
 #include <algorithm>
 #include <cstring>
 
+#include "core/util/Ascii.h"
 #include "gateway/HeaderValue.h"
 
 namespace Gateway {
@@ -155,7 +156,7 @@ void MultipartParser::onHeaderLine() {
     if (colon == std::string::npos || colon == 0) {
         check("a header line has no name");
     } else {
-        storeHeader(toLowerAscii(trimBlanks(line.substr(0, colon))),
+        storeHeader(Util::toLower(trimBlanks(line.substr(0, colon))),
                     trimBlanks(line.substr(colon + 1)));
     }
     line.clear();
@@ -178,8 +179,8 @@ void MultipartParser::storeHeader(const std::string& name, const std::string& va
             hasDisposition = true;
             part.name = *partName;
         }
-    } else if (name == "content-transfer-encoding" && toLowerAscii(value) != "binary" &&
-               toLowerAscii(value) != "8bit" && toLowerAscii(value) != "7bit") {
+    } else if (name == "content-transfer-encoding" && Util::toLower(value) != "binary" &&
+               Util::toLower(value) != "8bit" && Util::toLower(value) != "7bit") {
         check("a part has a transfer encoding that is not supported");
     }
 }

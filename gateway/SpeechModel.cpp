@@ -6,7 +6,7 @@
 #include <algorithm>
 #include <fstream>
 
-#include "gateway/HeaderValue.h"
+#include "core/util/Ascii.h"
 #include "pal/kd_log.h"
 
 namespace Gateway {
@@ -20,7 +20,7 @@ bool isReadable(const std::string& path) {
 
 /** A language tag in lower case, with "-" between its subtags. */
 std::string normalise(const std::string& languageTag) {
-    std::string tag = toLowerAscii(languageTag);
+    std::string tag = Util::toLower(languageTag);
     std::replace(tag.begin(), tag.end(), '_', '-');
     return tag;
 }

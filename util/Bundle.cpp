@@ -3,8 +3,8 @@
 #include <boost/make_shared.hpp>
 #include <cstring>
 
+#include "core/util/Ascii.h"
 #include "pal/kd_assert.h"
-#include "util/impl/Ascii.h"
 
 namespace Util {
 
@@ -64,7 +64,7 @@ std::string Bundle::normalizeKey(const std::string& key) {
         if (c == '_' || c == '-' || c == ' ') {
             continue;
         }
-        normalized += toLowerAscii(c);
+        normalized += toLower(c);
     }
     return normalized;
 }

@@ -1,11 +1,11 @@
 #include <boost/make_shared.hpp>
 #include <vector>
 
+#include "core/util/Ascii.h"
 #include "core/util/XmlUtils.h"
 #include "pal/kd_log.h"
 #include "tinyxml.h"
 #include "util/Bundle.h"
-#include "util/impl/Ascii.h"
 #include "util/impl/NumberText.h"
 
 namespace Util {
@@ -48,10 +48,7 @@ std::string bodyOf(const TiXmlElement& element) {
 }
 
 bool readBoolean(const std::string& key, const std::string& text) {
-    std::string lower;
-    for (const char c : text) {
-        lower += toLowerAscii(c);
-    }
+    const std::string lower = toLower(text);
     if (lower.empty() || lower == "0" || lower == "false" || lower == "no") {
         return false;
     }

@@ -10,6 +10,7 @@
 #include <cstdlib>
 #include <stdexcept>
 
+#include "core/util/Ascii.h"
 #include "gateway/Bodies.h"
 #include "gateway/HeaderValue.h"
 
@@ -69,7 +70,7 @@ HttpAnswer HttpClient::read() {
     for (std::size_t line = buffer.find("\r\n") + 2; line < end;) {
         const std::size_t next = buffer.find("\r\n", line);
         const std::size_t colon = buffer.find(':', line);
-        answer.headers[Gateway::toLowerAscii(buffer.substr(line, colon - line))] =
+        answer.headers[Util::toLower(buffer.substr(line, colon - line))] =
             Gateway::trimBlanks(buffer.substr(colon + 1, next - colon - 1));
         line = next + 2;
     }

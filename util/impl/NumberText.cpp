@@ -13,28 +13,11 @@
 #include <limits>
 #include <new>
 
-#include "util/impl/Ascii.h"
+#include "core/util/Ascii.h"
 
 namespace Util {
 
 namespace {
-
-bool isBlank(char c) {
-    return c == ' ' || (c >= '\t' && c <= '\r');
-}
-
-bool isDigit(char c) {
-    return c >= '0' && c <= '9';
-}
-
-/** Value of a hexadecimal digit, or -1. */
-int hexValue(char c) {
-    if (isDigit(c)) {
-        return c - '0';
-    }
-    const char lower = static_cast<char>(c | 0x20);
-    return lower >= 'a' && lower <= 'f' ? lower - 'a' + 10 : -1;
-}
 
 /** A place in a text; beyond its end there are zero bytes. */
 class Cursor {
@@ -49,7 +32,7 @@ class Cursor {
     std::string since(std::size_t start) const { return text.substr(start, at - start); }
 
     void skipBlanks() {
-        while (isBlank(peek())) {
+        while (isWhiteSpace(peek())) {
             skip();
         }
     }
@@ -66,7 +49,7 @@ class Cursor {
     /** Skips an exponent if a whole one with this (lower case) letter follows. */
     void skipExponent(char letter) {
         const std::size_t sign = peek(1) == '+' || peek(1) == '-' ? 1 : 0;
-        if (static_cast<char>(peek() | 0x20) == letter && isDigit(peek(1 + sign))) {
+        if (toLower(peek()) == letter && isDigit(peek(1 + sign))) {
             skip(1 + sign);
             skipDigits();
         }
@@ -76,12 +59,12 @@ class Cursor {
     bool skipWord(const char* word) {
         std::size_t length = 0;
         for (; word[length] != '\0'; ++length) {
-            if (toLowerAscii(peek(length)) != word[length]) {
+            if (toLower(peek(length)) != word[length]) {
                 return false;
             }
         }
-        const char next = toLowerAscii(peek(length));
-        if (isDigit(next) || next == '_' || (next >= 'a' && next <= 'z')) {
+        const char next = toLower(peek(length));
+        if (isDigit(next) || next == '_' || isLetter(next)) {
             return false;
         }
         skip(length);
@@ -89,7 +72,7 @@ class Cursor {
     }
 
     bool isAtHexadecimal() const {
-        return peek() == '0' && (peek(1) | 0x20) == 'x' &&
+        return peek() == '0' && toLower(peek(1)) == 'x' &&
                (hexValue(peek(2)) >= 0 || (peek(2) == '.' && hexValue(peek(3)) >= 0));
     }
 

@@ -2,6 +2,7 @@
 
 #include <algorithm>
 
+#include "core/util/Ascii.h"
 #include "pal/kd_assert.h"
 #include "pal/kd_log.h"
 
@@ -10,10 +11,7 @@ namespace Network {
 namespace {
 
 bool hasControlCharacter(const std::string& text) {
-    return std::any_of(text.begin(), text.end(), [](char c) {
-        const auto byte = static_cast<unsigned char>(c);
-        return byte < 0x20 || byte == 0x7F;
-    });
+    return std::any_of(text.begin(), text.end(), &Util::isControl);
 }
 
 bool isHeaderName(const std::string& name) {

@@ -1,18 +1,10 @@
 #include "core/network/HttpResponse.h"
 
-#include <algorithm>
+#include "core/util/Ascii.h"
 
 namespace Network {
 
 namespace {
-
-// By hand: the C library's conversion depends on the locale.
-std::string toLower(std::string text) {
-    std::transform(text.begin(), text.end(), text.begin(), [](char c) {
-        return c >= 'A' && c <= 'Z' ? static_cast<char>(c - 'A' + 'a') : c;
-    });
-    return text;
-}
 
 std::string trim(const std::string& text) {
     const char* const blanks = " \t\r\n";
@@ -32,7 +24,7 @@ int HttpResponse::getStatus() const {
 }
 
 std::optional<std::string> HttpResponse::getHeader(const std::string& name) const {
-    const auto found = headers.find(toLower(name));
+    const auto found = headers.find(Util::toLower(name));
     if (found == headers.end()) {
         return std::nullopt;
     }
@@ -40,7 +32,7 @@ std::optional<std::string> HttpResponse::getHeader(const std::string& name) cons
 }
 
 void HttpResponse::addHeader(const std::string& name, const std::string& value) {
-    headers.emplace(toLower(name), trim(value));
+    headers.emplace(Util::toLower(name), trim(value));
 }
 
 }  // namespace Network

@@ -3,6 +3,8 @@
 #include <cstddef>
 #include <cstdint>
 
+#include "core/util/Ascii.h"
+
 namespace Util {
 
 namespace {
@@ -21,7 +23,7 @@ int digitValue(char c) {
     if (c >= 'a' && c <= 'z') {
         return c - 'a' + 26;
     }
-    if (c >= '0' && c <= '9') {
+    if (isDigit(c)) {
         return c - '0' + 52;
     }
     if (c == '+') {

@@ -1,28 +1,15 @@
 #include "core/util/UrlCoder.h"
 
+#include "core/util/Ascii.h"
+
 namespace Util {
 
 namespace {
 
 const char* const HEX_DIGITS = "0123456789ABCDEF";
 
-// By hand: the C library's classes depend on the locale.
 bool isUnreserved(char c) {
-    return (c >= 'A' && c <= 'Z') || (c >= 'a' && c <= 'z') || (c >= '0' && c <= '9') || c == '-' ||
-           c == '_' || c == '.' || c == '~';
-}
-
-int hexValue(char c) {
-    if (c >= '0' && c <= '9') {
-        return c - '0';
-    }
-    if (c >= 'A' && c <= 'F') {
-        return c - 'A' + 10;
-    }
-    if (c >= 'a' && c <= 'f') {
-        return c - 'a' + 10;
-    }
-    return -1;
+    return isLetter(c) || isDigit(c) || c == '-' || c == '_' || c == '.' || c == '~';
 }
 
 }  // namespace

@@ -3,8 +3,8 @@
 #include <algorithm>
 #include <cstddef>
 
+#include "core/util/Ascii.h"
 #include "pal/kd_log.h"
-#include "util/Ascii.h"
 #include "util/Utf8.h"
 
 namespace Util {

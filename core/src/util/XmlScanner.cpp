@@ -2,7 +2,7 @@
 
 #include <cstdint>
 
-#include "util/Ascii.h"
+#include "core/util/Ascii.h"
 
 namespace Util {
 
@@ -10,32 +10,14 @@ namespace {
 
 constexpr std::uint32_t LAST_CODE_POINT = 0x10FFFF;
 
-bool isBlank(char c) {
-    return c == ' ' || (c >= '\t' && c <= '\r');
-}
-
-bool isDigit(char c) {
-    return c >= '0' && c <= '9';
-}
-
 // The parser takes every byte beyond ASCII, and DEL, for a letter.
 bool isNameStart(char c) {
     const auto byte = static_cast<unsigned char>(c);
-    return (c >= 'A' && c <= 'Z') || (c >= 'a' && c <= 'z') || c == '_' || byte >= 0x7F;
+    return isLetter(c) || c == '_' || byte >= 0x7F;
 }
 
 bool isNameCharacter(char c) {
     return isNameStart(c) || isDigit(c) || c == '-' || c == '.' || c == ':';
-}
-
-int hexValue(char c) {
-    if (isDigit(c)) {
-        return c - '0';
-    }
-    if (c >= 'a' && c <= 'f') {
-        return c - 'a' + 10;
-    }
-    return c >= 'A' && c <= 'F' ? c - 'A' + 10 : -1;
 }
 
 bool isXmlCharacter(std::uint32_t code) {
@@ -146,7 +128,7 @@ XmlScanner::Step XmlScanner::scanDeclaration() {
             }
             continue;
         }
-        while (!atEnd() && current() != '>' && !isBlank(current())) {
+        while (!atEnd() && current() != '>' && !isWhiteSpace(current())) {
             ++position;
         }
     }
@@ -178,7 +160,7 @@ XmlScanner::Step XmlScanner::scanAttribute() {
         ++position;
         return Step::ON;
     }
-    while (!atEnd() && !isBlank(current()) && current() != '/' && current() != '>') {
+    while (!atEnd() && !isWhiteSpace(current()) && current() != '/' && current() != '>') {
         if (current() == '"' || current() == '\'') {
             return Step::STOP;
         }
@@ -292,7 +274,7 @@ void XmlScanner::skipWhiteSpace() {
         if (startsWith("\xEF\xBB\xBF") || startsWith("\xEF\xBF\xBE") ||
             startsWith("\xEF\xBF\xBF")) {
             position += 3;
-        } else if (isBlank(current())) {
+        } else if (isWhiteSpace(current())) {
             ++position;
         } else {
             return;
