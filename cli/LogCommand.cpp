@@ -11,6 +11,7 @@
 #include "UsageError.h"
 #include "core/Logger.h"
 #include "core/util/EventLock.h"
+#include "core/util/Time.h"
 #include "core/util/Timer.h"
 #include "pal/kd_event.h"
 
@@ -18,7 +19,7 @@ namespace Cli {
 
 namespace {
 
-const int64_t NS_PER_S = 1000000000;
+using Util::NS_PER_S;
 
 std::map<std::string, std::string> readParams(const std::vector<std::string>& texts) {
     std::map<std::string, std::string> params;

@@ -3,6 +3,7 @@
 #include <utility>
 
 #include "core/sound/ZeroWatch.h"
+#include "core/util/Time.h"
 #include "pal/kd_time.h"
 #include "talvox/Recognizer.h"
 
@@ -14,7 +15,7 @@ SessionListener::SessionListener(boost::shared_ptr<EventQueue> events)
 SessionEvent SessionListener::make(SessionEvent::Kind kind) const {
     SessionEvent event;
     event.kind = kind;
-    event.ms = (kdGetTimeUST() - startTime) / 1000000;
+    event.ms = (kdGetTimeUST() - startTime) / Util::NS_PER_MS;
     return event;
 }
 

@@ -5,6 +5,7 @@
 #include <random>
 
 #include "core/util/Base64Coder.h"
+#include "core/util/Time.h"
 #include "gateway/HeaderValue.h"
 #include "gateway/LogText.h"
 #include "gateway/ResultDocument.h"
@@ -101,7 +102,7 @@ Answer RecognitionRequest::finish() {
     }
     answer.headers.emplace_back("x-kvrequestid", requestId);
     endUtterance();
-    answerMs = static_cast<uint64_t>((kdGetTimeUST() - begin) / 1000000);
+    answerMs = static_cast<uint64_t>((kdGetTimeUST() - begin) / Util::NS_PER_MS);
     return answer;
 }
 

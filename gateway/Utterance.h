@@ -5,6 +5,7 @@
 #include <memory>
 #include <vector>
 
+#include "core/util/Time.h"
 #include "gateway/CepstralMean.h"
 #include "gateway/DecoderPool.h"
 
@@ -63,7 +64,7 @@ class Utterance {
     uint64_t getDurationMs() const { return total * 1000 / SpeechModel::RATE_HZ; }
 
     /** Time that the decoder has taken so far, in milliseconds. */
-    uint64_t getDecodeMs() const { return static_cast<uint64_t>(decodeNs / 1000000); }
+    uint64_t getDecodeMs() const { return static_cast<uint64_t>(decodeNs / Util::NS_PER_MS); }
 
   private:
     void measure(bool last);

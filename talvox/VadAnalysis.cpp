@@ -8,6 +8,7 @@
 
 #include "core/sound/RecorderFormat.h"
 #include "core/sound/ZeroWatch.h"
+#include "core/util/Time.h"
 #include "talvox/impl/BufferedVAD.h"
 #include "talvox/impl/FrameVAD.h"
 #include "talvox/impl/ListeningRules.h"
@@ -18,7 +19,7 @@ namespace Talvox {
 
 namespace {
 
-const int64_t NS_PER_MS = 1000000;
+using Util::NS_PER_MS;
 
 /** Stands before a frame detector and notes its decisions. */
 class NotingFrameVAD : public FrameVAD {

@@ -8,14 +8,15 @@
 
 #include "core/Logger.h"
 #include "core/util/EventLock.h"
+#include "core/util/Time.h"
 #include "logcollector/impl/LogCollectorNetworkTask.h"
 
 namespace LogCollector {
 
 namespace {
 
-constexpr int64_t NS_PER_S = 1000000000;
-constexpr int64_t NS_PER_MS = 1000000;
+using Util::NS_PER_MS;
+using Util::NS_PER_S;
 constexpr int RETRY_DELAY_MS = 3000;
 constexpr int ATTEMPTS = 2;
 

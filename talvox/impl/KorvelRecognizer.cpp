@@ -6,6 +6,7 @@
 
 #include "core/network/NetworkManager.h"
 #include "core/util/EventLock.h"
+#include "core/util/Time.h"
 #include "pal/kd.h"
 #include "talvox/Log.h"
 #include "talvox/Talvox.h"
@@ -18,7 +19,7 @@ namespace {
 const int LOG_LEVEL = 2;
 const char* const DUMP_PATH = "/removable/in.wav";
 
-const int64_t NS_PER_MS = 1000000;
+using Util::NS_PER_MS;
 
 /** A recorder that neither delivers a millisecond nor reports for so long has failed. */
 const int64_t NO_SOUND_LIMIT_NS = 10000 * NS_PER_MS;

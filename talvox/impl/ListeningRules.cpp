@@ -1,10 +1,12 @@
 #include "talvox/impl/ListeningRules.h"
 
+#include "core/util/Time.h"
+
 namespace Talvox {
 
 namespace {
 
-const int64_t NS_PER_MS = 1000000;
+using Util::NS_PER_MS;
 const int64_t NO_VOICE_LIMIT_NS = 5000 * NS_PER_MS;
 const unsigned SOUND_LIMIT_MS = 20000;
 

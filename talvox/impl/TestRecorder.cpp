@@ -10,6 +10,7 @@
 #include <vector>
 
 #include "core/util/EventLock.h"
+#include "core/util/Time.h"
 #include "pal/kd.h"
 
 namespace Talvox {
@@ -20,7 +21,7 @@ const int SAMPLES_PER_BUFFER = 1600;
 const int CHANNELS = 1;
 const int SAMPLE_SIZE = 2;
 const std::size_t BYTES_PER_BUFFER = std::size_t{SAMPLES_PER_BUFFER} * CHANNELS * SAMPLE_SIZE;
-const int64_t NS_PER_MS = 1000000;
+using Util::NS_PER_MS;
 
 }  // namespace
 

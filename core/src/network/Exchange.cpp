@@ -7,6 +7,7 @@
 #include <utility>
 
 #include "core/util/EventLock.h"
+#include "core/util/Time.h"
 #include "network/FailureText.h"
 #include "network/RequestCheck.h"
 #include "network/Transport.h"
@@ -18,7 +19,7 @@ namespace Network {
 namespace {
 
 constexpr std::size_t MOST_COLLECTED_BYTES = std::size_t{1024} * 1024;
-constexpr int64_t NS_PER_MS = 1000000;
+using Util::NS_PER_MS;
 
 }  // namespace
 

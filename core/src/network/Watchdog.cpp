@@ -4,6 +4,7 @@
 #include <limits>
 #include <utility>
 
+#include "core/util/Time.h"
 #include "pal/kd_event.h"
 #include "pal/kd_time.h"
 
@@ -11,7 +12,7 @@ namespace Network {
 
 namespace {
 
-constexpr int64_t NS_PER_MS = 1000000;
+using Util::NS_PER_MS;
 constexpr int64_t NOT_WAITING = std::numeric_limits<int64_t>::min();
 
 }  // namespace

@@ -5,6 +5,7 @@
 #include <utility>
 
 #include "core/util/EventLock.h"
+#include "core/util/Time.h"
 #include "pal/kd_event.h"
 #include "pal/kd_log.h"
 #include "pal/kd_time.h"
@@ -13,7 +14,7 @@ namespace Sensor {
 
 namespace {
 
-const int64_t NS_PER_MS = 1000000;
+using Util::NS_PER_MS;
 
 }  // namespace
 

@@ -4,6 +4,7 @@
 #include <utility>
 
 #include "core/sound/RecorderFormat.h"
+#include "core/util/Time.h"
 #include "pal/kd_event.h"
 #include "pal/kd_time.h"
 
@@ -11,7 +12,7 @@ namespace Sound {
 
 namespace {
 
-const int64_t NS_PER_MS = 1000000;
+using Util::NS_PER_MS;
 
 /** The shortest time of a timer: it fires as soon as the event lock is free. */
 const int64_t SOONEST_NS = 1;

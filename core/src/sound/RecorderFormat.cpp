@@ -1,5 +1,7 @@
 #include "core/sound/RecorderFormat.h"
 
+#include "core/util/Time.h"
+
 namespace Sound {
 
 namespace {
@@ -10,7 +12,7 @@ const int BUFFER_LENGTH_MS_MIN = 1;
 const int BUFFER_LENGTH_MS_MAX = 10000;
 const int BYTES_PER_SAMPLE = 2;
 const int MS_PER_SECOND = 1000;
-const int64_t NS_PER_SECOND = 1000000000;
+using Util::NS_PER_S;
 
 }  // namespace
 
@@ -31,8 +33,7 @@ std::size_t RecorderFormat::getByteCount() const {
 }
 
 int64_t RecorderFormat::getDurationNs(int64_t sampleCount) const {
-    return sampleCount / sampleRate * NS_PER_SECOND +
-           sampleCount % sampleRate * NS_PER_SECOND / sampleRate;
+    return sampleCount / sampleRate * NS_PER_S + sampleCount % sampleRate * NS_PER_S / sampleRate;
 }
 
 SoundDataInfo RecorderFormat::getInfo() const {
