@@ -15,7 +15,7 @@ constexpr const char* DESCRIPTION =
     "A tool for developers, made for the loopback interface: it has no encryption, no\n"
     "authentication and no defence against overload. Do not offer it to a network.";
 
-constexpr const char* VERSION = "talvox-gateway 133 (" TALVOX_BUILD_ID ")";
+constexpr const char* VERSION = "talvox-gateway " TALVOX_VERSION " (" TALVOX_BUILD_ID ")";
 
 const CLI::Validator IS_NOT_EMPTY(
     [](const std::string& text) { return std::string(text.empty() ? "the value is empty" : ""); },

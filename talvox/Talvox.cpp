@@ -78,7 +78,7 @@ void logWhatHasNoEffect(const Settings& given, const Settings& engineSettings,
 
 }  // namespace
 
-TALVOX_EARLY const std::string Talvox::VERSION("133");
+TALVOX_EARLY const std::string Talvox::VERSION(TALVOX_VERSION);
 
 Talvox& Talvox::getInstance() {
     return instance();
