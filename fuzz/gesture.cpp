@@ -28,7 +28,7 @@ constexpr int64_t PAUSES_US[] = {0,        400,      600,      999,     1000,   
                                  30000000, 59999000, 60000000, 60001000};
 
 /** What a callback may do from inside; done once, at the next report. */
-enum Deed { NOTHING, STOP, RESTART, ADD, DROP, FALL_SILENT };
+enum CallbackAction { NOTHING, STOP, RESTART, ADD, DROP, FALL_SILENT };
 
 /** One of two that are to behave alike. */
 class Player {
@@ -47,8 +47,8 @@ class Player {
     virtual void drop() = 0;
     virtual void setListening(bool hears) = 0;
 
-    void arm(Deed deed, const std::string& name, const std::string& pattern) {
-        armed = deed;
+    void arm(CallbackAction action, const std::string& name, const std::string& pattern) {
+        armed = action;
         newName = name;
         newPattern = pattern;
     }
@@ -82,7 +82,7 @@ class Player {
     }
 
   private:
-    Deed armed = NOTHING;
+    CallbackAction armed = NOTHING;
     std::string newName;
     std::string newPattern;
 };
@@ -408,10 +408,10 @@ class Match {
                 reference.setListening(true);
                 break;
             default: {
-                static constexpr Deed DEEDS[] = {STOP, RESTART, ADD, FALL_SILENT};
-                const Deed deed = byte == 0xFF ? DROP : DEEDS[byte % 4];
-                recognizer.arm(deed, line.first, line.second);
-                reference.arm(deed, line.first, line.second);
+                static constexpr CallbackAction ACTIONS[] = {STOP, RESTART, ADD, FALL_SILENT};
+                const CallbackAction action = byte == 0xFF ? DROP : ACTIONS[byte % 4];
+                recognizer.arm(action, line.first, line.second);
+                reference.arm(action, line.first, line.second);
             }
         }
     }

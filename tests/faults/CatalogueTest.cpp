@@ -47,11 +47,11 @@ class CatalogueTest : public FaultSession,
         SCOPED_TRACE(chunked ? "chunked" : "simple");
         setChunked(chunked);
         GetParam().arrange(*this);
-        const Course course = run();
-        EXPECT_EQ(expected.end, course.end) << course.events;
-        EXPECT_EQ(expected.requests, course.requests);
-        checkTable(GetParam(), chunked, course);
-        questions += asksNameServer ? course.attempts : 0;
+        const SessionOutcome outcome = run();
+        EXPECT_EQ(expected.end, outcome.end) << outcome.events;
+        EXPECT_EQ(expected.requests, outcome.requests);
+        checkTable(GetParam(), chunked, outcome);
+        questions += asksNameServer ? outcome.attempts : 0;
     }
 
     bool asksNameServer = false;

@@ -154,46 +154,46 @@ void FaultSession::stepTo(int64_t ms) {
     }
 }
 
-Course FaultSession::finish() {
+SessionOutcome FaultSession::finish() {
     while (events->countEnds() == 0 && elapsed < LONGEST_SESSION_MS) {
         step();
     }
-    Course course = describe();
+    SessionOutcome outcome = describe();
     EXPECT_TRUE(isEngineFree());
     advanceMs(LONGEST_SESSION_MS);
     rest();
     advanceMs(LONGEST_SESSION_MS);
     EXPECT_EQ(1U, events->countEnds());
-    const Course later = describe();
-    EXPECT_EQ(course.events, later.events);
-    EXPECT_EQ(course.attempts, later.attempts);
-    return course;
+    const SessionOutcome later = describe();
+    EXPECT_EQ(outcome.events, later.events);
+    EXPECT_EQ(outcome.attempts, later.attempts);
+    return outcome;
 }
 
-Course FaultSession::run() {
+SessionOutcome FaultSession::run() {
     start();
     return finish();
 }
 
-Course FaultSession::describe() const {
-    Course course;
+SessionOutcome FaultSession::describe() const {
+    SessionOutcome outcome;
     for (const std::string& text : events->texts()) {
-        course.endMs = events->timeOf(text);
-        course.end = text;
+        outcome.endMs = events->timeOf(text);
+        outcome.end = text;
         if (text == "results") {
             const auto results = events->recognition()->getResults();
-            course.end += results->empty() ? " (none)" : " (" + results->front().getText() + ')';
+            outcome.end += results->empty() ? " (none)" : " (" + results->front().getText() + ')';
         }
-        course.events +=
-            (course.events.empty() ? "" : ", ") + course.end + ' ' + inSeconds(course.endMs);
+        outcome.events +=
+            (outcome.events.empty() ? "" : ", ") + outcome.end + ' ' + inSeconds(outcome.endMs);
     }
     if (events->countEnds() == 0) {
-        course.end.clear();
+        outcome.end.clear();
     }
-    course.speechEndMs = events->timeOf("recordingDone");
-    course.attempts = countAttempts(*log) - attemptsBefore;
-    course.requests = server->getRequestCount() - requestsBefore;
-    return course;
+    outcome.speechEndMs = events->timeOf("recordingDone");
+    outcome.attempts = countAttempts(*log) - attemptsBefore;
+    outcome.requests = server->getRequestCount() - requestsBefore;
+    return outcome;
 }
 
 bool FaultSession::isEngineFree() {

@@ -29,7 +29,7 @@ constexpr int BUFFER_MS = 100;
 TestSupport::Samples makeUtterance(int sentences = 1);
 
 /** What a session came to; times are of the platform's clock, since the start. */
-struct Course {
+struct SessionOutcome {
     std::string events; /**< "recordingBegin 0.3, ..." */
     std::string end;    /**< the last event, with the text of the best hypothesis; "" without end */
     int64_t endMs = -1;
@@ -40,7 +40,7 @@ struct Course {
 
 /**
  * The engine, a scripted server, and a recorder that plays an utterance in steps of 100 ms. Between
- * two steps everything comes to rest, so that the course of a session is always the same.
+ * two steps everything comes to rest, so that the outcome of a session is always the same.
  *
  * When a test is over, all that it used must have been given back.
  */
@@ -59,9 +59,9 @@ class FaultSession : public CloudTest::EngineTest {
     /** Steps up to this time since the start. */
     void stepTo(int64_t ms);
     /** Steps until the session's end, for two minutes at most; then nothing may follow. */
-    Course finish();
+    SessionOutcome finish();
     /** All of it. */
-    Course run();
+    SessionOutcome run();
 
     /** Milliseconds since the start. */
     int64_t elapsedMs() const { return elapsed; }
@@ -83,7 +83,7 @@ class FaultSession : public CloudTest::EngineTest {
 
   private:
     void deliverNext();
-    Course describe() const;
+    SessionOutcome describe() const;
 
     LiveCounts countsBefore;
     int64_t elapsed = 0;

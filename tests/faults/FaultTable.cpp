@@ -30,14 +30,14 @@ std::string makeKey(const Fault& fault, bool chunked) {
     return "| " + fault.what + " | " + (chunked ? "chunked" : "simple") + " | ";
 }
 
-std::string makeRow(const Fault& fault, bool chunked, const Course& course) {
+std::string makeRow(const Fault& fault, bool chunked, const SessionOutcome& outcome) {
     std::string after = "–";
-    if (course.speechEndMs >= 0) {
-        const int64_t tenths = (course.endMs - course.speechEndMs) / BUFFER_MS;
+    if (outcome.speechEndMs >= 0) {
+        const int64_t tenths = (outcome.endMs - outcome.speechEndMs) / BUFFER_MS;
         after = std::to_string(tenths / 10) + '.' + std::to_string(tenths % 10) + " s";
     }
-    return makeKey(fault, chunked) + course.events + " | " + after + " | " +
-           std::to_string(course.attempts) + " | " + std::to_string(course.requests) + " |";
+    return makeKey(fault, chunked) + outcome.events + " | " + after + " | " +
+           std::to_string(outcome.attempts) + " | " + std::to_string(outcome.requests) + " |";
 }
 
 std::vector<std::string> makeKeys() {
@@ -102,8 +102,8 @@ Writer* const writer = makeWriter();
 
 }  // namespace
 
-void checkTable(const Fault& fault, bool chunked, const Course& course) {
-    const std::string row = makeRow(fault, chunked, course);
+void checkTable(const Fault& fault, bool chunked, const SessionOutcome& outcome) {
+    const std::string row = makeRow(fault, chunked, outcome);
     if (writer != nullptr) {
         writer->add(makeKey(fault, chunked), row);
         return;

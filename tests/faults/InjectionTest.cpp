@@ -113,9 +113,9 @@ class InjectionTest : public FaultSession, public ::testing::WithParamInterface<
 
     /** A session as it is configured: one request with what belongs there, or none. */
     void expectOneRequest() {
-        const Course course = run();
-        EXPECT_EQ("results (go forward)", course.end);
-        ASSERT_EQ(1U, course.requests);
+        const SessionOutcome outcome = run();
+        EXPECT_EQ("results (go forward)", outcome.end);
+        ASSERT_EQ(1U, outcome.requests);
         const auto request = server->getRequest(server->getRequestCount() - 1);
         expectHead(request.head, "POST", host, names());
         EXPECT_EQ("multipart/form-data; boundary=1BEF0A57BE110FD467A",
@@ -126,9 +126,9 @@ class InjectionTest : public FaultSession, public ::testing::WithParamInterface<
 
     void expectRefusal() {
         log->clear();
-        const Course course = run();
-        EXPECT_EQ("error ErrorNetwork", course.end);
-        EXPECT_EQ(0U, course.requests);
+        const SessionOutcome outcome = run();
+        EXPECT_EQ("error ErrorNetwork", outcome.end);
+        EXPECT_EQ(0U, outcome.requests);
         EXPECT_EQ(0U, server->getConnectionCount() - connections);
         EXPECT_TRUE(log->containsPart(REFUSAL));
     }
@@ -173,8 +173,8 @@ TEST_P(InjectionTest, AddressesThatMeanSomethingElseAreNotSent) {
           url + "/\r\n", "http:" + host, std::string("http://"), std::string("http:///")}) {
         SCOPED_TRACE(bad);
         configureText(Settings::SKS_URL, bad);
-        const Course course = run();
-        EXPECT_EQ("error ErrorNetwork", course.end);
+        const SessionOutcome outcome = run();
+        EXPECT_EQ("error ErrorNetwork", outcome.end);
         EXPECT_EQ(0U, server->getConnectionCount());
         EXPECT_TRUE(log->containsPart("Network: a request"));
         log->clear();

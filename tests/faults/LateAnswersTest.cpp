@@ -47,7 +47,7 @@ class LateAnswersTest : public FaultSession,
     }
 
     /** The next one, with the first one's answer on its way. */
-    Course runSecond() {
+    SessionOutcome runSecond() {
         if (when() == When::BEFORE) {
             server->release();
         }
@@ -76,9 +76,9 @@ class LateAnswersTest : public FaultSession,
 
 TEST_P(LateAnswersTest, StayWithTheirSession) {
     runFirst();
-    const Course course = runSecond();
-    EXPECT_EQ("results (new words)", course.end) << course.events;
-    EXPECT_EQ(1U, course.attempts);
+    const SessionOutcome outcome = runSecond();
+    EXPECT_EQ("results (new words)", outcome.end) << outcome.events;
+    EXPECT_EQ(1U, outcome.attempts);
     if (when() == When::AFTER) {
         server->release();
         rest();

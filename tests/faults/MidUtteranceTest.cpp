@@ -43,8 +43,8 @@ class MidUtteranceTest : public FaultSession {
         };
     }
 
-    void expectWholeSound(const Course& course) {
-        EXPECT_EQ("results (go forward)", course.end);
+    void expectWholeSound(const SessionOutcome& outcome) {
+        EXPECT_EQ("results (go forward)", outcome.end);
         ASSERT_GE(server->getRequestCount(), 1U);
         const auto last = server->getRequest(server->getRequestCount() - 1);
         EXPECT_TRUE(last.complete);
@@ -53,9 +53,9 @@ class MidUtteranceTest : public FaultSession {
 };
 
 TEST_F(MidUtteranceTest, AnUndisturbedRequestHoldsTheWholeSound) {
-    const Course course = run();
-    EXPECT_EQ(SPEECH_END_MS, course.speechEndMs);
-    EXPECT_EQ(1U, course.attempts);
+    const SessionOutcome outcome = run();
+    EXPECT_EQ(SPEECH_END_MS, outcome.speechEndMs);
+    EXPECT_EQ(1U, outcome.attempts);
     EXPECT_TRUE(soundUpTo(SPEECH_END_MS) == takeSound(server->getRequest(0).body));
 }
 
@@ -69,12 +69,12 @@ TEST_F(MidUtteranceTest, LostAtAnyTimeItIsSentAgainFromTheFirstFrame) {
     for (const int64_t ms : {100, 300, 700, 1000, 1500, 2000, 2500, 2800}) {
         SCOPED_TRACE(ms);
         cutAt(ms);
-        const Course course = run();
-        expectWholeSound(course);
-        EXPECT_EQ(2U, course.attempts);
-        EXPECT_EQ(2U, course.requests);
+        const SessionOutcome outcome = run();
+        expectWholeSound(outcome);
+        EXPECT_EQ(2U, outcome.attempts);
+        EXPECT_EQ(2U, outcome.requests);
         // Two seconds of pause, or the speech that goes on meanwhile.
-        EXPECT_EQ(std::max(SPEECH_END_MS, ms + 2000), course.endMs);
+        EXPECT_EQ(std::max(SPEECH_END_MS, ms + 2000), outcome.endMs);
         const auto first = server->getRequest(server->getRequestCount() - 2);
         EXPECT_FALSE(first.complete);
         EXPECT_NE(std::string::npos, first.body.find(soundUpTo(ms)));
@@ -85,10 +85,10 @@ TEST_F(MidUtteranceTest, LostAfterAnyNumberOfBytesItIsSentAgainFromTheFirstFrame
     for (const std::size_t bytes : {0U, 1U, 300U, 700U, 5000U, 40000U, 90000U}) {
         SCOPED_TRACE(bytes);
         server->script({Answer::resetAfter(bytes)});
-        const Course course = run();
-        expectWholeSound(course);
-        EXPECT_EQ(2U, course.attempts);
-        EXPECT_EQ(2U, course.requests);
+        const SessionOutcome outcome = run();
+        expectWholeSound(outcome);
+        EXPECT_EQ(2U, outcome.attempts);
+        EXPECT_EQ(2U, outcome.requests);
     }
 }
 
@@ -98,29 +98,29 @@ TEST_F(MidUtteranceTest, LostOnAConnectionOfAnEarlierSessionItIsSentAgainAtOnce)
     start();
     stepTo(1600);
     EXPECT_EQ(3U, server->getRequestCount());
-    const Course course = finish();
-    expectWholeSound(course);
-    EXPECT_EQ(1U, course.attempts);
-    EXPECT_EQ(SPEECH_END_MS, course.endMs);
+    const SessionOutcome outcome = finish();
+    expectWholeSound(outcome);
+    EXPECT_EQ(1U, outcome.attempts);
+    EXPECT_EQ(SPEECH_END_MS, outcome.endMs);
 }
 
 TEST_F(MidUtteranceTest, LostRightAfterTheEndOfSpeechItIsSentAgainFromTheFirstFrame) {
     server->script({Answer::never()});
     cutAt(SPEECH_END_MS);
-    const Course course = run();
-    expectWholeSound(course);
-    EXPECT_EQ(SPEECH_END_MS + 2000, course.endMs);
+    const SessionOutcome outcome = run();
+    expectWholeSound(outcome);
+    EXPECT_EQ(SPEECH_END_MS + 2000, outcome.endMs);
     EXPECT_TRUE(server->getRequest(0).complete);
 }
 
 // An end in good order shows with one of the next two pieces of sound: when exactly, is libcurl's.
 TEST_F(MidUtteranceTest, ClosedInGoodOrderItIsSentAgainFromTheFirstFrame) {
     server->script({Answer::closing().afterBodyBytes(40000)});
-    const Course course = run();
-    expectWholeSound(course);
-    EXPECT_EQ(2U, course.requests);
-    EXPECT_GE(course.endMs, 3300);
-    EXPECT_LE(course.endMs, 3600);
+    const SessionOutcome outcome = run();
+    expectWholeSound(outcome);
+    EXPECT_EQ(2U, outcome.requests);
+    EXPECT_GE(outcome.endMs, 3300);
+    EXPECT_LE(outcome.endMs, 3600);
 }
 
 TEST_F(MidUtteranceTest, WhatIsSaidInThePauseIsSentAsWell) {
@@ -136,16 +136,16 @@ TEST_F(MidUtteranceTest, WhatIsSaidInThePauseIsSentAsWell) {
 
 TEST_F(MidUtteranceTest, ALossOfTheSecondConnectionIsFinal) {
     server->setDefaultAnswer(Answer::resetAfter(40000));
-    const Course course = run();
-    EXPECT_EQ("error ErrorNetwork", course.end);
-    EXPECT_EQ(2U, course.requests);
+    const SessionOutcome outcome = run();
+    EXPECT_EQ("error ErrorNetwork", outcome.end);
+    EXPECT_EQ(2U, outcome.requests);
 }
 
 TEST_F(MidUtteranceTest, TheEncodedSoundIsWholeAsWell) {
     configureText(Settings::SKS_SOUND_FORMAT, Settings::SOUND_FORMAT_SPEEX);
     cutAt(1500);
-    const Course course = run();
-    EXPECT_EQ("results (go forward)", course.end);
+    const SessionOutcome outcome = run();
+    EXPECT_EQ("results (go forward)", outcome.end);
     ASSERT_EQ(2U, server->getRequestCount());
     const std::string stream = takeSound(server->getRequest(1).body);
     const auto pages = TestSupport::readOggPages({stream.begin(), stream.end()});

@@ -7,21 +7,21 @@ namespace Lifecycle {
 
 namespace {
 
-const char* nameOf(Fate fate) {
-    switch (fate) {
-        case Fate::ANSWER:
+const char* nameOf(GatewayBehaviour behaviour) {
+    switch (behaviour) {
+        case GatewayBehaviour::ANSWER:
             return "answers";
-        case Fate::REFUSE_CONNECTION:
+        case GatewayBehaviour::REFUSE_CONNECTION:
             return "refuses the connection";
-        case Fate::RESET:
+        case GatewayBehaviour::RESET:
             return "resets";
-        case Fate::RESET_AFTER_HEAD:
+        case GatewayBehaviour::RESET_AFTER_HEAD:
             return "resets after the head of the answer";
-        case Fate::STALL:
+        case GatewayBehaviour::STALL:
             return "takes nothing";
-        case Fate::SILENCE:
+        case GatewayBehaviour::SILENCE:
             return "never answers";
-        case Fate::TOO_MUCH:
+        case GatewayBehaviour::TOO_MUCH:
             return "answers too much";
     }
     return "?";
@@ -57,7 +57,7 @@ std::string nameOfSession(int session) {
 }
 
 void describe(const AttemptPlan& attempt, std::ostream& out) {
-    out << "    gateway " << nameOf(attempt.fate) << " (" << nameOf(attempt.reply) << ")";
+    out << "    gateway " << nameOf(attempt.behaviour) << " (" << nameOf(attempt.reply) << ")";
     if (attempt.afterBytes == AttemptPlan::WHOLE_BODY) {
         out << " after the whole body";
     } else {

@@ -43,7 +43,7 @@ int pickTimeMs(Dice& dice) {
 AttemptPlan makeAttempt(Dice& dice) {
     AttemptPlan attempt;
     if (!dice.oneIn(3)) {
-        attempt.fate = static_cast<Fate>(dice.pick(FATE_COUNT));
+        attempt.behaviour = static_cast<GatewayBehaviour>(dice.pick(BEHAVIOUR_COUNT));
     }
     if (!dice.oneIn(3)) {
         attempt.reply = static_cast<Reply>(dice.pick(REPLY_COUNT));

@@ -6,7 +6,7 @@
 #include <optional>
 
 #include "Runner.h"
-#include "World.h"
+#include "Testbed.h"
 #include "support/AbortOnAssertion.h"
 
 namespace {
@@ -31,8 +31,8 @@ const std::string& nameOfEnd(std::size_t code) {
 
 int runRange(const Lifecycle::Range& range) {
     const auto start = std::chrono::steady_clock::now();
-    Lifecycle::World world;
-    const std::string found = Lifecycle::run(world, range);
+    Lifecycle::Testbed testbed;
+    const std::string found = Lifecycle::run(testbed, range);
     const std::chrono::duration<double> time = std::chrono::steady_clock::now() - start;
     if (!found.empty()) {
         std::cout << found;
@@ -40,11 +40,11 @@ int runRange(const Lifecycle::Range& range) {
     }
     std::cout << range.count << " sequences from seed " << range.first << " on: all well, "
               << time.count() << " s\n";
-    for (std::size_t code = 0; code < world.getEnds().size(); ++code) {
-        std::cout << "  " << nameOfEnd(code) << ": " << world.getEnds()[code] << "\n";
+    for (std::size_t code = 0; code < testbed.getEnds().size(); ++code) {
+        std::cout << "  " << nameOfEnd(code) << ": " << testbed.getEnds()[code] << "\n";
     }
     std::cout << "calls in microseconds: half of them, 999 of 1000, the longest\n";
-    for (const auto& [action, times] : world.getCallTimes()) {
+    for (const auto& [action, times] : testbed.getCallTimes()) {
         std::cout << "  " << nameOf(action) << ": " << times.quantile(500) << ", "
                   << times.quantile(999) << ", " << times.quantile(1000) << " (" << times.count()
                   << " calls)\n";

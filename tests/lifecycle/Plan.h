@@ -84,7 +84,7 @@ enum class Reply {
 constexpr int REPLY_COUNT = 8;
 
 /** What the gateway does with one attempt. */
-enum class Fate {
+enum class GatewayBehaviour {
     ANSWER,
     REFUSE_CONNECTION,
     RESET, /**< as soon as the bytes are there, without a word */
@@ -93,12 +93,12 @@ enum class Fate {
     SILENCE, /**< takes everything and says nothing */
     TOO_MUCH /**< an answer with a body beyond every bound */
 };
-constexpr int FATE_COUNT = 7;
+constexpr int BEHAVIOUR_COUNT = 7;
 
 struct AttemptPlan {
     static constexpr std::size_t WHOLE_BODY = SIZE_MAX;
 
-    Fate fate = Fate::ANSWER;
+    GatewayBehaviour behaviour = GatewayBehaviour::ANSWER;
     Reply reply = Reply::WORDS;
     std::size_t afterBytes = WHOLE_BODY; /**< of the body, before anything is done */
     int delayMs = 0;                     /**< and then so long */
@@ -129,7 +129,7 @@ struct DevicePlan {
     Saying insideStart = Saying::NOTHING; /**< what it says before the call returns */
     Saying insideStop = Saying::NOTHING;
     Saying insideCancel = Saying::NOTHING;
-    int logging = 0; /**< which policy of uploads, see `World` */
+    int logging = 0; /**< which policy of uploads, see `Testbed` */
 };
 
 /** What serves a session, by its policy. */
@@ -145,7 +145,7 @@ struct SessionPlan {
 
 struct Sequence {
     std::uint64_t seed = 0;
-    int settings = 0; /**< those of the beginning; an index, see `World` */
+    int settings = 0; /**< those of the beginning; an index, see `Testbed` */
     std::vector<SessionPlan> sessions;
     std::vector<Step> steps;
 };

@@ -1,7 +1,7 @@
 #include <gtest/gtest.h>
 
 #include "Runner.h"
-#include "World.h"
+#include "Testbed.h"
 
 namespace {
 
@@ -14,16 +14,16 @@ class RandomSequencesTest : public ::testing::TestWithParam<int> {};
 
 TEST_P(RandomSequencesTest, KeepTheContract) {
     const auto part = static_cast<std::uint64_t>(GetParam());
-    Lifecycle::World world;
+    Lifecycle::Testbed testbed;
     const std::string found =
-        Lifecycle::run(world, {1 + SEQUENCES_PER_PART * part, SEQUENCES_PER_PART});
+        Lifecycle::run(testbed, {1 + SEQUENCES_PER_PART * part, SEQUENCES_PER_PART});
     EXPECT_TRUE(found.empty()) << found;
     // The sequences reach what they are made for: each way in which a session can end.
     for (const int code :
          {SpeechError::ErrorAudio, SpeechError::ErrorNetwork, SpeechError::ErrorCanceled,
           SpeechError::ErrorNoVoice, SpeechError::ErrorNotAvailable, SpeechError::ErrorBusy,
           SpeechError::ErrorMax}) {
-        EXPECT_GT(world.getEnds()[static_cast<std::size_t>(code)], 0) << code;
+        EXPECT_GT(testbed.getEnds()[static_cast<std::size_t>(code)], 0) << code;
     }
 }
 

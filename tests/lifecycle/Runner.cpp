@@ -8,7 +8,7 @@
 #include <iostream>
 #include <sstream>
 
-#include "World.h"
+#include "Testbed.h"
 #include "pal/kd_log.h"
 
 #if defined(__SANITIZE_ADDRESS__) || defined(__SANITIZE_THREAD__)
@@ -60,9 +60,9 @@ void thin(std::vector<Element>& elements, const std::function<bool()>& isStillWr
  * What comes of leaving out steps, reactions and faults as long as the sequence still goes wrong in
  * the same way.
  */
-Sequence shorten(World& world, const Sequence& sequence, const std::string& wrong) {
+Sequence shorten(Testbed& testbed, const Sequence& sequence, const std::string& wrong) {
     Sequence shortest = sequence;
-    const auto isStillWrong = [&] { return world.run(shortest) == wrong; };
+    const auto isStillWrong = [&] { return testbed.run(shortest) == wrong; };
     thin(shortest.steps, isStillWrong);
     for (SessionPlan& session : shortest.sessions) {
         thin(session.reactions, isStillWrong);
@@ -83,21 +83,21 @@ Sequence shorten(World& world, const Sequence& sequence, const std::string& wron
     return shortest;
 }
 
-std::string report(World& world, const Sequence& sequence, const std::string& wrong) {
-    const Sequence shortest = shorten(world, sequence, wrong);
+std::string report(Testbed& testbed, const Sequence& sequence, const std::string& wrong) {
+    const Sequence shortest = shorten(testbed, sequence, wrong);
     std::ostringstream out;
     out << "seed " << sequence.seed << ": " << wrong << "\n";
     writeCommand(out, sequence.seed);
     out << "shortened to\n" << shortest << "what happens in it\n";
     kdSetLogSinkKOR(&writeLog, &out);
-    world.run(shortest, &out);
+    testbed.run(shortest, &out);
     kdSetLogSinkKOR(&ignoreLog, nullptr);
     return out.str();
 }
 
 }  // namespace
 
-std::string run(World& world, const Range& range) {
+std::string run(Testbed& testbed, const Range& range) {
 #ifdef LIFECYCLE_TELLS_SEED_AT_DEATH
     __sanitizer_set_death_callback(&tellSeed);
 #endif
@@ -107,9 +107,9 @@ std::string run(World& world, const Range& range) {
     for (std::uint64_t i = 0; i < range.count && found.empty(); ++i) {
         seedThatRuns = range.first + i;
         const Sequence sequence = makeSequence(seedThatRuns);
-        const std::string wrong = world.run(sequence);
+        const std::string wrong = testbed.run(sequence);
         if (!wrong.empty()) {
-            found = report(world, sequence, wrong);
+            found = report(testbed, sequence, wrong);
         }
     }
     kdSetLogSinkKOR(nullptr, nullptr);

@@ -9,7 +9,7 @@
 
 namespace Lifecycle {
 
-class World;
+class Testbed;
 
 /** Seeds one after the other. */
 struct Range {
@@ -22,6 +22,6 @@ struct Range {
  * @return empty, or all that helps to find the fault: the seed, the sequence without what does not
  *         matter, and what happens in it
  */
-std::string run(World& world, const Range& range);
+std::string run(Testbed& testbed, const Range& range);
 
 }  // namespace Lifecycle

@@ -155,7 +155,7 @@ bool ScriptedGateway::serveAny() {
 
 // After `act` the connection may be gone.
 bool ScriptedGateway::serve(Connection& connection) {
-    if (connection.plan.fate == Fate::REFUSE_CONNECTION) {
+    if (connection.plan.behaviour == GatewayBehaviour::REFUSE_CONNECTION) {
         finish(connection, Network::NetworkTask::NO_RESPONSE);
         return true;
     }
@@ -172,11 +172,12 @@ bool ScriptedGateway::serve(Connection& connection) {
 bool ScriptedGateway::receive(Connection& connection) {
     const AttemptPlan& plan = connection.plan;
     const bool whole = plan.afterBytes == AttemptPlan::WHOLE_BODY;
-    if (connection.bodyEnded || (plan.fate == Fate::STALL && whole)) {
+    if (connection.bodyEnded || (plan.behaviour == GatewayBehaviour::STALL && whole)) {
         return false;
     }
     const std::size_t before = connection.body.size();
-    const bool stops = !whole && (plan.fate == Fate::STALL || plan.fate == Fate::RESET);
+    const bool stops = !whole && (plan.behaviour == GatewayBehaviour::STALL ||
+                                  plan.behaviour == GatewayBehaviour::RESET);
     const std::size_t most =
         stops ? plan.afterBytes - std::min(plan.afterBytes, before) : AttemptPlan::WHOLE_BODY;
     connection.bodyEnded = connection.link.read(connection.body, most);
@@ -185,7 +186,8 @@ bool ScriptedGateway::receive(Connection& connection) {
     }
     const bool enough =
         connection.bodyEnded || (!whole && connection.body.size() >= plan.afterBytes);
-    const bool acts = plan.fate != Fate::STALL && plan.fate != Fate::SILENCE;
+    const bool acts =
+        plan.behaviour != GatewayBehaviour::STALL && plan.behaviour != GatewayBehaviour::SILENCE;
     if (connection.phase == Phase::RECEIVING && enough && acts) {
         connection.phase = Phase::ANSWERING;
         connection.due = kdGetTimeUST() + plan.delayMs * NS_PER_MS;
@@ -197,7 +199,7 @@ bool ScriptedGateway::receive(Connection& connection) {
 void ScriptedGateway::act(Connection& connection) {
     if (connection.phase == Phase::HEAD_SENT) {
         sendEnd(connection);
-    } else if (connection.plan.fate == Fate::RESET) {
+    } else if (connection.plan.behaviour == GatewayBehaviour::RESET) {
         finish(connection, Network::NetworkTask::NO_RESPONSE);
     } else {
         sendHead(connection);
@@ -215,10 +217,10 @@ void ScriptedGateway::sendEnd(Connection& connection) {
     static const unsigned char TEXT[] = {'o', 'k'};
     // Never read: its size is enough to refuse it.
     static const std::vector<unsigned char> tooMuch(TOO_MANY_BYTES);
-    const bool flood = connection.plan.fate == Fate::TOO_MUCH;
+    const bool flood = connection.plan.behaviour == GatewayBehaviour::TOO_MUCH;
     const bool taken = connection.link.listener->onTransferBytes(
         flood ? tooMuch.data() : TEXT, flood ? tooMuch.size() : sizeof(TEXT));
-    const bool broken = !taken || connection.plan.fate == Fate::RESET_AFTER_HEAD;
+    const bool broken = !taken || connection.plan.behaviour == GatewayBehaviour::RESET_AFTER_HEAD;
     finish(connection, broken ? static_cast<int>(Network::NetworkTask::NO_RESPONSE)
                               : getStatus(connection.plan.reply));
 }

@@ -45,7 +45,7 @@ const double BYTES_PER_SESSION_MAX = 4;
 /** Resident memory comes in pages: one in forty sessions. */
 const double RESIDENT_BYTES_PER_SESSION_MAX = 100;
 
-enum class Course {
+enum class Scenario {
     PLAIN,
     SLOW,
     CANCELLED,
@@ -58,17 +58,17 @@ enum class Course {
     NEVER_ANSWERED,
 };
 
-const std::map<Course, std::string> NAMES = {
-    {Course::PLAIN, "plain"},
-    {Course::SLOW, "slow answer"},
-    {Course::CANCELLED, "cancelled"},
-    {Course::DROPPED, "released"},
-    {Course::CLOSED, "closed without answer"},
-    {Course::RESET, "reset in mid-body"},
-    {Course::FAILED_ONCE, "500, then an answer"},
-    {Course::FAILED, "500 twice"},
-    {Course::BAD_HEADER, "bad header"},
-    {Course::NEVER_ANSWERED, "never answered"},
+const std::map<Scenario, std::string> NAMES = {
+    {Scenario::PLAIN, "plain"},
+    {Scenario::SLOW, "slow answer"},
+    {Scenario::CANCELLED, "cancelled"},
+    {Scenario::DROPPED, "released"},
+    {Scenario::CLOSED, "closed without answer"},
+    {Scenario::RESET, "reset in mid-body"},
+    {Scenario::FAILED_ONCE, "500, then an answer"},
+    {Scenario::FAILED, "500 twice"},
+    {Scenario::BAD_HEADER, "bad header"},
+    {Scenario::NEVER_ANSWERED, "never answered"},
 };
 
 /** What the engine's workers do at a time. */
@@ -116,16 +116,17 @@ class SoakTest : public CloudTest::EngineTest {
     }
 
     /** Four in a hundred sessions are cancelled or released, ten meet a fault. */
-    Course chooseCourse() {
+    Scenario chooseScenario() {
         const unsigned dice = random() % 100;
         if (dice >= 14) {
-            return Course::PLAIN;
+            return Scenario::PLAIN;
         }
-        static const Course OTHERS[] = {
-            Course::CANCELLED,      Course::CANCELLED,   Course::DROPPED, Course::DROPPED,
-            Course::SLOW,           Course::SLOW,        Course::CLOSED,  Course::RESET,
-            Course::RESET,          Course::FAILED_ONCE, Course::FAILED,  Course::BAD_HEADER,
-            Course::NEVER_ANSWERED, Course::CLOSED};
+        static const Scenario OTHERS[] = {
+            Scenario::CANCELLED,      Scenario::CANCELLED, Scenario::DROPPED,
+            Scenario::DROPPED,        Scenario::SLOW,      Scenario::SLOW,
+            Scenario::CLOSED,         Scenario::RESET,     Scenario::RESET,
+            Scenario::FAILED_ONCE,    Scenario::FAILED,    Scenario::BAD_HEADER,
+            Scenario::NEVER_ANSWERED, Scenario::CLOSED};
         return OTHERS[dice];
     }
 
@@ -142,25 +143,25 @@ class SoakTest : public CloudTest::EngineTest {
         kdMountKOR("/removable", dumps ? directory.path().c_str() : nullptr);
     }
 
-    Answer makeAnswer(Course course) const {
+    Answer makeAnswer(Scenario scenario) const {
         Answer own = CloudTest::answerDocument(CloudTest::makeDocument({{getOwnWords(), "0.95"}}));
-        switch (course) {
-            case Course::SLOW:
+        switch (scenario) {
+            case Scenario::SLOW:
                 return own.inPieces(100);
-            case Course::CLOSED:
+            case Scenario::CLOSED:
                 return Answer::closing();
-            case Course::RESET:
+            case Scenario::RESET:
                 return Answer::resetAfter(5000);
-            case Course::FAILED:
+            case Scenario::FAILED:
                 return Answer::status(500);
-            case Course::BAD_HEADER:
+            case Scenario::BAD_HEADER:
                 return Answer::status(200, {{"x-asrgw-recognition-results", "%%%"}});
-            case Course::CANCELLED:
-            case Course::DROPPED:
-            case Course::NEVER_ANSWERED:
+            case Scenario::CANCELLED:
+            case Scenario::DROPPED:
+            case Scenario::NEVER_ANSWERED:
                 return Answer::never();
-            case Course::PLAIN:
-            case Course::FAILED_ONCE:
+            case Scenario::PLAIN:
+            case Scenario::FAILED_ONCE:
                 break;
         }
         return own;
@@ -193,20 +194,20 @@ class SoakTest : public CloudTest::EngineTest {
         }
     }
 
-    void waitForEnd(Course course, std::size_t requestsBefore) {
-        switch (course) {
-            case Course::DROPPED:
-            case Course::CANCELLED:
+    void waitForEnd(Scenario scenario, std::size_t requestsBefore) {
+        switch (scenario) {
+            case Scenario::DROPPED:
+            case Scenario::CANCELLED:
                 break;
-            case Course::PLAIN:
+            case Scenario::PLAIN:
                 waitForAnswer();
                 break;
-            case Course::SLOW:
+            case Scenario::SLOW:
                 advanceMs(5000);
                 server->release(10);
                 waitForAnswer();
                 break;
-            case Course::FAILED_ONCE:
+            case Scenario::FAILED_ONCE:
                 waitForSecondAttempt(requestsBefore + 2);
                 break;
             default:
@@ -215,39 +216,39 @@ class SoakTest : public CloudTest::EngineTest {
         }
     }
 
-    void runSession(Course course) {
+    void runSession(Scenario scenario) {
         ++number;
-        ++courses[course];
+        ++scenarios[scenario];
         configureSession();
-        server->setDefaultAnswer(makeAnswer(course));
-        if (course == Course::FAILED_ONCE) {
+        server->setDefaultAnswer(makeAnswer(scenario));
+        if (scenario == Scenario::FAILED_ONCE) {
             server->script({Answer::status(500)});
         }
         events = boost::make_shared<CloudTest::EventRecorder>();
         auto session = engine().createRecognizer(events, boost::make_shared<Settings>());
         const std::size_t requestsBefore = server->getRequestCount();
         session->start();
-        const bool isBroken = course == Course::CANCELLED || course == Course::DROPPED;
+        const bool isBroken = scenario == Scenario::CANCELLED || scenario == Scenario::DROPPED;
         play(isBroken ? static_cast<int>(random() % 12) : 11);
-        if (course == Course::CANCELLED) {
+        if (scenario == Scenario::CANCELLED) {
             session->cancel();
         }
-        waitForEnd(course, requestsBefore);
+        waitForEnd(scenario, requestsBefore);
         session.reset();
-        checkEnd(course);
+        checkEnd(scenario);
     }
 
-    void checkEnd(Course course) {
+    void checkEnd(Scenario scenario) {
         const auto texts = events->texts();
-        const std::string context = "session " + std::to_string(number) + ", " + NAMES.at(course);
-        if (course == Course::DROPPED) {
+        const std::string context = "session " + std::to_string(number) + ", " + NAMES.at(scenario);
+        if (scenario == Scenario::DROPPED) {
             EXPECT_EQ(events->countEnds(), 0U) << context;
             return;
         }
         ASSERT_EQ(events->countEnds(), 1U) << context;
-        const bool hasAnswer =
-            course == Course::PLAIN || course == Course::SLOW || course == Course::FAILED_ONCE;
-        const std::string error = course == Course::CANCELLED ? "Canceled" : "Network";
+        const bool hasAnswer = scenario == Scenario::PLAIN || scenario == Scenario::SLOW ||
+                               scenario == Scenario::FAILED_ONCE;
+        const std::string error = scenario == Scenario::CANCELLED ? "Canceled" : "Network";
         EXPECT_EQ(texts.back(), hasAnswer ? "results" : "error Error" + error) << context;
         if (hasAnswer && texts.back() == "results") {
             EXPECT_EQ(events->recognition()->getResults()->front().getText(), getOwnWords())
@@ -260,9 +261,9 @@ class SoakTest : public CloudTest::EngineTest {
         server = std::make_unique<ScriptedHttpServer>(port);
         port = server->getPort();
         for (int i = 1; i < SESSIONS_PER_POINT; ++i) {
-            runSession(chooseCourse());
+            runSession(chooseScenario());
         }
-        runSession(Course::PLAIN);
+        runSession(Scenario::PLAIN);
         events.reset();
         recorder.reset();
         kdDrainEventsKOR();
@@ -274,7 +275,7 @@ class SoakTest : public CloudTest::EngineTest {
     std::unique_ptr<ScriptedHttpServer> server;
     boost::shared_ptr<CloudTest::EventRecorder> events;
     const CloudTest::BufferPtr buffer = CloudTest::makeConstantBuffer(7);
-    std::map<Course, int> courses;
+    std::map<Scenario, int> scenarios;
     unsigned short port = 0;
     int number = 0;
 };
@@ -305,7 +306,7 @@ TEST_F(SoakTest, LeavesNothingBehind) {
         })) << "after session "
             << number;
     }
-    for (const auto& entry : courses) {
+    for (const auto& entry : scenarios) {
         std::printf("%s: %d\n", NAMES.at(entry.first).c_str(), entry.second);
     }
     const double rise = live.getBytesPerSession(WARM_UP_POINTS);

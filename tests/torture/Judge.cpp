@@ -38,10 +38,10 @@ const char* getName(Stage stage) {
     return "at the end of the process";
 }
 
-std::string describe(const Course& course) {
-    std::string text = std::to_string(course.ends) + " ends";
-    text += course.results != 0 ? ", results" : "";
-    text += course.error >= 0 ? ", error " + std::to_string(course.error) : "";
+std::string describe(const SessionOutcome& outcome) {
+    std::string text = std::to_string(outcome.ends) + " ends";
+    text += outcome.results != 0 ? ", results" : "";
+    text += outcome.error >= 0 ? ", error " + std::to_string(outcome.error) : "";
     return text;
 }
 
@@ -60,28 +60,28 @@ void checkProcess(const Verdict& verdict, Faults& faults) {
     }
 }
 
-void checkException(const Course& course, Faults& faults) {
-    if (course.exception[0] != '\0') {
-        faults.push_back(std::string("an exception leaves ") + course.exception);
+void checkException(const SessionOutcome& outcome, Faults& faults) {
+    if (outcome.exception[0] != '\0') {
+        faults.push_back(std::string("an exception leaves ") + outcome.exception);
     }
 }
 
 /** One end, in time, and an error with a line in the log; after a release none has to come. */
-void checkEnd(const Plan& plan, const Course& course, Faults& faults) {
+void checkEnd(const Plan& plan, const SessionOutcome& outcome, Faults& faults) {
     const bool isReleased = plan.ending == Plan::Ending::RELEASE;
-    if (course.created == 0) {
+    if (outcome.created == 0) {
         return;
     }
-    if (course.ends > 1 || (course.ends == 0 && !isReleased)) {
-        faults.push_back("the session has " + describe(course));
+    if (outcome.ends > 1 || (outcome.ends == 0 && !isReleased)) {
+        faults.push_back("the session has " + describe(outcome));
     }
-    if (course.endMs > END_LIMIT_MS) {
-        faults.push_back("the session ends after " + std::to_string(course.endMs) + " ms");
+    if (outcome.endMs > END_LIMIT_MS) {
+        faults.push_back("the session ends after " + std::to_string(outcome.endMs) + " ms");
     }
-    if (course.error >= 0 && course.logged == 0) {
+    if (outcome.error >= 0 && outcome.logged == 0) {
         faults.push_back("an error without a line in the log");
     }
-    if (course.wrongText != 0) {
+    if (outcome.wrongText != 0) {
         faults.push_back("results that the gateway did not give");
     }
 }
@@ -100,9 +100,9 @@ bool isWhole(const Plan& plan, const std::vector<std::string>& bodies,
            (plan.speex && bodies.back().size() == wanted.back().size());
 }
 
-void checkTraffic(const Plan& plan, const Reference& reference, const Course& course,
+void checkTraffic(const Plan& plan, const Reference& reference, const SessionOutcome& outcome,
                   const Traffic& traffic, Faults& faults) {
-    if (course.results != 0 && !isWhole(plan, traffic.first, reference.traffic.first)) {
+    if (outcome.results != 0 && !isWhole(plan, traffic.first, reference.traffic.first)) {
         faults.push_back("results of a request that was not whole");
     }
     if (!reference.traffic.next.empty() && !isWhole(plan, traffic.next, reference.traffic.next)) {
@@ -110,10 +110,10 @@ void checkTraffic(const Plan& plan, const Reference& reference, const Course& co
     }
 }
 
-void checkNext(const Course& wanted, const Course& course, Faults& faults) {
-    if (course.created != wanted.created || course.ends != wanted.ends ||
-        course.results != wanted.results || course.error != wanted.error) {
-        faults.push_back("the session that follows has " + describe(course));
+void checkNext(const SessionOutcome& wanted, const SessionOutcome& outcome, Faults& faults) {
+    if (outcome.created != wanted.created || outcome.ends != wanted.ends ||
+        outcome.results != wanted.results || outcome.error != wanted.error) {
+        faults.push_back("the session that follows has " + describe(outcome));
     }
 }
 
@@ -139,19 +139,20 @@ void checkRest(const Holdings& wanted, const Report& report, Faults& faults) {
     }
 }
 
-bool isLike(const Course& course, const Course& wanted) {
-    return course.created == wanted.created && course.ends == wanted.ends &&
-           course.results == wanted.results && course.error == wanted.error;
+bool isLike(const SessionOutcome& outcome, const SessionOutcome& wanted) {
+    return outcome.created == wanted.created && outcome.ends == wanted.ends &&
+           outcome.results == wanted.results && outcome.error == wanted.error;
 }
 
-Ending findEnding(const Course& course, const Report& report, const Course& wanted) {
+Ending findEnding(const SessionOutcome& outcome, const Report& report,
+                  const SessionOutcome& wanted) {
     if (report.failed[0] == '\0') {
         return Ending::UNREACHED;
     }
-    if (course.created == 0) {
+    if (outcome.created == 0) {
         return Ending::REFUSED;
     }
-    return isLike(course, wanted) ? Ending::UNHURT : Ending::ERROR;
+    return isLike(outcome, wanted) ? Ending::UNHURT : Ending::ERROR;
 }
 
 }  // namespace

@@ -41,7 +41,7 @@ struct Order {
 enum class Stage : int { PREPARES, SESSION, NEXT_SESSION, SETTLES, EXITS };
 
 /** One session as its listener saw it. */
-struct Course {
+struct SessionOutcome {
     int created = 0; /**< `createRecognizer` returned a recognizer */
     int ends = 0;    /**< terminal events */
     int error = -1;  /**< the code of the last error; -1 when there was none */
@@ -54,8 +54,8 @@ struct Course {
 
 struct Report {
     Stage stage = Stage::PREPARES;
-    Course first;
-    Course next;
+    SessionOutcome first;
+    SessionOutcome next;
     long calls[KIND_COUNT] = {};
     const char* failedFunction = nullptr; /**< its name; has a meaning in victims only */
     char failed[TEXT_MAX] = {};           /**< the same; empty when no call failed */

@@ -26,7 +26,7 @@
 #include "Pipe.h"
 #include "Plan.h"
 #include "Room.h"
-#include "SessionCourse.h"
+#include "SessionRun.h"
 #include "core/sound/Recorder.h"
 #include "logcollector/LogCollector.h"
 #include "pal/kd.h"
@@ -61,7 +61,7 @@ constexpr int REST_STEPS_MAX = 1000;
 constexpr int REST_STEPS_UNCHANGED = 60;
 
 Report* shared = nullptr;
-Course* current = nullptr;
+SessionOutcome* current = nullptr;
 
 std::int64_t nowNs() {
     timespec now{};
@@ -115,9 +115,10 @@ void printFailure() {
     }
 }
 
-void runCourse(const Plan& plan, const Order& order, SessionCourse::Turn turn, Course& course) {
-    current = &course;
-    SessionCourse session(plan, order, turn, course);
+void runSession(const Plan& plan, const Order& order, SessionRun::Turn turn,
+                SessionOutcome& outcome) {
+    current = &outcome;
+    SessionRun session(plan, order, turn, outcome);
     session.run();
 }
 
@@ -194,7 +195,7 @@ void runFirst(const Plan& plan, const Order& order, Report& report) {
     const Room room(order, report);
     report.stage = Stage::SESSION;
     arm(order, report);
-    runCourse(plan, order, SessionCourse::Turn::FIRST, report.first);
+    runSession(plan, order, SessionRun::Turn::FIRST, report.first);
     disarm(report);
     report.calls[static_cast<int>(Kind::SPACE)] = plan.dumps ? PAGES_OF_A_DUMP : 0;
     if (order.kind == static_cast<int>(Kind::SPACE)) {
@@ -209,14 +210,14 @@ void runPoint(const Order& order, Report& report) {
     catchFatalSignals();
     kdSetLogSinkKOR(&keepLine, nullptr);
     kdUseManualClockKOR(CLOCK_START_NS);
-    Course warmUp;
+    SessionOutcome warmUp;
     if (plan.warm) {
-        runCourse(plan, order, SessionCourse::Turn::NEXT, warmUp);
+        runSession(plan, order, SessionRun::Turn::NEXT, warmUp);
     }
     runFirst(plan, order, report);
     printFailure();
     report.stage = Stage::NEXT_SESSION;
-    runCourse(plan, order, SessionCourse::Turn::NEXT, report.next);
+    runSession(plan, order, SessionRun::Turn::NEXT, report.next);
     current = nullptr;
     report.stage = Stage::SETTLES;
     checkDump(plan, order, report, true);

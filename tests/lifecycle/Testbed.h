@@ -26,14 +26,14 @@
 namespace Lifecycle {
 
 /** Runs sequences, one after the other. One at a time; the main thread is the application's. */
-class World : public GatewayObserver, public SessionHost, public DeviceHost {
+class Testbed : public GatewayObserver, public SessionHost, public DeviceHost {
   public:
     static constexpr int64_t CLOCK_START_MS = 1000000;
 
-    World();
-    ~World() override;
-    World(const World&) = delete;
-    World& operator=(const World&) = delete;
+    Testbed();
+    ~Testbed() override;
+    Testbed(const Testbed&) = delete;
+    Testbed& operator=(const Testbed&) = delete;
 
     /**
      * @param trace hears what happens, step by step; null for nobody

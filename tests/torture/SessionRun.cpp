@@ -1,4 +1,4 @@
-#include "SessionCourse.h"
+#include "SessionRun.h"
 
 #include <boost/make_shared.hpp>
 #include <cstdio>
@@ -44,13 +44,13 @@ constexpr int CAPTURE_STEPS_MAX = 1000;
 
 }  // namespace
 
-SessionCourse::SessionCourse(const Plan& thePlan, const Order& theOrder, Turn theTurn,
-                             Course& target)
+SessionRun::SessionRun(const Plan& thePlan, const Order& theOrder, Turn theTurn,
+                       SessionOutcome& target)
     : plan(thePlan),
       order(theOrder),
       turn(theTurn),
-      course(target),
-      listener(boost::make_shared<CourseListener>(target)),
+      outcome(target),
+      listener(boost::make_shared<OutcomeListener>(target)),
       engineSettings(boost::make_shared<Settings>()),
       ownSettings(boost::make_shared<Settings>()),
       bytes(BYTES_PER_BUFFER, '\7') {
@@ -64,19 +64,20 @@ SessionCourse::SessionCourse(const Plan& thePlan, const Order& theOrder, Turn th
                               plan.ending == Plan::Ending::NO_VOICE ? NEVER_SPEECH : SHORT_SPEECH);
 }
 
-SessionCourse::~SessionCourse() = default;
+SessionRun::~SessionRun() = default;
 
 // An exception that leaves the API is noted, and the application goes on.
-void SessionCourse::call(const char* name, const std::function<void()>& function) {
+void SessionRun::call(const char* name, const std::function<void()>& function) {
     try {
         const InEngine inEngine;
         function();
     } catch (const std::exception& exception) {
-        std::snprintf(course.exception, sizeof(course.exception), "%s: %s", name, exception.what());
+        std::snprintf(outcome.exception, sizeof(outcome.exception), "%s: %s", name,
+                      exception.what());
     }
 }
 
-void SessionCourse::run() {
+void SessionRun::run() {
     configure();
     create();
     if (session) {
@@ -89,7 +90,7 @@ void SessionCourse::run() {
     release();
 }
 
-void SessionCourse::configure() {
+void SessionRun::configure() {
     Network::NetworkManager& network = Network::NetworkManager::getInstance();
     network.overrideReachability(plan.asksNetwork ? -1 : Network::NetworkManager::WIFI);
     if (plan.tls) {
@@ -101,7 +102,7 @@ void SessionCourse::configure() {
          [this] { Talvox::Talvox::getInstance().setTalvoxSettings(engineSettings); });
 }
 
-void SessionCourse::chooseRecorder() {
+void SessionRun::chooseRecorder() {
     if (plan.sound == Plan::Sound::SERVER) {
         Sound::Recorder::setFactory({});
     } else if (plan.sound == Plan::Sound::FILE) {
@@ -116,14 +117,14 @@ void SessionCourse::chooseRecorder() {
     }
 }
 
-void SessionCourse::create() {
+void SessionRun::create() {
     call("createRecognizer", [this] {
         session = Talvox::Talvox::getInstance().createRecognizer(listener, ownSettings);
     });
-    course.created = session ? 1 : 0;
+    outcome.created = session ? 1 : 0;
 }
 
-void SessionCourse::log() {
+void SessionRun::log() {
     if (!plan.logs) {
         return;
     }
@@ -138,7 +139,7 @@ void SessionCourse::log() {
     });
 }
 
-void SessionCourse::play() {
+void SessionRun::play() {
     const bool isCut = plan.ending == Plan::Ending::STOP || plan.ending == Plan::Ending::CANCEL ||
                        plan.ending == Plan::Ending::RELEASE;
     int buffers = isCut && turn == Turn::FIRST ? BUFFERS_TO_THE_MIDDLE : BUFFERS_OF_AN_UTTERANCE;
@@ -154,7 +155,7 @@ void SessionCourse::play() {
     }
 }
 
-void SessionCourse::playPushed(int buffers) {
+void SessionRun::playPushed(int buffers) {
     for (int i = 0; i < buffers; ++i) {
         advance(BUFFER_MS);
         push();
@@ -162,7 +163,7 @@ void SessionCourse::playPushed(int buffers) {
     }
 }
 
-void SessionCourse::playPaced(int buffers) {
+void SessionRun::playPaced(int buffers) {
     for (int i = 0; i < buffers; ++i) {
         advance(BUFFER_MS);
         kdDrainEventsKOR();
@@ -170,7 +171,7 @@ void SessionCourse::playPaced(int buffers) {
 }
 
 /** The sound server's time is real; the platform clock stands still unless nothing comes. */
-void SessionCourse::awaitCapture(int buffers) {
+void SessionRun::awaitCapture(int buffers) {
     for (int i = 0; i < CAPTURE_STEPS_MAX && listener->countBuffers() < buffers; ++i) {
         if (listener->waitForEnd(CAPTURE_STEP)) {
             return;
@@ -179,7 +180,7 @@ void SessionCourse::awaitCapture(int buffers) {
 }
 
 // As a device does on a thread of its own: an exception would end that thread, and the sound.
-void SessionCourse::push() {
+void SessionRun::push() {
     boost::shared_ptr<Sound::CaptureQueue> queue;
     if (recorder) {
         const Util::EventLock lock;
@@ -192,11 +193,11 @@ void SessionCourse::push() {
     }
 }
 
-void SessionCourse::advance(std::int64_t ms) {
+void SessionRun::advance(std::int64_t ms) {
     call("a timer", [ms] { kdAdvanceClockKOR(ms * NS_PER_MS); });
 }
 
-void SessionCourse::interfere() {
+void SessionRun::interfere() {
     if (plan.sound == Plan::Sound::SERVER ||
         (plan.ending == Plan::Ending::STOP && turn == Turn::FIRST)) {
         call("stop", [this] { session->stop(); });
@@ -211,7 +212,7 @@ void SessionCourse::interfere() {
     }
 }
 
-void SessionCourse::awaitEnd() {
+void SessionRun::awaitEnd() {
     const auto step = turn == Turn::FIRST ? STEP : STEP_OF_A_SOUND_SESSION;
     for (std::int64_t waited = 0; session && waited <= LONGEST_WAIT_MS; waited += STEP_MS) {
         if (listener->waitForEnd(step)) {
@@ -224,7 +225,7 @@ void SessionCourse::awaitEnd() {
     }
 }
 
-void SessionCourse::release() {
+void SessionRun::release() {
     call("release", [this] { session.reset(); });
     recorder.reset();
 }

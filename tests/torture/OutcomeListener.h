@@ -14,10 +14,10 @@
 
 namespace Torture {
 
-/** Notes the course of one session. Any thread. */
-class CourseListener : public Talvox::RecognizerListener {
+/** Notes the outcome of one session. Any thread. */
+class OutcomeListener : public Talvox::RecognizerListener {
   public:
-    explicit CourseListener(Course& target);
+    explicit OutcomeListener(SessionOutcome& target);
 
     void onRecordingBegin(Talvox::Recognizer* recognizer) override;
     void onSpeakingBegin(Talvox::Recognizer* recognizer) override;
@@ -38,7 +38,7 @@ class CourseListener : public Talvox::RecognizerListener {
   private:
     void noteEnd();
 
-    Course& course;
+    SessionOutcome& outcome;
     const std::int64_t began;
     std::mutex mutex;
     std::condition_variable changed;

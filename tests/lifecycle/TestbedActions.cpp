@@ -4,7 +4,7 @@
 
 #include "Configuration.h"
 #include "Sounds.h"
-#include "World.h"
+#include "Testbed.h"
 #include "core/network/NetworkManager.h"
 #include "core/util/EventLock.h"
 
@@ -23,7 +23,7 @@ int64_t getDurationMs(const Sound::SoundDataBuffer& buffer) {
 
 }  // namespace
 
-void World::perform(const Step& step) {
+void Testbed::perform(const Step& step) {
     note("- ", step);
     networkStands = step.networkStands;
     ScriptedGateway::instance().setAnswersFirst(step.answersFirst);
@@ -66,7 +66,7 @@ void World::perform(const Step& step) {
     }
 }
 
-void World::act(Action action, Session* target, int amount) {
+void Testbed::act(Action action, Session* target, int amount) {
     const Util::EventLock lock;
     if (action == Action::CREATE || action == Action::CREATE_AND_START) {
         create(action == Action::CREATE_AND_START);
@@ -80,7 +80,7 @@ void World::act(Action action, Session* target, int amount) {
 }
 
 // The application holds no other reference while it calls: the call may be the session's end.
-void World::call(Action action, Session& session) {
+void Testbed::call(Action action, Session& session) {
     Talvox::Recognizer* const recognizer = session.recognizer.get();
     session.enter();
     switch (action) {
@@ -106,7 +106,7 @@ void World::call(Action action, Session& session) {
     session.leave();
 }
 
-void World::create(bool starts) {
+void Testbed::create(bool starts) {
     if (sessions.size() >= sequence->sessions.size()) {
         return;
     }
@@ -122,7 +122,7 @@ void World::create(bool starts) {
     }
 }
 
-void World::start(Session& session, Talvox::Recognizer& recognizer) {
+void Testbed::start(Session& session, Talvox::Recognizer& recognizer) {
     const bool wasActive = session.model->isActive();
     session.model->beginStart(now(), findRefusal(session));
     if (!wasActive && session.cloud != nullptr && session.model->isActive()) {
@@ -141,7 +141,7 @@ void World::start(Session& session, Talvox::Recognizer& recognizer) {
     onWrong(session.model->endStart());
 }
 
-std::optional<int> World::findRefusal(const Session& session) const {
+std::optional<int> Testbed::findRefusal(const Session& session) const {
     const Settings& current = *settings[static_cast<std::size_t>(settingsInUse)];
     if (isAnyActive()) {
         return SpeechError::ErrorBusy;
@@ -159,7 +159,7 @@ std::optional<int> World::findRefusal(const Session& session) const {
     return std::nullopt;
 }
 
-void World::callGetters(const Session* session) {
+void Testbed::callGetters(const Session* session) {
     const boost::shared_ptr<const Settings> current = engine().getTalvoxSettings();
     if (current != settings[static_cast<std::size_t>(settingsInUse)]) {
         onWrong("the engine has other settings");
@@ -175,12 +175,12 @@ void World::callGetters(const Session* session) {
     }
 }
 
-void World::useSettings(int index) {
+void Testbed::useSettings(int index) {
     settingsInUse = index;
     engine().setTalvoxSettings(settings[static_cast<std::size_t>(index)]);
 }
 
-void World::playSound(const Step& step, Session& session) {
+void Testbed::playSound(const Step& step, Session& session) {
     if (step.action == Action::ODD_SOUND) {
         deliver(session, makeOddBuffer(step.amount), false);
         return;
@@ -201,7 +201,7 @@ void World::playSound(const Step& step, Session& session) {
     }
 }
 
-void World::deliver(Session& session, const BufferPtr& buffer, bool rude) {
+void Testbed::deliver(Session& session, const BufferPtr& buffer, bool rude) {
     const Util::EventLock lock;
     const boost::shared_ptr<RecorderDouble> recorder = session.recorder;
     if (!recorder || (!recorder->isRecording() && !rude)) {
@@ -217,7 +217,7 @@ void World::deliver(Session& session, const BufferPtr& buffer, bool rude) {
     session.leave();
 }
 
-void World::failRecorder(Session& session) {
+void Testbed::failRecorder(Session& session) {
     const Util::EventLock lock;
     if (session.recorder) {
         session.enter();
@@ -226,7 +226,7 @@ void World::failRecorder(Session& session) {
     }
 }
 
-void World::sayAsDevice(Session& session, Saying what) {
+void Testbed::sayAsDevice(Session& session, Saying what) {
     static const std::map<Saying, Event> EVENTS = {{Saying::READY, Event::RECORDING_BEGIN},
                                                    {Saying::BEGINNING, Event::SPEAKING_BEGIN},
                                                    {Saying::LEVEL, Event::POWER},
@@ -252,7 +252,7 @@ void World::sayAsDevice(Session& session, Saying what) {
     session.leave();
 }
 
-bool World::onDeviceMade(int64_t handle) {
+bool Testbed::onDeviceMade(int64_t handle) {
     Session& session = *starting.back();
     session.deviceHandle = handle;
     if (session.plan.device.throwsWhenMade) {
@@ -263,7 +263,7 @@ bool World::onDeviceMade(int64_t handle) {
     return !session.plan.device.throwsWhenMade;
 }
 
-bool World::onDeviceAsked(int64_t handle, const std::string& what) {
+bool Testbed::onDeviceAsked(int64_t handle, const std::string& what) {
     const auto found =
         std::find_if(sessions.begin(), sessions.end(),
                      [handle](const auto& session) { return session->deviceHandle == handle; });

@@ -1,4 +1,4 @@
-#include "World.h"
+#include "Testbed.h"
 
 #include <algorithm>
 #include <boost/make_shared.hpp>
@@ -17,7 +17,7 @@ using Talvox::SpeechError;
 namespace {
 
 const int64_t NS_PER_MS = 1000000;
-const int64_t CLOCK_START = World::CLOCK_START_MS * NS_PER_MS;
+const int64_t CLOCK_START = Testbed::CLOCK_START_MS * NS_PER_MS;
 const int64_t LONGEST_PIECE_MS = 1000;
 /** After this the last session is over, whatever happened before. */
 const int64_t ALL_OVER_MS = 120000;
@@ -38,7 +38,7 @@ std::string findSound(const std::string& body) {
 
 }  // namespace
 
-World::World() {
+Testbed::Testbed() {
     for (int i = 0; i < SETTINGS_COUNT; ++i) {
         settings.push_back(makeEngineSettings(i));
     }
@@ -53,18 +53,18 @@ World::World() {
     device = Device::make(*this);
 }
 
-World::~World() {
+Testbed::~Testbed() {
     Sound::Recorder::setFactory({});
     Network::NetworkManager::getInstance().overrideReachability(-1);
     engine().setTalvoxSettings(boost::make_shared<Settings>());
     kdUseRealClockKOR();
 }
 
-int64_t World::now() const {
+int64_t Testbed::now() const {
     return kdGetTimeUST() / NS_PER_MS;
 }
 
-std::string World::run(const Sequence& what, std::ostream* trace) {
+std::string Testbed::run(const Sequence& what, std::ostream* trace) {
     out = trace;
     begin(what);
     for (std::size_t i = 0; i < what.steps.size() && wrong.empty();) {
@@ -76,7 +76,7 @@ std::string World::run(const Sequence& what, std::ostream* trace) {
     return wrong;
 }
 
-void World::begin(const Sequence& what) {
+void Testbed::begin(const Sequence& what) {
     wrong.clear();
     expectedAsserts = 0;
     sequence = &what;
@@ -90,7 +90,7 @@ void World::begin(const Sequence& what) {
 }
 
 // Steps that are joined happen in one hold of the lock. @return the index after them
-std::size_t World::performTogether(std::size_t index) {
+std::size_t Testbed::performTogether(std::size_t index) {
     const Step* step = &sequence->steps[index];
     if (!step->joined) {
         perform(*step);
@@ -105,7 +105,7 @@ std::size_t World::performTogether(std::size_t index) {
     return index + 1;
 }
 
-void World::wait(int64_t milliseconds) {
+void Testbed::wait(int64_t milliseconds) {
     const int64_t until = now() + milliseconds;
     for (int64_t left = milliseconds; left > 0 && wrong.empty(); left = until - now()) {
         const int64_t due = ScriptedGateway::instance().getNextDue() / NS_PER_MS - now();
@@ -114,14 +114,14 @@ void World::wait(int64_t milliseconds) {
     }
 }
 
-void World::jump(int64_t milliseconds) {
+void Testbed::jump(int64_t milliseconds) {
     const Util::EventLock lock;
     kdAdvanceClockKOR(milliseconds * NS_PER_MS);
 }
 
 // All that follows from what was done has happened afterwards: on the event thread, on the workers
 // and, unless it stands still, on the network. Nothing happens while steps are joined.
-void World::settle() {
+void Testbed::settle() {
     if (kdHoldsEventLockKOR() != 0) {
         return;
     }
@@ -138,7 +138,7 @@ void World::settle() {
     check();
 }
 
-void World::check() {
+void Testbed::check() {
     for (const std::unique_ptr<Session>& session : sessions) {
         onWrong(session->model->checkSettled(now()));
         if (session->isLeftBehind()) {
@@ -155,7 +155,7 @@ void World::check() {
     }
 }
 
-void World::checkEngine() {
+void Testbed::checkEngine() {
     const bool isFree = engine().registerRecognizer(probe.get());
     engine().unregisterRecognizer(probe.get());
     if (isFree == isAnyActive()) {
@@ -163,14 +163,14 @@ void World::checkEngine() {
     }
 }
 
-bool World::isAnyActive() const {
+bool Testbed::isAnyActive() const {
     return std::any_of(sessions.begin(), sessions.end(), [](const auto& session) {
         return !session->model->isGone() && session->model->isActive();
     });
 }
 
 // Whatever happened, time alone ends every session and every upload, and nothing is left.
-void World::end() {
+void Testbed::end() {
     networkStands = false;
     ScriptedGateway::instance().setAnswersFirst(false);
     note("- the end");
@@ -198,7 +198,7 @@ void World::end() {
     sessions.clear();
 }
 
-void World::checkNothingIsLeft() {
+void Testbed::checkNothingIsLeft() {
     const PlatformLedger after = PlatformLedger::now();
     if (isAnyActive()) {
         onWrong("a session without an end");
@@ -222,7 +222,7 @@ void World::checkNothingIsLeft() {
     }
 }
 
-Session* World::find(int index) {
+Session* Testbed::find(int index) {
     if (sessions.empty()) {
         return nullptr;
     }
@@ -230,7 +230,7 @@ Session* World::find(int index) {
     return index == NEWEST ? sessions.back().get() : sessions[number % sessions.size()].get();
 }
 
-void World::onEvent(Session& session, Event event, int errorCode) {
+void Testbed::onEvent(Session& session, Event event, int errorCode) {
     note("    session ", session.index, " ", nameOf(event), errorCode >= 0 ? " " : "",
          errorCode >= 0 ? SpeechError::errorStrings[errorCode] : "");
     checkEngine();
@@ -248,27 +248,27 @@ void World::onEvent(Session& session, Event event, int errorCode) {
     }
 }
 
-void World::onWrong(const std::string& what) {
+void Testbed::onWrong(const std::string& what) {
     if (!what.empty() && wrong.empty()) {
         wrong = what;
         note("WRONG: ", what);
     }
 }
 
-void World::onBody(int session, const std::string& body) {
+void Testbed::onBody(int session, const std::string& body) {
     const Session& sender = *sessions[static_cast<std::size_t>(session)];
     if (sender.sendsPcm && findSound(body) != sender.spoken) {
         onWrong("the request does not carry what was spoken");
     }
 }
 
-void World::onHead(int session, bool words) {
+void Testbed::onHead(int session, bool words) {
     note("    gateway: head for session ", session);
     Session& asker = *sessions[static_cast<std::size_t>(session)];
     asker.gotWords = asker.gotWords || words;
 }
 
-void World::onAttemptEnd(int session, int code) {
+void Testbed::onAttemptEnd(int session, int code) {
     note("    gateway: end ", code, " for session ", session);
     Session& asker = *sessions[static_cast<std::size_t>(session)];
     const bool canBeMended = code < 0 || code >= 500;

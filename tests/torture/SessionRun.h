@@ -8,8 +8,8 @@
 #include <functional>
 #include <string>
 
-#include "CourseListener.h"
 #include "Order.h"
+#include "OutcomeListener.h"
 #include "Plan.h"
 #include "PushedRecorder.h"
 #include "talvox/Recognizer.h"
@@ -22,15 +22,15 @@ namespace Torture {
  * then as much time as the documented limits allow, until the session ends. To be used on one
  * thread, which counts as a `Harness` but inside the engine's calls.
  */
-class SessionCourse {
+class SessionRun {
   public:
     /** Whose turn it is: the session in which a call fails, or a sound one. */
     enum class Turn { FIRST, NEXT };
 
-    SessionCourse(const Plan& plan, const Order& order, Turn turn, Course& course);
-    ~SessionCourse();
-    SessionCourse(const SessionCourse&) = delete;
-    SessionCourse& operator=(const SessionCourse&) = delete;
+    SessionRun(const Plan& plan, const Order& order, Turn turn, SessionOutcome& outcome);
+    ~SessionRun();
+    SessionRun(const SessionRun&) = delete;
+    SessionRun& operator=(const SessionRun&) = delete;
 
     /** Returns when the session is over and released, or its time is. */
     void run();
@@ -54,8 +54,8 @@ class SessionCourse {
     const Plan& plan;
     const Order& order;
     const Turn turn;
-    Course& course;
-    const boost::shared_ptr<CourseListener> listener;
+    SessionOutcome& outcome;
+    const boost::shared_ptr<OutcomeListener> listener;
     boost::shared_ptr<Talvox::Settings> engineSettings;
     boost::shared_ptr<Talvox::Settings> ownSettings;
     boost::shared_ptr<Talvox::Recognizer> session;
