@@ -104,7 +104,7 @@ void Exchange::attempt() {
 // The last resort: no retry, whose way would lead through the same want.
 void Exchange::endWithException() noexcept {
     const Util::EventLock lock;
-    if (!isHeard()) {
+    if (!mayDeliver()) {
         return;
     }
     callTask([this] { task->failureReason.swap(attemptReason); });
@@ -114,7 +114,7 @@ void Exchange::endWithException() noexcept {
 boost::shared_ptr<Transfer> Exchange::makeTransfer() {
     const Util::EventLock lock;
     const boost::shared_ptr<NetworkTask> current = task;
-    if (!isHeard() || !prepareTask(current)) {
+    if (!mayDeliver() || !prepareTask(current)) {
         return nullptr;
     }
     ++attempts;
@@ -151,7 +151,7 @@ bool Exchange::onTransferHead(const boost::shared_ptr<HttpResponse>& response) {
     const Util::EventLock lock;
     const boost::shared_ptr<NetworkTask> current = task;
     return callTask([&] {
-        if (isHeard()) {
+        if (mayDeliver()) {
             attemptReason = describeStatus(*response);
             current->onResponseRecieved(response);
         }
@@ -166,7 +166,7 @@ bool Exchange::onTransferBytes(const unsigned char* bytes, std::size_t size) {
 
 bool Exchange::takeBytes(const unsigned char* bytes, std::size_t size) {
     const boost::shared_ptr<NetworkTask> current = task;
-    if (!isHeard()) {
+    if (!mayDeliver()) {
         return false;
     }
     const bool byParts = current->recieveResponseBodyByParts();
@@ -200,7 +200,7 @@ void Exchange::onTransferEnd(const TransferEnd& how) {
 
 void Exchange::takeEnd(const TransferEnd& how) {
     const boost::shared_ptr<NetworkTask> current = task;
-    if (!isHeard()) {
+    if (!mayDeliver()) {
         return;
     }
     // Ours is more precise than what libcurl says about an end that we caused.
@@ -253,7 +253,7 @@ void Exchange::onPosted(void* user) {
 
 void Exchange::deliverEnd(int code) {
     const boost::shared_ptr<NetworkTask> current = task;
-    if (!isHeard()) {
+    if (!mayDeliver()) {
         return;
     }
     try {
@@ -266,7 +266,7 @@ void Exchange::deliverEnd(int code) {
 }
 
 // At the end of the process nothing is delivered any more, whatever becomes of the transfers.
-bool Exchange::isHeard() const {
+bool Exchange::mayDeliver() const {
     return active && kdEventsHaveEndedKOR() == 0;
 }
 

@@ -56,7 +56,7 @@ class Exchange : public boost::enable_shared_from_this<Exchange>, public Transfe
     bool postEnd(int code);
     static void onPosted(void* user);
     void deliverEnd(int code);
-    bool isHeard() const;
+    bool mayDeliver() const;
 
     const boost::shared_ptr<Transport> transport;
     boost::shared_ptr<NetworkTask> task;

@@ -38,7 +38,7 @@ final class ReachabilityBackend extends ConnectivityManager.NetworkCallback {
         final ConnectivityManager manager = (ConnectivityManager) service;
         try {
             final ReachabilityBackend callback = new ReachabilityBackend();
-            onReachabilityChangedInternal(judge(manager));
+            onReachabilityChangedInternal(classify(manager));
             manager.registerDefaultNetworkCallback(callback);
             watched = manager;
             watchedFor = context;
@@ -61,12 +61,12 @@ final class ReachabilityBackend extends ConnectivityManager.NetworkCallback {
         }
     }
 
-    private static int judge(ConnectivityManager manager) {
+    private static int classify(ConnectivityManager manager) {
         final Network network = manager.getActiveNetwork();
-        return network == null ? UNREACHABLE : judge(manager.getNetworkCapabilities(network));
+        return network == null ? UNREACHABLE : classify(manager.getNetworkCapabilities(network));
     }
 
-    private static int judge(NetworkCapabilities capabilities) {
+    private static int classify(NetworkCapabilities capabilities) {
         if (capabilities == null) {
             return METERED; // there is a network, of a kind that nobody knows
         }
@@ -78,7 +78,7 @@ final class ReachabilityBackend extends ConnectivityManager.NetworkCallback {
 
     @Override
     public void onCapabilitiesChanged(Network network, NetworkCapabilities capabilities) {
-        onReachabilityChangedInternal(judge(capabilities));
+        onReachabilityChangedInternal(classify(capabilities));
     }
 
     @Override
