@@ -60,8 +60,8 @@ class FolderAuthoritiesTest : public NetworkFixture {
             << certificate.rdbuf() << "Certificate:\n    Data:\n        Version: 3 (0x2)\n";
     }
 
-    std::string fetch(const std::string& server) {
-        const TlsServer tls(scratch.path(server));
+    std::string fetch(const std::string& name) {
+        const TlsServer tls(scratch.path(name));
         const auto task = makeTask(tls.getUrl("localhost"));
         holder.submitNoRetries(task);
         return task->waitForEnd();
