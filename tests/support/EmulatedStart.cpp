@@ -13,6 +13,7 @@
 #include <unistd.h>
 
 #include <array>
+#include <cstddef>
 #include <cstdio>
 #include <cstring>
 #include <vector>

@@ -73,8 +73,4 @@ bool PlatformAuthorities::attach(CURL* handle, bool retry) {
            curl_easy_setopt(handle, CURLOPT_SSL_CTX_DATA, store.get()) == CURLE_OK;
 }
 
-void PlatformAuthorities::detach(CURL* handle) {
-    curl_easy_setopt(handle, CURLOPT_SSL_CTX_FUNCTION, nullptr);
-}
-
 }  // namespace Network

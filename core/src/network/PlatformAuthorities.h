@@ -28,9 +28,6 @@ class PlatformAuthorities {
      */
     bool attach(CURL* handle, bool retry);
 
-    /** Sets up a handle so that its next request does not use these authorities. */
-    static void detach(CURL* handle);
-
   private:
     struct Store;
     std::unique_ptr<Store> store;

@@ -11,6 +11,4 @@ bool PlatformAuthorities::attach(CURL*, bool) {
     return true;
 }
 
-void PlatformAuthorities::detach(CURL*) {}
-
 }  // namespace Network

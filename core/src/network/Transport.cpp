@@ -272,7 +272,6 @@ bool Transport::setAuthorities(CURL* handle, const std::string& file) {
     if (file.empty()) {
         return authorities.attach(handle, hasFailedTls);
     }
-    PlatformAuthorities::detach(handle);
     return curl_easy_setopt(handle, CURLOPT_CAINFO, file.c_str()) == CURLE_OK &&
            curl_easy_setopt(handle, CURLOPT_CAPATH, nullptr) != CURLE_OUT_OF_MEMORY;
 }
