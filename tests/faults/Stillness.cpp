@@ -7,10 +7,12 @@
 #include <sys/ioctl.h>
 #include <sys/socket.h>
 
+#include <algorithm>
 #include <boost/make_shared.hpp>
 #include <chrono>
 #include <filesystem>
 #include <future>
+#include <map>
 #include <string>
 #include <thread>
 
@@ -96,32 +98,43 @@ bool isSettled(int descriptor, unsigned short serverPort,
     return peer->second || !hasUnsentBytes(descriptor);
 }
 
-bool areAllSettled(const ScriptedHttpServer& server) {
-    const std::map<unsigned short, bool> peers = server.getPeers();
+/** The open sockets, each with a number of its own, which a later one on the descriptor lacks. */
+std::map<int, std::string> listSockets() {
+    std::map<int, std::string> sockets;
     std::error_code ignored;
     for (const auto& entry : std::filesystem::directory_iterator("/proc/self/fd", ignored)) {
-        const int descriptor = std::stoi(entry.path().filename().string());
-        if (!isSettled(descriptor, server.getPort(), peers)) {
-            return false;
+        const std::string target = std::filesystem::read_symlink(entry.path(), ignored).string();
+        if (target.rfind("socket:", 0) == 0) {
+            sockets[std::stoi(entry.path().filename().string())] = target;
         }
     }
-    return true;
+    return sockets;
+}
+
+bool areAllSettled(const ScriptedHttpServer& server, const std::map<int, std::string>& sockets) {
+    const std::map<unsigned short, bool> peers = server.getPeers();
+    return std::all_of(sockets.begin(), sockets.end(), [&](const auto& socket) {
+        return isSettled(socket.first, server.getPort(), peers);
+    });
 }
 
 bool isStill(const ScriptedHttpServer& server) {
     const std::size_t before = server.getActivity();
-    if (!server.isIdle() || !areAllSettled(server) || LiveCounts::countTasks() > 0) {
+    const std::map<int, std::string> sockets = listSockets();
+    if (!server.isIdle() || !areAllSettled(server, sockets) || LiveCounts::countTasks() > 0) {
         return false;
     }
     // The two threads give each other work.
-    for (int round = 0; round < 2; ++round) {
+    for (int round = 0; round < 3; ++round) {
         if (!passNetworkThread()) {
             return false;
         }
         kdDrainEventsKOR();
     }
-    return passNetworkThread() && server.isIdle() && areAllSettled(server) &&
-           LiveCounts::countTasks() == 0 && server.getActivity() == before;
+    // A connection that was begun meanwhile may have been refused since the thread looked at it.
+    return passNetworkThread() && server.isIdle() && listSockets() == sockets &&
+           areAllSettled(server, sockets) && LiveCounts::countTasks() == 0 &&
+           server.getActivity() == before;
 }
 
 }  // namespace
