@@ -266,10 +266,11 @@ TEST_F(PlatformRecognizerTest, AnEndStopsTheClock) {
 TEST_F(PlatformRecognizerTest, ResultsThatWaitForTheEncoderAreNotSilence) {
     recognizer = create(Settings::LOG_WITH_SOUND_ALWAYS);
     recognizer->start();
-    say(Saying::SOUND);
-    recognizer->stop();
     {
+        // From before the sound on, so that the encoder cannot report its end.
         const Util::EventLock lock;
+        say(Saying::SOUND);
+        recognizer->stop();
         say(Saying::RESULTS);
         EXPECT_THAT(events, IsEmpty());
         kdAdvanceClockKOR(LISTENING_LIMIT_MS * NS_PER_MS);
