@@ -14,6 +14,7 @@
 #include "VadCommand.h"
 #include "VadWarnings.h"
 #include "Version.h"
+#include "corpus/CorpusCommand.h"
 #include "talvox/Settings.h"
 
 namespace Cli {
@@ -300,6 +301,7 @@ int runTool(int argc, const char* const* argv, Console& console, LogOutput& log)
     const CLI::App* vad = addVadCommand(app, arguments.vad);
     const CLI::App* settings = addSettingsCommand(app, arguments.settings, arguments.page);
     const CLI::App* logEvent = addLogCommand(app, arguments.log);
+    CorpusCommand corpus(app);
     try {
         app.parse(argc, argv);
         if (recognize->parsed()) {
@@ -318,7 +320,12 @@ int runTool(int argc, const char* const* argv, Console& console, LogOutput& log)
         if (logEvent->parsed()) {
             return runLog(arguments.log, console, log);
         }
-        throw UsageError("no command given (recognize, vad, settings or log); see talvox --help");
+        if (corpus.isParsed()) {
+            return corpus.run(console, log);
+        }
+        throw UsageError(
+            "no command given (recognize, vad, corpus, settings or log); see talvox "
+            "--help");
     } catch (const CLI::ParseError& error) {
         if (error.get_exit_code() == 0) {
             return app.exit(error, console.out, console.err);

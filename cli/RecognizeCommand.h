@@ -31,12 +31,13 @@ struct RecognizeOptions {
 /** The tool's defaults, over the engine's: a gateway on this machine, a fresh uuid, English. */
 std::vector<SettingsOptions::Assignment> recognizeDefaults();
 
-/** Standard streams, and whether the output is a terminal. */
+/** Standard streams, and which of them are terminals. */
 struct Console {
     std::istream& in;
     std::ostream& out;
     std::ostream& err;
     bool outIsTerminal;
+    bool errIsTerminal = false;
 };
 
 /**

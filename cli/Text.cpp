@@ -1,7 +1,8 @@
 #include "Text.h"
 
 #include <algorithm>
-#include <cstdio>
+#include <array>
+#include <charconv>
 
 #include "core/util/Ascii.h"
 
@@ -18,9 +19,13 @@ bool isContinuation(char byte) {
 }  // namespace
 
 std::string fixed(double value, int columns, int decimals) {
-    char text[64];
-    std::snprintf(text, sizeof text, "%*.*f", columns, decimals, value);
-    return text;
+    // Enough for any double; unlike printf it writes a point in every locale.
+    std::array<char, 512> text;
+    const auto [end, error] = std::to_chars(text.data(), text.data() + text.size(), value,
+                                            std::chars_format::fixed, decimals);
+    const std::string digits(text.data(), error == std::errc() ? end : text.data());
+    const auto width = static_cast<std::size_t>(std::max(0, columns));
+    return digits.size() < width ? std::string(width - digits.size(), ' ') + digits : digits;
 }
 
 std::string timeColumn(int64_t ms) {

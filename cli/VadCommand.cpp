@@ -1,6 +1,5 @@
 #include "VadCommand.h"
 
-#include <algorithm>
 #include <cstdint>
 #include <memory>
 #include <optional>
@@ -10,35 +9,16 @@
 #include "ExitStatus.h"
 #include "HumanVad.h"
 #include "JsonVad.h"
+#include "SoundBuffers.h"
 #include "SoundInput.h"
 #include "VadWarnings.h"
 #include "core/sound/Recorder.h"
-#include "core/sound/SoundDataBuffer.h"
 #include "talvox/SpeechError.h"
 #include "talvox/VadAnalysis.h"
 
 namespace Cli {
 
 namespace {
-
-// As a session asks of its recorder.
-const int BUFFER_MS = 100;
-const int SAMPLE_SIZE = 2;
-
-/** The buffer that begins at sample `position`; behind the end of the sound it is silent. */
-Sound::SoundDataBuffer bufferAt(const std::vector<int16_t>& samples, std::size_t position,
-                                std::size_t length, int sampleRateHz) {
-    std::vector<unsigned char> bytes(length * SAMPLE_SIZE);
-    const std::size_t end = std::min(samples.size(), position + length);
-    for (std::size_t index = position; index < end; ++index) {
-        const auto value = static_cast<uint16_t>(samples[index]);
-        bytes[(index - position) * SAMPLE_SIZE] = static_cast<unsigned char>(value & 0xFFU);
-        bytes[(index - position) * SAMPLE_SIZE + 1] = static_cast<unsigned char>(value >> 8U);
-    }
-    return Sound::SoundDataBuffer(Sound::SoundDataInfo(Sound::SoundDataInfo::NONE, 1, sampleRateHz,
-                                                       SAMPLE_SIZE, static_cast<int>(length)),
-                                  std::move(bytes));
-}
 
 Sound::Recorder::Mode sessionMode(const Talvox::Settings& settings) {
     return settings.getString(Talvox::Settings::SKS_SESSION_MODE) ==
@@ -92,7 +72,7 @@ int runVad(const VadOptions& options, Console& console, LogOutput& log) {
     warnOfVadMistakes(*settings, console.err);
     std::vector<int16_t> samples = loadSound(options.file, console.in, rate, MAX_CLIP_SECONDS);
     addLeadIn(samples, rate, options.leadInMs);
-    const std::size_t length = static_cast<std::size_t>(rate) * BUFFER_MS / 1000;
+    const std::size_t length = bufferLength(rate);
 
     const Sound::Recorder::Mode mode = sessionMode(*settings);
     const std::unique_ptr<VadPrinter> printer = makePrinter(options.json, mode, console.out);

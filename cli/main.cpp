@@ -24,7 +24,8 @@ int main(int argc, char** argv) {
     // Before the engine's own singletons, so that it outlives them.
     static Cli::LogOutput log(std::cerr);
     Tools::installAssertionHandler("talvox");
-    Cli::Console console{std::cin, std::cout, std::cerr, isatty(STDOUT_FILENO) == 1};
+    Cli::Console console{std::cin, std::cout, std::cerr, isatty(STDOUT_FILENO) == 1,
+                         isatty(STDERR_FILENO) == 1};
     const int status = Cli::runTool(argc, argv, console, log);
     if (!std::cout.flush() && !isReaderGone()) {
         std::cerr << "talvox: cannot write to standard output" << std::endl;

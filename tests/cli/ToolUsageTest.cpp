@@ -60,7 +60,9 @@ TEST(Tool, HelpsWithEveryCommand) {
 }
 
 TEST(Tool, RefusesWrongUsage) {
-    expectRefused({}, "no command given (recognize, vad, settings or log); see talvox --help");
+    expectRefused({},
+                  "no command given (recognize, vad, corpus, settings or log); see "
+                  "talvox --help");
     expectRefused({"sing"}, "sing");
     expectRefused({"recognize"}, "recognize needs --file FILE or --mic");
     expectRefused({"recognize", "--file", ""}, "recognize needs --file FILE or --mic");
