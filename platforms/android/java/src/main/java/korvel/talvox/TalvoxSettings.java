@@ -90,8 +90,8 @@ public final class TalvoxSettings {
             SettingKey.ofInteger("samplerate", ENGINE, SettingChecks.range(8000, 44100));
 
     /**
-     * Configuration text of the voice activity detector, empty for its defaults. Of the engine
-     * only.
+     * Configuration text of the voice activity detector, empty for its defaults, or one of {@link
+     * EndOfSpeech}. Of the engine only.
      */
     public static final SettingKey<String> VAD =
             SettingKey.ofText("vad", ENGINE, SettingChecks.none());
