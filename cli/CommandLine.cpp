@@ -15,6 +15,8 @@
 #include "VadWarnings.h"
 #include "Version.h"
 #include "corpus/CorpusCommand.h"
+#include "endpoint/EndpointCommand.h"
+#include "endpoint/VadText.h"
 #include "talvox/Settings.h"
 
 namespace Cli {
@@ -83,8 +85,15 @@ CLI::Option* addRate(CLI::App& command, SettingsOptions& settings) {
 }
 
 CLI::Option* addVad(CLI::App& command, SettingsOptions& settings) {
-    return addSetting(command, settings, Settings::SKS_VAD_SETTINGS, "--vad",
-                      "Parameters of the speech detector, such as \"activityon=0.6;framems=20\"")
+    return command
+        .add_option_function<std::string>(
+            "--vad",
+            [&settings](const std::string& text) {
+                settings.explicitValues.emplace_back(Settings::SKS_VAD_SETTINGS,
+                                                     expandPreset(text));
+            },
+            "Parameters of the speech detector, such as \"activityon=0.6;framems=20\", or "
+            "preset:command, preset:dictation or preset:noisy")
         ->type_name("TEXT");
 }
 
@@ -191,12 +200,17 @@ void checkSource(const RecognizeOptions& options) {
 
 CLI::App* addVadCommand(CLI::App& app, VadOptions& options) {
     CLI::App* command = app.add_subcommand("vad", "Show what the speech detector decides");
+    CLI::Option* file =
+        command
+            ->add_option("--file", options.file,
+                         "Sound file; \"-\" reads a WAV file or raw 16-bit little-endian mono "
+                         "sound from standard input, at most an hour")
+            ->type_name("FILE");
     command
-        ->add_option("--file", options.file,
-                     "Sound file; \"-\" reads a WAV file or raw 16-bit little-endian mono sound "
-                     "from standard input, at most an hour")
-        ->type_name("FILE")
-        ->required();
+        ->add_flag("--mic", options.microphone,
+                   "Show live what the default input device records, until Ctrl-C, and what a "
+                   "session would have sent")
+        ->excludes(file);
     addLeadInOption(*command, options.leadInMs);
     command->add_flag("--as-session", options.asSession,
                       "End where a recognition of this sound stops listening (end of speech, 5 s "
@@ -207,6 +221,8 @@ CLI::App* addVadCommand(CLI::App& app, VadOptions& options) {
     addSettingsSources(*command, options.settings);
     command->add_flag("--json", options.json,
                       "Print every buffer and every segment as one JSON object a line");
+    addPath(*command, "--report", options.report, "FILE.html",
+            "HTML file for charts and tables; one page that needs no network");
     command->footer("Levels are " + levelReference(false) + "; with sessionmode=general,\n" +
                     levelReference(true) +
                     ". The level of the leading noise, by which the detector\n"
@@ -302,6 +318,7 @@ int runTool(int argc, const char* const* argv, Console& console, LogOutput& log)
     const CLI::App* settings = addSettingsCommand(app, arguments.settings, arguments.page);
     const CLI::App* logEvent = addLogCommand(app, arguments.log);
     CorpusCommand corpus(app);
+    EndpointCommand endpoint(app);
     try {
         app.parse(argc, argv);
         if (recognize->parsed()) {
@@ -309,6 +326,9 @@ int runTool(int argc, const char* const* argv, Console& console, LogOutput& log)
             return runRecognize(arguments.recognize, console, log);
         }
         if (vad->parsed()) {
+            if (arguments.vad.file.empty() && !arguments.vad.microphone) {
+                throw UsageError("vad needs --file FILE or --mic");
+            }
             return runVad(arguments.vad, console, log);
         }
         if (settings->parsed() && !arguments.page.empty()) {
@@ -323,8 +343,11 @@ int runTool(int argc, const char* const* argv, Console& console, LogOutput& log)
         if (corpus.isParsed()) {
             return corpus.run(console, log);
         }
+        if (endpoint.isParsed()) {
+            return endpoint.run(console, log);
+        }
         throw UsageError(
-            "no command given (recognize, vad, corpus, settings or log); see talvox "
+            "no command given (recognize, vad, endpoint, corpus, settings or log); see talvox "
             "--help");
     } catch (const CLI::ParseError& error) {
         if (error.get_exit_code() == 0) {

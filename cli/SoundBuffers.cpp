@@ -29,4 +29,12 @@ Sound::SoundDataBuffer bufferAt(const std::vector<int16_t>& samples, std::size_t
                                   std::move(bytes));
 }
 
+void appendSamples(std::vector<int16_t>& samples, const Sound::SoundDataBuffer& buffer) {
+    const std::vector<unsigned char>& bytes = buffer.getData();
+    for (std::size_t index = 0; index + 1 < bytes.size(); index += SAMPLE_SIZE) {
+        const auto value = static_cast<uint16_t>(bytes[index] | bytes[index + 1] << 8U);
+        samples.push_back(static_cast<int16_t>(value));
+    }
+}
+
 }  // namespace Cli

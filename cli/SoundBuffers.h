@@ -18,4 +18,7 @@ std::size_t bufferLength(int sampleRateHz);
 Sound::SoundDataBuffer bufferAt(const std::vector<int16_t>& samples, std::size_t position,
                                 std::size_t length, int sampleRateHz);
 
+/** Appends the samples of a 16-bit mono buffer. */
+void appendSamples(std::vector<int16_t>& samples, const Sound::SoundDataBuffer& buffer);
+
 }  // namespace Cli

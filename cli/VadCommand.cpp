@@ -2,18 +2,26 @@
 
 #include <cstdint>
 #include <memory>
-#include <optional>
+#include <ostream>
+#include <string>
 #include <vector>
 
 #include "AudioFile.h"
 #include "ExitStatus.h"
 #include "HumanVad.h"
+#include "Interrupts.h"
 #include "JsonVad.h"
+#include "LiveVad.h"
+#include "Microphone.h"
 #include "SoundBuffers.h"
+#include "SoundDecoder.h"
 #include "SoundInput.h"
+#include "UsageError.h"
+#include "VadRun.h"
 #include "VadWarnings.h"
+#include "cli/endpoint/VadText.h"
+#include "cli/report/VadReport.h"
 #include "core/sound/Recorder.h"
-#include "talvox/SpeechError.h"
 #include "talvox/VadAnalysis.h"
 
 namespace Cli {
@@ -27,39 +35,55 @@ Sound::Recorder::Mode sessionMode(const Talvox::Settings& settings) {
                : Sound::Recorder::MODE_VOICE_RECOGNITION;
 }
 
-/** What a session reports by the step; nothing when it goes on listening. */
-std::optional<SessionEvent> toSessionEvent(const Talvox::VadBufferAnalysis& buffer) {
-    SessionEvent event;
-    event.ms = buffer.arrivalMs;
-    switch (buffer.step) {
-        case Talvox::ListeningStep::GO_ON:
-            return std::nullopt;
-        case Talvox::ListeningStep::RECORDING_BEGINS:
-            event.kind = SessionEvent::RECORDING_BEGIN;
-            break;
-        case Talvox::ListeningStep::SPEECH_BEGINS:
-            event.kind = SessionEvent::SPEAKING_BEGIN;
-            break;
-        case Talvox::ListeningStep::LISTENING_ENDS:
-            event.kind = SessionEvent::RECORDING_DONE;
-            break;
-        case Talvox::ListeningStep::NO_VOICE:
-            event.kind = SessionEvent::FAILURE;
-            event.errorCode = Talvox::SpeechError::ErrorNoVoice;
-            break;
+std::unique_ptr<VadPrinter> makePrinter(const VadOptions& options, const std::string& vad,
+                                        Sound::Recorder::Mode mode, const Console& console) {
+    if (options.json) {
+        return std::make_unique<JsonVad>(console.out);
     }
-    return event;
+    if (options.microphone && console.outIsTerminal) {
+        return std::make_unique<LiveVad>(console.out,
+                                         LiveThresholds{parameterNumber(vad, "activityon"),
+                                                        parameterNumber(vad, "activityoff")});
+    }
+    return std::make_unique<HumanVad>(console.out, mode == Sound::Recorder::MODE_GENERAL);
 }
 
-bool endsListening(Talvox::ListeningStep step) {
-    return step == Talvox::ListeningStep::LISTENING_ENDS || step == Talvox::ListeningStep::NO_VOICE;
+/** Runs the detector over the sound. */
+void analyzeSound(const std::vector<int16_t>& samples, int rateHz, bool asSession,
+                  Talvox::VadAnalyzer& analyzer, VadRun& run) {
+    const std::size_t length = bufferLength(rateHz);
+    // A session goes on behind the sound, in silence, until one of its limits ends it.
+    for (std::size_t position = 0; asSession ? run.isListening() : position < samples.size();
+         position += length) {
+        run.show(analyzer.analyze(bufferAt(samples, position, length, rateHz)));
+    }
 }
 
-std::unique_ptr<VadPrinter> makePrinter(bool json, Sound::Recorder::Mode mode, std::ostream& out) {
-    if (json) {
-        return std::make_unique<JsonVad>(out);
+/**
+ * Runs the detector over what the microphone records, until Ctrl-C, the end of a session or the
+ * failure of the device.
+ * @return what was recorded
+ */
+std::vector<int16_t> analyzeMicrophone(int rateHz, bool asSession, Sound::Recorder::Mode mode,
+                                       Talvox::VadAnalyzer& analyzer, VadRun& run,
+                                       std::ostream& out) {
+    std::vector<int16_t> samples;
+    Microphone microphone(rateHz, mode);
+    const Interrupts interrupts([&microphone] { microphone.interrupt(); });
+    const std::size_t most = samplesIn(MAX_CLIP_SECONDS, rateHz);
+    while (samples.size() < most && (!asSession || run.isListening())) {
+        const boost::shared_ptr<const Sound::SoundDataBuffer> buffer = microphone.take();
+        if (buffer == nullptr) {
+            break;
+        }
+        run.show(analyzer.analyze(*buffer));
+        out.flush();
+        appendSamples(samples, *buffer);
     }
-    return std::make_unique<HumanVad>(out, mode == Sound::Recorder::MODE_GENERAL);
+    if (samples.empty() && microphone.hasFailed()) {
+        throw UsageError("cannot record; is there a microphone, and a sound server for it?");
+    }
+    return samples;
 }
 
 }  // namespace
@@ -70,30 +94,28 @@ int runVad(const VadOptions& options, Console& console, LogOutput& log) {
     const int rate = settings->getSampleRate();
     checkSampleRate(rate);
     warnOfVadMistakes(*settings, console.err);
-    std::vector<int16_t> samples = loadSound(options.file, console.in, rate, MAX_CLIP_SECONDS);
-    addLeadIn(samples, rate, options.leadInMs);
-    const std::size_t length = bufferLength(rate);
-
-    const Sound::Recorder::Mode mode = sessionMode(*settings);
-    const std::unique_ptr<VadPrinter> printer = makePrinter(options.json, mode, console.out);
-    Talvox::VadAnalyzer analyzer(settings->getString(Talvox::Settings::SKS_VAD_SETTINGS), rate,
-                                 mode);
-    bool isSpeech = false;
-    bool isListening = true;
-    // A session goes on behind the sound, in silence, until one of its limits ends it.
-    for (std::size_t position = 0; options.asSession ? isListening : position < samples.size();
-         position += length) {
-        const Talvox::VadBufferAnalysis analysis =
-            analyzer.analyze(bufferAt(samples, position, length, rate));
-        printer->printBuffer(analysis);
-        const std::optional<SessionEvent> event = toSessionEvent(analysis);
-        if (options.asSession && event) {
-            printer->printSessionEvent(*event);
-        }
-        isSpeech = analysis.isSpeech;
-        isListening = !endsListening(analysis.step);
+    std::vector<int16_t> samples;
+    if (!options.microphone) {
+        samples = loadSound(options.file, console.in, rate, MAX_CLIP_SECONDS);
+        addLeadIn(samples, rate, options.leadInMs);
     }
-    printer->printSegments(analyzer.segments(), isSpeech);
+    const std::string vad = settings->getString(Talvox::Settings::SKS_VAD_SETTINGS);
+    const Sound::Recorder::Mode mode = sessionMode(*settings);
+    const std::unique_ptr<VadPrinter> printer = makePrinter(options, vad, mode, console);
+    Talvox::VadAnalyzer analyzer(vad, rate, mode);
+    VadReport report;
+    VadRun run(*printer, options.asSession || options.microphone,
+               options.report.empty() ? nullptr : &report);
+    if (options.microphone) {
+        samples = analyzeMicrophone(rate, options.asSession, mode, analyzer, run, console.out);
+    } else {
+        analyzeSound(samples, rate, options.asSession, analyzer, run);
+    }
+    run.finish(analyzer.segments());
+    if (!options.report.empty()) {
+        const std::string name = options.microphone ? "microphone" : options.file;
+        report.write(options.report, {name, vad, rate, &samples});
+    }
     return EXIT_OK;
 }
 

@@ -11,10 +11,12 @@ namespace Cli {
 /** What `talvox vad` was asked for. */
 struct VadOptions {
     SettingsOptions settings;
-    std::string file; /**< path or `STANDARD_INPUT` */
+    std::string file;        /**< path or `STANDARD_INPUT`; not used with `microphone` */
+    bool microphone = false; /**< record from the default input device */
     int leadInMs = LEAD_IN_MS_DFLT;
     bool asSession = false; /**< end where a session ends, and print what it reports */
     bool json = false;
+    std::string report; /**< HTML file; empty for none */
 };
 
 /**

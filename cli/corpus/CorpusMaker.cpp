@@ -83,14 +83,16 @@ class CorpusWriter {
     void writeUtterances(int number) {
         const Utterance utterance = makeUtterance(plan_.seed, number, plan_.tailMs, speaker_);
         const int rateHz = number % 2 == 0 ? WAVE_RATE_HZ : WAVE_RATE_HZ / 2;
-        const std::string name = "u" + twoDigits(number) + '-' + utterance.voice + "-peak" +
-                                 std::to_string(utterance.peak) + '-' +
-                                 std::to_string(rateHz / 1000) + "k";
+        std::string name = "u" + twoDigits(number);
+        name += '-' + utterance.voice;
+        name += "-peak" + std::to_string(utterance.peak);
+        name += '-' + std::to_string(rateHz / 1000) + 'k';
         write("clean", name, utterance.wave, utterance.speech, rateHz);
         const double loudness = speechRms(utterance);
         for (const std::string& noise : plan_.noises) {
-            const Wave background =
-                noiseOf(noise, utterance.wave.size(), noise + ' ' + std::to_string(number));
+            std::string purpose = noise;
+            purpose += ' ' + std::to_string(number);
+            const Wave background = noiseOf(noise, utterance.wave.size(), purpose);
             for (const int ratioDb : plan_.ratiosDb) {
                 const double gain = loudness * noiseShare(ratioDb) / rms(background);
                 Wave mixed = utterance.wave;

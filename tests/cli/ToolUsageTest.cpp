@@ -61,7 +61,7 @@ TEST(Tool, HelpsWithEveryCommand) {
 
 TEST(Tool, RefusesWrongUsage) {
     expectRefused({},
-                  "no command given (recognize, vad, corpus, settings or log); see "
+                  "no command given (recognize, vad, endpoint, corpus, settings or log); see "
                   "talvox --help");
     expectRefused({"sing"}, "sing");
     expectRefused({"recognize"}, "recognize needs --file FILE or --mic");

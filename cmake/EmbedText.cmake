@@ -1,0 +1,20 @@
+# cmake -DOUTPUT=FILE.cpp -DASSETS="NAME=FILE;..." -P EmbedText.cmake
+# Writes a source that defines each file's text as a constant `Cli::NAME`.
+file(WRITE ${OUTPUT} "#include \"cli/report/Assets.h\"\n\nnamespace Cli {\n")
+foreach(asset ${ASSETS})
+    string(REPLACE "=" ";" parts ${asset})
+    list(GET parts 0 name)
+    list(GET parts 1 path)
+    file(READ ${path} text)
+    file(APPEND ${OUTPUT} "\nconst char ${name}[] =\n")
+    string(LENGTH "${text}" length)
+    # In pieces, since compilers bound the length of one literal.
+    set(begin 0)
+    while(begin LESS length)
+        string(SUBSTRING "${text}" ${begin} 12000 piece)
+        file(APPEND ${OUTPUT} "R\"korvel(${piece})korvel\"\n")
+        math(EXPR begin "${begin} + 12000")
+    endwhile()
+    file(APPEND ${OUTPUT} ";\n")
+endforeach()
+file(APPEND ${OUTPUT} "\n}  // namespace Cli\n")
