@@ -1,6 +1,7 @@
 #include <unistd.h>
 
 #include <cstdlib>
+#include <filesystem>
 #include <memory>
 
 #include "NetworkFixture.h"
@@ -32,16 +33,19 @@ class NetworkTlsTest : public NetworkFixture {
             return;
         }
         NetworkManager::getInstance().setCertificateFile("");
-        for (const char* const name : {"server.key", "server.pem", "other.key", "other.pem"}) {
-            ::unlink(path(name).c_str());
-        }
-        ::rmdir(folder.c_str());
+        std::filesystem::remove_all(folder);
     }
 
     std::string path(const std::string& name) const { return folder + "/" + name; }
 
     void makeCertificate(const std::string& name, const std::string& subject) const {
         ASSERT_EQ("", TestSupport::makeCertificate(path(name), subject));
+    }
+
+    /** Makes `name` the certificate of this file. */
+    void putCertificate(const std::string& name, const std::string& file) const {
+        std::filesystem::copy_file(path(name), path(file),
+                                   std::filesystem::copy_options::overwrite_existing);
     }
 
     std::string fetch(const std::string& host) {
@@ -78,6 +82,24 @@ TEST_F(NetworkTlsTest, RefusesACertificateOfAnotherAuthority) {
 TEST_F(NetworkTlsTest, RefusesACertificateForAnotherHost) {
     NetworkManager::getInstance().setCertificateFile(path("server.pem"));
     EXPECT_EQ("finished -1", fetch("127.0.0.1"));
+}
+
+// What libcurl reads of a file is kept for a day, also when it is not all that the file holds.
+TEST_F(NetworkTlsTest, ReadsTheAuthoritiesAgainAfterAConnectionThatTheyDidNotAllow) {
+    makeCertificate("other", "DNS:localhost");
+    putCertificate("other.pem", "authorities.pem");
+    NetworkManager::getInstance().setCertificateFile(path("authorities.pem"));
+    EXPECT_EQ("finished -1", fetch("localhost"));
+    putCertificate("server.pem", "authorities.pem");
+    EXPECT_EQ("finished 200", fetch("localhost"));
+}
+
+TEST_F(NetworkTlsTest, ReadsTheAuthoritiesOnceWhileTheyAllowEveryConnection) {
+    putCertificate("server.pem", "authorities.pem");
+    NetworkManager::getInstance().setCertificateFile(path("authorities.pem"));
+    EXPECT_EQ("finished 200", fetch("localhost"));
+    std::filesystem::remove(path("authorities.pem"));
+    EXPECT_EQ("finished 200", fetch("localhost"));
 }
 
 TEST_F(NetworkTlsTest, FailsWithoutTheFileThatWasSet) {
