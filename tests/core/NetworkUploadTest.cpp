@@ -190,6 +190,25 @@ TEST_F(NetworkUploadTest, EndsWhenThePeerAnswersBeforeTheBodyEnds) {
     EXPECT_EQ(1U, server.getConnectionCount());
 }
 
+TEST_F(NetworkUploadTest, AnEarlyAnswerEndsABodyThatPauses) {
+    server.script({Answer::status(200), Answer::status(204).afterBodyBytes(4).held()});
+    // On a kept connection libcurl has no timer of its own that would end the wait, too.
+    const auto first = makeTask(server.getUrl());
+    holder.submitNoRetries(first);
+    EXPECT_EQ("finished 200", first->waitForEnd());
+    const auto task = makeStream(server.getUrl(), writer);
+    holder.submitNoRetries(task);
+    write(*writer, "word");
+    ASSERT_TRUE(server.waitForBody(1, 4));
+    settle();
+    settle();
+    server.release();
+    EXPECT_EQ("finished 204", task->waitForEnd());
+    ASSERT_TRUE(server.waitForRequest(2));
+    EXPECT_EQ("word", server.getRequest(1).body);
+    EXPECT_EQ(1U, server.getConnectionCount());
+}
+
 TEST_F(NetworkUploadTest, KeepsAnEarlyAnswerOfAPeerThatClosesAtOnce) {
     server.script({Answer::status(200, {{"Connection", "close"}}, "known").onHead().thenClose()});
     const auto task = makeUpload(server.getUrl(), std::string(5000000, 'x'));
