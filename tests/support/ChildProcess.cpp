@@ -12,42 +12,9 @@
 #include <filesystem>
 #include <sstream>
 
-extern char** environ;
+#include "support/Spawn.h"
 
 namespace TestSupport {
-
-namespace {
-
-/** The test's environment with `changes`, as text lines. */
-std::vector<std::string> mergeEnvironment(const ChildProcess::Environment& changes) {
-    std::vector<std::string> lines;
-    for (const auto& change : changes) {
-        lines.push_back(change.first + "=" + change.second);
-    }
-    for (char** entry = environ; *entry != nullptr; ++entry) {
-        const std::string line(*entry);
-        bool changed = false;
-        for (const auto& change : changes) {
-            changed = changed || line.compare(0, change.first.size() + 1, change.first + "=") == 0;
-        }
-        if (!changed) {
-            lines.push_back(line);
-        }
-    }
-    return lines;
-}
-
-std::vector<char*> toPointers(std::vector<std::string>& texts) {
-    std::vector<char*> pointers;
-    pointers.reserve(texts.size() + 1);
-    for (std::string& text : texts) {
-        pointers.push_back(text.data());
-    }
-    pointers.push_back(nullptr);
-    return pointers;
-}
-
-}  // namespace
 
 bool ChildProcess::isInstalled(const std::string& program) {
     const char* path = std::getenv("PATH");

@@ -7,15 +7,16 @@
 #include <sys/types.h>
 
 #include <string>
-#include <utility>
 #include <vector>
+
+#include "support/Spawn.h"
 
 namespace TestSupport {
 
 /** A running program; killed when its object goes. */
 class ChildProcess {
   public:
-    using Environment = std::vector<std::pair<std::string, std::string>>;
+    using Environment = TestSupport::Environment;
 
     struct Result {
         int exitStatus = -1; /**< -1 when it did not start or was ended by a signal */

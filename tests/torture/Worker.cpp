@@ -10,8 +10,7 @@
 #include <vector>
 
 #include "Pipe.h"
-
-extern char** environ;
+#include "support/Spawn.h"
 
 namespace Torture {
 
@@ -20,44 +19,25 @@ namespace {
 constexpr int ORDERS = 3;
 constexpr int ANSWERS = 4;
 
-std::string join(const char* variable, const std::string& more) {
-    const char* const before = std::getenv(variable);
-    return std::string(variable) + "=" + (before != nullptr ? std::string(before) + ":" : "") +
-           more;
-}
-
-/** The sanitizer accepts the library before itself; an abort shows its stack. */
-std::vector<std::string> makeEnvironment(const std::string& library) {
-    std::vector<std::string> lines = {"LD_PRELOAD=" + library,
-                                      join("ASAN_OPTIONS",
-                                           "verify_asan_link_order=0:handle_abort=1:"
-                                           "detect_leaks=1:exitcode=77")};
-    for (char** entry = environ; *entry != nullptr; ++entry) {
-        const std::string line(*entry);
-        if (line.rfind("LD_PRELOAD=", 0) != 0 && line.rfind("ASAN_OPTIONS=", 0) != 0) {
-            lines.push_back(line);
-        }
-    }
-    return lines;
-}
-
-std::vector<char*> toPointers(std::vector<std::string>& texts) {
-    std::vector<char*> pointers;
-    pointers.reserve(texts.size() + 1);
-    for (std::string& text : texts) {
-        pointers.push_back(text.data());
-    }
-    pointers.push_back(nullptr);
-    return pointers;
+/**
+ * The sanitizer accepts the library before itself; an abort shows its stack, and a leak its whole
+ * stack, through libraries without frame pointers.
+ */
+TestSupport::Environment makeEnvironment(const std::string& library) {
+    const char* const before = std::getenv("ASAN_OPTIONS");
+    return {{"LD_PRELOAD", library},
+            {"ASAN_OPTIONS", (before != nullptr ? std::string(before) + ":" : std::string()) +
+                                 "verify_asan_link_order=0:handle_abort=1:"
+                                 "detect_leaks=1:exitcode=77:fast_unwind_on_malloc=0"}};
 }
 
 }  // namespace
 
 Worker::Worker(const std::string& program, const std::string& library) {
     std::vector<std::string> words = {program, "--serve"};
-    std::vector<std::string> lines = makeEnvironment(library);
-    const std::vector<char*> argv = toPointers(words);
-    const std::vector<char*> envp = toPointers(lines);
+    std::vector<std::string> lines = TestSupport::mergeEnvironment(makeEnvironment(library));
+    const std::vector<char*> argv = TestSupport::toPointers(words);
+    const std::vector<char*> envp = TestSupport::toPointers(lines);
     std::array<int, 2> down = {-1, -1};
     std::array<int, 2> up = {-1, -1};
     if (pipe2(down.data(), O_CLOEXEC) != 0 || pipe2(up.data(), O_CLOEXEC) != 0) {
