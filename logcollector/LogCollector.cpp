@@ -28,6 +28,12 @@ void record(const char* operation, Call call) {
     }
 }
 
+/** The same with the collector, which the first call makes. */
+template <typename Call>
+void use(const char* operation, Call call) {
+    record(operation, [&call] { call(LogCollector::getInstance()); });
+}
+
 /** Makes the network's singleton the older one, so that it outlives the sender. */
 boost::shared_ptr<LogSender> makeSender() {
     Network::NetworkManager::getInstance();
@@ -65,8 +71,9 @@ void LogCollector::configure(const std::string& clientUuid) {
 
 void LogCollector::configure(const std::string& clientUuid, const std::string& endpointUrl) {
     const Util::EventLock lock;
-    uuid = clientUuid;
+    std::string nextUuid = clientUuid;
     url = endpointUrl;
+    uuid.swap(nextUuid);
     sender->onConfigured();
 }
 
@@ -152,7 +159,7 @@ void LogCollector::setDeliveredCallback(std::function<void()> callback) {
 }
 
 void setLoggingEnabled(bool value) {
-    LogCollector::getInstance().setLoggingEnabled(value);
+    use("setLoggingEnabled", [&](LogCollector& collector) { collector.setLoggingEnabled(value); });
 }
 
 bool isLoggingEnabled() {
@@ -160,11 +167,11 @@ bool isLoggingEnabled() {
 }
 
 void configure(const std::string& uuid) {
-    LogCollector::getInstance().configure(uuid);
+    use("configure", [&](LogCollector& collector) { collector.configure(uuid); });
 }
 
 void configure(const std::string& uuid, const std::string& url) {
-    LogCollector::getInstance().configure(uuid, url);
+    use("configure", [&](LogCollector& collector) { collector.configure(uuid, url); });
 }
 
 std::string getUrl() {
@@ -180,21 +187,21 @@ bool openStore(const LogStoreOptions& options) {
 }
 
 void startSession(const std::string& id) {
-    LogCollector::getInstance().startSession(id);
+    use("startSession", [&](LogCollector& collector) { collector.startSession(id); });
 }
 
 void stopSession(const std::string& id) {
-    LogCollector::getInstance().stopSession(id);
+    use("stopSession", [&](LogCollector& collector) { collector.stopSession(id); });
 }
 
 void logEvent(const std::string& sessionId, const std::string& name,
               const std::map<std::string, std::string>& params) {
-    LogCollector::getInstance().logEvent(sessionId, name, params);
+    use("logEvent", [&](LogCollector& collector) { collector.logEvent(sessionId, name, params); });
 }
 
 void logError(const std::string& sessionId, const std::string& name,
               const std::map<std::string, std::string>& params) {
-    LogCollector::getInstance().logError(sessionId, name, params);
+    use("logError", [&](LogCollector& collector) { collector.logError(sessionId, name, params); });
 }
 
 std::size_t getPendingCount() {

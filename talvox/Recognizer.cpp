@@ -2,6 +2,7 @@
 
 #include <boost/make_shared.hpp>
 #include <new>
+#include <optional>
 #include <utility>
 
 #include "core/util/EventLock.h"
@@ -14,14 +15,13 @@ namespace Talvox {
 
 namespace {
 
-/** Null when there is no memory. */
-boost::shared_ptr<Recognition> makeRecognition(
-    Recognition::Outcome outcome, const boost::shared_ptr<const RecognitionResults>& results,
-    const std::string& requestId) {
+/** What it makes; an empty value when there is no memory. */
+template <typename Make>
+auto makeOrNothing(Make make) -> decltype(make()) {
     try {
-        return boost::make_shared<Recognition>(outcome, results, requestId);
+        return make();
     } catch (const std::bad_alloc&) {
-        return nullptr;
+        return {};
     }
 }
 
@@ -77,15 +77,23 @@ void Recognizer::keepReason(std::string_view reason) noexcept {
 
 void Recognizer::callOnResults(const boost::shared_ptr<const RecognitionResults>& results,
                                const std::string& requestId) {
-    const boost::shared_ptr<const RecognitionResults> hypotheses =
-        KOR_ASSERT(results) ? results : boost::make_shared<const RecognitionResults>();
-    const Recognition::Outcome outcome =
-        Recognition::decideOutcome(*hypotheses, *engine->getTalvoxSettings());
+    boost::shared_ptr<const RecognitionResults> hypotheses = results;
+    // Nothing but this takes memory before the listeners are called.
+    const std::optional<Recognition::Outcome> outcome = makeOrNothing([&] {
+        if (!KOR_ASSERT(results)) {
+            hypotheses = boost::make_shared<const RecognitionResults>();
+        }
+        return std::make_optional(
+            Recognition::decideOutcome(*hypotheses, *engine->getTalvoxSettings()));
+    });
     const boost::shared_ptr<Recognizer> self = weak_from_this().lock();
     listeners.notify([&](RecognizerListener& listener) {
         korvel_pal::callGuarded([&] {
-            if (const boost::shared_ptr<Recognition> own =
-                    makeRecognition(outcome, hypotheses, requestId)) {
+            const boost::shared_ptr<Recognition> own = makeOrNothing([&] {
+                return outcome ? boost::make_shared<Recognition>(*outcome, hypotheses, requestId)
+                               : boost::shared_ptr<Recognition>();
+            });
+            if (own) {
                 listener.onResults(this, own);
             } else {
                 keepReason("no memory for the results");

@@ -82,6 +82,9 @@ class TALVOX_API Recognizer : public boost::enable_shared_from_this<Recognizer> 
     void callOnResults(const boost::shared_ptr<const RecognitionResults>& results,
                        const std::string& requestId);
 
+    /** For an object that serves one session after another. */
+    void forgetReason() noexcept { errorReason.clear(); }
+
     /** For the events of derived classes; see `Util::ListenerList`. */
     Util::ListenerList<RecognizerListener> listeners;
 

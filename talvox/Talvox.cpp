@@ -2,6 +2,8 @@
 
 #include <algorithm>
 #include <boost/make_shared.hpp>
+#include <exception>
+#include <new>
 
 #include "core/network/NetworkTaskHolder.h"
 #include "core/util/EventLock.h"
@@ -11,6 +13,7 @@
 #include "talvox/PlatformMechanism.h"
 #include "talvox/impl/EarlyInit.h"
 #include "talvox/impl/KorvelRecognizer.h"
+#include "talvox/impl/ReserveRecognizer.h"
 
 namespace Talvox {
 
@@ -86,8 +89,13 @@ Talvox& Talvox::getInstance() {
 
 Talvox::Talvox()
     : talvoxSettings(boost::make_shared<Settings>()),
+      reserve(boost::make_shared<ReserveRecognizer>(this, talvoxSettings)),
       registrationLock(kdThreadMutexCreate(nullptr)),
-      activeRecognizer(nullptr) {}
+      activeRecognizer(nullptr) {
+    if (registrationLock == nullptr) {
+        throw std::bad_alloc();
+    }
+}
 
 Talvox::~Talvox() {
     kdThreadMutexFree(registrationLock);
@@ -185,6 +193,17 @@ bool Talvox::isAvailable(RecognitionMechanism mechanism) {
 boost::shared_ptr<Recognizer> Talvox::createRecognizer(
     const boost::shared_ptr<RecognizerListener>& listener,
     const boost::shared_ptr<const Settings>& settings) const {
+    try {
+        return makeRecognizer(listener, settings);
+    } catch (const std::exception& exception) {
+        kdLogFormatMessage("createRecognizer: no recognizer can be made: %s", exception.what());
+    }
+    return lendReserve(listener);
+}
+
+boost::shared_ptr<Recognizer> Talvox::makeRecognizer(
+    const boost::shared_ptr<RecognizerListener>& listener,
+    const boost::shared_ptr<const Settings>& settings) const {
     const bool isGiven = KOR_ASSERT_AT(settings, "settings", ASSERT_PATH, __LINE__);
     const boost::shared_ptr<Settings> copy =
         isGiven ? settings->clone() : boost::make_shared<Settings>();
@@ -219,6 +238,17 @@ boost::shared_ptr<Recognizer> Talvox::makeRecognizer(
         assertUnknownMechanism();
     }
     return boost::make_shared<DummyRecognizer>(this, settings);
+}
+
+boost::shared_ptr<Recognizer> Talvox::lendReserve(
+    const boost::shared_ptr<RecognizerListener>& listener) const noexcept {
+    const Util::EventLock lock;
+    if (reserve.use_count() > 1) {
+        kdLogFormatMessage("createRecognizer: the stand-in is in use");
+        return nullptr;
+    }
+    reserve->assign(listener);
+    return reserve;
 }
 
 const std::vector<std::string>& Talvox::getAvailableLanguages() const {

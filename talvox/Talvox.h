@@ -22,6 +22,8 @@ class NetworkTaskHolder;
 
 namespace Talvox {
 
+class ReserveRecognizer;
+
 /**
  * Holds the engine-wide settings, decides which mechanism serves a recognition, makes recognizers
  * and admits one active recognition at a time. One per process, made on first use.
@@ -94,8 +96,9 @@ class TALVOX_API Talvox : public Util::Singleton<Talvox> {
      * begin as a clone of the engine's logs only what the application changed.
      * @param listener held weakly
      * @param settings not null; never changed
-     * @return the recognizer, owned by the caller; never null
-     * @throws std::bad_alloc, without effect, when there is no memory
+     * @return the recognizer, owned by the caller. Where memory is short, a stand-in with the
+     * default settings, whose `start` reports `ErrorUnknown`; it takes no memory. There is one:
+     * null while an earlier caller still owns it
      */
     boost::shared_ptr<Recognizer> createRecognizer(
         const boost::shared_ptr<RecognizerListener>& listener,
@@ -120,7 +123,12 @@ class TALVOX_API Talvox : public Util::Singleton<Talvox> {
     static void logMechanism(RecognitionMechanism mechanism, const Settings& settings,
                              bool platformSupported);
     boost::shared_ptr<Recognizer> makeRecognizer(
+        const boost::shared_ptr<RecognizerListener>& listener,
+        const boost::shared_ptr<const Settings>& settings) const;
+    boost::shared_ptr<Recognizer> makeRecognizer(
         RecognitionMechanism mechanism, const boost::shared_ptr<const Settings>& settings) const;
+    boost::shared_ptr<Recognizer> lendReserve(
+        const boost::shared_ptr<RecognizerListener>& listener) const noexcept;
 
     boost::shared_ptr<const Settings> talvoxSettings;
 
@@ -132,6 +140,7 @@ class TALVOX_API Talvox : public Util::Singleton<Talvox> {
     std::vector<boost::shared_ptr<Network::NetworkTaskHolder>> runningTaskHolders;
 
   private:
+    const boost::shared_ptr<ReserveRecognizer> reserve;
     KDThreadMutex* registrationLock;
     mutable std::atomic<Recognizer*> activeRecognizer;
 };

@@ -105,12 +105,14 @@ void ParallelEncoder::taskQueueStep() {
     }
 }
 
+// The manager comes first: where a task is set, the destructor finds it and makes none.
 void ParallelEncoder::startNextTask() {
+    Tasking::TaskManager& tasks = Tasking::TaskManager::getInstance();
     currentTask =
         spareTask ? std::move(spareTask) : boost::make_shared<ParallelEncoderTask>(this, encoder);
     currentTask->setBuffer(queue.front());
     queue.pop_front();
-    if (!Tasking::TaskManager::getInstance().addTask(currentTask, 0)) {
+    if (!tasks.addTask(currentTask, 0)) {
         giveUp();
     }
 }

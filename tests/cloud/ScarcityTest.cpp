@@ -5,15 +5,20 @@
 
 #include <atomic>
 #include <boost/make_shared.hpp>
+#include <memory>
 #include <new>
 #include <stdexcept>
 #include <string>
 
 #include "SessionTest.h"
+#include "core/sound/OggSpeexEncoder.h"
 #include "core/util/EventLock.h"
+#include "core/util/Singleton.h"
 #include "pal/kd.h"
 #include "support/AllocationFault.h"
+#include "support/EndCounter.h"
 #include "support/LogCapture.h"
+#include "talvox/impl/ParallelEncoder.h"
 
 namespace {
 
@@ -42,28 +47,7 @@ using CloudTest::EventRecorder;
 using CloudTest::Texts;
 using Talvox::Settings;
 using TestSupport::AllocationFault;
-
-/** Counts the terminal events, without any memory of its own. */
-class EndCounter : public Talvox::RecognizerListener {
-  public:
-    void onRecordingBegin(Talvox::Recognizer* /*recognizer*/) override {}
-    void onSpeakingBegin(Talvox::Recognizer* /*recognizer*/) override {}
-    void onRecordingDone(Talvox::Recognizer* /*recognizer*/) override {}
-    void onBufferReceived(Talvox::Recognizer* /*recognizer*/,
-                          const Sound::SoundDataBuffer& /*buffer*/) override {}
-    void onPowerChanged(Talvox::Recognizer* /*recognizer*/, float /*power*/) override {}
-    void onResults(Talvox::Recognizer* /*recognizer*/,
-                   boost::shared_ptr<Talvox::Recognition> /*recognition*/) override {
-        ++ends;
-    }
-    void onError(Talvox::Recognizer* /*recognizer*/, Talvox::SpeechError error) override {
-        ++ends;
-        code = error.getCode();
-    }
-
-    int ends = 0;
-    int code = -1;
-};
+using TestSupport::EndCounter;
 
 class ScarcityTest : public CloudTest::SessionTest {
   protected:
@@ -169,6 +153,124 @@ TEST_F(ScarcityTest, AllAllocationsOfStartMayFailFromAnyOn) {
     failEachAllocationOfStart(AllocationFault::ALL_FROM_THERE_ON);
 }
 
+TEST_F(ScarcityTest, EachAllocationOfACreationMayFail) {
+    int standIns = 0;
+    int number = 0;
+    for (bool failed = true; failed;) {
+        const auto counter = boost::make_shared<EndCounter>();
+        const auto settings = boost::make_shared<Settings>();
+        {
+            const AllocationFault fault(++number, AllocationFault::ONE);
+            session = engine().createRecognizer(counter, settings);
+            failed = AllocationFault::hasHappened();
+        }
+        ASSERT_NE(session, nullptr) << "allocation " << number;
+        if (failed && log.containsPart("no recognizer can be made")) {
+            ++standIns;
+            log.clear();
+            const AllocationFault fault(1, AllocationFault::ALL_FROM_THERE_ON);
+            session->start();
+            EXPECT_EQ(counter->code, Talvox::SpeechError::ErrorUnknown) << "allocation " << number;
+        }
+        expectOneEnd(*counter);
+    }
+    EXPECT_GT(standIns, 10);
+    expectTheNextSessionIsRight();
+}
+
+/** The stand-in that `createRecognizer` returns where there is no memory at all. */
+class StandInTest : public ScarcityTest {
+  protected:
+    boost::shared_ptr<Talvox::Recognizer> create(const boost::shared_ptr<EventRecorder>& hearer) {
+        const AllocationFault fault(1, AllocationFault::ALL_FROM_THERE_ON);
+        return engine().createRecognizer(hearer, ownSettings);
+    }
+
+    const boost::shared_ptr<EventRecorder> listener = boost::make_shared<EventRecorder>();
+    const boost::shared_ptr<const Settings> ownSettings = boost::make_shared<const Settings>();
+};
+
+TEST_F(StandInTest, ReportsOneErrorAndItsReason) {
+    const boost::shared_ptr<Talvox::Recognizer> standIn = create(listener);
+    standIn->stop();
+    EXPECT_EQ(listener->texts(), Texts());
+    standIn->start();
+    standIn->start();
+    standIn->cancel();
+    EXPECT_EQ(listener->texts(), Texts({"error ErrorUnknown"}));
+    EXPECT_EQ(listener->errorReason(), "no memory for a recognizer");
+    EXPECT_TRUE(isEngineFree());
+}
+
+TEST_F(StandInTest, CanBeCancelledInstead) {
+    const boost::shared_ptr<Talvox::Recognizer> standIn = create(listener);
+    standIn->cancel();
+    standIn->start();
+    EXPECT_EQ(listener->texts(), Texts({"error ErrorCanceled"}));
+}
+
+TEST_F(StandInTest, ServesTheNextCallerOnceItIsReleased) {
+    boost::shared_ptr<Talvox::Recognizer> standIn = create(listener);
+    standIn->addListener(listener);
+    standIn->start();
+    EXPECT_EQ(create(listener), nullptr);
+    standIn.reset();
+    const auto next = boost::make_shared<EventRecorder>();
+    standIn = create(next);
+    ASSERT_NE(standIn, nullptr);
+    EXPECT_EQ(standIn->getErrorReason(), "");
+    standIn->start();
+    EXPECT_EQ(next->texts(), Texts({"error ErrorUnknown"}));
+    EXPECT_EQ(listener->countEnds(), 2u);  // of the first session: added twice
+}
+
+/** Has results when it is started. */
+class ReadyRecognizer : public Talvox::Recognizer {
+  public:
+    explicit ReadyRecognizer(const Talvox::Talvox& facade)
+        : Recognizer(&facade, boost::make_shared<const Settings>()) {
+        hypotheses->emplace_back("go", 0.9F);
+    }
+    void start() override { callOnResults(hypotheses, requestId); }
+    void stop() override {}
+    void cancel() override {}
+
+  private:
+    boost::shared_ptr<Talvox::RecognitionResults> hypotheses =
+        boost::make_shared<Talvox::RecognitionResults>();
+    const std::string requestId = "an identifier of some length";
+};
+
+TEST_F(ScarcityTest, ResultsWithoutMemoryToJudgeThemAreOneError) {
+    for (const auto extent : {AllocationFault::ONE, AllocationFault::ALL_FROM_THERE_ON}) {
+        int number = 0;
+        for (bool failed = true; failed;) {
+            const auto counter = boost::make_shared<EndCounter>();
+            const auto recognizer = boost::make_shared<ReadyRecognizer>(engine());
+            recognizer->addListener(counter);
+            {
+                const AllocationFault fault(++number, extent);
+                recognizer->start();
+                failed = AllocationFault::hasHappened();
+            }
+            EXPECT_EQ(counter->ends, 1) << "allocation " << number;
+            EXPECT_EQ(counter->code, failed ? Talvox::SpeechError::ErrorUnknown : -1)
+                << "allocation " << number;
+        }
+        EXPECT_GT(number, 2);
+    }
+}
+
+TEST_F(ScarcityTest, AListenerThatIsGoneTakesNoMemoryAtTheEnd) {
+    const boost::shared_ptr<EndCounter> counter = makeCountedSession();
+    session->addListener(boost::make_shared<EndCounter>());
+    {
+        const AllocationFault fault(1, AllocationFault::ALL_FROM_THERE_ON);
+        session->cancel();
+    }
+    EXPECT_EQ(counter->ends, 1);
+}
+
 void ScarcityTest::failAllocationsOfASession(bool streaming, const std::string& format) {
     configure([&](Settings& settings) {
         settings.putBoolean(Settings::SKS_STREAMING, streaming);
@@ -192,6 +294,47 @@ void ScarcityTest::failAllocationsOfASession(bool streaming, const std::string& 
         expectOneEnd(*counter);
     }
     expectTheNextSessionIsRight();
+}
+
+TEST_F(ScarcityTest, EachAllocationOfAnEncoderMayFail) {
+    const CloudTest::BufferPtr sound = CloudTest::makeConstantBuffer(1000);
+    int number = 0;
+    for (bool failed = true; failed;) {
+        Sound::OggSpeexEncoder encoder(sound->getInfo(), 8);
+        bool threw = false;
+        {
+            const AllocationFault fault(++number, AllocationFault::ONE);
+            try {
+                encoder.encode(*sound);
+            } catch (const std::bad_alloc&) {
+                threw = true;
+            }
+            failed = AllocationFault::hasHappened();
+        }
+        EXPECT_EQ(failed, threw || encoder.hasFailed()) << "allocation " << number;
+    }
+    EXPECT_GT(number, 3);
+}
+
+TEST_F(ScarcityTest, AnEncoderWithoutMemoryForItsFirstTaskCanBeDestroyed) {
+    const CloudTest::BufferPtr sound = CloudTest::makeConstantBuffer(1000);
+    int number = 0;
+    for (bool failed = true; failed;) {
+        Util::SingletonStorage::destroyAll();  // the task manager, too
+        auto encoder = std::make_unique<Talvox::ParallelEncoder>(
+            boost::make_shared<Sound::OggSpeexEncoder>(sound->getInfo(), 8),
+            [](const boost::shared_ptr<const Sound::SoundDataBuffer>&) {});
+        const Util::EventLock lock;
+        const AllocationFault fault(++number, AllocationFault::ALL_FROM_THERE_ON);
+        try {
+            encoder->write(sound);
+        } catch (const std::bad_alloc&) {
+            EXPECT_TRUE(AllocationFault::hasHappened());
+        }
+        encoder.reset();
+        failed = AllocationFault::hasHappened();
+    }
+    EXPECT_GT(number, 3);
 }
 
 TEST_F(ScarcityTest, AllocationsOfASimpleSessionMayFail) {

@@ -64,10 +64,11 @@ std::set<std::string> findReportedReasons(const std::string& sources) {
             reasons.insert(std::regex_replace(match[1].str(), std::regex("\\\\"), ""));
         });
     };
-    findAll(sources,
-            "(callOnError|stopWithError|fail|giveUp|endWithError|notifyError)\\((SpeechError\\()?"
-            "SpeechError::[^;]*;",
-            addTexts);
+    findAll(
+        sources,
+        "(callOnError|stopWithError|fail|giveUp|end|endWithError|notifyError)\\((SpeechError\\()?"
+        "SpeechError::[^;]*;",
+        addTexts);
     findAll(sources, "(obstacle|REASON|reason) = [^;]*;", addTexts);
     return reasons;
 }

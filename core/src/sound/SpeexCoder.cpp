@@ -2,6 +2,8 @@
 
 #include <speex/speex_header.h>
 
+#include <memory>
+
 namespace Sound {
 
 namespace {
@@ -62,13 +64,14 @@ std::vector<unsigned char> SpeexCoder::makeHeader() const {
     speex_init_header(&header, sampleRate, 1, mode);
     header.frames_per_packet = 1;
     int size = 0;
-    char* text = speex_header_to_packet(&header, &size);
-    if (text == nullptr) {
+    struct Deleter {
+        void operator()(char* packet) const { speex_header_free(packet); }
+    };
+    const std::unique_ptr<char, Deleter> text(speex_header_to_packet(&header, &size));
+    if (!text) {
         return {};
     }
-    std::vector<unsigned char> bytes(text, text + size);
-    speex_header_free(text);
-    return bytes;
+    return {text.get(), text.get() + size};
 }
 
 const std::vector<unsigned char>& SpeexCoder::encodeFrame(int16_t* samples) {

@@ -9,6 +9,7 @@
 #include <boost/shared_ptr.hpp>
 #include <boost/weak_ptr.hpp>
 #include <cstddef>
+#include <new>
 #include <vector>
 
 namespace Util {
@@ -17,7 +18,7 @@ namespace Util {
  * Listeners held weakly, in the order of addition. Used under the event lock only.
  *
  * What holds of every notification:
- * - expired listeners are removed from the list first;
+ * - expired listeners are removed from the list first, where there is memory for that;
  * - the live ones are then called in the order of addition, each kept alive for its own call only;
  * - a listener that is added during the notification is first called by the next one;
  * - a listener that dies or is removed during the notification before its turn: a dead one is
@@ -45,7 +46,7 @@ class ListenerList {
     /** Calls `call(Listener&)` for each live listener. */
     template <typename Call>
     void notify(Call call) {
-        removeIf([](const boost::weak_ptr<Listener>& entry) { return entry.expired(); });
+        removeExpired();
         const boost::shared_ptr<const Entries> snapshot = entries;
         if (!snapshot) {
             return;
@@ -59,6 +60,15 @@ class ListenerList {
 
   private:
     using Entries = std::vector<boost::weak_ptr<Listener>>;
+
+    // Listeners must get their events all the same.
+    void removeExpired() noexcept {
+        try {
+            removeIf([](const boost::weak_ptr<Listener>& entry) { return entry.expired(); });
+        } catch (const std::bad_alloc&) {
+            return;
+        }
+    }
 
     template <typename Condition>
     void removeIf(Condition condition) {
