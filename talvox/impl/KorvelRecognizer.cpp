@@ -11,6 +11,7 @@
 #include "talvox/Log.h"
 #include "talvox/Talvox.h"
 #include "talvox/impl/ListeningRules.h"
+#include "talvox/impl/SessionGuard.h"
 
 namespace Talvox {
 
@@ -48,37 +49,19 @@ KorvelRecognizer::~KorvelRecognizer() {
 
 template <typename Call>
 void KorvelRecognizer::enter(Call call) noexcept {
-    const Util::EventLock lock;
-    const boost::shared_ptr<Recognizer> self = weak_from_this().lock();
-    if (!self) {
-        return;  // the last reference is going on another thread, and that is the end
-    }
-    try {
-        call();
-    } catch (const std::exception& exception) {
-        endUnexpectedly(exception.what());
-    } catch (...) {
-        endUnexpectedly("an exception of an unknown type");
-    }
+    enterSession(*this, call, [this](const char* what) { endUnexpectedly(what); });
 }
 
 // The last reference may be going on another thread; then there is nothing to end.
 void KorvelRecognizer::onException(const char* what) {
     const boost::shared_ptr<Recognizer> self = weak_from_this().lock();
     if (self && !isOver()) {
-        endUnexpectedly(what);
+        endSession(what, [this](const char* text) { endUnexpectedly(text); });
     }
 }
 
-void KorvelRecognizer::endUnexpectedly(const char* what) noexcept {
-    kdLogFormatMessage("KorvelRecognizer: the session cannot go on: %s", what);
-    try {
-        stopWithError(SpeechError::ErrorUnknown, what);
-    } catch (const std::exception& exception) {
-        kdLogFormatMessage("KorvelRecognizer: an exception at the end: %s", exception.what());
-    } catch (...) {
-        kdLogFormatMessage("KorvelRecognizer: an exception at the end");
-    }
+void KorvelRecognizer::endUnexpectedly(const char* what) {
+    stopWithError(SpeechError::ErrorUnknown, what);
 }
 
 const std::vector<std::string>& KorvelRecognizer::getAvailableLanguages() {
@@ -108,7 +91,7 @@ void KorvelRecognizer::begin() {
         return;
     }
     if (kdStartEventsKOR() != 0) {
-        stopWithError(SpeechError::ErrorUnknown, "the system has no thread for the engine");
+        stopWithError(SpeechError::ErrorUnknown, NO_THREAD_REASON);
         return;
     }
     exceptionWatch.emplace(static_cast<ExceptionWatch::Owner&>(*this));

@@ -67,7 +67,7 @@ class KorvelRecognizer : public Recognizer,
     template <typename Call>
     void enter(Call call) noexcept;
     void onException(const char* what) override;
-    void endUnexpectedly(const char* what) noexcept;
+    void endUnexpectedly(const char* what);
     void begin();
     /** Another session may begin; to be called right before the end is reported. */
     void leaveEngine();

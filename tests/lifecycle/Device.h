@@ -34,6 +34,9 @@ class Device {
     /** Tells the recognizer of this handle, if there is one. Under the event lock. */
     virtual void say(int64_t handle, Saying what, int session) = 0;
 
+    /** Makes a callback that throws `std::runtime_error`. Under the event lock. */
+    virtual void failInCallback(int64_t handle, const char* text) = 0;
+
     /** References that are held of the device's objects. */
     virtual long countReferences() const = 0;
 };

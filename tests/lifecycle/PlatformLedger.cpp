@@ -7,7 +7,10 @@
 #include <map>
 #include <memory>
 #include <mutex>
+#include <new>
+#include <utility>
 
+#include "core/util/EventLock.h"
 #include "pal/kd_event.h"
 
 namespace Lifecycle {
@@ -42,14 +45,26 @@ Books& books() {
     return *made;
 }
 
+/** Counts something down when it goes, also by an exception. */
+class CountedDown {
+  public:
+    explicit CountedDown(long PlatformLedger::*what) : count(what) {}
+    ~CountedDown() { books().change(count, -1); }
+    CountedDown(const CountedDown&) = delete;
+    CountedDown& operator=(const CountedDown&) = delete;
+
+  private:
+    long PlatformLedger::*count;
+};
+
 struct Post {
     void (*function)(void*);
     void* user;
 
     static void run(void* self) {
+        const CountedDown whenOver(&PlatformLedger::posts);
         const std::unique_ptr<Post> post(static_cast<Post*>(self));
         post->function(post->user);
-        books().change(&PlatformLedger::posts, -1);
     }
 };
 
@@ -78,12 +93,12 @@ struct Work {
 
   private:
     void end(void (*call)(void*)) {
+        const CountedDown whenOver(&PlatformLedger::works);
         const std::unique_ptr<Work> self(this);
         table().erase(handle);
         if (call != nullptr) {
             call(user);
         }
-        books().change(&PlatformLedger::works, -1);
     }
 };
 
@@ -122,26 +137,46 @@ KDint kdCancelTimer(KDTimer* timer) {
 
 KDint kdInstallCallback(KDCallbackFunc* func, KDint eventtype, void* eventuserptr) {
     static auto* const real = findReal<decltype(kdInstallCallback)>("kdInstallCallback");
-    books().change(&PlatformLedger::callbacks, func != nullptr ? 1 : -1);
-    return real(func, eventtype, eventuserptr);
+    const KDint result = real(func, eventtype, eventuserptr);
+    const int change = func != nullptr ? 1 : -1;
+    books().change(&PlatformLedger::callbacks, result == 0 ? change : 0);
+    return result;
 }
 
 KDint kdPostKOR(void (*func)(void* user), void* user) {
+    using Lifecycle::Post;
     static auto* const real = findReal<decltype(kdPostKOR)>("kdPostKOR");
+    std::unique_ptr<Post> post(new (std::nothrow) Post{func, user});
+    if (!post) {
+        return -1;
+    }
     books().change(&PlatformLedger::posts, 1);
-    return real(&Lifecycle::Post::run, new Lifecycle::Post{func, user});
+    const KDint result = real(&Post::run, post.get());
+    if (result == 0) {
+        static_cast<void>(post.release());
+    } else {
+        books().change(&PlatformLedger::posts, -1);
+    }
+    return result;
 }
 
 KDWork* kdQueueWorkKOR(void (*work)(void* user), void (*done)(void* user), void* user) {
     using Lifecycle::Work;
     static auto* const real = findReal<decltype(kdQueueWorkKOR)>("kdQueueWorkKOR");
-    kdEventLockKOR();
-    books().change(&PlatformLedger::works, 1);
-    auto* const counted = new Work{work, done, nullptr, user, nullptr};
-    counted->handle = real(&Work::run, &Work::finish, counted);
-    Work::table()[counted->handle] = counted;
-    KDWork* const handle = counted->handle;
-    kdEventUnlockKOR();
+    const Util::EventLock lock;
+    // What takes memory comes first: nothing may fail once the work is queued.
+    std::unique_ptr<Work> counted =
+        std::make_unique<Work>(Work{work, done, nullptr, user, nullptr});
+    std::map<KDWork*, Work*> place{{nullptr, counted.get()}};
+    KDWork* const handle = real(&Work::run, &Work::finish, counted.get());
+    if (handle != nullptr) {
+        books().change(&PlatformLedger::works, 1);
+        counted->handle = handle;
+        auto node = place.extract(place.begin());
+        node.key() = handle;
+        Work::table().insert(std::move(node));
+        static_cast<void>(counted.release());
+    }
     return handle;
 }
 

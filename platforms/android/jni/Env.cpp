@@ -33,6 +33,17 @@ std::string describe(JNIEnv* env, jthrowable exception) {
     return toUtf8(env, text.get());
 }
 
+/** Takes no memory of ours. Does nothing where what failed has left an exception. */
+void throwOutOfMemory(JNIEnv* env) noexcept {
+    if (env->ExceptionCheck() != JNI_FALSE) {
+        return;
+    }
+    const LocalRef<jclass> type(env, env->FindClass("java/lang/OutOfMemoryError"));
+    if (type) {
+        env->ThrowNew(type.get(), "native code has no memory");
+    }
+}
+
 }  // namespace
 
 JNIEnv* getEnv() {
@@ -49,7 +60,7 @@ void check(JNIEnv* env) {
     }
 }
 
-void throwNew(JNIEnv* env, const char* className, const std::string& message) noexcept {
+void throwNew(JNIEnv* env, const char* className, const char* message) noexcept {
     if (env->ExceptionCheck() != JNI_FALSE) {
         return;
     }
@@ -61,13 +72,12 @@ void throwNew(JNIEnv* env, const char* className, const std::string& message) no
             newObject(env, type.get(), "(Ljava/lang/String;)V", text.get());
         env->Throw(static_cast<jthrowable>(exception.get()));
     } catch (...) {
-        // What failed here has left a Java exception, too.
-        return;
+        throwOutOfMemory(env);
     }
 }
 
 void raise(JNIEnv* env, const char* className, const std::string& message) {
-    throwNew(env, className, message);
+    throwNew(env, className, message.c_str());
     throw PendingException();
 }
 

@@ -6,6 +6,7 @@
 
 #include <jni.h>
 
+#include <exception>
 #include <string>
 
 #include "Refs.h"
@@ -13,7 +14,10 @@
 namespace Jni {
 
 /** Thrown while a Java exception is pending on the thread; carries nothing itself. */
-class PendingException {};
+class PendingException : public std::exception {
+  public:
+    const char* what() const noexcept override { return "a Java exception"; }
+};
 
 /** The calling thread's environment. @throw std::runtime_error where there is no VM (any more) */
 JNIEnv* getEnv();
@@ -22,7 +26,7 @@ JNIEnv* getEnv();
 void check(JNIEnv* env);
 
 /** Makes a Java exception pending, unless there is one already. */
-void throwNew(JNIEnv* env, const char* className, const std::string& message) noexcept;
+void throwNew(JNIEnv* env, const char* className, const char* message) noexcept;
 
 /** Makes a Java exception pending and throws `PendingException`. */
 [[noreturn]] void raise(JNIEnv* env, const char* className, const std::string& message);

@@ -1,6 +1,7 @@
 #include "PlatformRecognizer.h"
 
 #include <boost/make_shared.hpp>
+#include <exception>
 #include <utility>
 
 #include "BundleConversion.h"
@@ -99,6 +100,30 @@ PlatformRecognizer::~PlatformRecognizer() {
     const Util::EventLock lock;
     Jni::KnownObjects<PlatformRecognizer>::remove(this);
     cancelSilently();
+    leaveEngine();
+}
+
+// The last reference may be going on another thread; then there is nothing to end.
+void PlatformRecognizer::onException(const char* what) {
+    const boost::shared_ptr<Recognizer> self = weak_from_this().lock();
+    if (self && !over) {
+        Talvox::endSession(what, [this](const char* text) { endUnexpectedly(text); });
+    }
+}
+
+void PlatformRecognizer::endUnexpectedly(const char* what) {
+    if (JNIEnv* const env = kdGetJNIEnvKOR()) {
+        Jni::logAndClear(env, "PlatformRecognizer");
+    }
+    if (pendingResults) {
+        reportResults();
+    } else {
+        giveUp(SpeechError::ErrorUnknown, what);
+    }
+}
+
+void PlatformRecognizer::leaveEngine() {
+    exceptionWatch.reset();
     getEngine()->unregisterRecognizer(this);
 }
 
@@ -140,8 +165,10 @@ void PlatformRecognizer::prepareSound(bool isWifi) {
 }
 
 void PlatformRecognizer::start() {
-    const Util::EventLock lock;
-    const boost::shared_ptr<Recognizer> self = shared_from_this();
+    enter([this] { begin(); });
+}
+
+void PlatformRecognizer::begin() {
     if (over || jobj) {
         kdLogFormatMessage("PlatformRecognizer: a recognizer is started once, start is ignored");
         return;
@@ -155,9 +182,18 @@ void PlatformRecognizer::start() {
         endWithError(SpeechError::ErrorNotAvailable, "there is no Java VM");
         return;
     }
+    if (kdStartEventsKOR() != 0) {
+        endWithError(SpeechError::ErrorUnknown, Talvox::NO_THREAD_REASON);
+        return;
+    }
+    exceptionWatch.emplace(static_cast<Talvox::ExceptionWatch::Owner&>(*this));
     hear();
-    silenceTimer = std::make_unique<Util::Timer>([this] { checkSilence(); });
+    silenceTimer = std::make_unique<Util::Timer>([this] { enter([this] { checkSilence(); }); });
     silenceTimer->start(KD_TIMER_ONESHOT, SILENCE_LIMIT_NS);
+    startJavaObject(env);
+}
+
+void PlatformRecognizer::startJavaObject(JNIEnv* env) {
     try {
         createJavaObject();
         if (!over) {
@@ -181,31 +217,29 @@ void PlatformRecognizer::createJavaObject() {
 }
 
 void PlatformRecognizer::stop() {
-    const Util::EventLock lock;
-    const boost::shared_ptr<Recognizer> self = shared_from_this();
-    requestTime = kdGetTimeUST();
-    JNIEnv* const env = kdGetJNIEnvKOR();
-    if (!jobj || env == nullptr) {
-        return;
-    }
-    awaitAnswer();
-    try {
-        Jni::callVoid(env, jobj.get(), "stop", "()V");
-    } catch (const Jni::PendingException&) {
-        Jni::logAndClear(env, "PlatformRecognizer.stop");
-        if (!pendingResults) {
-            giveUp(SpeechError::ErrorUnknown, "the device recognizer could not be stopped");
+    enter([this] {
+        requestTime = kdGetTimeUST();
+        JNIEnv* const env = kdGetJNIEnvKOR();
+        if (!jobj || env == nullptr) {
+            return;
         }
-    }
+        awaitAnswer();
+        try {
+            Jni::callVoid(env, jobj.get(), "stop", "()V");
+        } catch (const Jni::PendingException&) {
+            Jni::logAndClear(env, "PlatformRecognizer.stop");
+            if (!pendingResults) {
+                giveUp(SpeechError::ErrorUnknown, "the device recognizer could not be stopped");
+            }
+        }
+    });
 }
 
 void PlatformRecognizer::cancel() {
-    const Util::EventLock lock;
-    const boost::shared_ptr<Recognizer> self = shared_from_this();
-    giveUp(SpeechError::ErrorCanceled, "the application cancelled");
+    enter([this] { giveUp(SpeechError::ErrorCanceled, "the application cancelled"); });
 }
 
-void PlatformRecognizer::giveUp(int code, const std::string& reason) {
+void PlatformRecognizer::giveUp(int code, std::string_view reason) {
     // What Java says while it is cancelled does not count.
     const bool wasOver = std::exchange(over, true);
     cancelSilently();
@@ -228,16 +262,16 @@ void PlatformRecognizer::cancelSilently() {
     }
 }
 
-void PlatformRecognizer::endWithError(int code, const std::string& reason) {
+void PlatformRecognizer::endWithError(int code, std::string_view reason) {
     if (!std::exchange(over, true)) {
         reportError(code, reason);
     }
 }
 
-void PlatformRecognizer::reportError(int code, const std::string& reason) {
+void PlatformRecognizer::reportError(int code, std::string_view reason) {
     encoder.reset();
     silenceTimer.reset();
-    getEngine()->unregisterRecognizer(this);
+    leaveEngine();
     callOnError(SpeechError(code), reason);
 }
 
@@ -268,11 +302,13 @@ const std::vector<std::string>& PlatformRecognizer::getAvailableLanguages() {
 
 template <typename Call>
 void PlatformRecognizer::announce(Call call) {
-    const boost::shared_ptr<Recognizer> self = shared_from_this();
-    listeners.notify([this, &call](RecognizerListener& listener) {
-        if (!over) {
-            call(listener);
-        }
+    enter([&] {
+        hear();
+        listeners.notify([&](RecognizerListener& listener) {
+            if (!over) {
+                call(listener);
+            }
+        });
     });
 }
 
@@ -292,11 +328,6 @@ void PlatformRecognizer::awaitAnswer() {
 }
 
 void PlatformRecognizer::checkSilence() {
-    // The last reference may be going on another thread.
-    const boost::shared_ptr<Recognizer> self = weak_from_this().lock();
-    if (!self) {
-        return;
-    }
     const int64_t leftNs = silenceDeadline - kdGetTimeUST();
     if (leftNs > 0) {
         silenceTimer->start(KD_TIMER_ONESHOT, leftNs);
@@ -308,21 +339,22 @@ void PlatformRecognizer::checkSilence() {
 }
 
 void PlatformRecognizer::onReadyForSpeech() {
-    hear();
     announce([this](RecognizerListener& listener) { listener.onRecordingBegin(this); });
 }
 
 void PlatformRecognizer::onBeginningOfSpeech() {
-    hear();
     announce([this](RecognizerListener& listener) { listener.onSpeakingBegin(this); });
 }
 
 void PlatformRecognizer::onRmsChanged(float rms) {
-    hear();
     announce([this, rms](RecognizerListener& listener) { listener.onPowerChanged(this, rms); });
 }
 
 void PlatformRecognizer::onBufferReceived(const char* data, unsigned size) {
+    enter([this, data, size] { takeSound(data, size); });
+}
+
+void PlatformRecognizer::takeSound(const char* data, unsigned size) {
     hear();
     if (!logWithSound || over || pendingResults) {
         return;
@@ -343,9 +375,11 @@ void PlatformRecognizer::onEndOfSpeech() {
     if (over) {
         return;
     }
-    requestTime = kdGetTimeUST();
-    awaitAnswer();
-    announce([this](RecognizerListener& listener) { listener.onRecordingDone(this); });
+    enter([this] {
+        requestTime = kdGetTimeUST();
+        awaitAnswer();
+        announce([this](RecognizerListener& listener) { listener.onRecordingDone(this); });
+    });
 }
 
 void PlatformRecognizer::onPartialResults(
@@ -357,15 +391,19 @@ void PlatformRecognizer::onResults(const boost::shared_ptr<const RecognitionResu
     if (over || pendingResults) {
         return;
     }
-    tvLogFormatMessage(LOG_LEVEL, "Request finished in %d msec", getMsSinceRequest());
-    finishWithResults(results);
+    enter([this, &results] {
+        tvLogFormatMessage(LOG_LEVEL, "Request finished in %d msec", getMsSinceRequest());
+        finishWithResults(results);
+    });
 }
 
 void PlatformRecognizer::onError(int code) {
-    const boost::shared_ptr<Recognizer> self = shared_from_this();
-    if (over || pendingResults) {
-        return;
+    if (!over && !pendingResults) {
+        enter([this, code] { takeError(code); });
     }
+}
+
+void PlatformRecognizer::takeError(int code) {
     if (code == NO_HYPOTHESIS) {
         tvLogFormatMessage(LOG_LEVEL, "Request finished with empty results in %d msec",
                            getMsSinceRequest());
@@ -393,7 +431,6 @@ int PlatformRecognizer::getMsSinceRequest() const {
 
 void PlatformRecognizer::finishWithResults(
     const boost::shared_ptr<const RecognitionResults>& results) {
-    const boost::shared_ptr<Recognizer> self = shared_from_this();
     pendingResults = results;
     silenceTimer.reset();
     if (loggingEnabled && logWithSound && encodeWithSpeex) {
@@ -405,17 +442,28 @@ void PlatformRecognizer::finishWithResults(
 
 void PlatformRecognizer::makeHttpRequest(
     const boost::shared_ptr<const Sound::SoundDataBuffer>& sound) {
-    // The encoder's end may meet the last reference going on another thread.
-    const boost::shared_ptr<Recognizer> self = weak_from_this().lock();
-    if (!self || over) {
-        return;
-    }
-    if (loggingEnabled) {
+    enter([this, &sound] {
+        if (loggingEnabled && !over) {
+            logSession(sound);
+        }
+        reportResults();
+    });
+}
+
+// The upload may fail; the user gets the results.
+void PlatformRecognizer::logSession(const boost::shared_ptr<const Sound::SoundDataBuffer>& sound) {
+    try {
         submitLog(sound);
+    } catch (const std::exception& exception) {
+        kdLogFormatMessage("PlatformRecognizer: nothing is logged: %s", exception.what());
     }
-    over = true;
-    getEngine()->unregisterRecognizer(this);
-    callOnResults(pendingResults, "");
+}
+
+void PlatformRecognizer::reportResults() {
+    if (!std::exchange(over, true)) {
+        leaveEngine();
+        callOnResults(pendingResults, "");
+    }
 }
 
 void PlatformRecognizer::submitLog(const boost::shared_ptr<const Sound::SoundDataBuffer>& sound) {

@@ -9,14 +9,18 @@
 #include <boost/shared_ptr.hpp>
 #include <cstdint>
 #include <memory>
+#include <optional>
 #include <string>
+#include <string_view>
 #include <vector>
 
 #include "Refs.h"
 #include "core/sound/SoundDataBuffer.h"
 #include "core/util/Timer.h"
 #include "talvox/Recognizer.h"
+#include "talvox/impl/ExceptionWatch.h"
 #include "talvox/impl/ParallelEncoder.h"
+#include "talvox/impl/SessionGuard.h"
 
 /**
  * Drives a Java object that drives Android's recognizer, and turns its callbacks into the events
@@ -29,8 +33,11 @@
  * A device that falls silent does not keep the engine busy: `ErrorNetwork` ends the session 30 s
  * after the last callback while it listens, and 20 s after the first `stop` or end of speech,
  * whatever callbacks follow. An exception from Java's `stop` ends it with `ErrorUnknown`.
+ *
+ * So does any other exception, of want of memory or of a listener, in a call, a callback or on an
+ * engine thread. Results that are there by then are delivered all the same, without the upload.
  */
-class PlatformRecognizer : public Talvox::Recognizer {
+class PlatformRecognizer : public Talvox::Recognizer, private Talvox::ExceptionWatch::Owner {
   public:
     PlatformRecognizer(const Talvox::Talvox* facade,
                        boost::shared_ptr<const Talvox::Settings> recognizerSettings);
@@ -43,6 +50,15 @@ class PlatformRecognizer : public Talvox::Recognizer {
     void start() override;
     void stop() override;
     void cancel() override;
+
+    /**
+     * Makes a call into the session, such as what Java's callbacks do. What it throws ends the
+     * session and goes no further; a pending Java exception is logged and cleared.
+     */
+    template <typename Call>
+    void enter(Call call) noexcept {
+        Talvox::enterSession(*this, call, [this](const char* what) { endUnexpectedly(what); });
+    }
 
     /** Whether the device has a recognizer; false outside Android. */
     static bool isRecognitionAvailable();
@@ -69,11 +85,18 @@ class PlatformRecognizer : public Talvox::Recognizer {
   private:
     void chooseLogging();
     void prepareSound(bool isWifi);
+    void begin();
+    void startJavaObject(JNIEnv* env);
     void createJavaObject();
     void cancelSilently();
-    void giveUp(int code, const std::string& reason);
-    void endWithError(int code, const std::string& reason = std::string());
-    void reportError(int code, const std::string& reason);
+    void onException(const char* what) override;
+    void endUnexpectedly(const char* what);
+    void giveUp(int code, std::string_view reason);
+    void endWithError(int code, std::string_view reason = std::string_view());
+    void reportError(int code, std::string_view reason);
+    void reportResults();
+    /** Another session may begin; to be called right before the end is reported. */
+    void leaveEngine();
     template <typename Call>
     void announce(Call call);
 
@@ -81,7 +104,10 @@ class PlatformRecognizer : public Talvox::Recognizer {
     void awaitAnswer();
     void checkSilence();
     void finishWithResults(const boost::shared_ptr<const Talvox::RecognitionResults>& results);
+    void takeSound(const char* data, unsigned size);
+    void takeError(int code);
     void makeHttpRequest(const boost::shared_ptr<const Sound::SoundDataBuffer>& sound);
+    void logSession(const boost::shared_ptr<const Sound::SoundDataBuffer>& sound);
     void submitLog(const boost::shared_ptr<const Sound::SoundDataBuffer>& sound);
     int getMsSinceRequest() const;
 
@@ -102,4 +128,5 @@ class PlatformRecognizer : public Talvox::Recognizer {
     bool answerAwaited = false;
     int64_t silenceDeadline = 0;
     std::unique_ptr<Util::Timer> silenceTimer;
+    std::optional<Talvox::ExceptionWatch> exceptionWatch;
 };

@@ -70,6 +70,15 @@ boost::shared_ptr<const RecognitionResults> readResults(JNIEnv* env, jobjectArra
     return results;
 }
 
+/** Hands a callback to its recognizer, whose session ends where something throws. */
+template <typename Callback>
+void receive(jlong handle, Callback callback) noexcept {
+    Jni::enter([handle, &callback](JNIEnv* env) {
+        const boost::shared_ptr<PlatformRecognizer> target = getRecognizer(env, handle);
+        target->enter([&] { callback(env, *target); });
+    });
+}
+
 void receiveBuffer(JNIEnv* env, PlatformRecognizer& recognizer, jbyteArray sound) {
     const jsize size = env->GetArrayLength(sound);
     std::vector<jbyte> bytes(static_cast<std::size_t>(size));
@@ -85,54 +94,53 @@ extern "C" {
 
 JNIEXPORT void JNICALL Java_korvel_talvox_impl_PlatformRecognizer_onReadyForSpeechInternal(
     JNIEnv* /*env*/, jclass /*type*/, jlong recognizer) {
-    Jni::enter([recognizer](JNIEnv* env) { getRecognizer(env, recognizer)->onReadyForSpeech(); });
+    receive(recognizer,
+            [](JNIEnv* /*env*/, PlatformRecognizer& target) { target.onReadyForSpeech(); });
 }
 
 JNIEXPORT void JNICALL Java_korvel_talvox_impl_PlatformRecognizer_onBeginningOfSpeechInternal(
     JNIEnv* /*env*/, jclass /*type*/, jlong recognizer) {
-    Jni::enter(
-        [recognizer](JNIEnv* env) { getRecognizer(env, recognizer)->onBeginningOfSpeech(); });
+    receive(recognizer,
+            [](JNIEnv* /*env*/, PlatformRecognizer& target) { target.onBeginningOfSpeech(); });
 }
 
 JNIEXPORT void JNICALL Java_korvel_talvox_impl_PlatformRecognizer_onRmsChangedInternal(
     JNIEnv* /*env*/, jclass /*type*/, jlong recognizer, jfloat rms) {
-    Jni::enter(
-        [recognizer, rms](JNIEnv* env) { getRecognizer(env, recognizer)->onRmsChanged(rms); });
+    receive(recognizer,
+            [rms](JNIEnv* /*env*/, PlatformRecognizer& target) { target.onRmsChanged(rms); });
 }
 
 JNIEXPORT void JNICALL Java_korvel_talvox_impl_PlatformRecognizer_onBufferReceivedInternal(
     JNIEnv* /*env*/, jclass /*type*/, jlong recognizer, jbyteArray sound) {
-    Jni::enter([recognizer, sound](JNIEnv* env) {
-        const boost::shared_ptr<PlatformRecognizer> target = getRecognizer(env, recognizer);
+    receive(recognizer, [sound](JNIEnv* env, PlatformRecognizer& target) {
         if (sound != nullptr) {
-            receiveBuffer(env, *target, sound);
+            receiveBuffer(env, target, sound);
         }
     });
 }
 
 JNIEXPORT void JNICALL Java_korvel_talvox_impl_PlatformRecognizer_onEndOfSpeechInternal(
     JNIEnv* /*env*/, jclass /*type*/, jlong recognizer) {
-    Jni::enter([recognizer](JNIEnv* env) { getRecognizer(env, recognizer)->onEndOfSpeech(); });
+    receive(recognizer,
+            [](JNIEnv* /*env*/, PlatformRecognizer& target) { target.onEndOfSpeech(); });
 }
 
 JNIEXPORT void JNICALL Java_korvel_talvox_impl_PlatformRecognizer_onPartialResultsInternal(
     JNIEnv* /*env*/, jclass /*type*/, jlong recognizer, jobjectArray texts, jfloatArray scores) {
-    Jni::enter([recognizer, texts, scores](JNIEnv* env) {
-        const boost::shared_ptr<PlatformRecognizer> target = getRecognizer(env, recognizer);
+    receive(recognizer, [texts, scores](JNIEnv* env, PlatformRecognizer& target) {
         if (const auto results = readResults(env, texts, scores)) {
-            target->onPartialResults(results);
+            target.onPartialResults(results);
         }
     });
 }
 
 JNIEXPORT void JNICALL Java_korvel_talvox_impl_PlatformRecognizer_onResultsInternal(
     JNIEnv* /*env*/, jclass /*type*/, jlong recognizer, jobjectArray texts, jfloatArray scores) {
-    Jni::enter([recognizer, texts, scores](JNIEnv* env) {
-        const boost::shared_ptr<PlatformRecognizer> target = getRecognizer(env, recognizer);
+    receive(recognizer, [texts, scores](JNIEnv* env, PlatformRecognizer& target) {
         if (const auto results = readResults(env, texts, scores)) {
-            target->onResults(results);
+            target.onResults(results);
         } else {
-            target->onError(Talvox::SpeechError::ErrorUnknown);
+            target.onError(Talvox::SpeechError::ErrorUnknown);
         }
     });
 }
@@ -141,7 +149,8 @@ JNIEXPORT void JNICALL Java_korvel_talvox_impl_PlatformRecognizer_onErrorInterna
                                                                                   jclass /*type*/,
                                                                                   jlong recognizer,
                                                                                   jint code) {
-    Jni::enter([recognizer, code](JNIEnv* env) { getRecognizer(env, recognizer)->onError(code); });
+    receive(recognizer,
+            [code](JNIEnv* /*env*/, PlatformRecognizer& target) { target.onError(code); });
 }
 
 JNIEXPORT void JNICALL Java_korvel_talvox_impl_PlatformRecognizer_onEventInternal(

@@ -23,6 +23,7 @@ Ring& ring() {
 }  // namespace
 
 void* Quarantine::allocate(std::size_t sizeInBytes) {
+    ring();  // made now: freeing must not fail
     return ::operator new(sizeInBytes);
 }
 

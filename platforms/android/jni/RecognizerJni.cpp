@@ -1,5 +1,6 @@
 // Entry points of korvel.talvox.impl.Recognizer.
 #include <boost/make_shared.hpp>
+#include <new>
 
 #include "Engine.h"
 #include "EntryPoint.h"
@@ -27,10 +28,15 @@ jlong start(JNIEnv* env, jlong engine, jobject javaObject) {
     const auto listener = boost::make_shared<RecognizerListenerImpl>();
     const boost::shared_ptr<Talvox::Recognizer> recognizer =
         facade.createRecognizer(listener, settings);
+    if (!recognizer) {
+        throw std::bad_alloc();
+    }
     listener->setRecognizer(recognizer);
     listener->attach(env, javaObject);
+    // Nothing may fail any more once events have come.
+    const jlong handle = Handles::add(listener);
     recognizer->start();
-    return Handles::add(listener);
+    return handle;
 }
 
 }  // namespace

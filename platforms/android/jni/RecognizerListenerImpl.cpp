@@ -126,22 +126,22 @@ void RecognizerListenerImpl::onResults(Talvox::Recognizer* source,
     }
 }
 
-void RecognizerListenerImpl::reportReason(const std::string& reason) {
-    deliver("onErrorReason", FRAME_SIZE, [this, &reason](JNIEnv* env) {
+void RecognizerListenerImpl::reportReason(const Talvox::Recognizer& source) {
+    deliver("onErrorReason", FRAME_SIZE, [this, &source](JNIEnv* env) {
         const jmethodID method =
             env->GetMethodID(javaClass.getClass(), "onErrorReason", "(Ljava/lang/String;)V");
         if (method == nullptr) {
             env->ExceptionClear();
             return;
         }
-        const Jni::LocalRef<jstring> text = Jni::toJString(env, reason);
+        const Jni::LocalRef<jstring> text = Jni::toJString(env, source.getErrorReason());
         env->CallNonvirtualVoidMethod(javaObject.get(), javaClass.getClass(), method, text.get());
         Jni::check(env);
     });
 }
 
 void RecognizerListenerImpl::onError(Talvox::Recognizer* source, Talvox::SpeechError error) {
-    reportReason(source->getErrorReason());
+    reportReason(*source);
     deliver("onError", FRAME_SIZE, [this, error](JNIEnv* env) {
         callJava(env, "onError", "(I)V", static_cast<jint>(error.getCode()));
     });

@@ -7,7 +7,6 @@
 #include <jni.h>
 
 #include <boost/shared_ptr.hpp>
-#include <string>
 
 #include "Refs.h"
 #include "talvox/Recognizer.h"
@@ -48,7 +47,7 @@ class RecognizerListenerImpl : public Talvox::RecognizerListener {
     void deliver(const char* name, jint localReferences, Event event);
 
     /** Hands the reason of the error that follows to a Java object that wants to know it. */
-    void reportReason(const std::string& reason);
+    void reportReason(const Talvox::Recognizer& source);
 
     /** Calls a method of exactly the kept class. */
     template <typename... Args>

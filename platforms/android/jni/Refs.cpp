@@ -1,12 +1,18 @@
 #include "Refs.h"
 
+#include <new>
+
 #include "Env.h"
 #include "pal/kd_jni.h"
 
 namespace Jni {
 
 GlobalRef::GlobalRef(JNIEnv* env, jobject object)
-    : ref(object != nullptr ? env->NewGlobalRef(object) : nullptr) {}
+    : ref(object != nullptr ? env->NewGlobalRef(object) : nullptr) {
+    if (object != nullptr && ref == nullptr) {
+        throw std::bad_alloc();
+    }
+}
 
 GlobalRef& GlobalRef::operator=(GlobalRef&& other) noexcept {
     if (this != &other) {

@@ -47,6 +47,7 @@ class LocalRef {
 class GlobalRef {
   public:
     GlobalRef() = default;
+    /** @throw std::bad_alloc when the VM has no memory */
     GlobalRef(JNIEnv* env, jobject object);
     GlobalRef(GlobalRef&& other) noexcept : ref(std::exchange(other.ref, nullptr)) {}
     GlobalRef& operator=(GlobalRef&& other) noexcept;

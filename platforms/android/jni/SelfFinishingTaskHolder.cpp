@@ -11,8 +11,9 @@ void SelfFinishingTaskHolder::submitLog(
     SelfFinishingTaskHolder* const target = holder.get();
     request->callback = [target](const boost::shared_ptr<const Talvox::RecognitionResults>& results,
                                  const std::string& text) { target->selfFinish(results, text); };
-    facade.runningTaskHolders.push_back(holder);
     holder->submitNoRetries(request);
+    // Nothing of it is delivered before the event lock is free; what throws here ends it.
+    facade.runningTaskHolders.push_back(holder);
 }
 
 void SelfFinishingTaskHolder::selfFinish(

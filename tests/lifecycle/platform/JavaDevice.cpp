@@ -1,4 +1,5 @@
 #include <boost/make_shared.hpp>
+#include <stdexcept>
 
 #include "Device.h"
 #include "JavaDouble.h"
@@ -35,20 +36,31 @@ class JavaDevice : public Device {
     JavaDevice& operator=(const JavaDevice&) = delete;
 
     void say(int64_t handle, Saying what, int session) override;
+    void failInCallback(int64_t handle, const char* text) override;
     long countReferences() const override { return java.countReferences(); }
 
   private:
+    static void callBack(::PlatformRecognizer& recognizer, Saying what, int session);
+
     JavaDouble java;
     Mechanism mechanism;
 };
 
+// As the callbacks from Java do.
 void JavaDevice::say(int64_t handle, Saying what, int session) {
-    static const char SOUND[320] = {};
-    const boost::shared_ptr<::PlatformRecognizer> recognizer =
-        Jni::KnownObjects<::PlatformRecognizer>::find(handle);
-    if (!recognizer) {
-        return;
+    if (const auto recognizer = Jni::KnownObjects<::PlatformRecognizer>::find(handle)) {
+        recognizer->enter([&] { callBack(*recognizer, what, session); });
     }
+}
+
+void JavaDevice::failInCallback(int64_t handle, const char* text) {
+    if (const auto recognizer = Jni::KnownObjects<::PlatformRecognizer>::find(handle)) {
+        recognizer->enter([text] { throw std::runtime_error(text); });
+    }
+}
+
+void JavaDevice::callBack(::PlatformRecognizer& recognizer, Saying what, int session) {
+    static const char SOUND[320] = {};
     const auto results = boost::make_shared<RecognitionResults>();
     results->emplace_back(ScriptedGateway::makeWords(session),
                           RecognitionResult::UNKNOWN_CONFIDENCE);
@@ -56,34 +68,34 @@ void JavaDevice::say(int64_t handle, Saying what, int session) {
         case Saying::NOTHING:
             break;
         case Saying::READY:
-            recognizer->onReadyForSpeech();
+            recognizer.onReadyForSpeech();
             break;
         case Saying::BEGINNING:
-            recognizer->onBeginningOfSpeech();
+            recognizer.onBeginningOfSpeech();
             break;
         case Saying::LEVEL:
-            recognizer->onRmsChanged(1);
+            recognizer.onRmsChanged(1);
             break;
         case Saying::SOUND:
-            recognizer->onBufferReceived(SOUND, sizeof(SOUND));
+            recognizer.onBufferReceived(SOUND, sizeof(SOUND));
             break;
         case Saying::END:
-            recognizer->onEndOfSpeech();
+            recognizer.onEndOfSpeech();
             break;
         case Saying::PARTIAL:
-            recognizer->onPartialResults(results);
+            recognizer.onPartialResults(results);
             break;
         case Saying::RESULTS:
-            recognizer->onResults(results);
+            recognizer.onResults(results);
             break;
         case Saying::NO_HYPOTHESIS:
-            recognizer->onError(-1);
+            recognizer.onError(-1);
             break;
         case Saying::ERROR:
-            recognizer->onError(DEVICE_ERROR);
+            recognizer.onError(DEVICE_ERROR);
             break;
         case Saying::OTHER:
-            recognizer->onEvent();
+            recognizer.onEvent();
             break;
     }
 }

@@ -1,5 +1,6 @@
 package korvel.talvox;
 
+import android.util.Log;
 import java.util.concurrent.Executor;
 import korvel.talvox.impl.NativeHandle;
 import korvel.talvox.impl.Recognizer;
@@ -9,6 +10,8 @@ import korvel.talvox.impl.Recognizer;
  * listener's executor. The monitor is never held while native code or the listener runs.
  */
 final class Session implements Recognizer.Events {
+    private static final String TAG = "Talvox";
+
     private final RecognitionListener listener;
     private final SerialExecutor executor;
     private Object owner;
@@ -36,14 +39,21 @@ final class Session implements Recognizer.Events {
         final NativeHandle started;
         try {
             started = Recognizer.start(engine.getHandle(), settings.toBundle(), this);
-        } catch (RuntimeException failure) {
-            over();
-            throw failure;
+        } catch (RuntimeException | OutOfMemoryError failure) {
+            refuse(failure);
+            return;
         }
         synchronized (this) {
             handle = started;
         }
         catchUp(started);
+    }
+
+    /** Native code has no memory for the recognition, and keeps nothing of it. */
+    private void refuse(Throwable failure) {
+        Log.e(TAG, "the recognition does not start", failure);
+        onErrorReason(String.valueOf(failure.getMessage()));
+        onError(SpeechError.UNKNOWN.getCode());
     }
 
     /** Does what was asked for, from an event or another thread, before the start had returned. */
