@@ -19,9 +19,6 @@ struct Open {
 /** What the sample of the tests leaves out. */
 inline const std::vector<Open>& getOpen() {
     static const std::vector<Open> open = {
-        {Kind::MEMORY, nullptr,
-         "`std::bad_alloc` leaves `createRecognizer`, and the settings' own operations, see the "
-         "table below"},
         {Kind::SOCKETS, "pulse", "a connection that fails half way keeps a descriptor"},
         {Kind::PULSE, nullptr, "a connection that fails half way keeps a descriptor"},
     };

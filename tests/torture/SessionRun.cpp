@@ -3,6 +3,7 @@
 #include <boost/make_shared.hpp>
 #include <cstdio>
 #include <exception>
+#include <new>
 #include <vector>
 
 #include "Control.h"
@@ -78,6 +79,9 @@ void SessionRun::call(const char* name, const std::function<void()>& function) {
 }
 
 void SessionRun::run() {
+    if (!findEngine()) {
+        return;
+    }
     configure();
     create();
     if (session) {
@@ -90,6 +94,17 @@ void SessionRun::run() {
     release();
 }
 
+// The first use makes the engine, and may throw.
+bool SessionRun::findEngine() {
+    try {
+        const InEngine inEngine;
+        engine = &Talvox::Talvox::getInstance();
+    } catch (const std::bad_alloc&) {
+        engine = nullptr;
+    }
+    return engine != nullptr;
+}
+
 void SessionRun::configure() {
     Network::NetworkManager& network = Network::NetworkManager::getInstance();
     network.overrideReachability(plan.asksNetwork ? -1 : Network::NetworkManager::WIFI);
@@ -98,8 +113,7 @@ void SessionRun::configure() {
     }
     kdMountKOR("/removable", plan.dumps ? order.directory : nullptr);
     chooseRecorder();
-    call("setTalvoxSettings",
-         [this] { Talvox::Talvox::getInstance().setTalvoxSettings(engineSettings); });
+    call("setTalvoxSettings", [this] { engine->setTalvoxSettings(engineSettings); });
 }
 
 void SessionRun::chooseRecorder() {
@@ -118,9 +132,7 @@ void SessionRun::chooseRecorder() {
 }
 
 void SessionRun::create() {
-    call("createRecognizer", [this] {
-        session = Talvox::Talvox::getInstance().createRecognizer(listener, ownSettings);
-    });
+    call("createRecognizer", [this] { session = engine->createRecognizer(listener, ownSettings); });
     outcome.created = session ? 1 : 0;
 }
 
@@ -128,14 +140,20 @@ void SessionRun::log() {
     if (!plan.logs) {
         return;
     }
+    // Arguments are the application's.
     const std::map<std::string, std::string> params = {{"name", "value"}};
+    const std::string uuid = FIRST_UUID;
+    const std::string url = order.logUrl;
+    const std::string id = "session";
+    const std::string begun = "begun";
+    const std::string failed = "failed";
     call("usage log", [&] {
         LogCollector::setLoggingEnabled(true);
-        LogCollector::configure(FIRST_UUID, order.logUrl);
-        LogCollector::startSession("session");
-        LogCollector::logEvent("session", "begun", params);
-        LogCollector::logError("session", "failed", params);
-        LogCollector::stopSession("session");
+        LogCollector::configure(uuid, url);
+        LogCollector::startSession(id);
+        LogCollector::logEvent(id, begun, params);
+        LogCollector::logError(id, failed, params);
+        LogCollector::stopSession(id);
     });
 }
 

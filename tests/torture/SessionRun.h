@@ -14,6 +14,7 @@
 #include "PushedRecorder.h"
 #include "talvox/Recognizer.h"
 #include "talvox/Settings.h"
+#include "talvox/Talvox.h"
 
 namespace Torture {
 
@@ -37,6 +38,7 @@ class SessionRun {
 
   private:
     void call(const char* name, const std::function<void()>& function);
+    bool findEngine();
     void configure();
     void chooseRecorder();
     void create();
@@ -56,6 +58,7 @@ class SessionRun {
     const Turn turn;
     SessionOutcome& outcome;
     const boost::shared_ptr<OutcomeListener> listener;
+    Talvox::Talvox* engine = nullptr;
     boost::shared_ptr<Talvox::Settings> engineSettings;
     boost::shared_ptr<Talvox::Settings> ownSettings;
     boost::shared_ptr<Talvox::Recognizer> session;

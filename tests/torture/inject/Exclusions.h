@@ -18,6 +18,9 @@ struct Exclusion {
 constexpr Exclusion EXCLUSIONS[] = {
     {Kind::MEMORY, "libpulse",
      "its allocator (`pa_xmalloc`) ends the process when there is no memory, as documented"},
+    {Kind::MEMORY, "libspeex",
+     "follows a null pointer when there is no memory for the narrow-band half of a wide-band codec "
+     "(`sb_encoder_init`, `sb_decoder_init`)"},
     {Kind::CLOCK, "libpulse", "asserts that the clock can be read (`pa_rtclock_get`)"},
     {Kind::FILES, "libpulse",
      "asserts that `close` succeeds (`pa_cmsg_ancil_data_close_fds`, pstream.c)"},

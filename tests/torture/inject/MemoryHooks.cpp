@@ -1,4 +1,5 @@
-// Memory: what allocates in C and in C++. Freeing never fails and is not replaced.
+// Memory: what allocates in C and in C++. Freeing never fails and is not replaced. A sanitizer asks
+// for the stack of each new thread, and ends the process when the C library has no memory to tell.
 #include <cstddef>
 #include <new>
 
@@ -54,6 +55,13 @@ void* calloc(std::size_t count, std::size_t size) noexcept {
     }
     const auto next = findAllocator<void* (*)(std::size_t, std::size_t)>(known, "calloc");
     return next != nullptr ? next(count, size) : takeEarlyMemory(count * size);
+}
+
+TORTURE_EXPORT int pthread_getattr_np(unsigned long thread, void* attributes) noexcept;
+
+int pthread_getattr_np(unsigned long thread, void* attributes) noexcept {
+    const Torture::Exempt exempt;
+    return TORTURE_NEXT(int, pthread_getattr_np, (unsigned long, void*), (thread, attributes));
 }
 
 TORTURE_EXPORT void* realloc(void* memory, std::size_t size) noexcept;
