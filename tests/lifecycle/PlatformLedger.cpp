@@ -165,6 +165,7 @@ KDWork* kdQueueWorkKOR(void (*work)(void* user), void (*done)(void* user), void*
     static auto* const real = findReal<decltype(kdQueueWorkKOR)>("kdQueueWorkKOR");
     const Util::EventLock lock;
     // What takes memory comes first: nothing may fail once the work is queued.
+    std::map<KDWork*, Work*>& table = Work::table();
     std::unique_ptr<Work> counted =
         std::make_unique<Work>(Work{work, done, nullptr, user, nullptr});
     std::map<KDWork*, Work*> place{{nullptr, counted.get()}};
@@ -174,7 +175,7 @@ KDWork* kdQueueWorkKOR(void (*work)(void* user), void (*done)(void* user), void*
         counted->handle = handle;
         auto node = place.extract(place.begin());
         node.key() = handle;
-        Work::table().insert(std::move(node));
+        table.insert(std::move(node));
         static_cast<void>(counted.release());
     }
     return handle;
