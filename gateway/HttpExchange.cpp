@@ -8,10 +8,14 @@
 #include "core/util/UrlCoder.h"
 #include "gateway/LogText.h"
 #include "pal/kd_log.h"
+#include "pal/kd_time.h"
 
 namespace Gateway {
 
 namespace {
+
+/** In a request: report in the answer, under the same name, when the body arrived. */
+constexpr const char* ARRIVALS_HEADER = "x-asrgw-arrivals";
 
 std::string toText(const char* text) {
     return text == nullptr ? std::string() : text;
@@ -42,7 +46,7 @@ bool isRecognitionPath(const std::string& path) {
 
 HttpExchange::HttpExchange(Server& exchangeServer, MHD_Connection* httpConnection, const char* path,
                            const char* method)
-    : server(exchangeServer), connection(httpConnection) {
+    : server(exchangeServer), connection(httpConnection), arrivals(kdGetTimeUST()) {
     head.path = Util::UrlCoder::urlDecodeString(toText(path));
     head.method = toText(method);
     head.uuid = readArgument("uuid");
@@ -91,19 +95,30 @@ Answer HttpExchange::judgeRecognition() {
     if (!length.empty() && std::strtoull(length.c_str(), nullptr, 10) > limit) {
         return Answer::refuse(413, "the body is longer than " + std::to_string(limit) + " bytes");
     }
-    request = std::make_unique<RecognitionRequest>(head, boundary, server.getPool(), limit);
+    beginBody(boundary);
     return Answer();
+}
+
+void HttpExchange::beginBody(const std::string& boundary) {
+    request = std::make_unique<RecognitionRequest>(head, boundary, server.getPool(),
+                                                   server.getOptions().maxBodyBytes);
+    pump = std::make_unique<BodyPump>([this](const std::string& piece) {
+        if (server.getOptions().verbose) {
+            log(0, "sends " + std::to_string(piece.size()) + " bytes");
+        }
+        request->write(piece.data(), piece.size());
+    });
 }
 
 bool HttpExchange::onBody(const char* data, std::size_t size) {
     // The rest of a body whose head was refused.
-    if (!request) {
+    if (!pump) {
         return true;
     }
-    if (server.getOptions().verbose) {
-        log(0, "sends " + std::to_string(size) + " bytes");
-    }
-    return request->write(data, size);
+    arrivals.add(kdGetTimeUST());
+    bodyBytes += size;
+    pump->push(data, size);
+    return request->takes(bodyBytes);
 }
 
 Answer HttpExchange::keepRecord() const {
@@ -136,14 +151,26 @@ bool HttpExchange::onEnd() {
     if (!request || answered) {
         return true;
     }
-    const Answer answer = request->finish();
-    log(answer.status, request->describe());
+    const Answer answer = recognise();
+    log(answer.status, request->describe(arrivals.describe()));
     return send(answer);
 }
 
+Answer HttpExchange::recognise() {
+    pump->finish();
+    pump.reset();
+    Answer answer = request->finish();
+    arrivals.answer(kdGetTimeUST());
+    if (!readHeader(ARRIVALS_HEADER).empty()) {
+        answer.headers.emplace_back(ARRIVALS_HEADER, arrivals.describe());
+    }
+    return answer;
+}
+
 void HttpExchange::onCompleted() {
+    pump.reset();
     if (request && !answered) {
-        log(0, "went away: " + request->describe());
+        log(0, "went away: " + request->describe(arrivals.describe()));
     }
 }
 

@@ -6,6 +6,8 @@
 #include <optional>
 #include <string>
 
+#include "gateway/Arrivals.h"
+#include "gateway/BodyPump.h"
 #include "gateway/RecognitionRequest.h"
 #include "gateway/Server.h"
 
@@ -35,6 +37,8 @@ class HttpExchange {
   private:
     Answer judgeHead();
     Answer judgeRecognition();
+    void beginBody(const std::string& boundary);
+    Answer recognise();
     Answer keepRecord() const;
     bool send(const Answer& answer);
     void logRefusal(const Answer& answer) const;
@@ -46,7 +50,11 @@ class HttpExchange {
     Server& server;
     MHD_Connection* const connection;
     RequestHead head;
+    Arrivals arrivals;
+    std::size_t bodyBytes = 0;
     std::unique_ptr<RecognitionRequest> request;
+    /** Feeds the request; null before the body, and once the request is over. */
+    std::unique_ptr<BodyPump> pump;
     bool carriesRecord = false;
     bool answered = false;
 };

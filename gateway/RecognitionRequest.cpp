@@ -5,11 +5,9 @@
 #include <random>
 
 #include "core/util/Base64Coder.h"
-#include "core/util/Time.h"
 #include "gateway/HeaderValue.h"
 #include "gateway/LogText.h"
 #include "gateway/ResultDocument.h"
-#include "pal/kd_time.h"
 
 namespace Gateway {
 
@@ -75,13 +73,11 @@ bool RecognitionRequest::write(const char* data, std::size_t size) {
     }
     if (bodyBytes > maxBytes) {
         refuse(413, "the body is longer than " + std::to_string(maxBytes) + " bytes");
-        return bodyBytes / 2 <= maxBytes;
     }
-    return true;
+    return takes(bodyBytes);
 }
 
 Answer RecognitionRequest::finish() {
-    const KDust begin = kdGetTimeUST();
     if (refusedStatus == 0 && !parser.finish()) {
         refuse(400, parser.getError());
     }
@@ -102,11 +98,10 @@ Answer RecognitionRequest::finish() {
     }
     answer.headers.emplace_back("x-kvrequestid", requestId);
     endUtterance();
-    answerMs = static_cast<uint64_t>((kdGetTimeUST() - begin) / Util::NS_PER_MS);
     return answer;
 }
 
-std::string RecognitionRequest::describe() const {
+std::string RecognitionRequest::describe(const std::string& times) const {
     std::string text = "uuid=" + toLogText(head.uuid);
     text += " session=" + toLogText(head.sessionId);
     text += " lang=" + toLogText(fields.get("lang"));
@@ -115,7 +110,7 @@ std::string RecognitionRequest::describe() const {
     text += " bytes=" + std::to_string(bodyBytes) + " sound=" + std::to_string(soundBytes);
     text += " utterance=" + std::to_string(utteranceMs) + "ms";
     text += " decode=" + std::to_string(decodeMs) + "ms";
-    text += " answer=" + std::to_string(answerMs) + "ms";
+    text += times.empty() ? "" : " " + times;
     text += " request=" + requestId;
     if (fields.has("canceled")) {
         text += " canceled";

@@ -56,14 +56,20 @@ class RecognitionRequest : private MultipartListener {
     RecognitionRequest(const RequestHead& requestHead, const std::string& boundary,
                        DecoderPool& decoderPool, std::size_t maxBodyBytes);
 
-    /** Takes more of the body. @return false when the client sends absurdly more than allowed */
+    /** Takes more of the body. @return as `takes` for all of the body so far */
     bool write(const char* data, std::size_t size);
 
     /** Ends the body, waits for the decoder and gives the answer. Called once. */
     Answer finish();
 
-    /** Everything about the request in one line, for the log. */
-    std::string describe() const;
+    /** Whether a client may send this many bytes by mistake; beyond that the gateway hangs up. */
+    bool takes(std::size_t bytes) const { return bytes / 2 <= maxBytes; }
+
+    /**
+     * Everything about the request in one line, for the log.
+     * @param times fields about when it arrived, to be put among the others; may be empty
+     */
+    std::string describe(const std::string& times) const;
 
     /** The hypotheses of the answer. */
     const std::vector<Hypothesis>& getHypotheses() const { return hypotheses; }
@@ -96,7 +102,6 @@ class RecognitionRequest : private MultipartListener {
     uint64_t soundSamples = 0;
     uint64_t utteranceMs = 0;
     uint64_t decodeMs = 0;
-    uint64_t answerMs = 0;
     unsigned refusedStatus = 0;
     std::string refusedReason;
     std::vector<Hypothesis> hypotheses;

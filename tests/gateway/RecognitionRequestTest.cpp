@@ -41,7 +41,7 @@ Outcome run(const std::string& body, const RequestHead& head = usualHead(),
     }
     Outcome outcome;
     outcome.answer = request.finish();
-    outcome.line = request.describe();
+    outcome.line = request.describe("pieces=3");
     outcome.hypotheses = request.getHypotheses();
     return outcome;
 }
@@ -199,7 +199,7 @@ TEST(RecognitionRequest, RefusesForAWhileWhenAllDecodersAreBusy) {
     EXPECT_EQ("all decoders are busy\n", answer.body);
     EXPECT_EQ("2", header(answer, "Retry-After"));
     EXPECT_NE("missing", header(answer, "x-kvrequestid"));
-    EXPECT_NE(std::string::npos, refused.describe().find(" refused: \"all decoders are busy\""));
+    EXPECT_NE(std::string::npos, refused.describe("").find(" refused: \"all decoders are busy\""));
     other.reset();
     RecognitionRequest next(usualHead(), BOUNDARY, pool, MAX_BODY);
     EXPECT_TRUE(next.write(body.data(), body.size()));
