@@ -25,6 +25,7 @@ public final class AudioRecorderBackend {
     private final int sampleRateHz;
     private final int bufferLengthMs;
     private final int mode;
+    private final RecordingReport report = RecordingReport.ofStart();
     private volatile boolean isStopped;
 
     private AudioRecorderBackend(long recorder, int sampleRateHz, int bufferLengthMs, int mode) {
@@ -59,6 +60,7 @@ public final class AudioRecorderBackend {
     }
 
     private void run(Thread previous) {
+        reach(RecordingReport.State.OPENING);
         try {
             if (previous != null) {
                 previous.join(PREVIOUS_WAIT_MS);
@@ -78,9 +80,11 @@ public final class AudioRecorderBackend {
         final byte[] piece =
                 new byte[Math.max(1, sampleRateHz * pieceMs / MS_PER_SECOND) * BYTES_PER_SAMPLE];
         try (SoundInput input = factory.open(sampleRateHz, bufferLengthMs, mode)) {
+            reach(RecordingReport.State.RECORDING);
             while (!isStopped) {
                 final int size = input.read(piece, piece.length);
                 if (size <= 0) {
+                    reach(RecordingReport.State.ENDED);
                     return;
                 }
                 if (!isStopped) {
@@ -90,9 +94,18 @@ public final class AudioRecorderBackend {
         }
     }
 
+    /** A stop leaves the report as it is: it says what the recorder had reached by then. */
+    private void reach(RecordingReport.State state) {
+        if (!isStopped) {
+            report.reach(state);
+        }
+    }
+
     private void report(Exception failure) {
         if (!isStopped) {
-            onErrorInternal(recorder, Objects.toString(failure.getMessage(), failure.toString()));
+            final String why = Objects.toString(failure.getMessage(), failure.toString());
+            report.fail(RecordingException.getState(failure), why);
+            onErrorInternal(recorder, why);
         }
     }
 

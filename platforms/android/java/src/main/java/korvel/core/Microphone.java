@@ -7,6 +7,7 @@ import android.media.AudioFormat;
 import android.media.AudioRecord;
 import android.media.MediaRecorder;
 import java.io.IOException;
+import korvel.core.RecordingReport.State;
 
 /** The device's microphone. */
 final class Microphone implements SoundInput {
@@ -35,20 +36,23 @@ final class Microphone implements SoundInput {
                             AudioFormat.ENCODING_PCM_16BIT,
                             getBufferSize(sampleRateHz, bufferLengthMs));
         } catch (IllegalArgumentException refused) {
-            throw new IOException("no recording at " + sampleRateHz + " Hz", refused);
+            throw new RecordingException(
+                    State.UNAVAILABLE, "no recording at " + sampleRateHz + " Hz", refused);
         }
         try {
             if (record.getState() != AudioRecord.STATE_INITIALIZED) {
-                throw new IOException("the microphone cannot be opened");
+                throw new RecordingException(State.UNAVAILABLE, "the microphone cannot be opened");
             }
             record.startRecording();
             if (record.getRecordingState() != AudioRecord.RECORDSTATE_RECORDING) {
-                throw new IOException("the microphone is in use by another application");
+                throw new RecordingException(
+                        State.IN_USE, "the microphone is in use by another application");
             }
             return new Microphone(record);
         } catch (IllegalStateException refused) {
             record.release();
-            throw new IOException("the microphone cannot be started", refused);
+            throw new RecordingException(
+                    State.UNAVAILABLE, "the microphone cannot be started", refused);
         } catch (IOException refused) {
             record.release();
             throw refused;
@@ -66,7 +70,8 @@ final class Microphone implements SoundInput {
         if (context != null
                 && context.checkSelfPermission(Manifest.permission.RECORD_AUDIO)
                         != PackageManager.PERMISSION_GRANTED) {
-            throw new IOException("the application lacks the permission RECORD_AUDIO");
+            throw new RecordingException(
+                    State.NO_PERMISSION, "the application lacks the permission RECORD_AUDIO");
         }
     }
 

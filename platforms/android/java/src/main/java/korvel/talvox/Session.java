@@ -2,6 +2,8 @@ package korvel.talvox;
 
 import android.util.Log;
 import java.util.concurrent.Executor;
+import korvel.core.RecordingReport;
+import korvel.talvox.impl.DeviceFailure;
 import korvel.talvox.impl.NativeHandle;
 import korvel.talvox.impl.Recognizer;
 
@@ -14,6 +16,7 @@ final class Session implements Recognizer.Events {
 
     private final RecognitionListener listener;
     private final SerialExecutor executor;
+    private final RecordingReport recording = new RecordingReport();
     private Object owner;
     private NativeHandle handle;
     private boolean stopWanted;
@@ -38,7 +41,11 @@ final class Session implements Recognizer.Events {
         }
         final NativeHandle started;
         try {
-            started = Recognizer.start(engine.getHandle(), settings.toBundle(), this);
+            started =
+                    recording.during(
+                            () ->
+                                    Recognizer.start(
+                                            engine.getHandle(), settings.toBundle(), this));
         } catch (RuntimeException | OutOfMemoryError failure) {
             refuse(failure);
             return;
@@ -195,13 +202,39 @@ final class Session implements Recognizer.Events {
 
     @Override
     public void onError(int code) {
+        final DeviceFailure device = DeviceFailure.take();
+        if (ended) {
+            return;
+        }
         final SpeechError error = SpeechError.fromCode(code);
-        deliverLast(() -> listener.onError(error));
+        final ErrorDetail detail = describe(error, device);
+        errorReason = detail.getReason();
+        deliverLast(() -> listener.onError(error, detail));
+    }
+
+    private ErrorDetail describe(SpeechError error, DeviceFailure device) {
+        return new ErrorDetail(
+                findReason(error, device),
+                error == SpeechError.NETWORK ? ErrorDetail.findHttpStatus(errorReason) : null,
+                device == null ? null : device.getNumber(),
+                RecorderState.of(recording.getState()));
+    }
+
+    /** Native code knows that the recorder or the device recognizer has failed, but not why. */
+    private String findReason(SpeechError error, DeviceFailure device) {
+        if (device != null && errorReason.isEmpty()) {
+            return device.getReason();
+        }
+        final String failure = recording.getFailure();
+        return error == SpeechError.AUDIO && !failure.isEmpty()
+                ? errorReason + ": " + failure
+                : errorReason;
     }
 
     @Override
     public void onResults(
             int outcome, String[] texts, float[] confidences, String requestId) {
+        DeviceFailure.take();
         final Recognition recognition =
                 Recognition.fromNative(outcome, texts, confidences, requestId);
         deliverLast(() -> listener.onResults(recognition));

@@ -24,7 +24,33 @@ public final class PlatformErrors {
     /** The session ended without a hypothesis. */
     public static final int NO_HYPOTHESIS = -1;
 
+    private static final String[] NAMES = {
+        "",
+        "ERROR_NETWORK_TIMEOUT",
+        "ERROR_NETWORK",
+        "ERROR_AUDIO",
+        "ERROR_SERVER",
+        "ERROR_CLIENT",
+        "ERROR_SPEECH_TIMEOUT",
+        "ERROR_NO_MATCH",
+        "ERROR_RECOGNIZER_BUSY",
+        "ERROR_INSUFFICIENT_PERMISSIONS",
+        "ERROR_TOO_MANY_REQUESTS",
+        "ERROR_SERVER_DISCONNECTED",
+        "ERROR_LANGUAGE_NOT_SUPPORTED",
+        "ERROR_LANGUAGE_UNAVAILABLE",
+        "ERROR_CANNOT_CHECK_SUPPORT",
+        "ERROR_CANNOT_LISTEN_TO_DOWNLOAD_EVENTS"
+    };
+
     private PlatformErrors() {}
+
+    /** The number with its name in {@link SpeechRecognizer}, if it has one. */
+    static String describe(int platformError) {
+        return platformError > 0 && platformError < NAMES.length
+                ? platformError + " (" + NAMES[platformError] + ")"
+                : String.valueOf(platformError);
+    }
 
     /**
      * @param platformError a number that the platform handed to {@code onError}

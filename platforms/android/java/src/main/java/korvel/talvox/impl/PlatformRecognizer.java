@@ -133,7 +133,9 @@ public final class PlatformRecognizer {
         if (context.checkSelfPermission(Manifest.permission.RECORD_AUDIO)
                 != PackageManager.PERMISSION_GRANTED) {
             Log.e(TAG, "the application has no permission RECORD_AUDIO: nothing can be recorded");
-            finish(() -> onErrorInternal(recognizer, SpeechError.AUDIO.getCode()));
+            fail(
+                    SpeechError.AUDIO.getCode(),
+                    DeviceFailure.ofReason("the application lacks the permission RECORD_AUDIO"));
             return;
         }
         try {
@@ -142,7 +144,9 @@ public final class PlatformRecognizer {
             speech.startListening(makeIntent(context));
         } catch (RuntimeException failure) {
             Log.e(TAG, "the device recognizer does not start", failure);
-            finish(() -> onErrorInternal(recognizer, SpeechError.NOT_AVAILABLE.getCode()));
+            fail(
+                    SpeechError.NOT_AVAILABLE.getCode(),
+                    DeviceFailure.ofReason("the device recognizer does not start: " + failure));
         }
     }
 
@@ -202,6 +206,10 @@ public final class PlatformRecognizer {
         destroy();
     }
 
+    private void fail(int code, DeviceFailure failure) {
+        finish(() -> failure.report(() -> onErrorInternal(recognizer, code)));
+    }
+
     /** What the platform calls, on the main looper. */
     private final class Callbacks implements RecognitionListener {
         @Override
@@ -257,7 +265,7 @@ public final class PlatformRecognizer {
             if (error == SpeechRecognizer.ERROR_INSUFFICIENT_PERMISSIONS) {
                 Log.e(TAG, "the device recognizer was refused the permission RECORD_AUDIO");
             }
-            finish(() -> onErrorInternal(recognizer, PlatformErrors.toEngine(error)));
+            fail(PlatformErrors.toEngine(error), DeviceFailure.ofNumber(error));
         }
 
         @Override

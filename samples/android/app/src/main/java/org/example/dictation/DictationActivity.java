@@ -10,6 +10,7 @@ import android.widget.TextView;
 import java.util.List;
 
 import korvel.talvox.AsrPolicy;
+import korvel.talvox.ErrorDetail;
 import korvel.talvox.Hypothesis;
 import korvel.talvox.Outcome;
 import korvel.talvox.Recognition;
@@ -91,8 +92,8 @@ public class DictationActivity extends Activity implements RecognitionListener {
     }
 
     @Override
-    public void onError(SpeechError error) {
-        Log.e("Dictation", error.getText() + ": " + recognizer.getErrorReason());
+    public void onError(SpeechError error, ErrorDetail detail) {
+        Log.e("Dictation", error.getText() + ": " + detail);
         text.setText("That did not work");
     }
 
