@@ -2,23 +2,19 @@ package korvel.talvox;
 
 import android.util.Log;
 import java.util.concurrent.Executor;
-import korvel.core.RecordingReport;
-import korvel.talvox.impl.DeviceFailure;
-import korvel.talvox.impl.NativeHandle;
-import korvel.talvox.impl.Recognizer;
+import korvel.talvox.impl.EngineBackend;
 
 /**
- * One recognition from start to close: takes the events from native code and hands them to the
- * listener's executor. The monitor is never held while native code or the listener runs.
+ * One recognition from start to close: takes the events of the engine and hands them to the
+ * listener's executor. The monitor is never held while the engine or the listener runs.
  */
-final class Session implements Recognizer.Events {
+final class Session implements EngineBackend.Events {
     private static final String TAG = "Talvox";
 
     private final RecognitionListener listener;
     private final SerialExecutor executor;
-    private final RecordingReport recording = new RecordingReport();
     private Object owner;
-    private NativeHandle handle;
+    private EngineBackend.Running handle;
     private boolean stopWanted;
     private boolean cancelWanted;
     private volatile String errorReason = "";
@@ -35,17 +31,13 @@ final class Session implements Recognizer.Events {
      *
      * @param owner kept alive until the last event has been delivered
      */
-    void start(TalvoxEngine engine, TalvoxSettings settings, Object owner) {
+    void start(EngineBackend engine, TalvoxSettings settings, Object owner) {
         synchronized (this) {
             this.owner = owner;
         }
-        final NativeHandle started;
+        final EngineBackend.Running started;
         try {
-            started =
-                    recording.during(
-                            () ->
-                                    Recognizer.start(
-                                            engine.getHandle(), settings.toBundle(), this));
+            started = engine.start(settings, this);
         } catch (RuntimeException | OutOfMemoryError failure) {
             refuse(failure);
             return;
@@ -56,15 +48,15 @@ final class Session implements Recognizer.Events {
         catchUp(started);
     }
 
-    /** Native code has no memory for the recognition, and keeps nothing of it. */
+    /** The engine has no memory for the recognition, and keeps nothing of it. */
     private void refuse(Throwable failure) {
         Log.e(TAG, "the recognition does not start", failure);
-        onErrorReason(String.valueOf(failure.getMessage()));
-        onError(SpeechError.UNKNOWN.getCode());
+        final String reason = String.valueOf(failure.getMessage());
+        onError(SpeechError.UNKNOWN, new ErrorDetail(reason, null, null, null));
     }
 
     /** Does what was asked for, from an event or another thread, before the start had returned. */
-    private void catchUp(NativeHandle started) {
+    private void catchUp(EngineBackend.Running started) {
         final boolean stop;
         final boolean cancel;
         synchronized (this) {
@@ -81,7 +73,7 @@ final class Session implements Recognizer.Events {
     }
 
     void stop() {
-        final NativeHandle running;
+        final EngineBackend.Running running;
         synchronized (this) {
             running = handle;
             stopWanted = true;
@@ -92,7 +84,7 @@ final class Session implements Recognizer.Events {
     }
 
     void cancel() {
-        final NativeHandle running;
+        final EngineBackend.Running running;
         synchronized (this) {
             running = handle;
             cancelWanted = true;
@@ -103,7 +95,7 @@ final class Session implements Recognizer.Events {
     }
 
     void close() {
-        final NativeHandle running;
+        final EngineBackend.Running running;
         synchronized (this) {
             running = handle;
             closed = true;
@@ -114,19 +106,19 @@ final class Session implements Recognizer.Events {
         }
     }
 
-    private void stop(NativeHandle running) {
+    private void stop(EngineBackend.Running running) {
         if (!ended) {
-            Recognizer.stop(running);
+            running.stop();
         }
     }
 
-    private void cancel(NativeHandle running) {
+    private void cancel(EngineBackend.Running running) {
         if (!ended) {
-            Recognizer.cancel(running);
+            running.cancel();
         }
     }
 
-    private void release(NativeHandle running) {
+    private void release(EngineBackend.Running running) {
         cancel(running);
         running.close();
     }
@@ -189,54 +181,20 @@ final class Session implements Recognizer.Events {
         deliver(() -> listener.onBufferReceived(buffer));
     }
 
-    @Override
-    public void onErrorReason(String reason) {
-        if (!ended) {
-            errorReason = reason;
-        }
-    }
-
     String getErrorReason() {
         return errorReason;
     }
 
     @Override
-    public void onError(int code) {
-        final DeviceFailure device = DeviceFailure.take();
-        if (ended) {
-            return;
+    public void onError(SpeechError error, ErrorDetail detail) {
+        if (!ended) {
+            errorReason = detail.getReason();
         }
-        final SpeechError error = SpeechError.fromCode(code);
-        final ErrorDetail detail = describe(error, device);
-        errorReason = detail.getReason();
         deliverLast(() -> listener.onError(error, detail));
     }
 
-    private ErrorDetail describe(SpeechError error, DeviceFailure device) {
-        return new ErrorDetail(
-                findReason(error, device),
-                error == SpeechError.NETWORK ? ErrorDetail.findHttpStatus(errorReason) : null,
-                device == null ? null : device.getNumber(),
-                RecorderState.of(recording.getState()));
-    }
-
-    /** Native code knows that the recorder or the device recognizer has failed, but not why. */
-    private String findReason(SpeechError error, DeviceFailure device) {
-        if (device != null && errorReason.isEmpty()) {
-            return device.getReason();
-        }
-        final String failure = recording.getFailure();
-        return error == SpeechError.AUDIO && !failure.isEmpty()
-                ? errorReason + ": " + failure
-                : errorReason;
-    }
-
     @Override
-    public void onResults(
-            int outcome, String[] texts, float[] confidences, String requestId) {
-        DeviceFailure.take();
-        final Recognition recognition =
-                Recognition.fromNative(outcome, texts, confidences, requestId);
+    public void onResults(Recognition recognition) {
         deliverLast(() -> listener.onResults(recognition));
     }
 }

@@ -48,18 +48,17 @@ public abstract class SettingKey<T> {
         return name;
     }
 
-    /** Puts a value that is not null; an IllegalArgumentException if it is not a good one. */
-    final void checkAndPut(Bundle bundle, T value) {
+    /** Throws an IllegalArgumentException if the value, which is not null, is not a good one. */
+    final void check(T value) {
         final String fault = check.findFault(value);
         if (fault != null) {
             throw new IllegalArgumentException(name + " " + fault);
         }
-        put(bundle, value);
     }
 
     abstract void put(Bundle bundle, T value);
 
-    /** The value in the bundle, which has the key; null if it is of another type. */
+    /** The value in the bundle; null if it is not there or of another type. */
     abstract T get(Bundle bundle);
 
     static SettingKey<Boolean> ofBoolean(

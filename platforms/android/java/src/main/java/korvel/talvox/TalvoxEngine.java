@@ -1,19 +1,14 @@
 package korvel.talvox;
 
 import android.content.Context;
-import android.os.Bundle;
-import android.os.Handler;
-import android.os.Looper;
 import java.io.File;
-import java.util.ArrayList;
 import java.util.List;
 import java.util.Objects;
-import java.util.TreeSet;
 import java.util.concurrent.Executor;
 import korvel.core.CoreApplication;
+import korvel.talvox.impl.EngineBackend;
 import korvel.talvox.impl.PlatformRecognizer;
 import korvel.talvox.impl.Talvox;
-import korvel.talvox.util.LogCollector;
 
 /**
  * The speech-recognition engine. There is one per process, which lives as long as the process.
@@ -23,10 +18,13 @@ import korvel.talvox.util.LogCollector;
 public final class TalvoxEngine {
     private static TalvoxEngine instance;
 
-    private final long handle;
+    /** Takes the place of the native engine in an application's tests. */
+    private static volatile TalvoxEngine substitute;
 
-    private TalvoxEngine(long handle) {
-        this.handle = handle;
+    private final EngineBackend backend;
+
+    TalvoxEngine(EngineBackend backend) {
+        this.backend = backend;
     }
 
     /**
@@ -38,24 +36,30 @@ public final class TalvoxEngine {
      *     device's processor
      */
     public static TalvoxEngine getInstance(Context context) {
+        Objects.requireNonNull(context, "context");
+        final TalvoxEngine other = substitute;
+        if (other != null) {
+            return other;
+        }
         CoreApplication.install(context);
         PlatformRecognizer.queryLanguages();
         final long handle = Talvox.getHandle();
         synchronized (TalvoxEngine.class) {
             if (instance == null) {
-                instance = new TalvoxEngine(handle);
+                instance = new TalvoxEngine(new NativeBackend(handle));
             }
             return instance;
         }
     }
 
-    long getHandle() {
-        return handle;
+    /** For the test kit: null for the native engine. */
+    static void substitute(TalvoxEngine engine) {
+        substitute = engine;
     }
 
     /** The engine's version, for example "133". */
     public String getVersion() {
-        return Talvox.getVersion();
+        return backend.getVersion();
     }
 
     /**
@@ -63,9 +67,7 @@ public final class TalvoxEngine {
      * events are collected, however that was switched.
      */
     public TalvoxSettings getSettings() {
-        final Bundle settings = Talvox.getSettings(handle);
-        settings.putAll(eventsLogging());
-        return TalvoxSettings.fromBundle(settings);
+        return backend.getSettings();
     }
 
     /**
@@ -74,8 +76,7 @@ public final class TalvoxEngine {
      * results arrive, and the verbosity.
      */
     public void updateSettings(TalvoxSettings settings) {
-        Talvox.updateSettings(handle, settings.toBundle());
-        switchEventsLogging(settings);
+        backend.updateSettings(Objects.requireNonNull(settings, "settings"));
     }
 
     /**
@@ -85,31 +86,7 @@ public final class TalvoxEngine {
      * Otherwise as {@link #updateSettings}.
      */
     public void updateSettingsFromXml(String xml) {
-        Objects.requireNonNull(xml, "xml");
-        // The document need not set this one; if it does not, the collector stays as it is.
-        Talvox.updateSettings(handle, eventsLogging());
-        Talvox.updateSettingsFromXml(handle, xml);
-        switchEventsLogging(TalvoxSettings.fromBundle(Talvox.getSettings(handle)));
-    }
-
-    /** The state of the collector as a setting. */
-    private static Bundle eventsLogging() {
-        return TalvoxSettings.builder()
-                .set(
-                        TalvoxSettings.EVENTS_LOGGING,
-                        LogCollector.isLoggingEnabled()
-                                ? EventsLogging.ENABLED
-                                : EventsLogging.DISABLED)
-                .build()
-                .toBundle();
-    }
-
-    /** Switches the collector where the settings say how. */
-    private static void switchEventsLogging(TalvoxSettings settings) {
-        final EventsLogging wanted = settings.get(TalvoxSettings.EVENTS_LOGGING);
-        if (wanted != null) {
-            LogCollector.setLoggingEnabled(wanted == EventsLogging.ENABLED);
-        }
+        backend.updateSettingsFromXml(Objects.requireNonNull(xml, "xml"));
     }
 
     /**
@@ -123,10 +100,7 @@ public final class TalvoxEngine {
      *     or a broken one; what was trusted before stays trusted
      */
     public void setCertificateFile(File file) {
-        if (file != null) {
-            CertificateFile.check(file);
-        }
-        Talvox.setCertificateFile(file == null ? "" : file.getAbsolutePath());
+        backend.setCertificateFile(file);
     }
 
     /**
@@ -135,7 +109,7 @@ public final class TalvoxEngine {
      * nor the gateway is asked.
      */
     public boolean isRecognitionAvailable(TalvoxSettings settings) {
-        return Talvox.isRecognitionAvailable(handle, settings.toBundle());
+        return backend.isRecognitionAvailable(Objects.requireNonNull(settings, "settings"));
     }
 
     /**
@@ -143,9 +117,7 @@ public final class TalvoxEngine {
      * are asked for when the engine is created and join as soon as it has answered.
      */
     public List<String> getAvailableLanguages() {
-        final TreeSet<String> languages = new TreeSet<>(Talvox.getAvailableLanguages(handle));
-        languages.addAll(PlatformRecognizer.getAvailableLanguages());
-        return new ArrayList<>(languages);
+        return backend.getAvailableLanguages();
     }
 
     /**
@@ -154,8 +126,7 @@ public final class TalvoxEngine {
      */
     public TalvoxRecognizer createRecognizer(
             TalvoxSettings settings, RecognitionListener listener) {
-        final Handler main = new Handler(Looper.getMainLooper());
-        return createRecognizer(settings, listener, main::post);
+        return createRecognizer(settings, listener, backend.getMainExecutor());
     }
 
     /**
@@ -174,7 +145,7 @@ public final class TalvoxEngine {
             TalvoxSettings settings, RecognitionListener listener, Executor executor) {
         Objects.requireNonNull(settings, "settings").checkForRecognition();
         return new TalvoxRecognizer(
-                this,
+                backend,
                 settings,
                 Objects.requireNonNull(listener, "listener"),
                 Objects.requireNonNull(executor, "executor"));

@@ -1,6 +1,7 @@
 package korvel.talvox;
 
 import java.util.concurrent.Executor;
+import korvel.talvox.impl.EngineBackend;
 import korvel.talvox.impl.SafetyNet;
 
 /**
@@ -19,14 +20,14 @@ public final class TalvoxRecognizer implements AutoCloseable {
         CLOSED
     }
 
-    private final TalvoxEngine engine;
+    private final EngineBackend engine;
     private final TalvoxSettings settings;
     private final Session session;
     private SafetyNet.Watch watch;
     private State state = State.NEW;
 
     TalvoxRecognizer(
-            TalvoxEngine engine,
+            EngineBackend engine,
             TalvoxSettings settings,
             RecognitionListener listener,
             Executor executor) {

@@ -3,7 +3,9 @@ package korvel.talvox;
 import android.os.Bundle;
 import java.util.Arrays;
 import java.util.Collections;
+import java.util.HashMap;
 import java.util.List;
+import java.util.Map;
 import java.util.Objects;
 
 /**
@@ -187,9 +189,9 @@ public final class TalvoxSettings {
                             MAP_CENTER,
                             SESSION_ID));
 
-    private final Bundle values;
+    private final Values values;
 
-    private TalvoxSettings(Bundle values) {
+    private TalvoxSettings(Values values) {
         this.values = values;
     }
 
@@ -200,7 +202,7 @@ public final class TalvoxSettings {
 
     /** A builder that takes all keys, for {@link TalvoxEngine#updateSettings}. */
     public static Builder builder() {
-        return new Builder(new Bundle(), false);
+        return new Builder(new Values(), false);
     }
 
     /**
@@ -208,17 +210,17 @@ public final class TalvoxSettings {
      * refuses the keys that are of the engine only.
      */
     public static Builder forRecognition() {
-        return new Builder(new Bundle(), true);
+        return new Builder(new Values(), true);
     }
 
     /** A builder that begins with these settings and takes all keys. */
     public Builder toBuilder() {
-        return new Builder(new Bundle(values), false);
+        return new Builder(new Values(values), false);
     }
 
     /** Whether the key has been set. */
     public boolean has(SettingKey<?> key) {
-        return values.containsKey(key.getName());
+        return values.has(Objects.requireNonNull(key, "key"));
     }
 
     /**
@@ -228,7 +230,7 @@ public final class TalvoxSettings {
      *     constants stands for
      */
     public <T> T get(SettingKey<T> key) {
-        return has(key) ? key.get(values) : null;
+        return values.get(Objects.requireNonNull(key, "key"));
     }
 
     /**
@@ -236,7 +238,7 @@ public final class TalvoxSettings {
      * entries stay as they are.
      */
     public static TalvoxSettings fromBundle(Bundle bundle) {
-        return new TalvoxSettings(new Bundle(bundle));
+        return new TalvoxSettings(new Values(Objects.requireNonNull(bundle, "bundle")));
     }
 
     /**
@@ -244,7 +246,67 @@ public final class TalvoxSettings {
      * the caller's own.
      */
     public Bundle toBundle() {
-        return new Bundle(values);
+        return values.toBundle();
+    }
+
+    /**
+     * The values, by their keys. Android's classes come in only with a bundle, so that the test kit
+     * works where there are none.
+     */
+    private static final class Values {
+        private final Map<SettingKey<?>, Object> byKey = new HashMap<>();
+
+        /** Holds what has no value above; null without such a bundle. */
+        private final Bundle received;
+
+        Values() {
+            received = null;
+        }
+
+        Values(Values other) {
+            byKey.putAll(other.byKey);
+            received = other.received == null ? null : new Bundle(other.received);
+        }
+
+        Values(Bundle received) {
+            this.received = new Bundle(received);
+        }
+
+        boolean has(SettingKey<?> key) {
+            return byKey.containsKey(key)
+                    || received != null && received.containsKey(key.getName());
+        }
+
+        @SuppressWarnings("unchecked") // set() puts only values of the key's type
+        <T> T get(SettingKey<T> key) {
+            if (byKey.containsKey(key)) {
+                return (T) byKey.get(key);
+            }
+            return received == null ? null : key.get(received);
+        }
+
+        <T> void set(SettingKey<T> key, T value) {
+            byKey.put(key, value);
+        }
+
+        void unset(SettingKey<?> key) {
+            byKey.remove(key);
+            if (received != null) {
+                received.remove(key.getName());
+            }
+        }
+
+        Bundle toBundle() {
+            final Bundle bundle = received == null ? new Bundle() : new Bundle(received);
+            for (SettingKey<?> key : byKey.keySet()) {
+                put(bundle, key);
+            }
+            return bundle;
+        }
+
+        private <T> void put(Bundle bundle, SettingKey<T> key) {
+            key.put(bundle, get(key));
+        }
     }
 
     /**
@@ -272,10 +334,10 @@ public final class TalvoxSettings {
 
     /** Collects settings. Not thread-safe. */
     public static final class Builder {
-        private final Bundle values;
+        private final Values values;
         private final boolean isForRecognition;
 
-        private Builder(Bundle values, boolean isForRecognition) {
+        private Builder(Values values, boolean isForRecognition) {
             this.values = values;
             this.isForRecognition = isForRecognition;
         }
@@ -283,22 +345,24 @@ public final class TalvoxSettings {
         /**
          * Sets one value in place of any earlier one.
          *
-         * @throws NullPointerException if the key or the value is null
+         * @throws NullPointerException if the key or the value is null; the message names the key
          * @throws IllegalArgumentException if the value is out of range, or if the key is of the
          *     engine only and these are settings {@linkplain #forRecognition for a recognition}
          */
         public <T> Builder set(SettingKey<T> key, T value) {
-            Objects.requireNonNull(value, key.getName());
+            Objects.requireNonNull(key, "key");
+            Objects.requireNonNull(value, () -> "value of " + key);
             if (isForRecognition && key.isEngineOnly()) {
                 throw new IllegalArgumentException(notForRecognition(key.getName()));
             }
-            key.checkAndPut(values, value);
+            key.check(value);
+            values.set(key, value);
             return this;
         }
 
         /** Forgets the value of the key, so that the engine's holds. */
         public Builder unset(SettingKey<?> key) {
-            values.remove(key.getName());
+            values.unset(Objects.requireNonNull(key, "key"));
             return this;
         }
 
@@ -308,7 +372,7 @@ public final class TalvoxSettings {
          * @throws IllegalArgumentException if both confidences are set, the lower above the upper
          */
         public TalvoxSettings build() {
-            final TalvoxSettings settings = new TalvoxSettings(new Bundle(values));
+            final TalvoxSettings settings = new TalvoxSettings(new Values(values));
             final Float lower = settings.get(LOWER_CONFIDENCE);
             final Float upper = settings.get(UPPER_CONFIDENCE);
             if (lower != null && upper != null && lower > upper) {

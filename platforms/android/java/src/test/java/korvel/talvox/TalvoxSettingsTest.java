@@ -73,7 +73,7 @@ public class TalvoxSettingsTest extends KitTest {
                 assertThrows(
                         NullPointerException.class,
                         () -> TalvoxSettings.builder().set(TalvoxSettings.UUID, null));
-        assertEquals("uuid", refusal.getMessage());
+        assertEquals("value of uuid", refusal.getMessage());
     }
 
     @Test

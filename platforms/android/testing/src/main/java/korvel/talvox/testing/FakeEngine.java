@@ -1,21 +1,18 @@
 package korvel.talvox.testing;
 
-import android.content.Context;
 import java.io.File;
 import java.util.ArrayDeque;
 import java.util.ArrayList;
 import java.util.Arrays;
-import java.util.Collections;
 import java.util.List;
 import java.util.Objects;
 import java.util.Queue;
 import java.util.TreeSet;
 import java.util.concurrent.Executor;
 import korvel.talvox.ErrorDetail;
-import korvel.talvox.RecognitionListener;
+import korvel.talvox.SettingKey;
 import korvel.talvox.SpeechError;
 import korvel.talvox.TalvoxEngine;
-import korvel.talvox.TalvoxRecognizer;
 import korvel.talvox.TalvoxSettings;
 import korvel.talvox.TestKitAccess;
 import korvel.talvox.impl.EngineBackend;
@@ -63,7 +60,7 @@ public final class FakeEngine implements AutoCloseable {
     private final TreeSet<String> languages = new TreeSet<>();
     private TalvoxSettings settings = TalvoxSettings.builder().build();
     private TalvoxSettings sessionSettings;
-    private List<String> documents = new ArrayList<>();
+    private final List<String> documents = new ArrayList<>();
     private boolean isRecognitionAvailable = true;
     private boolean isAdvancing;
     private Session running;
@@ -212,7 +209,7 @@ public final class FakeEngine implements AutoCloseable {
         sessionSettings = values;
         if (running != null) {
             listener.onError(SpeechError.BUSY, reason("another session is active"));
-            return new Session(Collections.emptyList(), listener);
+            return new Refused();
         }
         final Script script = scripts.poll();
         if (script == null) {
@@ -224,6 +221,22 @@ public final class FakeEngine implements AutoCloseable {
             session.deliverNext();
         }
         return session;
+    }
+
+    private static TalvoxSettings merge(TalvoxSettings older, TalvoxSettings newer) {
+        final TalvoxSettings.Builder merged = older.toBuilder();
+        for (SettingKey<?> key : TalvoxSettings.keys()) {
+            copy(newer, key, merged);
+        }
+        return merged.build();
+    }
+
+    private static <T> void copy(
+            TalvoxSettings from, SettingKey<T> key, TalvoxSettings.Builder to) {
+        final T value = from.get(key);
+        if (value != null) {
+            to.set(key, value);
+        }
     }
 
     private static ErrorDetail reason(String text) {
@@ -319,6 +332,18 @@ public final class FakeEngine implements AutoCloseable {
         }
     }
 
+    /** A session that ended inside its start. */
+    private static final class Refused implements EngineBackend.Running {
+        @Override
+        public void stop() {}
+
+        @Override
+        public void cancel() {}
+
+        @Override
+        public void close() {}
+    }
+
     /** What lies below the kit's classes. */
     private final class Backend implements EngineBackend {
         @Override
@@ -336,7 +361,7 @@ public final class FakeEngine implements AutoCloseable {
         @Override
         public void updateSettings(TalvoxSettings changes) {
             synchronized (FakeEngine.this) {
-                settings = merge(settings.toBuilder(), changes);
+                settings = merge(settings, changes);
             }
         }
 

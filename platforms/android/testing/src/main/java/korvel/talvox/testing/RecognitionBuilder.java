@@ -72,7 +72,7 @@ public final class RecognitionBuilder {
             if (hypotheses.size() == 1) {
                 require(Outcome.ACCEPTED, "on one hypothesis without a confidence");
             } else {
-                require(Outcome.REJECTED, "on several hypotheses, the first without a confidence");
+                require(Outcome.REJECTED, "on several hypotheses, the first without a confidence,");
             }
         }
         return TestKitAccess.makeRecognition(outcome, new ArrayList<>(hypotheses), requestId);

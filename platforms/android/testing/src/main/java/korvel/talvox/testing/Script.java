@@ -93,9 +93,11 @@ public final class Script {
     }
 
     private final List<Event> events;
+    private final Event endAfterStop;
 
-    private Script(List<Event> events) {
+    private Script(List<Event> events, Event endAfterStop) {
         this.events = Collections.unmodifiableList(new ArrayList<>(events));
+        this.endAfterStop = endAfterStop;
     }
 
     /** A session of the cloud recognizer. */
@@ -120,9 +122,15 @@ public final class Script {
         return events.get(events.size() - 1);
     }
 
-    /** The scripted end of listening; null if the session ends before. */
-    Event getRecordingDone() {
-        return find(events, Kind.RECORDING_DONE);
+    /** What ends the session after a stop. */
+    Event getEndAfterStop() {
+        return endAfterStop;
+    }
+
+    /** The time in the script from which the end after a stop counts. */
+    long getStopMs() {
+        final Event done = find(events, Kind.RECORDING_DONE);
+        return done != null ? done.timeMs : getEnd().timeMs;
     }
 
     private static Event find(List<Event> events, Kind kind) {
@@ -139,6 +147,7 @@ public final class Script {
         private final boolean isCloud;
         private final List<Event> events = new ArrayList<>();
         private long nowMs;
+        private boolean isNoVoice;
 
         private Builder(boolean isCloud) {
             this.isCloud = isCloud;
@@ -242,7 +251,9 @@ public final class Script {
             if (isCloud && error == SpeechError.NO_VOICE && has(Kind.SPEAKING_BEGIN)) {
                 throw new IllegalStateException(name + ": after onSpeakingBegin");
             }
-            return add(Kind.END, name, events -> events.onError(error, detail));
+            add(Kind.END, name, events -> events.onError(error, detail));
+            isNoVoice = error == SpeechError.NO_VOICE;
+            return this;
         }
 
         private void checkDetail(String name, SpeechError error, ErrorDetail detail) {
@@ -264,10 +275,23 @@ public final class Script {
         public Script build() {
             final Builder whole = new Builder(isCloud);
             whole.events.addAll(events);
+            whole.isNoVoice = isNoVoice;
             while (!whole.has(Kind.END)) {
                 whole.addLimit();
             }
-            return new Script(whole.events);
+            return new Script(whole.events, whole.getEndAfterStop());
+        }
+
+        /** The end of this script, but an answer where it waits for speech in vain. */
+        private Event getEndAfterStop() {
+            final Event end = find(events, Kind.END);
+            return isCloud && isNoVoice
+                    ? new Event(
+                            end.timeMs,
+                            Kind.END,
+                            "onResults",
+                            events -> events.onResults(RecognitionBuilder.empty()))
+                    : end;
         }
 
         /** What the engine does when nothing happens any more. */
@@ -342,9 +366,12 @@ public final class Script {
             }
             if (nowMs > getDeadlineMs()) {
                 throw new IllegalStateException(
-                        String.format(
-                                "%s at %d ms: the engine's time limit is %d ms",
-                                name, nowMs, getDeadlineMs()));
+                        name
+                                + " at "
+                                + nowMs
+                                + " ms: the engine's time limit is "
+                                + getDeadlineMs()
+                                + " ms");
             }
             events.add(new Event(nowMs, kind, name, action));
             return this;
