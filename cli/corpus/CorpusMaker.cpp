@@ -109,7 +109,10 @@ class CorpusWriter {
         for (const std::string& noise : plan_.noises) {
             for (const int loudness : ALONE_RMS) {
                 const std::string name = "rms" + std::to_string(loudness);
-                Wave background = noiseOf(noise, samples, noise + " alone " + name);
+                std::string purpose = noise;
+                purpose += " alone ";
+                purpose += name;
+                Wave background = noiseOf(noise, samples, purpose);
                 scale(background, loudness / rms(background));
                 for (const int rateHz : {WAVE_RATE_HZ, WAVE_RATE_HZ / 2}) {
                     write("alone-" + noise, name + '-' + std::to_string(rateHz / 1000) + "k",

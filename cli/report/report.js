@@ -99,6 +99,7 @@
         if (!audio) add(main, "p", "The sound is too long to be part of this page.", {class: "faint"});
 
         const lengthS = data.lengthMs / 1000;
+        const eventColor = (event) => color({recordingBegin: "faint", speakingBegin: "three"}[event] || "bad");
         // Marks on every chart: labels as bands, events as lines, the place of the playback.
         const marks = {
             id: "marks",
@@ -127,7 +128,7 @@
                 ctx.save();
                 ctx.lineWidth = 1.5;
                 for (const event of data.events) {
-                    line(event.ms, event.event === "speakingBegin" ? color("three") : color("bad"), false);
+                    line(event.ms, eventColor(event.event), false);
                 }
                 for (const segment of data.segments) {
                     line(segment.startMs, color("three"), true);
@@ -137,6 +138,7 @@
                 ctx.restore();
             },
         };
+        const Y_AXIS_WIDTH = 64;
         const timeChart = (title, datasets, y) => makeChart(title, () => ({
             type: "line",
             data: {datasets: datasets()},
@@ -148,7 +150,11 @@
                 onClick(event, _, chart) {
                     if (audio) audio.currentTime = Math.max(0, chart.scales.x.getValueForPixel(event.x));
                 },
-                scales: {x: axis("s", {type: "linear", min: 0, max: lengthS}), y: axis(y.title, y)},
+                scales: {
+                    x: axis("s", {type: "linear", min: 0, max: lengthS}),
+                    // The same width in each chart, so that a moment stands below itself.
+                    y: axis(y.title, Object.assign({afterFit: (scale) => { scale.width = Y_AXIS_WIDTH; }}, y)),
+                },
                 plugins: {legend: datasets().length > 1 ? legend() : {display: false}, decimation: {enabled: false}},
             },
         }));
@@ -187,7 +193,7 @@
             audio.addEventListener("play", follow);
             audio.addEventListener("seeked", follow);
         }
-        add(main, "p", "Bands are the labels; solid lines what a session reports, dashed ones where the detector's speech begins (green) and ends (red). Click into a chart to play from there.", {class: "faint"});
+        add(main, "p", "Bands are the labels; solid lines what a session reports (recording begun grey, speech begun green, the end red), dashed ones where the detector's speech begins and ends. Click into a chart to play from there.", {class: "faint"});
 
         add(main, "h2", "What a session reports");
         const events = table(["event", "after ms"]);
@@ -330,6 +336,10 @@
                 },
             },
         }), {tall: true});
+        if (finite.length < data.points.length) {
+            add(main, "p", data.points.length - finite.length +
+                " points whose median session never ends are not drawn.", {class: "faint"});
+        }
         heatMap("Sessions that lose words, %", "heatLost", percent, (point) => point.lost);
         heatMap("Latency of the end, ms", "heatLatency", latency, (point) => point.endLateMs);
 
