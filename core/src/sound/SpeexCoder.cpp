@@ -65,7 +65,7 @@ std::vector<unsigned char> SpeexCoder::makeHeader() const {
     header.frames_per_packet = 1;
     int size = 0;
     struct Deleter {
-        void operator()(char* packet) const { speex_header_free(packet); }
+        void operator()(char* header) const { speex_header_free(header); }
     };
     const std::unique_ptr<char, Deleter> text(speex_header_to_packet(&header, &size));
     if (!text) {
