@@ -81,6 +81,7 @@ TEST(EndpointVerdict, TellsMissedFalseAndUnendedApart) {
 /** Sessions whose ends are as late as these numbers say. */
 std::vector<Verdict> endedLate(const std::vector<int>& latenciesMs) {
     std::vector<Verdict> verdicts;
+    verdicts.reserve(latenciesMs.size());
     for (const int latencyMs : latenciesMs) {
         verdicts.push_back(
             Cli::compare(session(820, Listening::SPEECH_ENDED, 1980 + latencyMs), SPEECH));

@@ -50,7 +50,7 @@ class ReportTest : public ::testing::Test {
         samples.insert(samples.end(), word.begin(), word.end());
         samples.resize(samples.size() + static_cast<std::size_t>(pauseMs) * RATE_HZ / 1000);
         samples.insert(samples.end(), word.begin(), word.end());
-        samples.resize(samples.size() + RATE_HZ * 3);
+        samples.resize(samples.size() + std::size_t{RATE_HZ} * 3);
         const std::string path = directory.path(name + ".wav");
         ASSERT_TRUE(TestSupport::writeSoundFile(path, SF_FORMAT_WAV | SF_FORMAT_PCM_16, RATE_HZ, 1,
                                                 samples));

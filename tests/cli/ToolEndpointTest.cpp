@@ -209,7 +209,7 @@ TEST_F(ToolEndpointTest, NamesAndSkipsWhatItCannotScoreAndEndsWithStatusTwo) {
     write("loud/silent", second, "");
     write("loud/unlabelled", second, "");
     std::filesystem::remove(directory.path("loud/unlabelled.txt"));
-    write("loud/late", std::vector<int16_t>(RATE_HZ * 25, 1), "0.1\t21\ta\n");
+    write("loud/late", std::vector<int16_t>(std::size_t{RATE_HZ} * 25, 1), "0.1\t21\ta\n");
     const ToolResult result = score();
     EXPECT_EQ(result.status, 2);
     EXPECT_EQ(result.out, expected);
@@ -225,7 +225,7 @@ TEST_F(ToolEndpointTest, NamesAndSkipsWhatItCannotScoreAndEndsWithStatusTwo) {
 }
 
 TEST_F(ToolEndpointTest, ScoresNoiseInPiecesOfFiveSeconds) {
-    write("noise", std::vector<int16_t>(RATE_HZ * 16, 0), "0\t16\t(noise)\n");
+    write("noise", std::vector<int16_t>(std::size_t{RATE_HZ} * 16, 0), "0\t16\t(noise)\n");
     const Json noise = row(score(), ".");
     EXPECT_EQ(noise["sessions"], 3);
     EXPECT_EQ(noise["sessionsWithSpeech"], 0);
