@@ -32,12 +32,19 @@ class Exempt {
     Exempt& operator=(const Exempt&) = delete;
 };
 
+/**
+ * A function of a library that a program has loaded for itself alone, as a Java VM does; null where
+ * there is none.
+ */
+void* findInLoadedLibraries(const char* name);
+
 /** The function that this library stands in front of. */
 template <typename Function>
 Function find(std::atomic<void*>& known, const char* name) {
     void* function = known.load(std::memory_order_relaxed);
     if (function == nullptr) {
         function = dlsym(RTLD_NEXT, name);
+        function = function != nullptr ? function : findInLoadedLibraries(name);
         known.store(function, std::memory_order_relaxed);
     }
     return reinterpret_cast<Function>(function);

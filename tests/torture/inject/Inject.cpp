@@ -39,13 +39,20 @@ constexpr std::size_t RANGES_MAX = 32;
 std::array<Range, RANGES_MAX> exemptRanges;
 std::size_t exemptRangeCount = 0;
 
-void addCode(const dl_phdr_info& library, int kind) {
+/** Code of the libraries that calls are restricted to. */
+std::array<Range, RANGES_MAX> chosenRanges;
+std::size_t chosenRangeCount = 0;
+std::array<const char*, RANGES_MAX> chosenLibraries;
+std::size_t chosenLibraryCount = 0;
+
+void addCode(const dl_phdr_info& library, int kind, std::array<Range, RANGES_MAX>& ranges,
+             std::size_t& count) {
     for (int i = 0; i < library.dlpi_phnum; ++i) {
         const ElfW(Phdr)& part = library.dlpi_phdr[i];
         const bool isCode = part.p_type == PT_LOAD && (part.p_flags & PF_X) != 0;
-        if (isCode && exemptRangeCount < RANGES_MAX) {
+        if (isCode && count < RANGES_MAX) {
             const std::uintptr_t begin = library.dlpi_addr + part.p_vaddr;
-            exemptRanges[exemptRangeCount++] = {begin, begin + part.p_memsz, kind};
+            ranges[count++] = {begin, begin + part.p_memsz, kind};
         }
     }
 }
@@ -53,27 +60,38 @@ void addCode(const dl_phdr_info& library, int kind) {
 int addLibrary(dl_phdr_info* library, std::size_t /*size*/, void* /*data*/) {
     for (const char* const sanitizer : {"/libasan.", "/libubsan."}) {
         if (std::strstr(library->dlpi_name, sanitizer) != nullptr) {
-            addCode(*library, NO_KIND);
+            addCode(*library, NO_KIND, exemptRanges, exemptRangeCount);
         }
     }
     for (const Exclusion& exclusion : EXCLUSIONS) {
         if (std::strstr(library->dlpi_name, exclusion.library) != nullptr) {
-            addCode(*library, static_cast<int>(exclusion.kind));
+            addCode(*library, static_cast<int>(exclusion.kind), exemptRanges, exemptRangeCount);
+        }
+    }
+    for (std::size_t i = 0; i < chosenLibraryCount; ++i) {
+        if (std::strstr(library->dlpi_name, chosenLibraries[i]) != nullptr) {
+            addCode(*library, NO_KIND, chosenRanges, chosenRangeCount);
         }
     }
     return 0;
 }
 
-bool isExempt(Kind kind, const void* caller) {
+bool isWithin(const std::array<Range, RANGES_MAX>& ranges, std::size_t count, Kind kind,
+              const void* caller) {
     const auto place = reinterpret_cast<std::uintptr_t>(caller);
-    for (std::size_t i = 0; i < exemptRangeCount; ++i) {
-        const Range& range = exemptRanges[i];
+    for (std::size_t i = 0; i < count; ++i) {
+        const Range& range = ranges[i];
         if (place >= range.begin && place < range.end &&
             (range.kind == NO_KIND || range.kind == static_cast<int>(kind))) {
             return true;
         }
     }
     return false;
+}
+
+bool isExempt(Kind kind, const void* caller) {
+    return isWithin(exemptRanges, exemptRangeCount, kind, caller) ||
+           (chosenLibraryCount > 0 && !isWithin(chosenRanges, chosenRangeCount, kind, caller));
 }
 
 void keepFailure(const char* name) {
@@ -88,6 +106,18 @@ void keepFailure(const char* name) {
 }
 
 }  // namespace
+
+void* findInLoadedLibraries(const char* name) {
+    const Exempt exempt;
+    for (const char* const library : {"libssl.so.3", "libcrypto.so.3", "libpulse.so.0"}) {
+        void* const handle = dlopen(library, RTLD_LAZY | RTLD_NOLOAD);
+        void* const function = handle != nullptr ? dlsym(handle, name) : nullptr;
+        if (function != nullptr) {
+            return function;
+        }
+    }
+    return nullptr;
+}
 
 bool counts() {
     return armed.load(std::memory_order_relaxed) && exemptLevel == 0;
@@ -115,7 +145,7 @@ void tortureArm(int kind, long call, int onward, int withStack, const char** fai
         void* warmUp[1];
         backtrace(warmUp, 1);  // loads its library now
     }
-    if (exemptRangeCount == 0) {
+    if (exemptRangeCount == 0 && chosenRangeCount == 0) {
         dl_iterate_phdr(&addLibrary, nullptr);
     }
     for (std::atomic<long>& count : calls) {
@@ -129,6 +159,13 @@ void tortureArm(int kind, long call, int onward, int withStack, const char** fai
     goesOn = onward != 0;
     keepsStack = withStack != 0;
     armed = true;
+}
+
+void tortureRestrictTo(const char* library) {
+    using namespace Torture;
+    if (chosenLibraryCount < RANGES_MAX) {
+        chosenLibraries[chosenLibraryCount++] = library;
+    }
 }
 
 void tortureDisarm() {

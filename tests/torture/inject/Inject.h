@@ -59,6 +59,13 @@ extern "C" {
  */
 void tortureArm(int kind, long call, int onward, int withStack, const char** failedName);
 
+/**
+ * From the next `tortureArm` on, only calls that are made from these libraries count; without any,
+ * all calls do. For programs such as a Java VM, which has no use for calls that fail.
+ * @param library a part of the path of its file; must stay valid
+ */
+void tortureRestrictTo(const char* library);
+
 /** From now on every call reaches its function. What was counted is kept. */
 void tortureDisarm();
 
