@@ -31,7 +31,7 @@ TEST_F(NetworkAssertTest, TearDownByATaskOnTheNetworkThreadIsDoneAllTheSame) {
     { const Util::EventLock afterTheHook; }
     ASSERT_EQ(asserts.count(), 1U);
     EXPECT_EQ(asserts.reports()[0].condition, "!isOwnThread");
-    EXPECT_EQ(asserts.reports()[0].path, "core/src/network/Transport");
+    EXPECT_EQ(asserts.reports()[0].path, "core/src/network/curl/CurlTransport");
     EXPECT_EQ(runTask(), "finished 200");
 }
 

@@ -16,7 +16,7 @@
 #include "Device.h"
 #include "PlatformLedger.h"
 #include "ScriptedGateway.h"
-#include "core/network/NetworkManager.h"
+#include "ScriptedTransport.h"
 #include "core/util/EventLock.h"
 #include "core/util/Time.h"
 #include "pal/kd.h"
@@ -45,7 +45,7 @@ class PlatformFixture : public ::testing::Test,
             GTEST_SKIP() << "built without the platform recognizer";
         }
         kdUseManualClockKOR(NS_PER_MS);
-        Network::NetworkManager::getInstance().getTransport();
+        ScriptedTransport::install();
         ScriptedGateway::instance().begin(plans, this);
         listener = makeListener();
         recognizer = create();

@@ -6,9 +6,9 @@
 #include <limits>
 #include <utility>
 
+#include "ScriptedTransport.h"
 #include "core/network/NetworkTask.h"
 #include "core/util/Base64Coder.h"
-#include "network/Transfer.h"
 #include "pal/kd_time.h"
 
 namespace Lifecycle {
@@ -117,14 +117,14 @@ void ScriptedGateway::connect(Link link) {
     connections.push_back(std::move(connection));
 }
 
-bool ScriptedGateway::disconnect(const boost::shared_ptr<Network::Transfer>& transfer) {
+bool ScriptedGateway::disconnect(const boost::shared_ptr<ScriptedTransfer>& transfer) {
     const std::size_t before = connections.size();
     connections.remove_if(
         [&transfer](const Connection& connection) { return connection.link.transfer == transfer; });
     return connections.size() != before;
 }
 
-void ScriptedGateway::end(const boost::shared_ptr<Network::Transfer>& transfer, int code) {
+void ScriptedGateway::end(const boost::shared_ptr<ScriptedTransfer>& transfer, int code) {
     const auto found = std::find_if(
         connections.begin(), connections.end(),
         [&transfer](const Connection& entry) { return entry.link.transfer == transfer; });
@@ -226,7 +226,7 @@ void ScriptedGateway::sendEnd(Connection& connection) {
 }
 
 void ScriptedGateway::finish(const Connection& connection, int code) {
-    const boost::shared_ptr<Network::Transfer> transfer = connection.link.transfer;
+    const boost::shared_ptr<ScriptedTransfer> transfer = connection.link.transfer;
     const int session = connection.session;
     disconnect(transfer);
     observer->onAttemptEnd(session, code);

@@ -12,14 +12,11 @@
 #include <vector>
 
 #include "Plan.h"
-#include "core/network/HttpResponse.h"
-
-namespace Network {
-class Transfer;
-class TransferListener;
-}  // namespace Network
+#include "core/network/Transport.h"
 
 namespace Lifecycle {
+
+class ScriptedTransfer;
 
 /** Hears what the gateway does with the requests of a session; under the event lock. */
 class GatewayObserver {
@@ -36,14 +33,14 @@ class GatewayObserver {
 
 /**
  * Stands in for libcurl and the gateway below the real task holders, exchanges, retry policies and
- * watchdogs: `TransportDouble` and `TransferDouble` hand it the commands for the network thread and
- * the transfers, and a test lets it take its turns. Under the event lock.
+ * watchdogs: `ScriptedTransport` hands it the commands for the network thread and the transfers,
+ * and a test lets it take its turns. Under the event lock.
  */
 class ScriptedGateway {
   public:
     /** One attempt as it looks from here. */
     struct Link {
-        boost::shared_ptr<Network::Transfer> transfer;
+        boost::shared_ptr<ScriptedTransfer> transfer;
         boost::shared_ptr<Network::TransferListener> listener;
         std::string url;
         /** Appends what there is of the body, up to so many bytes. @return true at its end */
@@ -74,12 +71,12 @@ class ScriptedGateway {
     static std::string makeRequestId(int session);
     static std::string makeSessionId(int session);
 
-    // For the doubles.
+    // For the transport.
     void setCommandRunner(std::function<bool()> runner) { runCommands = std::move(runner); }
     void connect(Link link);
-    bool disconnect(const boost::shared_ptr<Network::Transfer>& transfer);
+    bool disconnect(const boost::shared_ptr<ScriptedTransfer>& transfer);
     /** The transfer is over: tells it. */
-    void end(const boost::shared_ptr<Network::Transfer>& transfer, int code);
+    void end(const boost::shared_ptr<ScriptedTransfer>& transfer, int code);
 
   private:
     enum class Phase { RECEIVING, ANSWERING, HEAD_SENT };

@@ -4,6 +4,7 @@
 #include <boost/make_shared.hpp>
 
 #include "Configuration.h"
+#include "ScriptedTransport.h"
 #include "core/network/NetworkManager.h"
 #include "core/util/EventLock.h"
 #include "pal/kd.h"
@@ -49,7 +50,7 @@ Testbed::Testbed() {
             session.plan.recorder, [&session] { session.cloud->onRecorderFailed(); });
         return session.recorder;
     });
-    Network::NetworkManager::getInstance().getTransport();
+    ScriptedTransport::install();
     device = Device::make(*this);
 }
 

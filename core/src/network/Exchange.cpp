@@ -1,7 +1,6 @@
 #include "network/Exchange.h"
 
 #include <algorithm>
-#include <boost/make_shared.hpp>
 #include <exception>
 #include <new>
 #include <utility>
@@ -10,7 +9,6 @@
 #include "core/util/Time.h"
 #include "network/FailureText.h"
 #include "network/RequestCheck.h"
-#include "network/Transport.h"
 #include "pal/kd_event.h"
 #include "pal/kd_log.h"
 
@@ -42,7 +40,7 @@ void Exchange::cancel() {
     active = false;
     retryTimer.cancel();
     if (const boost::shared_ptr<Transfer> ended = std::move(transfer)) {
-        transport->requestAbandon(ended);
+        ended->cancel();
     }
     policy.reset();
     // Last: the task's destructor may do anything.
@@ -93,7 +91,7 @@ void Exchange::noteException(const char* what) noexcept {
 void Exchange::attempt() {
     const bool begun = callTask([this] {
         if (const boost::shared_ptr<Transfer> next = makeTransfer()) {
-            transport->start(next);
+            next->start();
         }
     });
     if (!begun) {
@@ -131,8 +129,7 @@ boost::shared_ptr<Transfer> Exchange::makeTransfer() {
     }
     collected.clear();
     attemptReason.clear();
-    transfer = boost::make_shared<Transfer>(transport, request, shared_from_this());
-    transfer->startWatchdog();
+    transfer = transport->makeTransfer(request, shared_from_this());
     return transfer;
 }
 

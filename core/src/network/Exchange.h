@@ -8,12 +8,10 @@
 
 #include "core/network/NetworkTask.h"
 #include "core/network/NetworkTaskRetryPolicy.h"
+#include "core/network/Transport.h"
 #include "core/util/Timer.h"
-#include "network/Transfer.h"
 
 namespace Network {
-
-class Transport;
 
 /**
  * One submitted task with all its attempts. Everything in here is guarded by the event lock; calls

@@ -2,9 +2,10 @@
 
 #include <atomic>
 #include <boost/make_shared.hpp>
+#include <mutex>
 
 #include "core/network/NetworkInterfaces.h"
-#include "network/Transport.h"
+#include "network/curl/CurlTransport.h"
 
 namespace Network {
 
@@ -12,8 +13,9 @@ class NetworkManager::Impl {
   public:
     static constexpr int NO_OVERRIDE = -1;
 
-    const boost::shared_ptr<Transport> transport = boost::make_shared<Transport>();
     std::atomic<int> override{NO_OVERRIDE};
+    std::mutex mutex;
+    boost::shared_ptr<Transport> transport = boost::make_shared<CurlTransport>();
 };
 
 NetworkManager& NetworkManager::getInstance() {
@@ -40,11 +42,22 @@ void NetworkManager::overrideReachability(int value) {
 }
 
 void NetworkManager::setCertificateFile(const std::string& path) {
-    impl->transport->setCertificateFile(path);
+    getTransport()->setCertificateFile(path);
 }
 
-Transport& NetworkManager::getTransport() {
-    return *impl->transport;
+boost::shared_ptr<Transport> NetworkManager::getTransport() const {
+    const std::lock_guard<std::mutex> lock(impl->mutex);
+    return impl->transport;
+}
+
+void NetworkManager::setTransport(const boost::shared_ptr<Transport>& transport) {
+    boost::shared_ptr<Transport> previous =
+        transport ? transport : boost::make_shared<CurlTransport>();
+    {
+        const std::lock_guard<std::mutex> lock(impl->mutex);
+        previous.swap(impl->transport);
+    }
+    previous->stop();
 }
 
 }  // namespace Network

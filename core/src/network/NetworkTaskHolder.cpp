@@ -6,7 +6,6 @@
 #include "core/network/NetworkManager.h"
 #include "core/util/EventLock.h"
 #include "network/Exchange.h"
-#include "network/Transport.h"
 #include "pal/kd_assert.h"
 #include "pal/kd_log.h"
 
@@ -27,9 +26,8 @@ void NetworkTaskHolder::submit(const boost::shared_ptr<NetworkTask>& task,
     if (isWorking()) {
         kdLogMessage("NetworkTaskHolder: a running task gives way to the next one");
     }
-    Transport& transport = NetworkManager::getInstance().getTransport();
-    const auto next = boost::make_shared<Exchange>(transport.shared_from_this(), task, policy,
-                                                   thread == EndThread::NETWORK);
+    const auto next = boost::make_shared<Exchange>(NetworkManager::getInstance().getTransport(),
+                                                   task, policy, thread == EndThread::NETWORK);
     // Nothing of it is delivered before the event lock is free. A start that throws changes
     // nothing.
     next->start();

@@ -53,8 +53,15 @@ class KORVEL_CORE_API NetworkManager : public Util::Singleton<NetworkManager> {
      */
     void setCertificateFile(const std::string& path);
 
-    /** The transport under the holders; for the library's own use. */
-    Transport& getTransport();
+    /** What carries the requests of tasks that are submitted now. Any thread. */
+    boost::shared_ptr<Transport> getTransport() const;
+
+    /**
+     * Has another transport carry the requests of tasks that are submitted afterwards, in tests for
+     * example. The one before is stopped, as by the destructor. Any thread.
+     * @param transport null for libcurl's
+     */
+    void setTransport(const boost::shared_ptr<Transport>& transport);
 
   private:
     friend class Util::Singleton<NetworkManager>;

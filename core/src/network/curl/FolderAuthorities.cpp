@@ -3,7 +3,7 @@
 
 #include <memory>
 
-#include "network/PlatformAuthorities.h"
+#include "network/curl/PlatformAuthorities.h"
 #include "pal/kd_log.h"
 
 namespace Network {

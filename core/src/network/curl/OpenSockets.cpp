@@ -1,4 +1,4 @@
-#include "network/OpenSockets.h"
+#include "network/curl/OpenSockets.h"
 
 #include <netinet/in.h>
 #include <poll.h>
@@ -7,7 +7,7 @@
 
 #include <algorithm>
 
-#include "network/CurlGuard.h"
+#include "network/curl/CurlGuard.h"
 
 namespace Network {
 

@@ -1,4 +1,4 @@
-#include "network/Transfer.h"
+#include "network/curl/CurlTransfer.h"
 
 #include <boost/weak_ptr.hpp>
 #include <limits>
@@ -6,9 +6,9 @@
 #include <utility>
 
 #include "core/network/NetworkTask.h"
-#include "network/CurlGuard.h"
 #include "network/FailureText.h"
-#include "network/Transport.h"
+#include "network/curl/CurlGuard.h"
+#include "network/curl/CurlTransport.h"
 #include "pal/kd_log.h"
 
 namespace Network {
@@ -25,20 +25,29 @@ bool isSecure(const std::string& url) {
 
 }  // namespace
 
-Transfer::Transfer(boost::shared_ptr<Transport> owner, boost::shared_ptr<HttpRequest> what,
-                   boost::shared_ptr<TransferListener> hearer)
+CurlTransfer::CurlTransfer(boost::shared_ptr<CurlTransport> owner,
+                           boost::shared_ptr<HttpRequest> what,
+                           boost::shared_ptr<TransferListener> hearer)
     : transport(std::move(owner)),
       request(std::move(what)),
       listener(std::move(hearer)),
       watchdog(request->getTimeoutMs(),
                [this] {
-                   if (const boost::shared_ptr<Transfer> self = weak_from_this().lock()) {
+                   if (const boost::shared_ptr<CurlTransfer> self = weak_from_this().lock()) {
                        transport->requestCheck(self);
                    }
                }),
       body(request) {}
 
-CURL* Transfer::open(const std::string& certificateFile) {
+void CurlTransfer::start() {
+    transport->start(shared_from_this());
+}
+
+void CurlTransfer::cancel() noexcept {
+    transport->requestAbandon(shared_from_this());
+}
+
+CURL* CurlTransfer::open(const std::string& certificateFile) {
     easy.reset(transport->takeHandle(certificateFile));
     if (easy) {
         setUpConnection(certificateFile);
@@ -54,13 +63,13 @@ CURL* Transfer::open(const std::string& certificateFile) {
 // A handle serves one request after the other without a reset, which could fail and not say so:
 // each request sets every option that any of them sets.
 template <typename Value>
-void Transfer::set(CURLoption option, Value value) {
+void CurlTransfer::set(CURLoption option, Value value) {
     // Options that this libcurl does not know are no obstacle.
     hadNoMemory =
         hadNoMemory || (curl_easy_setopt)(easy.get(), option, value) == CURLE_OUT_OF_MEMORY;
 }
 
-void Transfer::setUpConnection(const std::string& certificateFile) {
+void CurlTransfer::setUpConnection(const std::string& certificateFile) {
     set(CURLOPT_NOSIGNAL, 1L);
     // Otherwise the end of a transfer waits for a name server that does not answer.
     set(CURLOPT_QUICK_EXIT, 1L);
@@ -70,17 +79,17 @@ void Transfer::setUpConnection(const std::string& certificateFile) {
     set(CURLOPT_HTTP_VERSION, static_cast<long>(CURL_HTTP_VERSION_1_1));
     set(CURLOPT_SSLVERSION, static_cast<long>(CURL_SSLVERSION_TLSv1_2));
     transport->getSockets().attach(easy.get());
-    set(CURLOPT_PREREQFUNCTION, &Transfer::onConnection);
+    set(CURLOPT_PREREQFUNCTION, &CurlTransfer::onConnection);
     set(CURLOPT_PREREQDATA, this);
     set(CURLOPT_FRESH_CONNECT, 0L);
     hadNoMemory = hadNoMemory || !transport->setAuthorities(easy.get(), certificateFile);
     set(CURLOPT_ERRORBUFFER, errorText.data());
     set(CURLOPT_NOPROGRESS, 0L);
-    set(CURLOPT_XFERINFOFUNCTION, &Transfer::onProgress);
+    set(CURLOPT_XFERINFOFUNCTION, &CurlTransfer::onProgress);
     set(CURLOPT_XFERINFODATA, this);
 }
 
-void Transfer::setUpRequest() {
+void CurlTransfer::setUpRequest() {
     const std::string& url = request->getUrl();
     set(CURLOPT_URL, url.c_str());
     set(CURLOPT_PATH_AS_IS, 1L);
@@ -94,22 +103,22 @@ void Transfer::setUpRequest() {
     } else {
         set(CURLOPT_HTTPGET, 1L);
     }
-    set(CURLOPT_HEADERFUNCTION, &Transfer::onHeader);
+    set(CURLOPT_HEADERFUNCTION, &CurlTransfer::onHeader);
     set(CURLOPT_HEADERDATA, this);
-    set(CURLOPT_WRITEFUNCTION, &Transfer::onWrite);
+    set(CURLOPT_WRITEFUNCTION, &CurlTransfer::onWrite);
     set(CURLOPT_WRITEDATA, this);
 }
 
-void Transfer::setUpBody() {
+void CurlTransfer::setUpBody() {
     set(CURLOPT_POST, 1L);
-    set(CURLOPT_READFUNCTION, &Transfer::onRead);
+    set(CURLOPT_READFUNCTION, &CurlTransfer::onRead);
     set(CURLOPT_READDATA, this);
-    set(CURLOPT_SEEKFUNCTION, &Transfer::onSeek);
+    set(CURLOPT_SEEKFUNCTION, &CurlTransfer::onSeek);
     set(CURLOPT_SEEKDATA, this);
     if (request->isChunked()) {
-        const boost::weak_ptr<Transfer> weak(shared_from_this());
+        const boost::weak_ptr<CurlTransfer> weak(shared_from_this());
         request->getWriter()->setWakeUp([weak] {
-            if (const boost::shared_ptr<Transfer> self = weak.lock()) {
+            if (const boost::shared_ptr<CurlTransfer> self = weak.lock()) {
                 self->wake();
             }
         });
@@ -118,7 +127,7 @@ void Transfer::setUpBody() {
         request->isChunked() ? curl_off_t{-1} : static_cast<curl_off_t>(request->getBody().size()));
 }
 
-void Transfer::setUpHeaders() {
+void CurlTransfer::setUpHeaders() {
     bool hasContentType = false;
     for (const auto& header : request->getHeaders()) {
         // Without a value, a colon would tell libcurl to leave the header out.
@@ -138,7 +147,7 @@ void Transfer::setUpHeaders() {
     set(CURLOPT_HTTPHEADER, headerLines.get());
 }
 
-void Transfer::addHeaderLine(const std::string& line) {
+void CurlTransfer::addHeaderLine(const std::string& line) {
     curl_slist* const longer = curl_slist_append(headerLines.get(), line.c_str());
     if (longer == nullptr) {
         hadNoMemory = true;
@@ -148,7 +157,7 @@ void Transfer::addHeaderLine(const std::string& line) {
     headerLines.reset(longer);
 }
 
-TransferEnd Transfer::judge(CURLcode result) const {
+TransferEnd CurlTransfer::judge(CURLcode result) const {
     const long status = getStatus();
     if (headDelivered && (result == CURLE_OK || isAnswered())) {
         return {static_cast<int>(status), {}};
@@ -162,7 +171,7 @@ TransferEnd Transfer::judge(CURLcode result) const {
     return {neverSent ? NetworkTask::NO_REQUEST : NetworkTask::NO_RESPONSE, reason};
 }
 
-std::string Transfer::describe(CURLcode result) const {
+std::string CurlTransfer::describe(CURLcode result) const {
     if (refusal != nullptr) {
         return refusal;
     }
@@ -179,7 +188,7 @@ std::string Transfer::describe(CURLcode result) const {
     return errorText[0] != '\0' ? errorText.data() : curl_easy_strerror(result);
 }
 
-long Transfer::getStatus() const {
+long CurlTransfer::getStatus() const {
     long status = 0;
     if (!easy) {
         return status;
@@ -189,13 +198,13 @@ long Transfer::getStatus() const {
 }
 
 // A peer that has answered may close the connection without listening to the end.
-bool Transfer::isAnswered() const {
+bool CurlTransfer::isAnswered() const {
     curl_off_t expected = -1;
     curl_easy_getinfo(easy.get(), CURLINFO_CONTENT_LENGTH_DOWNLOAD_T, &expected);
     return expected >= 0 && receivedBytes >= expected;
 }
 
-void Transfer::end(const TransferEnd& how) {
+void CurlTransfer::end(const TransferEnd& how) {
     const boost::shared_ptr<TransferListener> hearer = listener;
     abandon();
     if (hearer) {
@@ -203,7 +212,7 @@ void Transfer::end(const TransferEnd& how) {
     }
 }
 
-void Transfer::abandon() {
+void CurlTransfer::abandon() {
     if (listener && request->isChunked()) {
         request->getWriter()->setWakeUp({});
     }
@@ -215,13 +224,13 @@ void Transfer::abandon() {
 }
 
 // Writes may come faster than the network thread wakes up: one command serves them all.
-void Transfer::wake() {
+void CurlTransfer::wake() {
     if (!wakeUpPosted.exchange(true)) {
         transport->requestResume(shared_from_this());
     }
 }
 
-void Transfer::resume() {
+void CurlTransfer::resume() {
     wakeUpPosted = false;
     if (easy && paused) {
         paused = false;
@@ -230,7 +239,7 @@ void Transfer::resume() {
     }
 }
 
-std::size_t Transfer::readBody(char* data, std::size_t size) {
+std::size_t CurlTransfer::readBody(char* data, std::size_t size) {
     std::size_t count = 0;
     // Once the answer is there, nobody waits for the rest: an early end keeps the connection.
     const bool cutShort = headDelivered && request->isChunked();
@@ -248,13 +257,13 @@ std::size_t Transfer::readBody(char* data, std::size_t size) {
 }
 
 // While we have nothing to send, the peer owes us nothing, whatever it says.
-void Transfer::noteProgress() {
+void CurlTransfer::noteProgress() {
     if (!paused) {
         watchdog.progress();
     }
 }
 
-bool Transfer::handleHeadEnd() {
+bool CurlTransfer::handleHeadEnd() {
     const long status = getStatus();
     const bool interim = status < 200;
     const bool redirected = status >= 300 && status < 400 && request->getMethod() != "POST" &&
@@ -271,14 +280,14 @@ bool Transfer::handleHeadEnd() {
 
 // On a kept connection something may have arrived since the last answer: whatever it is, it would
 // be taken for the answer to this request. libcurl looks at that only since late versions.
-bool Transfer::canUseConnection(int ownPort) {
+bool CurlTransfer::canUseConnection(int ownPort) {
     long connectionsMade = 0;
     curl_easy_getinfo(easy.get(), CURLINFO_NUM_CONNECTS, &connectionsMade);
     needsNewConnection = connectionsMade == 0 && transport->getSockets().hasArrivals(ownPort);
     return !needsNewConnection;
 }
 
-bool Transfer::takeNewConnection() {
+bool CurlTransfer::takeNewConnection() {
     const bool needed = needsNewConnection;
     if (needed) {
         needsNewConnection = false;
@@ -289,33 +298,34 @@ bool Transfer::takeNewConnection() {
     return needed;
 }
 
-int Transfer::onConnection(void* self, char*, char*, int, int ownPort) {
+int CurlTransfer::onConnection(void* self, char*, char*, int, int ownPort) {
     return guardForCurl(CURL_PREREQFUNC_ABORT, [self, ownPort] {
-        return static_cast<Transfer*>(self)->canUseConnection(ownPort) ? CURL_PREREQFUNC_OK
-                                                                       : CURL_PREREQFUNC_ABORT;
+        return static_cast<CurlTransfer*>(self)->canUseConnection(ownPort) ? CURL_PREREQFUNC_OK
+                                                                           : CURL_PREREQFUNC_ABORT;
     });
 }
 
-std::size_t Transfer::onRead(char* data, std::size_t size, std::size_t count, void* self) {
-    return guardForCurl(std::size_t{CURL_READFUNC_ABORT},
-                        [=] { return static_cast<Transfer*>(self)->readBody(data, size * count); });
+std::size_t CurlTransfer::onRead(char* data, std::size_t size, std::size_t count, void* self) {
+    return guardForCurl(std::size_t{CURL_READFUNC_ABORT}, [=] {
+        return static_cast<CurlTransfer*>(self)->readBody(data, size * count);
+    });
 }
 
-int Transfer::onSeek(void* self, curl_off_t offset, int origin) {
+int CurlTransfer::onSeek(void* self, curl_off_t offset, int origin) {
     if (origin != SEEK_SET || offset < 0) {
         return CURL_SEEKFUNC_CANTSEEK;
     }
-    static_cast<Transfer*>(self)->body.seek(static_cast<std::size_t>(offset));
+    static_cast<CurlTransfer*>(self)->body.seek(static_cast<std::size_t>(offset));
     return CURL_SEEKFUNC_OK;
 }
 
-std::size_t Transfer::onHeader(char* data, std::size_t size, std::size_t count, void* self) {
+std::size_t CurlTransfer::onHeader(char* data, std::size_t size, std::size_t count, void* self) {
     return guardForCurl(std::size_t{0}, [=] {
-        return static_cast<Transfer*>(self)->takeHeaderLine(data, size * count);
+        return static_cast<CurlTransfer*>(self)->takeHeaderLine(data, size * count);
     });
 }
 
-std::size_t Transfer::takeHeaderLine(const char* data, std::size_t size) {
+std::size_t CurlTransfer::takeHeaderLine(const char* data, std::size_t size) {
     noteProgress();
     if (!head.hasRoom(size)) {
         kdLogMessage("Network: the head of a response is too large");
@@ -326,8 +336,8 @@ std::size_t Transfer::takeHeaderLine(const char* data, std::size_t size) {
     return isWanted ? size : 0;
 }
 
-std::size_t Transfer::onWrite(char* data, std::size_t size, std::size_t count, void* self) {
-    Transfer& transfer = *static_cast<Transfer*>(self);
+std::size_t CurlTransfer::onWrite(char* data, std::size_t size, std::size_t count, void* self) {
+    CurlTransfer& transfer = *static_cast<CurlTransfer*>(self);
     transfer.noteProgress();
     const std::size_t bytes = size * count;
     const auto* const start = reinterpret_cast<const unsigned char*>(data);
@@ -338,8 +348,9 @@ std::size_t Transfer::onWrite(char* data, std::size_t size, std::size_t count, v
     return bytes;
 }
 
-int Transfer::onProgress(void* self, curl_off_t, curl_off_t downNow, curl_off_t, curl_off_t upNow) {
-    Transfer& transfer = *static_cast<Transfer*>(self);
+int CurlTransfer::onProgress(void* self, curl_off_t, curl_off_t downNow, curl_off_t,
+                             curl_off_t upNow) {
+    CurlTransfer& transfer = *static_cast<CurlTransfer*>(self);
     const curl_off_t moved = downNow + upNow;
     if (moved != transfer.movedBytes) {
         transfer.movedBytes = moved;

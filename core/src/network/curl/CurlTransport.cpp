@@ -1,13 +1,14 @@
-#include "network/Transport.h"
+#include "network/curl/CurlTransport.h"
 
 #include <algorithm>
+#include <boost/make_shared.hpp>
 #include <chrono>
 #include <exception>
 #include <new>
 #include <utility>
 
 #include "core/network/NetworkTask.h"
-#include "network/Transfer.h"
+#include "network/curl/CurlTransfer.h"
 #include "pal/SignalsBlocked.h"
 #include "pal/kd_assert.h"
 #include "pal/kd_event.h"
@@ -52,7 +53,7 @@ class EventLockLoan {
     int levels = 0;
 };
 
-TransferEnd judge(const Transfer& transfer, CURLcode result) noexcept {
+TransferEnd judge(const CurlTransfer& transfer, CURLcode result) noexcept {
     try {
         return transfer.judge(result);
     } catch (const std::exception&) {
@@ -67,13 +68,13 @@ bool isTlsFailure(CURLcode result) {
 
 }  // namespace
 
-Transport::Transport() {
+CurlTransport::CurlTransport() {
     initialiseCurl();
 }
 
-Transport::~Transport() = default;
+CurlTransport::~CurlTransport() = default;
 
-bool Transport::post(std::function<void()> command) {
+bool CurlTransport::post(std::function<void()> command) {
     const std::lock_guard<std::mutex> lock(mutex);
     if (!takesCommands()) {
         return false;
@@ -83,7 +84,15 @@ bool Transport::post(std::function<void()> command) {
     return true;
 }
 
-void Transport::requestResume(const boost::shared_ptr<Transfer>& transfer) {
+boost::shared_ptr<Transfer> CurlTransport::makeTransfer(
+    const boost::shared_ptr<HttpRequest>& request,
+    const boost::shared_ptr<TransferListener>& listener) {
+    const auto transfer = boost::make_shared<CurlTransfer>(shared_from_this(), request, listener);
+    transfer->startWatchdog();
+    return transfer;
+}
+
+void CurlTransport::requestResume(const boost::shared_ptr<CurlTransfer>& transfer) {
     const std::lock_guard<std::mutex> lock(mutex);
     if (takesCommands()) {
         resumed.push_back(transfer);
@@ -91,32 +100,32 @@ void Transport::requestResume(const boost::shared_ptr<Transfer>& transfer) {
     }
 }
 
-bool Transport::takesCommands() {
+bool CurlTransport::takesCommands() {
     return !closed && kdEventsHaveEndedKOR() == 0 && launchThread();
 }
 
-void Transport::wakeFromOutside() {
+void CurlTransport::wakeFromOutside() {
     if (thread.get_id() != std::this_thread::get_id()) {
         wake();
     }
 }
 
 // A wake-up that fails is tried again with the next command.
-void Transport::wake() {
+void CurlTransport::wake() {
     awake = awake || curl_multi_wakeup(multi.get()) == CURLM_OK;
 }
 
-void Transport::requestCheck(const boost::shared_ptr<Transfer>& transfer) {
-    const boost::shared_ptr<Transport> self = shared_from_this();
+void CurlTransport::requestCheck(const boost::shared_ptr<CurlTransfer>& transfer) {
+    const boost::shared_ptr<CurlTransport> self = shared_from_this();
     post([self, transfer] { self->check(transfer); });
 }
 
-void Transport::setCertificateFile(const std::string& path) {
+void CurlTransport::setCertificateFile(const std::string& path) {
     const std::lock_guard<std::mutex> lock(mutex);
     certificateFile = path;
 }
 
-void Transport::stop() {
+void CurlTransport::stop() {
     {
         const std::lock_guard<std::mutex> lock(mutex);
         // Not earlier: the thread could end, and free what is woken here.
@@ -145,13 +154,13 @@ void Transport::stop() {
     }
 }
 
-bool Transport::waitForEnd() {
+bool CurlTransport::waitForEnd() {
     std::unique_lock<std::mutex> lock(mutex);
     return changed.wait_for(lock, STOP_LIMIT, [this] { return finished; });
 }
 
 // Without free descriptors libcurl makes a handle that cannot be woken: it is not kept.
-bool Transport::launchThread() {
+bool CurlTransport::launchThread() {
     if (thread.joinable()) {
         return true;
     }
@@ -162,7 +171,7 @@ bool Transport::launchThread() {
         return false;
     }
     const korvel_pal::SignalsBlocked signalsBlocked;
-    const boost::shared_ptr<Transport> self = shared_from_this();
+    const boost::shared_ptr<CurlTransport> self = shared_from_this();
     try {
         thread = std::thread([self] { self->run(); });
     } catch (const std::exception& error) {
@@ -173,7 +182,7 @@ bool Transport::launchThread() {
     return true;
 }
 
-void Transport::run() {
+void CurlTransport::run() {
     while (runCommands()) {
         perform();
         if (!isWanted()) {
@@ -189,14 +198,14 @@ void Transport::run() {
 }
 
 // The end counts, too: `stop` may have come before the last batch, without a wake-up of its own.
-bool Transport::isWanted() {
+bool CurlTransport::isWanted() {
     const std::lock_guard<std::mutex> lock(mutex);
     return !commands.empty() || !resumed.empty() || stopping;
 }
 
 // One batch at a time: transfers go on between commands that come in quick succession. The end
 // comes when nothing is left to run, so that each command that was accepted is run.
-bool Transport::runCommands() {
+bool CurlTransport::runCommands() {
     {
         const std::lock_guard<std::mutex> lock(mutex);
         awake = false;
@@ -217,14 +226,14 @@ bool Transport::runCommands() {
         }
     }
     currentCommands.clear();
-    for (const boost::shared_ptr<Transfer>& transfer : currentResumed) {
+    for (const boost::shared_ptr<CurlTransfer>& transfer : currentResumed) {
         transfer->resume();
     }
     currentResumed.clear();
     return true;
 }
 
-void Transport::perform() {
+void CurlTransport::perform() {
     int running = 0;
     curl_multi_perform(multi.get(), &running);
     int waiting = 0;
@@ -236,7 +245,7 @@ void Transport::perform() {
     }
 }
 
-void Transport::start(const boost::shared_ptr<Transfer>& transfer) {
+void CurlTransport::start(const boost::shared_ptr<CurlTransfer>& transfer) {
     std::string certificates;
     {
         const std::lock_guard<std::mutex> lock(mutex);
@@ -254,7 +263,7 @@ void Transport::start(const boost::shared_ptr<Transfer>& transfer) {
 }
 
 // Making a handle costs as much as the rest of a small request.
-CURL* Transport::takeHandle(const std::string& certificates) {
+CURL* CurlTransport::takeHandle(const std::string& certificates) {
     if (certificates != spareCertificateFile) {
         spareHandle.reset();
         spareCertificateFile = certificates;
@@ -262,7 +271,7 @@ CURL* Transport::takeHandle(const std::string& certificates) {
     return spareHandle ? spareHandle.release() : curl_easy_init();
 }
 
-bool Transport::setAuthorities(CURL* handle, const std::string& file) {
+bool CurlTransport::setAuthorities(CURL* handle, const std::string& file) {
     // How long libcurl may use what it has read.
     const long cacheS = hasFailedTls ? 0 : AUTHORITY_CACHE_S;
     // A libcurl that keeps nothing does not know the option.
@@ -276,15 +285,15 @@ bool Transport::setAuthorities(CURL* handle, const std::string& file) {
            curl_easy_setopt(handle, CURLOPT_CAPATH, nullptr) != CURLE_OUT_OF_MEMORY;
 }
 
-void Transport::giveBack(CURL* handle) {
+void CurlTransport::giveBack(CURL* handle) {
     // What the next request sets may be written there.
     curl_easy_setopt(handle, CURLOPT_ERRORBUFFER, nullptr);
     spareHandle.reset(handle);
 }
 
-void Transport::requestAbandon(const boost::shared_ptr<Transfer>& transfer) noexcept {
+void CurlTransport::requestAbandon(const boost::shared_ptr<CurlTransfer>& transfer) noexcept {
     try {
-        const boost::shared_ptr<Transport> self = shared_from_this();
+        const boost::shared_ptr<CurlTransport> self = shared_from_this();
         post([self, transfer] { self->abandon(transfer); });
     } catch (const std::exception&) {
         kdLogMessage("Network: no memory to end a transfer at once");
@@ -292,7 +301,7 @@ void Transport::requestAbandon(const boost::shared_ptr<Transfer>& transfer) noex
     }
 }
 
-void Transport::abandon(const boost::shared_ptr<Transfer>& transfer) {
+void CurlTransport::abandon(const boost::shared_ptr<CurlTransfer>& transfer) {
     const auto entry = find(transfer);
     if (entry != transfers.end()) {
         curl_multi_remove_handle(multi.get(), entry->first);
@@ -302,7 +311,7 @@ void Transport::abandon(const boost::shared_ptr<Transfer>& transfer) {
 }
 
 // What has arrived but was not looked at yet counts for the peer.
-void Transport::check(const boost::shared_ptr<Transfer>& transfer) {
+void CurlTransport::check(const boost::shared_ptr<CurlTransfer>& transfer) {
     perform();
     const auto entry = find(transfer);
     if (entry != transfers.end() && transfer->hasExpired()) {
@@ -310,8 +319,8 @@ void Transport::check(const boost::shared_ptr<Transfer>& transfer) {
     }
 }
 
-void Transport::finish(Transfers::iterator entry, CURLcode result) {
-    const boost::shared_ptr<Transfer> transfer = entry->second;
+void CurlTransport::finish(Transfers::iterator entry, CURLcode result) {
+    const boost::shared_ptr<CurlTransfer> transfer = entry->second;
     curl_multi_remove_handle(multi.get(), entry->first);
     if (transfer->takeNewConnection() &&
         curl_multi_add_handle(multi.get(), entry->first) == CURLM_OK) {
@@ -325,13 +334,14 @@ void Transport::finish(Transfers::iterator entry, CURLcode result) {
     transfer->end(how);
 }
 
-void Transport::finishAll() {
+void CurlTransport::finishAll() {
     while (!transfers.empty()) {
         finish(transfers.begin(), CURLE_ABORTED_BY_CALLBACK);
     }
 }
 
-Transport::Transfers::iterator Transport::find(const boost::shared_ptr<Transfer>& transfer) {
+CurlTransport::Transfers::iterator CurlTransport::find(
+    const boost::shared_ptr<CurlTransfer>& transfer) {
     return std::find_if(
         transfers.begin(), transfers.end(),
         [&transfer](const Transfers::value_type& entry) { return entry.second == transfer; });

@@ -10,47 +10,28 @@
 #include <memory>
 #include <string>
 
-#include "core/network/HttpRequest.h"
-#include "core/network/HttpResponse.h"
+#include "core/network/Transport.h"
 #include "network/RequestBody.h"
-#include "network/ResponseHead.h"
 #include "network/Watchdog.h"
+#include "network/curl/ResponseHead.h"
 
 namespace Network {
 
-class Transport;
-
-/** How a transfer ended. */
-struct TransferEnd {
-    int code = 0;       /**< as for `NetworkTask::onFinished` */
-    std::string reason; /**< why there was no complete response; empty when there was one */
-};
-
-/**
- * Hears of one transfer. All operations are called on the network thread without any lock, and none
- * throws.
- */
-class TransferListener {
-  public:
-    virtual ~TransferListener() = default;
-
-    /** @return false to end the transfer */
-    virtual bool onTransferHead(const boost::shared_ptr<HttpResponse>& response) = 0;
-    /** @return false to end the transfer */
-    virtual bool onTransferBytes(const unsigned char* bytes, std::size_t size) = 0;
-    virtual void onTransferEnd(const TransferEnd& how) = 0;
-};
+class CurlTransport;
 
 /**
  * One attempt of a request: a libcurl handle and its callbacks. Lives on the network thread, apart
  * from the operations that say otherwise.
  */
-class Transfer : public boost::enable_shared_from_this<Transfer> {
+class CurlTransfer : public Transfer, public boost::enable_shared_from_this<CurlTransfer> {
   public:
-    Transfer(boost::shared_ptr<Transport> transport, boost::shared_ptr<HttpRequest> request,
-             boost::shared_ptr<TransferListener> listener);
-    Transfer(const Transfer&) = delete;
-    Transfer& operator=(const Transfer&) = delete;
+    CurlTransfer(boost::shared_ptr<CurlTransport> transport, boost::shared_ptr<HttpRequest> request,
+                 boost::shared_ptr<TransferListener> listener);
+    CurlTransfer(const CurlTransfer&) = delete;
+    CurlTransfer& operator=(const CurlTransfer&) = delete;
+
+    void start() override;
+    void cancel() noexcept override;
 
     /** Starts to measure the time. Any thread, under the event lock. */
     void startWatchdog() { watchdog.start(); }
@@ -115,7 +96,7 @@ class Transfer : public boost::enable_shared_from_this<Transfer> {
     static int onProgress(void* self, curl_off_t downTotal, curl_off_t downNow, curl_off_t upTotal,
                           curl_off_t upNow);
 
-    const boost::shared_ptr<Transport> transport;
+    const boost::shared_ptr<CurlTransport> transport;
     const boost::shared_ptr<HttpRequest> request;
     boost::shared_ptr<TransferListener> listener;
     Watchdog watchdog;

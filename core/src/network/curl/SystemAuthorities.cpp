@@ -1,4 +1,4 @@
-#include "network/PlatformAuthorities.h"
+#include "network/curl/PlatformAuthorities.h"
 
 namespace Network {
 

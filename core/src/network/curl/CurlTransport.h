@@ -14,51 +14,43 @@
 #include <thread>
 #include <vector>
 
-#include "network/OpenSockets.h"
-#include "network/PlatformAuthorities.h"
+#include "core/network/Transport.h"
+#include "network/curl/OpenSockets.h"
+#include "network/curl/PlatformAuthorities.h"
 
 namespace Network {
 
-class Transfer;
+class CurlTransfer;
 
-/**
- * The network thread: runs commands and transfers. It never holds a lock of its own while a
- * command or a callback runs, so these may take the event lock.
- */
-class Transport : public boost::enable_shared_from_this<Transport> {
+/** The network thread: runs commands, and transfers by libcurl. */
+class CurlTransport : public Transport, public boost::enable_shared_from_this<CurlTransport> {
   public:
-    Transport();
-    ~Transport();
-    Transport(const Transport&) = delete;
-    Transport& operator=(const Transport&) = delete;
+    CurlTransport();
+    ~CurlTransport() override;
+    CurlTransport(const CurlTransport&) = delete;
+    CurlTransport& operator=(const CurlTransport&) = delete;
 
-    /**
-     * Has a command run on the network thread. Any thread; does not block.
-     * @return false when the command will not run: the transport is closed, or the system has no
-     *         thread or descriptors for it at the moment; the next call tries again
-     */
-    bool post(std::function<void()> command);
+    bool post(std::function<void()> command) override;
+
+    boost::shared_ptr<Transfer> makeTransfer(
+        const boost::shared_ptr<HttpRequest>& request,
+        const boost::shared_ptr<TransferListener>& listener) override;
+
+    /** Waits two seconds at most: a thread that hangs is left behind. */
+    void stop() override;
+
+    bool isStopping() const override { return stopping; }
+
+    void setCertificateFile(const std::string& path) override;
 
     /** Has the network thread look whether the peer keeps this transfer waiting. Any thread. */
-    void requestCheck(const boost::shared_ptr<Transfer>& transfer);
+    void requestCheck(const boost::shared_ptr<CurlTransfer>& transfer);
 
     /** Has a paused transfer look for more to send. Any thread. */
-    void requestResume(const boost::shared_ptr<Transfer>& transfer);
-
-    /**
-     * Ends all transfers and the thread, and waits for that, two seconds at most: a thread that
-     * hangs is left behind. The event lock, where the caller holds it, is lent to the network
-     * thread meanwhile.
-     */
-    void stop();
-
-    /** From the beginning of `stop` on. */
-    bool isStopping() const { return stopping; }
-
-    void setCertificateFile(const std::string& path);
+    void requestResume(const boost::shared_ptr<CurlTransfer>& transfer);
 
     /** Network thread only. */
-    void start(const boost::shared_ptr<Transfer>& transfer);
+    void start(const boost::shared_ptr<CurlTransfer>& transfer);
 
     /**
      * A handle, owned by the caller; null on failure. It keeps what its last request set, of the
@@ -80,10 +72,10 @@ class Transport : public boost::enable_shared_from_this<Transport> {
     OpenSockets& getSockets() { return sockets; }
 
     /** Has `abandon` called on the network thread. Any thread; does not block, and cannot fail. */
-    void requestAbandon(const boost::shared_ptr<Transfer>& transfer) noexcept;
+    void requestAbandon(const boost::shared_ptr<CurlTransfer>& transfer) noexcept;
 
     /** Network thread only; a transfer that is over or was never started is accepted. */
-    void abandon(const boost::shared_ptr<Transfer>& transfer);
+    void abandon(const boost::shared_ptr<CurlTransfer>& transfer);
 
   private:
     struct MultiDeleter {
@@ -92,7 +84,7 @@ class Transport : public boost::enable_shared_from_this<Transport> {
     struct EasyDeleter {
         void operator()(CURL* handle) const { curl_easy_cleanup(handle); }
     };
-    using Transfers = std::map<CURL*, boost::shared_ptr<Transfer>>;
+    using Transfers = std::map<CURL*, boost::shared_ptr<CurlTransfer>>;
 
     static constexpr long AUTHORITY_CACHE_S = 24L * 60 * 60;
 
@@ -105,16 +97,16 @@ class Transport : public boost::enable_shared_from_this<Transport> {
     bool isWanted();
     bool runCommands();
     void perform();
-    void check(const boost::shared_ptr<Transfer>& transfer);
+    void check(const boost::shared_ptr<CurlTransfer>& transfer);
     void finish(Transfers::iterator entry, CURLcode result);
     void finishAll();
-    Transfers::iterator find(const boost::shared_ptr<Transfer>& transfer);
+    Transfers::iterator find(const boost::shared_ptr<CurlTransfer>& transfer);
 
     std::mutex mutex;
     std::condition_variable changed;
     // Guarded by the mutex.
     std::vector<std::function<void()>> commands;
-    std::vector<boost::shared_ptr<Transfer>> resumed;
+    std::vector<boost::shared_ptr<CurlTransfer>> resumed;
     bool awake = false;  // a wake-up is on its way to the thread
     bool closed = false;
     bool finished = false;
@@ -134,7 +126,7 @@ class Transport : public boost::enable_shared_from_this<Transport> {
     Transfers transfers;
     // Kept for their room: sound that comes piece by piece needs none of its own.
     std::vector<std::function<void()>> currentCommands;
-    std::vector<boost::shared_ptr<Transfer>> currentResumed;
+    std::vector<boost::shared_ptr<CurlTransfer>> currentResumed;
 };
 
 }  // namespace Network

@@ -1,4 +1,4 @@
-#include "network/ResponseHead.h"
+#include "network/curl/ResponseHead.h"
 
 #include <boost/make_shared.hpp>
 
