@@ -1,3 +1,17 @@
+// The event thread does four things in turn: it runs what was posted, delivers the ends of
+// background work, fires timers, and sleeps. Each of them takes one batch, so that none can starve
+// the others, and each callback runs under the event lock of its own, so that other threads come in
+// between.
+//
+// Whoever gives the thread something to do sets `awake` under the mutex and signals. `sleep` looks
+// at `awake` under the same mutex, so no wake-up is lost. The signal is a condition variable's and
+// not a descriptor's: the engine has to work in processes that have run out of those.
+//
+// The threads start with the first use and are never stopped before the process ends. A start that
+// fails leaves nothing behind. At the end of the process `stop` waits, for a bounded time and
+// without the event lock, for the callback that runs. If that one does not return, the thread is
+// left behind, and `isBlocked` tells the owners of singletons to leave everything that it may still
+// use alone.
 #include "event_loop.h"
 
 #include <pthread.h>

@@ -1,3 +1,17 @@
+// Timers live in two structures under one mutex: `timers` knows each by its handle, and `queue`
+// holds those that wait, by due time and, where that is the same, in the order in which they were
+// started.
+//
+// On the real clock the event loop sleeps until the first entry is due (`timeToNext`) and then
+// fires what is due (`fireDue`). `loopWakesAt` is when it will wake by itself, so that `start`
+// wakes it only for a timer that is due earlier. On the hand-driven clock nothing sleeps;
+// `advanceManualClock` moves the clock from one due time to the next and calls on the thread that
+// moves it.
+//
+// A callback runs under the event lock and outside the mutex, so it may start and cancel timers.
+// The event lock is taken first and the due timer then: a timer that was cancelled under the event
+// lock never calls again. Entries move between `queue` and `keptEntries` as map nodes, so a timer
+// that has been started once needs no memory to run again.
 #include "timer_table.h"
 
 #include <algorithm>

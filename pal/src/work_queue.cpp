@@ -1,3 +1,10 @@
+// A piece of work goes from `waiting` over a worker to `completed`, and from there to the event
+// thread, which calls `done`, or `release` if the work was cancelled. An entry is its own link in
+// these lines, so that nothing can fail on the way once it has been accepted.
+//
+// Cancelling waits for nobody. Work that waits is completed at once; work that runs is only marked,
+// and its worker never looks at the mark. The mark belongs to the event lock, under which both the
+// canceller and `deliverOne` hold it, so exactly one of `done` and `release` is called.
 #include "work_queue.h"
 
 #include <pthread.h>

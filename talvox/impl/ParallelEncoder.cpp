@@ -1,3 +1,11 @@
+// The event thread writes buffers into the queue; one task at a time takes the first of them to a
+// worker, where the encoder encodes it, and comes back to the event thread (`taskDone`), which
+// hands on the output and starts the next. So the encoder is used by one thread at a time without a
+// lock, and the order stays. After `closeWrite` the end of the last task finishes the stream.
+//
+// Whatever is called from here, the request, the callback, the failure callback, may destroy this
+// object: such a call is the last thing that an operation does. The destructor cancels the task in
+// flight, and under the event lock that is enough for its end never to arrive.
 #include "talvox/impl/ParallelEncoder.h"
 
 #include <array>

@@ -1,3 +1,17 @@
+// An exchange has two sides. Its owner starts and cancels it under the event lock, on any thread.
+// The transport's thread runs the attempts, and takes the event lock for every call to the task.
+// Whoever comes with the lock first asks `mayDeliver`: after `cancel`, and once deliveries have
+// ended with the process, the task hears nothing any more, whatever the transport is still doing.
+//
+// An attempt goes from `postAttempt` over the transport's thread (`attempt`, `makeTransfer`) to the
+// transfer, which reports head, bytes and end. The end leads to another attempt, at once or when
+// the retry timer is due, or to `finish`. The task's end is told once, on the event thread or, for
+// holders that want it so, on the transport's.
+//
+// Each call from the transport may throw, because tasks are anybody's code: `callTask` turns that
+// into an end without a response and without a retry. Nothing is ever left without an end: an
+// attempt that cannot even be posted ends by the event thread, and an end that cannot be posted is
+// told where it was found.
 #include "network/Exchange.h"
 
 #include <algorithm>

@@ -1,3 +1,9 @@
+// The audio thread fills slots of the ring (`push`) and the event thread empties them (`take`). A
+// slot belongs to one of them at a time, and which one is a matter of the counters under the mutex,
+// so the bytes themselves are copied outside it. The audio thread allocates nothing and waits for
+// nobody but the mutex, which the other side holds for a few instructions only. If the event thread
+// falls behind by the whole ring, recording ends with an error: sound with a hole in it would be
+// recognised as something else.
 #include "core/sound/CaptureQueue.h"
 
 #include <algorithm>

@@ -1,3 +1,10 @@
+// Singletons end in the reverse order of their making, whatever the order of static objects is: the
+// list has them by age, and `EndOfLibrary`, a static object that is made with a class's first
+// instance, deletes that instance from it. Before the first of them goes, the platform layer ends
+// all deliveries (`endEventsFirst` has registered that at the process's exit), so that no callback
+// meets an engine that is half gone. All of this happens under the event lock. If a callback hangs
+// and keeps the lock for good, nothing is deleted: a leak at exit is harmless, a use after delete
+// is not.
 #include "core/util/Singleton.h"
 
 #include <algorithm>

@@ -1,3 +1,19 @@
+// One thread owns libcurl: the multi handle, the transfers, the connections that are kept, the
+// sockets. Other threads leave commands for it under the mutex and wake it; `awake` spares further
+// wake-ups until it has looked. It runs one batch of commands, lets libcurl do what sockets and
+// libcurl's timers ask for, ends the transfers that are over, and sleeps until there is more.
+// Nothing is polled for.
+//
+// The thread holds no lock while it runs a command or a callback, so that these may take the event
+// lock. The mutex may be taken under the event lock, never the other way round.
+//
+// The thread starts with the first command. Where the system has no thread or no descriptors for
+// it, `post` says so, and the next command tries again. `stop` lets it run what it has accepted,
+// ends every transfer without a response and closes the connections.
+//
+// How long a peer keeps us waiting is measured on the platform clock, by each transfer's watchdog.
+// When one is due on the event thread, this thread first takes what has arrived meanwhile
+// (`check`): an answer that lies in the socket is an answer in time.
 #include "network/curl/CurlTransport.h"
 
 #include <algorithm>
