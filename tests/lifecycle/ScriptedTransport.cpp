@@ -21,10 +21,9 @@ ScriptedTransport::~ScriptedTransport() {
 }
 
 void ScriptedTransport::install() {
-    static const boost::shared_ptr<ScriptedTransport> transport(new ScriptedTransport);
     Network::NetworkManager& network = Network::NetworkManager::getInstance();
-    if (network.getTransport() != transport) {
-        network.setTransport(transport);
+    if (!boost::dynamic_pointer_cast<ScriptedTransport>(network.getTransport())) {
+        network.setTransport(boost::shared_ptr<ScriptedTransport>(new ScriptedTransport));
     }
 }
 

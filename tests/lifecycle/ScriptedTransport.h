@@ -25,7 +25,7 @@ namespace Lifecycle {
 class ScriptedTransport : public Network::Transport,
                           public boost::enable_shared_from_this<ScriptedTransport> {
   public:
-    /** Has the network manager use one; once is enough for a process. */
+    /** Has the network manager use one, unless it does so. */
     static void install();
 
     ~ScriptedTransport() override;

@@ -9,6 +9,7 @@
 #include <functional>
 #include <string>
 
+#include "core/Export.h"
 #include "core/network/HttpRequest.h"
 #include "core/network/HttpResponse.h"
 
@@ -25,7 +26,7 @@ struct TransferEnd {
  * call. All operations are called on the transport's thread without any lock of its own, and none
  * throws.
  */
-class TransferListener {
+class KORVEL_CORE_API TransferListener {
   public:
     virtual ~TransferListener() = default;
 
@@ -37,7 +38,7 @@ class TransferListener {
 };
 
 /** One attempt of a request; made by its transport, which keeps it alive until it is over. */
-class Transfer {
+class KORVEL_CORE_API Transfer {
   public:
     virtual ~Transfer() = default;
 
@@ -59,7 +60,7 @@ class Transfer {
  * in for the network in tests. Holds no lock of its own while a command or a listener runs, so
  * these may take the event lock.
  */
-class Transport {
+class KORVEL_CORE_API Transport {
   public:
     virtual ~Transport() = default;
 
