@@ -3,7 +3,6 @@
 
 namespace FaultTest {
 
-using CloudTest::answerGoForward;
 using TestSupport::Answer;
 
 namespace {

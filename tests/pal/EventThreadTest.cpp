@@ -54,6 +54,7 @@ TEST(EventThread, RunsPostsInOrderOnOneThreadUnderTheLock) {
 TEST(EventThread, RunsEveryPostOfManyThreads) {
     int count = 0;  // under the event lock
     std::vector<std::thread> threads;
+    threads.reserve(4);
     for (int i = 0; i < 4; ++i) {
         threads.emplace_back([&count] {
             for (int j = 0; j < 500; ++j) {
@@ -149,6 +150,7 @@ TEST(EventLock, IsRecursiveAndKnowsItsHolder) {
 TEST(EventLock, SerialisesThreads) {
     int count = 0;
     std::vector<std::thread> threads;
+    threads.reserve(4);
     for (int i = 0; i < 4; ++i) {
         threads.emplace_back([&count] {
             for (int j = 0; j < 1000; ++j) {

@@ -72,6 +72,7 @@ TEST(Log, CallsTheSinkOneMessageAtATime) {
         },
         &sink);
     std::vector<std::thread> threads;
+    threads.reserve(4);
     for (int i = 0; i < 4; ++i) {
         threads.emplace_back([] {
             for (int j = 0; j < 200; ++j) {

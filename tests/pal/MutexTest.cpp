@@ -13,6 +13,7 @@ TEST(Mutex, ExcludesOtherThreads) {
     ASSERT_NE(mutex, nullptr);
     int count = 0;
     std::vector<std::thread> threads;
+    threads.reserve(4);
     for (int i = 0; i < 4; ++i) {
         threads.emplace_back([mutex, &count] {
             for (int j = 0; j < 1000; ++j) {

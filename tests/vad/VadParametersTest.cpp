@@ -55,7 +55,7 @@ std::vector<VadParameter> numbers() {
 /** Buffers of 21 s of faint noise with speech of 4 s after the first. */
 const std::vector<Sound::SoundDataBuffer>& soundWithSpeech() {
     static const std::vector<Sound::SoundDataBuffer> buffers = [] {
-        TestSupport::Samples sound(21 * 16000);
+        TestSupport::Samples sound(std::size_t{21} * 16000);
         const TestSupport::Samples& speech = TestSupport::speechLike(16000, 4000);
         std::copy(speech.begin(), speech.end(), sound.begin() + 16000);
         TestSupport::NoiseSource noise(3);
