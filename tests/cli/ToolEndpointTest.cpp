@@ -142,6 +142,22 @@ TEST_F(ToolEndpointTest, AgreesWithWhatASessionReports) {
     }
 }
 
+TEST_F(ToolEndpointTest, CountsASessionThatSpeechFillsToItsLimitAsNeverEnded) {
+    std::vector<int16_t> samples(RATE_HZ / 2);
+    const std::vector<int16_t> speech = TestSupport::voiceLike(RATE_HZ, 21);
+    samples.insert(samples.end(), speech.begin(), speech.end());
+    const ScratchDirectory one;
+    ASSERT_TRUE(TestSupport::writeSoundFile(one.path("a.wav"), SF_FORMAT_WAV | SF_FORMAT_PCM_16,
+                                            RATE_HZ, 1, samples));
+    one.write("a.txt", "0.5\t19.5\tspeech\n");
+    const ToolResult result = runTalvox({"endpoint", "score", one.path(), "--json"});
+    const Json all = lines(result.out).at(0);
+    EXPECT_EQ(all["missed"]["value"], 0.0);
+    EXPECT_EQ(all["early"]["value"], 0.0);
+    EXPECT_EQ(all["unended"]["value"], 1.0);
+    EXPECT_EQ(all["endLateMs"]["value"], "never");
+}
+
 TEST_F(ToolEndpointTest, FindsLabelsThatAreWrongByTenMilliseconds) {
     const Json before = row(score(), "quiet/far");
     for (int number = 0; number < 4; ++number) {
