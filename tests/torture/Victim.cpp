@@ -38,9 +38,9 @@
 extern "C" __attribute__((visibility("default"))) const char* __lsan_default_suppressions();
 
 // It knows the loader's own memory by its caller, which is the preloaded library here. TinyXML
-// loses the node that it reads when memory runs out, and OpenSSL what it collects at its first use.
+// loses the node that it reads when memory runs out.
 extern "C" const char* __lsan_default_suppressions() {
-    return "leak:ld-linux\nleak:TiXmlNode::Identify\nleak:libcrypto.so";
+    return "leak:ld-linux\nleak:TiXmlNode::Identify";
 }
 // NOLINTEND(bugprone-reserved-identifier)
 #endif
