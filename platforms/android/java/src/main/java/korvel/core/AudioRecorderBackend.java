@@ -2,6 +2,7 @@ package korvel.core;
 
 import java.io.IOException;
 import java.util.Objects;
+import org.jspecify.annotations.Nullable;
 
 /**
  * One recording of the native recorder: reads a {@link SoundInput} on a thread of its own and hands
@@ -19,7 +20,7 @@ public final class AudioRecorderBackend {
     private static volatile SoundInput.Factory factory = MICROPHONE;
 
     /** The thread of the newest recording. */
-    private static Thread newest;
+    private static @Nullable Thread newest;
 
     private final long recorder;
     private final int sampleRateHz;
@@ -41,7 +42,7 @@ public final class AudioRecorderBackend {
      *
      * @param inputs opens what is recorded from; null for the microphone
      */
-    public static void setInputFactory(SoundInput.Factory inputs) {
+    public static void setInputFactory(SoundInput.@Nullable Factory inputs) {
         factory = inputs != null ? inputs : MICROPHONE;
         installInternal();
     }
@@ -59,7 +60,7 @@ public final class AudioRecorderBackend {
         isStopped = true;
     }
 
-    private void run(Thread previous) {
+    private void run(@Nullable Thread previous) {
         reach(RecordingReport.State.OPENING);
         try {
             if (previous != null) {

@@ -2,6 +2,7 @@ package korvel.core;
 
 import android.app.Application;
 import android.content.Context;
+import org.jspecify.annotations.Nullable;
 
 /**
  * The Android application that the native libraries live in.
@@ -14,13 +15,13 @@ import android.content.Context;
 public final class CoreApplication {
     private static final long LAST_EVENT_WAIT_MS = 2000;
 
-    private static volatile Context installed;
+    private static volatile @Nullable Context installed;
     private static volatile boolean isLoaded;
 
     private CoreApplication() {}
 
     /** The application's context, or null outside Android. */
-    public static Context getApplicationContext() {
+    public static @Nullable Context getApplicationContext() {
         final Context context = installed;
         return context != null ? context : findApplication();
     }
@@ -52,7 +53,7 @@ public final class CoreApplication {
         }
     }
 
-    private static Context findApplication() {
+    private static @Nullable Context findApplication() {
         try {
             // Hidden, but in place since the first Android; there is no public way without a
             // context.

@@ -5,11 +5,12 @@ import android.hardware.Sensor;
 import android.hardware.SensorEvent;
 import android.hardware.SensorEventListener;
 import android.hardware.SensorManager;
+import org.jspecify.annotations.Nullable;
 
 /** The device's proximity sensor for the native library, which makes, starts and stops it. */
 final class ProximityBackend implements SensorEventListener {
     private final long source;
-    private SensorManager manager;
+    private @Nullable SensorManager manager;
 
     private ProximityBackend(long source) {
         this.source = source;

@@ -5,6 +5,7 @@ import android.net.ConnectivityManager;
 import android.net.Network;
 import android.net.NetworkCapabilities;
 import android.util.Log;
+import org.jspecify.annotations.Nullable;
 
 /** Tells the native library how the network is reached: by the default network's transport. */
 final class ReachabilityBackend extends ConnectivityManager.NetworkCallback {
@@ -15,9 +16,9 @@ final class ReachabilityBackend extends ConnectivityManager.NetworkCallback {
     /** The system's own view, where Android does not tell. */
     private static final int UNKNOWN = -1;
 
-    private static ConnectivityManager watched;
-    private static Context watchedFor;
-    private static ReachabilityBackend watcher;
+    private static @Nullable ConnectivityManager watched;
+    private static @Nullable Context watchedFor;
+    private static @Nullable ReachabilityBackend watcher;
 
     private ReachabilityBackend() {}
 
@@ -51,7 +52,7 @@ final class ReachabilityBackend extends ConnectivityManager.NetworkCallback {
     }
 
     private static void stop() {
-        if (watcher != null) {
+        if (watched != null && watcher != null) {
             try {
                 watched.unregisterNetworkCallback(watcher);
             } catch (IllegalArgumentException unknown) {
@@ -66,7 +67,7 @@ final class ReachabilityBackend extends ConnectivityManager.NetworkCallback {
         return network == null ? UNREACHABLE : classify(manager.getNetworkCapabilities(network));
     }
 
-    private static int classify(NetworkCapabilities capabilities) {
+    private static int classify(@Nullable NetworkCapabilities capabilities) {
         if (capabilities == null) {
             return METERED; // there is a network, of a kind that nobody knows
         }

@@ -1,6 +1,7 @@
 package korvel.core;
 
 import java.util.function.Supplier;
+import org.jspecify.annotations.Nullable;
 
 /**
  * What has become of the recording of one session. The recorder writes it before native code
@@ -21,9 +22,9 @@ public final class RecordingReport {
         FAILED
     }
 
-    private static final ThreadLocal<RecordingReport> STARTING = new ThreadLocal<>();
+    private static final ThreadLocal<@Nullable RecordingReport> STARTING = new ThreadLocal<>();
 
-    private volatile State state;
+    private volatile @Nullable State state;
     private volatile String failure = "";
 
     /** Runs {@code start} with this report for the recorder that is made inside. */
@@ -53,7 +54,7 @@ public final class RecordingReport {
     }
 
     /** Null if there has been no recorder. */
-    public State getState() {
+    public @Nullable State getState() {
         return state;
     }
 

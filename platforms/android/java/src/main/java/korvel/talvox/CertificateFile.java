@@ -9,6 +9,7 @@ import java.io.InputStream;
 import java.nio.charset.StandardCharsets;
 import java.security.cert.CertificateException;
 import java.security.cert.CertificateFactory;
+import org.jspecify.annotations.Nullable;
 
 /** A file of certificates in PEM form, looked at before the network layer uses it. */
 final class CertificateFile {
@@ -73,7 +74,8 @@ final class CertificateFile {
         return bytes.toString("ISO-8859-1");
     }
 
-    private static IllegalArgumentException refusal(File file, String reason, Exception cause) {
+    private static IllegalArgumentException refusal(
+            File file, String reason, @Nullable Exception cause) {
         return new IllegalArgumentException("certificate file " + file + ": " + reason, cause);
     }
 }

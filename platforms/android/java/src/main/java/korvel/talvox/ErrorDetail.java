@@ -3,6 +3,7 @@ package korvel.talvox;
 import java.util.Objects;
 import java.util.regex.Matcher;
 import java.util.regex.Pattern;
+import org.jspecify.annotations.Nullable;
 
 /**
  * What is known of the cause of an error, for developers: log it, count it, but do not show it to
@@ -17,12 +18,15 @@ public final class ErrorDetail {
             Pattern.compile("^(?:[^;]*\\()?HTTP status (\\d{3})");
 
     private final String reason;
-    private final Integer httpStatus;
-    private final Integer deviceError;
-    private final RecorderState recorderState;
+    private final @Nullable Integer httpStatus;
+    private final @Nullable Integer deviceError;
+    private final @Nullable RecorderState recorderState;
 
     ErrorDetail(
-            String reason, Integer httpStatus, Integer deviceError, RecorderState recorderState) {
+            String reason,
+            @Nullable Integer httpStatus,
+            @Nullable Integer deviceError,
+            @Nullable RecorderState recorderState) {
         this.reason = reason;
         this.httpStatus = httpStatus;
         this.deviceError = deviceError;
@@ -30,7 +34,7 @@ public final class ErrorDetail {
     }
 
     /** The status of the gateway's answer that a reason of the network layer names; or null. */
-    static Integer findHttpStatus(String reason) {
+    static @Nullable Integer findHttpStatus(String reason) {
         final Matcher matcher = HTTP_STATUS.matcher(reason);
         return matcher.find() ? Integer.valueOf(matcher.group(1)) : null;
     }
@@ -47,7 +51,7 @@ public final class ErrorDetail {
     }
 
     /** The HTTP status of the gateway's answer; null if the session ended without an answer. */
-    public Integer getHttpStatus() {
+    public @Nullable Integer getHttpStatus() {
         return httpStatus;
     }
 
@@ -56,7 +60,7 @@ public final class ErrorDetail {
      * android.speech.SpeechRecognizer}; null if the device recognizer did not serve, or reported no
      * number.
      */
-    public Integer getDeviceError() {
+    public @Nullable Integer getDeviceError() {
         return deviceError;
     }
 
@@ -64,12 +68,12 @@ public final class ErrorDetail {
      * What the engine's recorder had reached when the session ended or stopped it; null if the
      * session had no recorder. The device recognizer records by itself.
      */
-    public RecorderState getRecorderState() {
+    public @Nullable RecorderState getRecorderState() {
         return recorderState;
     }
 
     @Override
-    public boolean equals(Object other) {
+    public boolean equals(@Nullable Object other) {
         if (!(other instanceof ErrorDetail)) {
             return false;
         }

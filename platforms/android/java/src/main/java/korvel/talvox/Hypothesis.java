@@ -1,5 +1,7 @@
 package korvel.talvox;
 
+import org.jspecify.annotations.Nullable;
+
 /** One thing that may have been said. Immutable. */
 public final class Hypothesis {
     private static final float UNKNOWN = -1.0f;
@@ -28,7 +30,7 @@ public final class Hypothesis {
     }
 
     @Override
-    public boolean equals(Object other) {
+    public boolean equals(@Nullable Object other) {
         return other instanceof Hypothesis
                 && text.equals(((Hypothesis) other).text)
                 && Float.compare(confidence, ((Hypothesis) other).confidence) == 0;

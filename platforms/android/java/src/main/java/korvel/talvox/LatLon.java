@@ -1,5 +1,7 @@
 package korvel.talvox;
 
+import org.jspecify.annotations.Nullable;
+
 /** A position in degrees, kept in single precision as the engine does. Immutable. */
 public final class LatLon {
     private final float latitude;
@@ -22,7 +24,7 @@ public final class LatLon {
     }
 
     @Override
-    public boolean equals(Object other) {
+    public boolean equals(@Nullable Object other) {
         return other instanceof LatLon
                 && Float.compare(latitude, ((LatLon) other).latitude) == 0
                 && Float.compare(longitude, ((LatLon) other).longitude) == 0;

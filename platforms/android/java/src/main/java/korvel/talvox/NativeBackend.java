@@ -12,6 +12,7 @@ import korvel.talvox.impl.EngineBackend;
 import korvel.talvox.impl.PlatformRecognizer;
 import korvel.talvox.impl.Talvox;
 import korvel.talvox.util.LogCollector;
+import org.jspecify.annotations.Nullable;
 
 /** The native engine. */
 final class NativeBackend implements EngineBackend {
@@ -68,7 +69,7 @@ final class NativeBackend implements EngineBackend {
     }
 
     @Override
-    public void setCertificateFile(File file) {
+    public void setCertificateFile(@Nullable File file) {
         if (file != null) {
             CertificateFile.check(file);
         }

@@ -5,42 +5,50 @@ import korvel.talvox.impl.DeviceFailure;
 import korvel.talvox.impl.EngineBackend;
 import korvel.talvox.impl.NativeHandle;
 import korvel.talvox.impl.Recognizer;
+import org.jspecify.annotations.Nullable;
 
 /**
  * A session of the native engine: turns the numbers of its events into values, and puts together what
  * is known of an error. Native code calls it under the event lock.
  */
-final class NativeSession implements Recognizer.Events, EngineBackend.Running {
+final class NativeSession implements Recognizer.Events {
     private final EngineBackend.Events events;
     private final RecordingReport recording = new RecordingReport();
-    private volatile NativeHandle handle;
     private String errorReason = "";
 
     private NativeSession(EngineBackend.Events events) {
         this.events = events;
     }
 
-    static NativeSession start(long engine, TalvoxSettings settings, EngineBackend.Events events) {
+    static EngineBackend.Running start(
+            long engine, TalvoxSettings settings, EngineBackend.Events events) {
         final NativeSession session = new NativeSession(events);
-        session.handle =
+        return new Started(
                 session.recording.during(
-                        () -> Recognizer.start(engine, settings.toBundle(), session));
-        return session;
+                        () -> Recognizer.start(engine, settings.toBundle(), session)));
     }
 
-    @Override
-    public void stop() {
-        Recognizer.stop(handle);
-    }
+    private static final class Started implements EngineBackend.Running {
+        private final NativeHandle handle;
 
-    @Override
-    public void cancel() {
-        Recognizer.cancel(handle);
-    }
+        Started(NativeHandle handle) {
+            this.handle = handle;
+        }
 
-    @Override
-    public void close() {
-        handle.close();
+        @Override
+        public void stop() {
+            Recognizer.stop(handle);
+        }
+
+        @Override
+        public void cancel() {
+            Recognizer.cancel(handle);
+        }
+
+        @Override
+        public void close() {
+            handle.close();
+        }
     }
 
     @Override
@@ -80,7 +88,7 @@ final class NativeSession implements Recognizer.Events, EngineBackend.Running {
         events.onError(error, describe(error, device));
     }
 
-    private ErrorDetail describe(SpeechError error, DeviceFailure device) {
+    private ErrorDetail describe(SpeechError error, @Nullable DeviceFailure device) {
         return new ErrorDetail(
                 findReason(error, device),
                 error == SpeechError.NETWORK ? ErrorDetail.findHttpStatus(errorReason) : null,
@@ -89,7 +97,7 @@ final class NativeSession implements Recognizer.Events, EngineBackend.Running {
     }
 
     /** Native code knows that the recorder or the device recognizer has failed, but not why. */
-    private String findReason(SpeechError error, DeviceFailure device) {
+    private String findReason(SpeechError error, @Nullable DeviceFailure device) {
         if (device != null && errorReason.isEmpty()) {
             return device.getReason();
         }

@@ -3,6 +3,7 @@ package korvel.talvox;
 import java.util.ArrayList;
 import java.util.Collections;
 import java.util.List;
+import org.jspecify.annotations.Nullable;
 
 /** What was recognised. Immutable. */
 public final class Recognition {
@@ -47,7 +48,7 @@ public final class Recognition {
     }
 
     @Override
-    public boolean equals(Object other) {
+    public boolean equals(@Nullable Object other) {
         if (!(other instanceof Recognition)) {
             return false;
         }

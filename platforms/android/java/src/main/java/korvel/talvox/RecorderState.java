@@ -1,6 +1,7 @@
 package korvel.talvox;
 
 import korvel.core.RecordingReport;
+import org.jspecify.annotations.Nullable;
 
 /** What the engine's recorder had reached in a session, or why it failed. */
 public enum RecorderState {
@@ -26,7 +27,7 @@ public enum RecorderState {
     }
 
     /** Null for null. */
-    static RecorderState of(RecordingReport.State reported) {
+    static @Nullable RecorderState of(RecordingReport.@Nullable State reported) {
         for (RecorderState state : values()) {
             if (state.reported == reported) {
                 return state;

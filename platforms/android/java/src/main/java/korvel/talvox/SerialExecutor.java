@@ -4,6 +4,7 @@ import android.util.Log;
 import java.util.ArrayDeque;
 import java.util.Queue;
 import java.util.concurrent.Executor;
+import org.jspecify.annotations.Nullable;
 
 /**
  * Runs tasks on another executor, one at a time and in order, whatever that executor does.
@@ -37,7 +38,7 @@ final class SerialExecutor implements Executor {
     /** A turn, taken once: by the executor, or by this class if the executor has thrown first. */
     private final class Turn implements Runnable {
         private boolean taken;
-        private Throwable failure;
+        private @Nullable Throwable failure;
 
         @Override
         public void run() {

@@ -3,6 +3,7 @@ package korvel.talvox;
 import android.util.Log;
 import java.util.concurrent.Executor;
 import korvel.talvox.impl.EngineBackend;
+import org.jspecify.annotations.Nullable;
 
 /**
  * One recognition from start to close: takes the events of the engine and hands them to the
@@ -13,8 +14,8 @@ final class Session implements EngineBackend.Events {
 
     private final RecognitionListener listener;
     private final SerialExecutor executor;
-    private Object owner;
-    private EngineBackend.Running handle;
+    private @Nullable Object owner;
+    private EngineBackend.@Nullable Running handle;
     private boolean stopWanted;
     private boolean cancelWanted;
     private volatile String errorReason = "";
@@ -73,7 +74,7 @@ final class Session implements EngineBackend.Events {
     }
 
     void stop() {
-        final EngineBackend.Running running;
+        final EngineBackend.@Nullable Running running;
         synchronized (this) {
             running = handle;
             stopWanted = true;
@@ -84,7 +85,7 @@ final class Session implements EngineBackend.Events {
     }
 
     void cancel() {
-        final EngineBackend.Running running;
+        final EngineBackend.@Nullable Running running;
         synchronized (this) {
             running = handle;
             cancelWanted = true;
@@ -95,7 +96,7 @@ final class Session implements EngineBackend.Events {
     }
 
     void close() {
-        final EngineBackend.Running running;
+        final EngineBackend.@Nullable Running running;
         synchronized (this) {
             running = handle;
             closed = true;

@@ -2,6 +2,7 @@ package korvel.talvox;
 
 import java.nio.charset.StandardCharsets;
 import java.util.Locale;
+import org.jspecify.annotations.Nullable;
 
 /** What a value of a setting must be. Each check returns its complaint, or null for a good value. */
 final class SettingChecks {
@@ -13,7 +14,7 @@ final class SettingChecks {
     /** Judges a value. */
     interface Check<T> {
         /** What is wrong, to follow the key's name; null if nothing is. */
-        String findFault(T value);
+        @Nullable String findFault(T value);
     }
 
     static <T> Check<T> none() {
@@ -42,17 +43,17 @@ final class SettingChecks {
                         : "must be a number of 0 or more, not " + value;
     }
 
-    static String position(LatLon value) {
+    static @Nullable String position(LatLon value) {
         return Math.abs(value.getLatitude()) <= 90 && Math.abs(value.getLongitude()) <= 180
                 ? null
                 : "must be from -90 to 90 and from -180 to 180 degrees, not " + value;
     }
 
-    static String notEmpty(String value) {
+    static @Nullable String notEmpty(String value) {
         return value.isEmpty() ? "must not be empty" : null;
     }
 
-    static String uuid(String value) {
+    static @Nullable String uuid(String value) {
         final int size = value.getBytes(StandardCharsets.UTF_8).length;
         return size == UUID_BYTES
                 ? partOfAddress(value)
@@ -60,14 +61,14 @@ final class SettingChecks {
     }
 
     /** A text that is appended to an address. Not all that ends it: no request would be sent. */
-    static String partOfAddress(String value) {
+    static @Nullable String partOfAddress(String value) {
         return value.chars().anyMatch(c -> isBlankOrControl(c) || c == '#')
                 ? "must hold neither blanks nor control characters nor #: " + quote(value)
                 : null;
     }
 
     /** The network layer's own conditions for an address, and a port that exists. */
-    static String address(String value) {
+    static @Nullable String address(String value) {
         final String fault = partOfAddress(value);
         if (fault != null) {
             return fault;

@@ -3,6 +3,7 @@ package korvel.talvox;
 import android.location.Location;
 import android.os.Bundle;
 import java.util.Objects;
+import org.jspecify.annotations.Nullable;
 
 /**
  * The name of a setting together with the type of its values. The keys are the constants of {@link
@@ -59,7 +60,7 @@ public abstract class SettingKey<T> {
     abstract void put(Bundle bundle, T value);
 
     /** The value in the bundle; null if it is not there or of another type. */
-    abstract T get(Bundle bundle);
+    abstract @Nullable T get(Bundle bundle);
 
     static SettingKey<Boolean> ofBoolean(
             String name, Level level, SettingChecks.Check<Boolean> check) {
@@ -90,7 +91,7 @@ public abstract class SettingKey<T> {
             }
 
             @Override
-            E get(Bundle bundle) {
+            @Nullable E get(Bundle bundle) {
                 final String text = read(bundle, getName(), String.class);
                 for (E value : values) {
                     if (value.getText().equals(text)) {
@@ -113,7 +114,7 @@ public abstract class SettingKey<T> {
             }
 
             @Override
-            LatLon get(Bundle bundle) {
+            @Nullable LatLon get(Bundle bundle) {
                 final Location location = read(bundle, getName(), Location.class);
                 return location == null
                         ? null
@@ -140,14 +141,14 @@ public abstract class SettingKey<T> {
             }
 
             @Override
-            V get(Bundle bundle) {
+            @Nullable V get(Bundle bundle) {
                 return read(bundle, getName(), type);
             }
         };
     }
 
     @SuppressWarnings("deprecation") // the typed forms of Bundle.get are younger than API 24
-    private static <V> V read(Bundle bundle, String name, Class<V> type) {
+    private static <V> @Nullable V read(Bundle bundle, String name, Class<V> type) {
         final Object value = bundle.get(name);
         return type.isInstance(value) ? type.cast(value) : null;
     }

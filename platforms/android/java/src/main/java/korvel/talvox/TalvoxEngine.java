@@ -9,6 +9,7 @@ import korvel.core.CoreApplication;
 import korvel.talvox.impl.EngineBackend;
 import korvel.talvox.impl.PlatformRecognizer;
 import korvel.talvox.impl.Talvox;
+import org.jspecify.annotations.Nullable;
 
 /**
  * The speech-recognition engine. There is one per process, which lives as long as the process.
@@ -16,10 +17,10 @@ import korvel.talvox.impl.Talvox;
  * <p>Any thread may call any method; none waits for the network or a device.
  */
 public final class TalvoxEngine {
-    private static TalvoxEngine instance;
+    private static @Nullable TalvoxEngine instance;
 
     /** Takes the place of the native engine in an application's tests. */
-    private static volatile TalvoxEngine substitute;
+    private static volatile @Nullable TalvoxEngine substitute;
 
     private final EngineBackend backend;
 
@@ -53,7 +54,7 @@ public final class TalvoxEngine {
     }
 
     /** For the test kit: null for the native engine. */
-    static void substitute(TalvoxEngine engine) {
+    static void substitute(@Nullable TalvoxEngine engine) {
         substitute = engine;
     }
 
@@ -99,7 +100,7 @@ public final class TalvoxEngine {
      * @throws IllegalArgumentException if the file is missing, cannot be read, holds no certificate
      *     or a broken one; what was trusted before stays trusted
      */
-    public void setCertificateFile(File file) {
+    public void setCertificateFile(@Nullable File file) {
         backend.setCertificateFile(file);
     }
 

@@ -3,6 +3,7 @@ package korvel.talvox;
 import java.util.concurrent.Executor;
 import korvel.talvox.impl.EngineBackend;
 import korvel.talvox.impl.SafetyNet;
+import org.jspecify.annotations.Nullable;
 
 /**
  * One recognition: created by {@link TalvoxEngine#createRecognizer}, started once, closed when it is
@@ -23,7 +24,7 @@ public final class TalvoxRecognizer implements AutoCloseable {
     private final EngineBackend engine;
     private final TalvoxSettings settings;
     private final Session session;
-    private SafetyNet.Watch watch;
+    private SafetyNet.@Nullable Watch watch;
     private State state = State.NEW;
 
     TalvoxRecognizer(

@@ -7,6 +7,7 @@ import java.util.HashMap;
 import java.util.List;
 import java.util.Map;
 import java.util.Objects;
+import org.jspecify.annotations.Nullable;
 
 /**
  * Settings of the engine or of one recognition: those that were set, nothing else. What is not set
@@ -229,7 +230,7 @@ public final class TalvoxSettings {
      * @return null if it is not set, or if the engine's XML settings gave it a text that none of the
      *     constants stands for
      */
-    public <T> T get(SettingKey<T> key) {
+    public <T> @Nullable T get(SettingKey<T> key) {
         return values.get(Objects.requireNonNull(key, "key"));
     }
 
@@ -257,7 +258,7 @@ public final class TalvoxSettings {
         private final Map<SettingKey<?>, Object> byKey = new HashMap<>();
 
         /** Holds what has no value above; null without such a bundle. */
-        private final Bundle received;
+        private final @Nullable Bundle received;
 
         Values() {
             received = null;
@@ -278,7 +279,7 @@ public final class TalvoxSettings {
         }
 
         @SuppressWarnings("unchecked") // set() puts only values of the key's type
-        <T> T get(SettingKey<T> key) {
+        <T> @Nullable T get(SettingKey<T> key) {
             if (byKey.containsKey(key)) {
                 return (T) byKey.get(key);
             }
@@ -305,7 +306,10 @@ public final class TalvoxSettings {
         }
 
         private <T> void put(Bundle bundle, SettingKey<T> key) {
-            key.put(bundle, get(key));
+            final T value = get(key);
+            if (value != null) {
+                key.put(bundle, value);
+            }
         }
     }
 

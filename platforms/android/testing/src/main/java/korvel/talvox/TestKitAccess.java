@@ -2,8 +2,11 @@ package korvel.talvox;
 
 import java.util.List;
 import korvel.talvox.impl.EngineBackend;
+import org.jspecify.annotations.NullMarked;
+import org.jspecify.annotations.Nullable;
 
 /** What the test kit needs of the kit's package-private parts. For korvel.talvox.testing alone. */
+@NullMarked
 public final class TestKitAccess {
     private TestKitAccess() {}
 
@@ -12,7 +15,7 @@ public final class TestKitAccess {
     }
 
     /** From now on {@link TalvoxEngine#getInstance} returns this engine; null for the native one. */
-    public static void substitute(TalvoxEngine engine) {
+    public static void substitute(@Nullable TalvoxEngine engine) {
         TalvoxEngine.substitute(engine);
     }
 
@@ -26,7 +29,10 @@ public final class TestKitAccess {
     }
 
     public static ErrorDetail makeErrorDetail(
-            String reason, Integer httpStatus, Integer deviceError, RecorderState recorderState) {
+            String reason,
+            @Nullable Integer httpStatus,
+            @Nullable Integer deviceError,
+            @Nullable RecorderState recorderState) {
         return new ErrorDetail(reason, httpStatus, deviceError, recorderState);
     }
 }

@@ -1,17 +1,19 @@
 package korvel.talvox.impl;
 
+import org.jspecify.annotations.Nullable;
+
 /**
  * What the device recognizer reported, on its way to the session. Native code has room for the
  * engine's error alone, but calls the session on the thread that reports the failure, before that
  * call returns. So the failure waits on the thread for the session to take it.
  */
 public final class DeviceFailure {
-    private static final ThreadLocal<DeviceFailure> REPORTED = new ThreadLocal<>();
+    private static final ThreadLocal<@Nullable DeviceFailure> REPORTED = new ThreadLocal<>();
 
-    private final Integer number;
+    private final @Nullable Integer number;
     private final String reason;
 
-    private DeviceFailure(Integer number, String reason) {
+    private DeviceFailure(@Nullable Integer number, String reason) {
         this.number = number;
         this.reason = reason;
     }
@@ -41,14 +43,14 @@ public final class DeviceFailure {
      * The failure that this thread reports, once: what ends inside the same call, but later, has
      * other causes. Null if there is none.
      */
-    public static DeviceFailure take() {
+    public static @Nullable DeviceFailure take() {
         final DeviceFailure failure = REPORTED.get();
         REPORTED.remove();
         return failure;
     }
 
     /** The error number of the device recognizer; null if it has reported none. */
-    public Integer getNumber() {
+    public @Nullable Integer getNumber() {
         return number;
     }
 

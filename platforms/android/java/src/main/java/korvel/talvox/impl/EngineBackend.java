@@ -7,6 +7,7 @@ import korvel.talvox.ErrorDetail;
 import korvel.talvox.Recognition;
 import korvel.talvox.SpeechError;
 import korvel.talvox.TalvoxSettings;
+import org.jspecify.annotations.Nullable;
 
 /**
  * What lies below {@code TalvoxEngine} and its recognizers: the native engine, or the scripted one of
@@ -52,7 +53,7 @@ public interface EngineBackend {
     void updateSettingsFromXml(String xml);
 
     /** Null for the authorities of the system. */
-    void setCertificateFile(File file);
+    void setCertificateFile(@Nullable File file);
 
     boolean isRecognitionAvailable(TalvoxSettings settings);
 

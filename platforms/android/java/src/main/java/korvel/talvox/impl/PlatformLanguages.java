@@ -11,6 +11,7 @@ import android.speech.RecognizerIntent;
 import android.util.Log;
 import java.util.ArrayList;
 import java.util.Collections;
+import org.jspecify.annotations.Nullable;
 
 /**
  * The languages of the device recognizer: asked for by an ordered broadcast, kept from then on.
@@ -23,7 +24,7 @@ final class PlatformLanguages {
     private String preference = "";
 
     /** Who has asked and has not been answered with nothing. */
-    private Context asker;
+    private @Nullable Context asker;
 
     /** Asks, unless that has been done; after an empty answer it is done again. */
     void query(Context context) {

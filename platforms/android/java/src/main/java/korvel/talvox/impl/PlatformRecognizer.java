@@ -20,6 +20,7 @@ import korvel.core.CoreApplication;
 import korvel.talvox.RecognitionModel;
 import korvel.talvox.SpeechError;
 import korvel.talvox.TalvoxSettings;
+import org.jspecify.annotations.Nullable;
 
 /**
  * Drives the device recognizer for the native recognizer of the same name, which creates,
@@ -44,7 +45,7 @@ public final class PlatformRecognizer {
     private volatile boolean over;
 
     /** Of the main looper. */
-    private SpeechRecognizer speech;
+    private @Nullable SpeechRecognizer speech;
 
     /** Called by native code. */
     PlatformRecognizer(long recognizer, Bundle settings) {
@@ -228,7 +229,7 @@ public final class PlatformRecognizer {
         }
 
         @Override
-        public void onBufferReceived(byte[] sound) {
+        public void onBufferReceived(byte @Nullable [] sound) {
             if (sound != null) {
                 report(() -> onBufferReceivedInternal(recognizer, sound));
             }
@@ -240,18 +241,18 @@ public final class PlatformRecognizer {
         }
 
         @Override
-        public void onPartialResults(Bundle results) {
+        public void onPartialResults(@Nullable Bundle results) {
             final ReceivedBundle received = new ReceivedBundle(results);
             final ReceivedBundle.Texts texts = texts(received);
-            final float[] scores = scores(received, texts);
+            final float @Nullable [] scores = scores(received, texts);
             report(() -> onPartialResultsInternal(recognizer, texts.toArray(), scores));
         }
 
         @Override
-        public void onResults(Bundle results) {
+        public void onResults(@Nullable Bundle results) {
             final ReceivedBundle received = new ReceivedBundle(results);
             final ReceivedBundle.Texts texts = texts(received);
-            final float[] scores = scores(received, texts);
+            final float @Nullable [] scores = scores(received, texts);
             texts.logOmitted();
             if (texts.toArray().length == 0) {
                 finish(() -> onErrorInternal(recognizer, PlatformErrors.NO_HYPOTHESIS));
@@ -278,7 +279,7 @@ public final class PlatformRecognizer {
         return results.getTexts(SpeechRecognizer.RESULTS_RECOGNITION);
     }
 
-    private static float[] scores(ReceivedBundle results, ReceivedBundle.Texts texts) {
+    private static float @Nullable [] scores(ReceivedBundle results, ReceivedBundle.Texts texts) {
         return texts.align(results.getFloats(SpeechRecognizer.CONFIDENCE_SCORES));
     }
 
@@ -293,9 +294,10 @@ public final class PlatformRecognizer {
     private static native void onEndOfSpeechInternal(long recognizer);
 
     private static native void onPartialResultsInternal(
-            long recognizer, String[] texts, float[] scores);
+            long recognizer, String[] texts, float @Nullable [] scores);
 
-    private static native void onResultsInternal(long recognizer, String[] texts, float[] scores);
+    private static native void onResultsInternal(
+            long recognizer, String[] texts, float @Nullable [] scores);
 
     private static native void onErrorInternal(long recognizer, int code);
 

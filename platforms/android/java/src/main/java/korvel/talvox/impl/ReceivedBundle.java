@@ -7,6 +7,7 @@ import java.util.BitSet;
 import java.util.Collections;
 import java.util.List;
 import java.util.function.Function;
+import org.jspecify.annotations.Nullable;
 
 /**
  * A bundle that another application sent. It may hold anything: a value of another type than asked
@@ -18,7 +19,7 @@ final class ReceivedBundle {
     private final Bundle bundle;
 
     /** @param bundle null counts as empty */
-    ReceivedBundle(Bundle bundle) {
+    ReceivedBundle(@Nullable Bundle bundle) {
         this.bundle = bundle != null ? bundle : Bundle.EMPTY;
     }
 
@@ -37,11 +38,12 @@ final class ReceivedBundle {
     }
 
     /** The numbers, or null. */
-    float[] getFloats(String key) {
+    float @Nullable [] getFloats(String key) {
         return read(key, bundle::getFloatArray);
     }
 
-    private static <T> T read(String key, Function<String, T> getter) {
+    private static <T> @Nullable T read(
+            String key, Function<String, @Nullable T> getter) {
         try {
             return getter.apply(key);
         } catch (RuntimeException unreadable) {
@@ -81,7 +83,7 @@ final class ReceivedBundle {
          * @param scores one for each entry of the list, or null
          * @return null if there is not one score for each entry
          */
-        float[] align(float[] scores) {
+        float @Nullable [] align(float @Nullable [] scores) {
             if (scores == null || scores.length != size) {
                 return null;
             }

@@ -61,6 +61,8 @@ public final class ProximityGestureRecognizer implements AutoCloseable {
      * @throws IllegalStateException if this is closed
      */
     public void addGesture(String name, String pattern) {
+        Objects.requireNonNull(name, "name");
+        Objects.requireNonNull(pattern, "pattern");
         use("addGesture", recognizer -> addGesture(recognizer, name, pattern));
     }
 

@@ -2,6 +2,7 @@ package korvel.talvox.util;
 
 import android.os.Bundle;
 import java.io.File;
+import java.util.Objects;
 import korvel.talvox.impl.NativeLibrary;
 
 /**
@@ -89,6 +90,7 @@ public final class LogCollector {
      * @throws IllegalArgumentException if a bound is out of range
      */
     public static boolean openStore(File folder, long maxBytes, long maxAgeS) {
+        Objects.requireNonNull(folder, "folder");
         checkRange("maxBytes", maxBytes, STORE_BYTES_LEAST, STORE_BYTES_MOST);
         checkRange("maxAgeS", maxAgeS, STORE_AGE_S_LEAST, STORE_AGE_S_MOST);
         return openStore(folder.getPath(), maxBytes, maxAgeS);

@@ -68,6 +68,8 @@ public final class UsageLog implements AutoCloseable {
      * @throws IllegalStateException if this is closed
      */
     public void event(String name, Bundle parameters) {
+        Objects.requireNonNull(name, "name");
+        Objects.requireNonNull(parameters, "parameters");
         checkOpen("event");
         LogCollector.logEvent(id, name, parameters);
     }
@@ -79,6 +81,8 @@ public final class UsageLog implements AutoCloseable {
 
     /** Logs an error; otherwise as {@link #event(String, Bundle)}. */
     public void error(String name, Bundle parameters) {
+        Objects.requireNonNull(name, "name");
+        Objects.requireNonNull(parameters, "parameters");
         checkOpen("error");
         LogCollector.logError(id, name, parameters);
     }

@@ -4,13 +4,14 @@ import java.util.Objects;
 import korvel.talvox.ErrorDetail;
 import korvel.talvox.RecorderState;
 import korvel.talvox.TestKitAccess;
+import org.jspecify.annotations.Nullable;
 
 /** Builds an {@link ErrorDetail}; what is not set is not known. Not thread-safe. */
 public final class ErrorDetailBuilder {
     private String reason = "";
-    private Integer httpStatus;
-    private Integer deviceError;
-    private RecorderState recorderState;
+    private @Nullable Integer httpStatus;
+    private @Nullable Integer deviceError;
+    private @Nullable RecorderState recorderState;
 
     /** Begins a detail of which nothing is known. */
     public ErrorDetailBuilder() {}

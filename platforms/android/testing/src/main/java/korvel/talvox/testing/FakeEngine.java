@@ -16,6 +16,7 @@ import korvel.talvox.TalvoxEngine;
 import korvel.talvox.TalvoxSettings;
 import korvel.talvox.TestKitAccess;
 import korvel.talvox.impl.EngineBackend;
+import org.jspecify.annotations.Nullable;
 
 /**
  * An engine for an application's own tests: sessions follow scripts, on a clock that the test moves.
@@ -59,11 +60,11 @@ public final class FakeEngine implements AutoCloseable {
     private final Queue<Runnable> mainTasks = new ArrayDeque<>();
     private final TreeSet<String> languages = new TreeSet<>();
     private TalvoxSettings settings = TalvoxSettings.builder().build();
-    private TalvoxSettings sessionSettings;
+    private @Nullable TalvoxSettings sessionSettings;
     private final List<String> documents = new ArrayList<>();
     private boolean isRecognitionAvailable = true;
     private boolean isAdvancing;
-    private Session running;
+    private @Nullable Session running;
     private int startCount;
     private long nowMs;
 
@@ -130,7 +131,7 @@ public final class FakeEngine implements AutoCloseable {
     }
 
     /** The settings of the newest session, without those of the engine; null before the first. */
-    public synchronized TalvoxSettings getSessionSettings() {
+    public synchronized @Nullable TalvoxSettings getSessionSettings() {
         return sessionSettings;
     }
 
@@ -373,7 +374,7 @@ public final class FakeEngine implements AutoCloseable {
         }
 
         @Override
-        public void setCertificateFile(File file) {}
+        public void setCertificateFile(@Nullable File file) {}
 
         @Override
         public boolean isRecognitionAvailable(TalvoxSettings ignored) {

@@ -10,6 +10,7 @@ import korvel.talvox.ErrorDetail;
 import korvel.talvox.Recognition;
 import korvel.talvox.SpeechError;
 import korvel.talvox.impl.EngineBackend;
+import org.jspecify.annotations.Nullable;
 
 /**
  * What happens in one session of a {@link FakeEngine}, in milliseconds of its clock since the start.
@@ -133,7 +134,7 @@ public final class Script {
         return done != null ? done.timeMs : getEnd().timeMs;
     }
 
-    private static Event find(List<Event> events, Kind kind) {
+    private static @Nullable Event find(List<Event> events, Kind kind) {
         for (Event event : events) {
             if (event.kind == kind) {
                 return event;
@@ -282,9 +283,9 @@ public final class Script {
             return new Script(whole.events, whole.getEndAfterStop());
         }
 
-        /** The end of this script, but an answer where it waits for speech in vain. */
+        /** The end of this whole script, but an answer where it waits for speech in vain. */
         private Event getEndAfterStop() {
-            final Event end = find(events, Kind.END);
+            final Event end = events.get(events.size() - 1);
             return isCloud && isNoVoice
                     ? new Event(
                             end.timeMs,

@@ -1,0 +1,10 @@
+/**
+ * Speech recognition for applications. Start with {@link korvel.talvox.TalvoxEngine}.
+ *
+ * <p>Nothing is null unless it is annotated so. An argument that must not be null and is, throws a
+ * {@code NullPointerException} at once.
+ */
+@NullMarked
+package korvel.talvox;
+
+import org.jspecify.annotations.NullMarked;
