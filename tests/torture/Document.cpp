@@ -33,7 +33,8 @@ std::string makeNames() {
     for (const Plan& plan : getPlans()) {
         text << "| `" << plan.name << "` | " << plan.title << " |\n";
     }
-    text << "\nNever fails, because the caller would end the process or be of no use afterwards:\n\n";
+    text << "\nNever fails, because the caller would end the process or be of no use "
+            "afterwards:\n\n";
     for (const Exclusion& exclusion : EXCLUSIONS) {
         text << "- `" << getName(exclusion.kind) << "` in " << exclusion.library << ": "
              << exclusion.reason << "\n";
