@@ -66,7 +66,11 @@ bool HttpExchange::onHead() {
         }
         return true;
     }
-    logRefusal(answer);
+    if (answer.status != 200) {
+        logRefusal(answer);
+    } else if (server.getOptions().verbose) {
+        log(answer.status, "ready");
+    }
     return send(answer);
 }
 
@@ -74,11 +78,24 @@ Answer HttpExchange::judgeHead() {
     if (isRecognitionPath(head.path)) {
         return judgeRecognition();
     }
+    if (head.path == "/health") {
+        return judgeHealth();
+    }
     if (head.path != "/log") {
-        return Answer::refuse(404, "there is nothing here but /asrgw, /asrgw_chunked and /log");
+        return Answer::refuse(404,
+                              "there is nothing here but /asrgw, /asrgw_chunked, /log and /health");
     }
     carriesRecord = head.method == "GET";
     return carriesRecord ? Answer() : refuseMethod("records come in GET requests", "GET");
+}
+
+Answer HttpExchange::judgeHealth() const {
+    if (head.method != "GET" && head.method != "HEAD") {
+        return refuseMethod("health is asked for with GET or HEAD", "GET, HEAD");
+    }
+    Answer answer;
+    answer.body = "ready\n";
+    return answer;
 }
 
 Answer HttpExchange::judgeRecognition() {

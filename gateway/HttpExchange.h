@@ -36,6 +36,7 @@ class HttpExchange {
 
   private:
     Answer judgeHead();
+    Answer judgeHealth() const;
     Answer judgeRecognition();
     void beginBody(const std::string& boundary);
     Answer recognise();

@@ -191,6 +191,20 @@ TEST(Server, KnowsItsPathsAndMethods) {
     EXPECT_EQ("POST", answer.headers.at("allow"));
 }
 
+TEST(Server, SaysThatItIsReadyWithoutALogLine) {
+    RunningServer running;
+    HttpClient client(running.server.getPort());
+    client.send("GET /health HTTP/1.1\r\nHost: a\r\n\r\n");
+    const HttpAnswer ready = client.read();
+    EXPECT_EQ(200, ready.status);
+    EXPECT_EQ("ready\n", ready.body);
+    EXPECT_EQ(std::vector<std::string>(), running.log.messages());
+    client.send(requestHead("/health", 0, "PUT"));
+    const HttpAnswer refused = client.read();
+    EXPECT_EQ(405, refused.status);
+    EXPECT_EQ("GET, HEAD", refused.headers.at("allow"));
+}
+
 TEST(Server, RefusesBodiesThatAreTooLong) {
     ServerOptions options = anyPort();
     options.maxBodyBytes = 20000;
