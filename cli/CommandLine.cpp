@@ -15,6 +15,7 @@
 #include "VadWarnings.h"
 #include "Version.h"
 #include "corpus/CorpusCommand.h"
+#include "doctor/DoctorCommand.h"
 #include "endpoint/EndpointCommand.h"
 #include "endpoint/VadText.h"
 #include "talvox/Settings.h"
@@ -319,6 +320,7 @@ int runTool(int argc, const char* const* argv, Console& console, LogOutput& log)
     const CLI::App* logEvent = addLogCommand(app, arguments.log);
     CorpusCommand corpus(app);
     EndpointCommand endpoint(app);
+    const DoctorCommand doctor(app);
     try {
         app.parse(argc, argv);
         if (recognize->parsed()) {
@@ -346,9 +348,12 @@ int runTool(int argc, const char* const* argv, Console& console, LogOutput& log)
         if (endpoint.isParsed()) {
             return endpoint.run(console, log);
         }
+        if (doctor.isParsed()) {
+            return doctor.run(console);
+        }
         throw UsageError(
-            "no command given (recognize, vad, endpoint, corpus, settings or log); see talvox "
-            "--help");
+            "no command given (recognize, vad, endpoint, corpus, doctor, settings or log); see "
+            "talvox --help");
     } catch (const CLI::ParseError& error) {
         if (error.get_exit_code() == 0) {
             return app.exit(error, console.out, console.err);

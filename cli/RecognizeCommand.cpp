@@ -36,17 +36,6 @@ const int UUID_LENGTH = 32;
 // A session takes 20 s of sound; standard input may be a pipe that never ends.
 const int STANDARD_INPUT_MAX_SECONDS = 60;
 
-std::string makeUuid() {
-    static const char DIGITS[] = "0123456789abcdef";
-    std::random_device random;
-    std::uniform_int_distribution<int> digit(0, 15);
-    std::string uuid;
-    for (int index = 0; index < UUID_LENGTH; ++index) {
-        uuid += DIGITS[digit(random)];
-    }
-    return uuid;
-}
-
 /** Makes the engine hear the file in place of a device. */
 void installPlayer(const RecognizeOptions& options, int sampleRateHz, std::istream& input) {
     std::vector<int16_t> samples =
@@ -105,6 +94,17 @@ void reportError(const SessionEvent& failure, const RecognizeOptions& options,
 }
 
 }  // namespace
+
+std::string makeUuid() {
+    static const char DIGITS[] = "0123456789abcdef";
+    std::random_device random;
+    std::uniform_int_distribution<int> digit(0, 15);
+    std::string uuid;
+    for (int index = 0; index < UUID_LENGTH; ++index) {
+        uuid += DIGITS[digit(random)];
+    }
+    return uuid;
+}
 
 std::vector<SettingsOptions::Assignment> recognizeDefaults() {
     return {{Talvox::Settings::SKS_URL, URL_DFLT},

@@ -28,6 +28,9 @@ struct RecognizeOptions {
     bool json = false;
 };
 
+/** A random identifier of an installation. */
+std::string makeUuid();
+
 /** The tool's defaults, over the engine's: a gateway on this machine, a fresh uuid, English. */
 std::vector<SettingsOptions::Assignment> recognizeDefaults();
 

@@ -60,9 +60,10 @@ TEST(Tool, HelpsWithEveryCommand) {
 }
 
 TEST(Tool, RefusesWrongUsage) {
-    expectRefused({},
-                  "no command given (recognize, vad, endpoint, corpus, settings or log); see "
-                  "talvox --help");
+    expectRefused(
+        {},
+        "no command given (recognize, vad, endpoint, corpus, doctor, settings or log); see "
+        "talvox --help");
     expectRefused({"sing"}, "sing");
     expectRefused({"recognize"}, "recognize needs --file FILE or --mic");
     expectRefused({"recognize", "--file", ""}, "recognize needs --file FILE or --mic");
