@@ -33,7 +33,7 @@ install(FILES ${CMAKE_BINARY_DIR}/KorvelTalvoxConfig.cmake
 set(korvel_documents ${CMAKE_INSTALL_DATADIR}/doc/korveltalvox)
 install(FILES LICENSE README.md ARCHITECTURE.md CHANGELOG.md CONTRIBUTING.md
         DESTINATION ${korvel_documents})
-install(DIRECTORY docs/ DESTINATION ${korvel_documents}/docs FILES_MATCHING PATTERN "*.md")
+install(DIRECTORY docs/ DESTINATION ${korvel_documents}/docs FILES_MATCHING PATTERN "*.md" PATTERN "*.conf" PATTERN "*.cfg")
 install(PROGRAMS samples/gateway/gateway.py DESTINATION ${korvel_documents}/samples/gateway)
 install(DIRECTORY samples/android samples/cpp DESTINATION ${korvel_documents}/samples)
 install(FILES platforms/android/BUILDING.md DESTINATION ${korvel_documents}/platforms/android)

@@ -199,8 +199,9 @@ TEST(Server, SaysThatItIsReadyWithoutALogLine) {
     EXPECT_EQ(200, ready.status);
     EXPECT_EQ("ready\n", ready.body);
     EXPECT_EQ(std::vector<std::string>(), running.log.messages());
-    client.send(requestHead("/health", 0, "PUT"));
-    const HttpAnswer refused = client.read();
+    HttpClient other(running.server.getPort());
+    other.send(requestHead("/health", 0, "PUT"));
+    const HttpAnswer refused = other.read();
     EXPECT_EQ(405, refused.status);
     EXPECT_EQ("GET, HEAD", refused.headers.at("allow"));
 }
