@@ -35,7 +35,7 @@ install(FILES LICENSE README.md ARCHITECTURE.md CHANGELOG.md CONTRIBUTING.md
         DESTINATION ${korvel_documents})
 install(DIRECTORY docs/ DESTINATION ${korvel_documents}/docs FILES_MATCHING PATTERN "*.md" PATTERN "*.conf" PATTERN "*.cfg")
 install(PROGRAMS samples/gateway/gateway.py DESTINATION ${korvel_documents}/samples/gateway)
-install(DIRECTORY samples/android samples/cpp DESTINATION ${korvel_documents}/samples)
+install(DIRECTORY samples/android samples/cpp samples/testing DESTINATION ${korvel_documents}/samples)
 install(FILES platforms/android/BUILDING.md DESTINATION ${korvel_documents}/platforms/android)
 
 if(TALVOX_BUILD_TOOLS)
