@@ -59,7 +59,7 @@ std::optional<Check> findNoAnswer(const std::string& name, const ProbeResult& re
 }
 
 std::optional<Check> findFault(const std::string& name, const ProbeResult& result, int timeoutMs) {
-    if (const std::optional<Check> none = findNoAnswer(name, result, timeoutMs)) {
+    if (std::optional<Check> none = findNoAnswer(name, result, timeoutMs)) {
         return none;
     }
     if (result.status < 200 || result.status > 299) {

@@ -4,7 +4,6 @@
 #include <sys/socket.h>
 
 #include <algorithm>
-#include <cstring>
 #include <new>
 
 #include "core/util/Ascii.h"
@@ -255,7 +254,7 @@ std::size_t HttpProbe::give(char* buffer, std::size_t room) {
         return CURL_READFUNC_PAUSE;
     }
     const std::size_t count = std::min(room, pieces[piece].size() - offset);
-    std::memcpy(buffer, pieces[piece].data() + offset, count);
+    pieces[piece].copy(buffer, count, offset);
     offset += count;
     if (offset == pieces[piece].size()) {
         ++piece;

@@ -25,7 +25,7 @@ const char* const COLLECTED_ADVICE =
 
 std::optional<Check> findPathFault(const ProbeResult& result, const std::string& path,
                                    int timeoutMs) {
-    if (const std::optional<Check> none = findNoAnswer("path", result, timeoutMs)) {
+    if (std::optional<Check> none = findNoAnswer("path", result, timeoutMs)) {
         return none;
     }
     if (result.status >= 300 && result.status < 400) {

@@ -302,7 +302,7 @@ TEST(VadParameters, ThresholdsThatCannotBeReachedInTimeAreFound) {
         bool hasBegun = false;
         // At this rate every frame counts as speech.
         for (const Sound::SoundDataBuffer& buffer :
-             TestSupport::cutIntoBuffers(TestSupport::Samples(5 * 44100, 1), 44100)) {
+             TestSupport::cutIntoBuffers(TestSupport::Samples(std::size_t{5} * 44100, 1), 44100)) {
             hasBegun = hasBegun || analyzer.analyze(buffer).isSpeech;
         }
         EXPECT_EQ(hasBegun, spanMs == 9590);
