@@ -28,7 +28,7 @@ struct TransferEnd {
  */
 class KORVEL_CORE_API TransferListener {
   public:
-    virtual ~TransferListener() = default;
+    virtual ~TransferListener();
 
     /** @return false to end the transfer */
     virtual bool onTransferHead(const boost::shared_ptr<HttpResponse>& response) = 0;
@@ -40,7 +40,7 @@ class KORVEL_CORE_API TransferListener {
 /** One attempt of a request; made by its transport, which keeps it alive until it is over. */
 class KORVEL_CORE_API Transfer {
   public:
-    virtual ~Transfer() = default;
+    virtual ~Transfer();
 
     /**
      * Begins, once. However it goes, the listener hears of the end, unless `cancel` comes first.
@@ -62,7 +62,7 @@ class KORVEL_CORE_API Transfer {
  */
 class KORVEL_CORE_API Transport {
   public:
-    virtual ~Transport() = default;
+    virtual ~Transport();
 
     /**
      * Has a command run on the transport's thread, behind those before it. Any thread; does not
