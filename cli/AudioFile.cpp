@@ -44,12 +44,12 @@ bool isSpeex(const std::string& path) {
 }
 
 /** Why libsndfile refused a file, and what the user can do instead. */
-std::string explainRefusal(const std::string& path) {
+std::string explainRefusal(const std::string& path, const OpenFailure& failure) {
     if (isSpeex(path)) {
         return "it is Ogg Speex; decode it first, as with speexdec FILE.spx FILE.wav";
     }
-    if (sf_error(nullptr) != SF_ERR_UNRECOGNISED_FORMAT) {
-        return plainReason(sf_strerror(nullptr));
+    if (failure.error != SF_ERR_UNRECOGNISED_FORMAT) {
+        return failure.reason;
     }
     const bool isRaw = endsWith(path, ".raw") || endsWith(path, ".pcm");
     return std::string("it is not sound of a known format") +
@@ -74,9 +74,11 @@ void warnOfLoss(const std::string& path, const SF_INFO& info, const AudioClip& c
 AudioClip readAudioFile(const std::string& path) {
     checkIsFile(path);
     SF_INFO info = {};
-    const SoundFile file(sf_open(path.c_str(), SFM_READ, &info), &sf_close);
+    OpenFailure failure;
+    const SoundFile file =
+        openSound([&] { return sf_open(path.c_str(), SFM_READ, &info); }, failure);
     if (!file) {
-        refuseSound(path, explainRefusal(path));
+        refuseSound(path, explainRefusal(path, failure));
     }
     const std::size_t maxSamples = samplesIn(MAX_CLIP_SECONDS, info.samplerate);
     AudioClip clip = decodeSound(file.get(), info, path, maxSamples);

@@ -75,9 +75,11 @@ AudioClip readWavStream(std::istream& in, std::string bytes, int maxSeconds) {
     SF_VIRTUAL_IO access = {&MemoryFile::getLength, &MemoryFile::seek, &MemoryFile::read,
                             &MemoryFile::write, &MemoryFile::tell};
     SF_INFO info = {};
-    const SoundFile file(sf_open_virtual(&access, SFM_READ, &info, &memory), &sf_close);
+    OpenFailure failure;
+    const SoundFile file =
+        openSound([&] { return sf_open_virtual(&access, SFM_READ, &info, &memory); }, failure);
     if (!file) {
-        refuseSound(STREAM_NAME, plainReason(sf_strerror(nullptr)));
+        refuseSound(STREAM_NAME, failure.reason);
     }
     const std::size_t maxSamples = samplesIn(maxSeconds, info.samplerate);
     AudioClip clip = decodeSound(file.get(), info, STREAM_NAME, maxSamples);

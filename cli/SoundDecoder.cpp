@@ -2,6 +2,7 @@
 
 #include <algorithm>
 #include <cmath>
+#include <mutex>
 #include <vector>
 
 #include "Text.h"
@@ -37,13 +38,10 @@ std::string secondsText(double seconds) {
     return fixed(seconds, 0, 3) + " s";
 }
 
-}  // namespace
-
-void refuseSound(const std::string& name, const std::string& reason) {
-    throw UsageError("cannot read " + printable(name) + ": " + reason);
-}
-
-/** libsndfile ends some of its messages with a full stop and begins some with "Error : ". */
+/**
+ * A message of libsndfile as a part of a sentence. Some end with a full stop, some begin with
+ * "Error : ".
+ */
 std::string plainReason(const char* message) {
     std::string reason(message);
     const std::string prefix = "Error : ";
@@ -55,6 +53,22 @@ std::string plainReason(const char* message) {
     }
     std::replace(reason.begin(), reason.end(), '\n', ' ');
     return reason;
+}
+
+}  // namespace
+
+void refuseSound(const std::string& name, const std::string& reason) {
+    throw UsageError("cannot read " + printable(name) + ": " + reason);
+}
+
+SoundFile openSound(const std::function<SNDFILE*()>& open, OpenFailure& failure) {
+    static std::mutex mutex;
+    const std::lock_guard<std::mutex> lock(mutex);
+    SoundFile file(open(), &sf_close);
+    if (!file) {
+        failure = {sf_error(nullptr), plainReason(sf_strerror(nullptr))};
+    }
+    return file;
 }
 
 std::size_t samplesIn(int seconds, int sampleRateHz) {

@@ -4,6 +4,7 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <functional>
 #include <memory>
 #include <string>
 
@@ -17,8 +18,18 @@ using SoundFile = std::unique_ptr<SNDFILE, int (*)(SNDFILE*)>;
 /** @throws UsageError always: the sound called `name` cannot be read */
 [[noreturn]] void refuseSound(const std::string& name, const std::string& reason);
 
-/** A message of libsndfile as a part of a sentence. */
-std::string plainReason(const char* message);
+/** Why libsndfile did not open a file. */
+struct OpenFailure {
+    int error = SF_ERR_NO_ERROR; /**< a number of libsndfile's */
+    std::string reason;          /**< a part of a sentence */
+};
+
+/**
+ * Calls `open`, which calls sf_open or one of its kin. libsndfile keeps the reason of a failure in
+ * one place for the whole process and clears it at the next opening, so openings take turns.
+ * @return the open file; null, and `failure` filled in, if there is none
+ */
+SoundFile openSound(const std::function<SNDFILE*()>& open, OpenFailure& failure);
 
 /** How many samples `seconds` of sound have. */
 std::size_t samplesIn(int seconds, int sampleRateHz);

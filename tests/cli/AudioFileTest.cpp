@@ -3,6 +3,10 @@
 #include <gmock/gmock.h>
 #include <sndfile.h>
 
+#include <atomic>
+#include <set>
+#include <thread>
+
 #include "SoundFiles.h"
 #include "cli/UsageError.h"
 #include "support/LogCapture.h"
@@ -200,6 +204,32 @@ TEST(AudioFile, RefusesWhatIsNotSound) {
     const ScratchDirectory directory;
     const std::string path = directory.write("letter.txt", "Dear Sir or Madam, this is no sound.");
     EXPECT_EQ(refusal(path), "cannot read " + path + ": it is not sound of a known format");
+}
+
+TEST(AudioFile, SaysWhyWhileOtherThreadsOpenFiles) {
+    const ScratchDirectory directory;
+    const std::string sound = directory.path("a.wav");
+    ASSERT_TRUE(writeSoundFile(sound, WAV, 16000, 1, {1, 2, 3}));
+    const std::string letter = directory.write("letter.wav", "Dear Sir or Madam, no sound.");
+    std::atomic<bool> isOver{false};
+    std::vector<std::thread> others;
+    for (int number = 0; number < 3; ++number) {
+        others.emplace_back([&] {
+            while (!isOver) {
+                readAudioFile(sound);
+            }
+        });
+    }
+    std::set<std::string> refusals;
+    for (int turn = 0; turn < 2000; ++turn) {
+        refusals.insert(refusal(letter));
+    }
+    isOver = true;
+    for (std::thread& other : others) {
+        other.join();
+    }
+    EXPECT_THAT(refusals,
+                ElementsAre("cannot read " + letter + ": it is not sound of a known format"));
 }
 
 TEST(AudioFile, RefusesAMissingFileAndADirectory) {
