@@ -38,6 +38,8 @@ Answer refuseMethod(const std::string& reason, const std::string& allowed) {
     return answer;
 }
 
+const char* const HEALTH_PATH = "/health";
+
 bool isRecognitionPath(const std::string& path) {
     return path == RecognitionRequest::WHOLE_PATH || path == RecognitionRequest::STREAMING_PATH;
 }
@@ -57,7 +59,7 @@ HttpExchange::HttpExchange(Server& exchangeServer, MHD_Connection* httpConnectio
 
 bool HttpExchange::onHead() {
     const Answer answer = judgeHead();
-    if (carriesRecord) {
+    if (isAnsweredAtEnd) {
         return true;
     }
     if (request) {
@@ -66,11 +68,7 @@ bool HttpExchange::onHead() {
         }
         return true;
     }
-    if (answer.status != 200) {
-        logRefusal(answer);
-    } else if (server.getOptions().verbose) {
-        log(answer.status, "ready");
-    }
+    logRefusal(answer);
     return send(answer);
 }
 
@@ -78,24 +76,17 @@ Answer HttpExchange::judgeHead() {
     if (isRecognitionPath(head.path)) {
         return judgeRecognition();
     }
-    if (head.path == "/health") {
-        return judgeHealth();
+    if (head.path == HEALTH_PATH) {
+        isAnsweredAtEnd = head.method == "GET" || head.method == "HEAD";
+        return isAnsweredAtEnd ? Answer()
+                               : refuseMethod("health is asked for with GET or HEAD", "GET, HEAD");
     }
     if (head.path != "/log") {
         return Answer::refuse(404,
                               "there is nothing here but /asrgw, /asrgw_chunked, /log and /health");
     }
-    carriesRecord = head.method == "GET";
-    return carriesRecord ? Answer() : refuseMethod("records come in GET requests", "GET");
-}
-
-Answer HttpExchange::judgeHealth() const {
-    if (head.method != "GET" && head.method != "HEAD") {
-        return refuseMethod("health is asked for with GET or HEAD", "GET, HEAD");
-    }
-    Answer answer;
-    answer.body = "ready\n";
-    return answer;
+    isAnsweredAtEnd = head.method == "GET";
+    return isAnsweredAtEnd ? Answer() : refuseMethod("records come in GET requests", "GET");
 }
 
 Answer HttpExchange::judgeRecognition() {
@@ -138,7 +129,7 @@ bool HttpExchange::onBody(const char* data, std::size_t size) {
     return request->takes(bodyBytes);
 }
 
-Answer HttpExchange::keepRecord() const {
+Answer HttpExchange::judgeRecord() const {
     const std::optional<std::string> uuid = readRawArgument("uuid");
     const std::optional<std::string> record = readRawArgument("logmessage");
     if (!uuid || !record) {
@@ -155,15 +146,28 @@ Answer HttpExchange::keepRecord() const {
     return kept ? Answer() : Answer::refuse(500, "the record could not be written");
 }
 
+Answer HttpExchange::sayReady() const {
+    if (server.getOptions().verbose) {
+        log(200, "ready");
+    }
+    Answer answer;
+    answer.body = "ready\n";
+    return answer;
+}
+
+Answer HttpExchange::keepRecord() const {
+    const Answer answer = judgeRecord();
+    if (answer.status != 200) {
+        logRefusal(answer);
+    } else if (server.getOptions().verbose) {
+        log(answer.status, "uuid=" + toLogText(head.uuid));
+    }
+    return answer;
+}
+
 bool HttpExchange::onEnd() {
-    if (carriesRecord && !answered) {
-        const Answer answer = keepRecord();
-        if (answer.status != 200) {
-            logRefusal(answer);
-        } else if (server.getOptions().verbose) {
-            log(answer.status, "uuid=" + toLogText(head.uuid));
-        }
-        return send(answer);
+    if (isAnsweredAtEnd && !answered) {
+        return send(head.path == HEALTH_PATH ? sayReady() : keepRecord());
     }
     if (!request || answered) {
         return true;

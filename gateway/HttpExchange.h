@@ -36,10 +36,11 @@ class HttpExchange {
 
   private:
     Answer judgeHead();
-    Answer judgeHealth() const;
     Answer judgeRecognition();
     void beginBody(const std::string& boundary);
     Answer recognise();
+    Answer sayReady() const;
+    Answer judgeRecord() const;
     Answer keepRecord() const;
     bool send(const Answer& answer);
     void logRefusal(const Answer& answer) const;
@@ -56,7 +57,8 @@ class HttpExchange {
     std::unique_ptr<RecognitionRequest> request;
     /** Feeds the request; null before the body, and once the request is over. */
     std::unique_ptr<BodyPump> pump;
-    bool carriesRecord = false;
+    /** An answer before the end of a request would cost the connection. */
+    bool isAnsweredAtEnd = false;
     bool answered = false;
 };
 

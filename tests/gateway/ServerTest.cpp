@@ -191,13 +191,15 @@ TEST(Server, KnowsItsPathsAndMethods) {
     EXPECT_EQ("POST", answer.headers.at("allow"));
 }
 
-TEST(Server, SaysThatItIsReadyWithoutALogLine) {
+TEST(Server, SaysThatItIsReadyOnAConnectionThatStaysAndWithoutALogLine) {
     RunningServer running;
     HttpClient client(running.server.getPort());
-    client.send("GET /health HTTP/1.1\r\nHost: a\r\n\r\n");
-    const HttpAnswer ready = client.read();
-    EXPECT_EQ(200, ready.status);
-    EXPECT_EQ("ready\n", ready.body);
+    for (int turn = 0; turn < 2; ++turn) {
+        client.send("GET /health HTTP/1.1\r\nHost: a\r\n\r\n");
+        const HttpAnswer ready = client.read();
+        EXPECT_EQ(200, ready.status);
+        EXPECT_EQ("ready\n", ready.body);
+    }
     EXPECT_EQ(std::vector<std::string>(), running.log.messages());
     HttpClient other(running.server.getPort());
     other.send(requestHead("/health", 0, "PUT"));
