@@ -6,8 +6,12 @@
 
 namespace TestSupport {
 
+nlohmann::json DoctorResult::report() const {
+    return nlohmann::json::parse(output, nullptr, false);
+}
+
 nlohmann::json DoctorResult::check(const std::string& name) const {
-    for (const nlohmann::json& check : report.value("checks", nlohmann::json::array())) {
+    for (const nlohmann::json& check : report().value("checks", nlohmann::json::array())) {
         if (check["check"] == name) {
             return check;
         }
@@ -26,7 +30,7 @@ std::string DoctorResult::words(const std::string& name) const {
 
 std::string DoctorResult::names() const {
     std::string text;
-    for (const nlohmann::json& check : report.value("checks", nlohmann::json::array())) {
+    for (const nlohmann::json& check : report().value("checks", nlohmann::json::array())) {
         text += (text.empty() ? "" : " ") + check.value("check", "");
     }
     return text;
@@ -39,8 +43,8 @@ DoctorResult runDoctor(const std::string& url, const std::vector<std::string>& m
     const ChildProcess::Result run = ChildProcess::run(command);
     DoctorResult result;
     result.status = run.exitStatus;
-    result.report = nlohmann::json::parse(run.output, nullptr, false);
-    EXPECT_TRUE(result.report.is_object()) << run.output;
+    result.output = run.output;
+    EXPECT_TRUE(result.report().is_object()) << run.output;
     return result;
 }
 

@@ -9,8 +9,10 @@ namespace TestSupport {
 /** What `talvox doctor --json` found. */
 struct DoctorResult {
     int status = -1;
-    nlohmann::json report;
+    std::string output; /**< a JSON object */
 
+    /** The whole report; discarded if the output is no JSON. */
+    nlohmann::json report() const;
     /** The check of this name; an empty object if it was not made. */
     nlohmann::json check(const std::string& name) const;
     std::string verdict(const std::string& name) const;

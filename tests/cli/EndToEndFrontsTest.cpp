@@ -126,7 +126,7 @@ TEST_F(EndToEndFronts, NginxByDefaultCollectsTheRequestAndLimitsTheBody) {
 TEST_F(EndToEndFronts, WithoutOneAllIsWell) {
     const Gateway gateway;
     const DoctorResult result = runDoctor(gateway.getUrl(), {"--timeout", "600", "--idle", "1"});
-    EXPECT_EQ(0, result.status) << result.report;
+    EXPECT_EQ(0, result.status) << result.output;
 }
 
 TEST_P(EndToEndFronts, PassesThePiecesOnAsTheyCome) {
@@ -140,7 +140,7 @@ TEST_P(EndToEndFronts, PassesThePiecesOnAsTheyCome) {
     const std::string url = startFront(GetParam(), places);
     const DoctorResult result =
         runDoctor(url, {"--ca-file", authority(), "--timeout", "600", "--idle", "1"});
-    EXPECT_EQ(0, result.status) << result.report;
+    EXPECT_EQ(0, result.status) << result.output;
     EXPECT_EQ("well", result.verdict("streamed")) << result.words("streamed");
     EXPECT_EQ("well", result.verdict("size")) << result.words("size");
 }
@@ -216,7 +216,7 @@ TEST_F(EndToEndFronts, AGatewayThatIsDrainedGetsNoMoreRequests) {
     ASSERT_TRUE(two.waitForRequest(1));
     EXPECT_EQ("\n", haproxy->command("set server gateways/one state drain"));
     const DoctorResult result = runDoctor(url, {"--ca-file", authority(), "--idle", "0"});
-    EXPECT_EQ(0, result.status) << result.report;
+    EXPECT_EQ(0, result.status) << result.output;
     std::size_t posts[] = {0, 0};
     const ScriptedHttpServer* const servers[] = {&one, &two};
     for (const std::size_t i : {0U, 1U}) {

@@ -40,7 +40,7 @@ TEST(ToolDoctor, SaysThatANameIsNotKnown) {
     EXPECT_EQ("name", result.names());
     EXPECT_EQ("problem", result.verdict("name"));
     EXPECT_THAT(result.words("name"), StartsWith("the name " + name + " is not known here\ncheck"));
-    EXPECT_EQ(false, result.report["well"]);
+    EXPECT_EQ(false, result.report()["well"]);
 }
 
 TEST(ToolDoctor, SaysThatAConnectionIsRefused) {
@@ -124,7 +124,7 @@ TEST(ToolDoctor, TellsACollectedRequestFromOneThatIsPassedOn) {
     const DoctorResult passed = runDoctor(server.getUrl(), QUICKLY);
     EXPECT_EQ(0, passed.status);
     EXPECT_EQ("well", passed.verdict("streamed"));
-    EXPECT_EQ(true, passed.report["well"]);
+    EXPECT_EQ(true, passed.report()["well"]);
     EXPECT_EQ(104, passed.check("streamed")["gapMs"]);
     EXPECT_EQ(20, passed.check("streamed")["pieces"]);
     server.setDefaultAnswer(reporting("pieces=2 first=0ms last=3ms gap=3ms answer=5ms"));
@@ -229,7 +229,7 @@ class ToolDoctorTls : public ::testing::Test {
 
 TEST_F(ToolDoctorTls, DescribesACertificate) {
     const DoctorResult result = examine("IP:127.0.0.1", 90, true);
-    EXPECT_EQ(0, result.status) << result.report;
+    EXPECT_EQ(0, result.status) << result.output;
     EXPECT_EQ("well", result.verdict("tls"));
     EXPECT_THAT(result.words("tls"), MatchesRegex("issued by CN = talvox test, (89|90) days left, "
                                                   "names 127\\.0\\.0\\.1\n"));

@@ -98,7 +98,9 @@ TEST(DeployDocument, GivesOneGatewayTheTimeOutsOfSeveral) {
                 const bool isTimeOut = line.find('#') == std::string::npos &&
                                        line.find("timeout ") != std::string::npos &&
                                        line.find("proxy_next") == std::string::npos;
-                lines[count] += isTimeOut ? line + "\n" : "";
+                if (isTimeOut) {
+                    lines[count].append(line).append("\n");
+                }
             }
         }
         EXPECT_NE("", lines["one"]);

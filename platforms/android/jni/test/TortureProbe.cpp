@@ -50,12 +50,6 @@ JNIEXPORT void JNICALL Java_korvel_talvox_impl_TortureProbe_disarm(JNIEnv* /*env
     find<void()>("tortureDisarm")();
 }
 
-JNIEXPORT jlong JNICALL Java_korvel_talvox_impl_TortureProbe_countCalls(JNIEnv* /*env*/,
-                                                                        jclass /*type*/,
-                                                                        jint kind) {
-    return find<long(int)>("tortureCountCalls")(kind);
-}
-
 JNIEXPORT jboolean JNICALL Java_korvel_talvox_impl_TortureProbe_hasFailed(JNIEnv* /*env*/,
                                                                           jclass /*type*/) {
     return failedName != nullptr ? JNI_TRUE : JNI_FALSE;

@@ -24,9 +24,6 @@ final class TortureProbe {
 
     static native void disarm();
 
-    /** Calls of the kind while it was armed. */
-    static native long countCalls(int kind);
-
     /** Whether a call has failed since it was armed. */
     static native boolean hasFailed();
 
