@@ -156,7 +156,7 @@ Answer HttpExchange::sayReady() const {
 }
 
 Answer HttpExchange::keepRecord() const {
-    const Answer answer = judgeRecord();
+    Answer answer = judgeRecord();
     if (answer.status != 200) {
         logRefusal(answer);
     } else if (server.getOptions().verbose) {
