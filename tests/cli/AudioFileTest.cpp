@@ -3,6 +3,7 @@
 #include <gmock/gmock.h>
 #include <sndfile.h>
 
+#include <array>
 #include <atomic>
 #include <set>
 #include <thread>
@@ -212,14 +213,12 @@ TEST(AudioFile, SaysWhyWhileOtherThreadsOpenFiles) {
     ASSERT_TRUE(writeSoundFile(sound, WAV, 16000, 1, {1, 2, 3}));
     const std::string letter = directory.write("letter.wav", "Dear Sir or Madam, no sound.");
     std::atomic<bool> isOver{false};
-    std::vector<std::thread> others;
-    for (int number = 0; number < 3; ++number) {
-        others.emplace_back([&] {
-            while (!isOver) {
-                readAudioFile(sound);
-            }
-        });
-    }
+    const auto read = [&] {
+        while (!isOver) {
+            readAudioFile(sound);
+        }
+    };
+    std::array<std::thread, 3> others = {std::thread(read), std::thread(read), std::thread(read)};
     std::set<std::string> refusals;
     for (int turn = 0; turn < 2000; ++turn) {
         refusals.insert(refusal(letter));
