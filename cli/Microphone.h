@@ -9,7 +9,7 @@ namespace Cli {
 
 /**
  * Records from the default input device, in buffers of `BUFFER_MS`, from its making to its end.
- * Buffers wait for whoever takes them, so that a slow terminal costs none.
+ * Buffers wait until they are taken, so that a slow terminal costs none.
  */
 class Microphone {
   public:

@@ -41,7 +41,7 @@ class RecognitionRequest : private MultipartListener {
     static constexpr const char* WHOLE_PATH = "/asrgw";
 
     /**
-     * Judges a head.
+     * Checks a head.
      * @param[out] boundary the boundary of the body that follows
      * @return an empty text, or the reason for status 400
      */

@@ -122,7 +122,7 @@ void LogSender::send(std::list<LogRecord>& one) {
             const QueueLock lock(queueMutex);
             queue.splice(queue.begin(), sent);
         }
-        // The timer tries again; where there is none to be had, the next record does.
+        // The timer tries again; without a timer, the next record does.
         startTimer();
     }
 }

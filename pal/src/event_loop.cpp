@@ -3,9 +3,10 @@
 // the others, and each callback runs under the event lock of its own, so that other threads come in
 // between.
 //
-// Whoever gives the thread something to do sets `awake` under the mutex and signals. `sleep` looks
-// at `awake` under the same mutex, so no wake-up is lost. The signal is a condition variable's and
-// not a descriptor's: the engine has to work in processes that have run out of those.
+// A caller that gives the thread something to do sets `awake` under the mutex and signals. `sleep`
+// looks at `awake` under the same mutex, so no wake-up is lost. The signal is a condition
+// variable's and not a descriptor's: the engine has to work in processes that have run out of
+// those.
 //
 // The threads start with the first use and are never stopped before the process ends. A start that
 // fails leaves nothing behind. At the end of the process `stop` waits, for a bounded time and
@@ -103,7 +104,7 @@ void EventLoop::stop() {
     if (thread.get_id() == std::this_thread::get_id()) {
         return;  // a callback ends the process
     }
-    // Whoever ends the process with the lock held must not make the event thread wait for it.
+    // A thread that ends the process with the lock held must not make the event thread wait for it.
     EventLockRelease release;
     if (!waitForCallbacks()) {
         blocked = true;

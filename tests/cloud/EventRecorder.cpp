@@ -124,7 +124,7 @@ void EventRecorder::addEnd(const std::string& text, Talvox::Recognizer* recogniz
     callHook(text, recognizer);
 }
 
-// Whoever waits for an end finds its text.
+// A thread that waits for an end finds its text.
 void EventRecorder::append(const std::string& text, std::size_t newEnds) {
     const std::lock_guard<std::mutex> lock(mutex);
     events.push_back({text, (kdGetTimeUST() - startTime) / 1000000});

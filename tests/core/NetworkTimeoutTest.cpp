@@ -90,7 +90,7 @@ TEST_F(NetworkTimeoutTest, BoundsTheWaitForMoreOfAnAnswer) {
     server.release();
     ASSERT_TRUE(task->waitFor("bytes"));
     settle();
-    // The time counts anew from the piece that came.
+    // The time begins again with the piece that came.
     advanceMs(REQUEST_TIMEOUT_MS - 1);
     settle();
     EXPECT_TRUE(holder.isWorking());

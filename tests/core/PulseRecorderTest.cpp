@@ -381,7 +381,7 @@ class PulseRecorderWithServer : public PulseRecorderTest {
   protected:
     void SetUp() override {
         if (!server.isRunning()) {
-            GTEST_SKIP() << "no PulseAudio server to be had: " << server.getOutput();
+            GTEST_SKIP() << "no PulseAudio server: " << server.getOutput();
         }
     }
 

@@ -13,7 +13,7 @@ namespace FaultTest {
 
 namespace {
 
-/** Set: the tests write the table anew instead of comparing with it. */
+/** Set: the tests rewrite the table instead of comparing with it. */
 const char* const WRITE_VARIABLE = "TALVOX_WRITE_FAULTS";
 const std::string BEGIN = "<!-- The table begins; written by tests_faults. -->\n";
 const std::string END = "<!-- The table ends. -->\n";
@@ -110,7 +110,7 @@ void checkTable(const Fault& fault, bool chunked, const SessionOutcome& outcome)
     }
     EXPECT_NE(std::string::npos, readDocument().find('\n' + row + '\n'))
         << "docs/FAULTS.md does not have the row\n"
-        << row << "\nIf that is right, write it anew: " << WRITE_VARIABLE
+        << row << "\nIf that is right, rewrite it: " << WRITE_VARIABLE
         << "=1 build/debug/tests/tests_faults --gtest_filter='*Catalogue*'";
 }
 

@@ -25,7 +25,7 @@ Function* findReal(const char* name) {
     return reinterpret_cast<Function*>(dlsym(RTLD_NEXT, name));
 }
 
-struct Books {
+struct Ledger {
     std::mutex mutex;
     std::condition_variable idle;
     PlatformLedger counts;
@@ -40,8 +40,8 @@ struct Books {
 };
 
 /** Never destroyed: the libraries use it until the process has gone. */
-Books& books() {
-    static auto* const made = new Books;
+Ledger& ledger() {
+    static auto* const made = new Ledger;
     return *made;
 }
 
@@ -49,7 +49,7 @@ Books& books() {
 class CountedDown {
   public:
     explicit CountedDown(long PlatformLedger::*what) : count(what) {}
-    ~CountedDown() { books().change(count, -1); }
+    ~CountedDown() { ledger().change(count, -1); }
     CountedDown(const CountedDown&) = delete;
     CountedDown& operator=(const CountedDown&) = delete;
 
@@ -105,33 +105,34 @@ struct Work {
 }  // namespace
 
 PlatformLedger PlatformLedger::now() {
-    const std::lock_guard<std::mutex> lock(books().mutex);
-    return books().counts;
+    const std::lock_guard<std::mutex> lock(ledger().mutex);
+    return ledger().counts;
 }
 
 bool PlatformLedger::waitUntilIdle() {
-    std::unique_lock<std::mutex> lock(books().mutex);
-    return books().idle.wait_for(
-        lock, LONGEST_WAIT, [] { return books().counts.works == 0 && books().counts.posts == 0; });
+    std::unique_lock<std::mutex> lock(ledger().mutex);
+    return ledger().idle.wait_for(lock, LONGEST_WAIT, [] {
+        return ledger().counts.works == 0 && ledger().counts.posts == 0;
+    });
 }
 
 }  // namespace Lifecycle
 
-using Lifecycle::books;
 using Lifecycle::findReal;
+using Lifecycle::ledger;
 using Lifecycle::PlatformLedger;
 
 KDTimer* kdSetTimer(KDint64 intervalNs, KDint periodic, void* eventuserptr) {
     static auto* const real = findReal<decltype(kdSetTimer)>("kdSetTimer");
     KDTimer* const timer = real(intervalNs, periodic, eventuserptr);
-    books().change(&PlatformLedger::timers, timer != nullptr ? 1 : 0);
+    ledger().change(&PlatformLedger::timers, timer != nullptr ? 1 : 0);
     return timer;
 }
 
 KDint kdCancelTimer(KDTimer* timer) {
     static auto* const real = findReal<decltype(kdCancelTimer)>("kdCancelTimer");
     const KDint result = real(timer);
-    books().change(&PlatformLedger::timers, result == 0 ? -1 : 0);
+    ledger().change(&PlatformLedger::timers, result == 0 ? -1 : 0);
     return result;
 }
 
@@ -139,7 +140,7 @@ KDint kdInstallCallback(KDCallbackFunc* func, KDint eventtype, void* eventuserpt
     static auto* const real = findReal<decltype(kdInstallCallback)>("kdInstallCallback");
     const KDint result = real(func, eventtype, eventuserptr);
     const int change = func != nullptr ? 1 : -1;
-    books().change(&PlatformLedger::callbacks, result == 0 ? change : 0);
+    ledger().change(&PlatformLedger::callbacks, result == 0 ? change : 0);
     return result;
 }
 
@@ -150,12 +151,12 @@ KDint kdPostKOR(void (*func)(void* user), void* user) {
     if (!post) {
         return -1;
     }
-    books().change(&PlatformLedger::posts, 1);
+    ledger().change(&PlatformLedger::posts, 1);
     const KDint result = real(&Post::run, post.get());
     if (result == 0) {
         static_cast<void>(post.release());
     } else {
-        books().change(&PlatformLedger::posts, -1);
+        ledger().change(&PlatformLedger::posts, -1);
     }
     return result;
 }
@@ -171,7 +172,7 @@ KDWork* kdQueueWorkKOR(void (*work)(void* user), void (*done)(void* user), void*
     std::map<KDWork*, Work*> place{{nullptr, counted.get()}};
     KDWork* const handle = real(&Work::run, &Work::finish, counted.get());
     if (handle != nullptr) {
-        books().change(&PlatformLedger::works, 1);
+        ledger().change(&PlatformLedger::works, 1);
         counted->handle = handle;
         auto node = place.extract(place.begin());
         node.key() = handle;

@@ -225,7 +225,7 @@ TEST_F(LogSenderTest, EndsWithTheNetwork) {
     send({"a"});
     ASSERT_TRUE(server.waitForRequest(2));
     sender.reset();
-    // The collector first, then the network: nothing makes either of them anew.
+    // The collector first, then the network: nothing makes either of them again.
     Util::SingletonStorage::destroyAll();
     EXPECT_EQ(0U, log.count(FAILURE));
     EXPECT_EQ(0U, LogCollector::getPendingCount());

@@ -312,10 +312,10 @@ TEST_F(SoakTest, LeavesNothingBehind) {
     const double rise = live.getBytesPerSession(WARM_UP_POINTS);
     std::printf("bytes left by each session: %.2f\n", rise);
     if (!Soak::isExact()) {
-        GTEST_SKIP() << "not judged: run it with GLIBC_TUNABLES=glibc.malloc.tcache_count=0";
+        GTEST_SKIP() << "not checked: run it with GLIBC_TUNABLES=glibc.malloc.tcache_count=0";
     }
     if (number < SESSIONS_TO_JUDGE) {
-        GTEST_SKIP() << "not judged: a curve needs " << SESSIONS_TO_JUDGE << " sessions";
+        GTEST_SKIP() << "not checked: a curve needs " << SESSIONS_TO_JUDGE << " sessions";
     }
     EXPECT_LT(rise, BYTES_PER_SESSION_MAX);
     // The bound would see what a single session leaves.

@@ -23,7 +23,7 @@ class FrozenSoundServer : public ::testing::Test {
   protected:
     void SetUp() override {
         if (!server.isRunning()) {
-            GTEST_SKIP() << "no PulseAudio server to be had: " << server.getOutput();
+            GTEST_SKIP() << "no PulseAudio server: " << server.getOutput();
         }
         ASSERT_EQ(::mkfifo(go.c_str(), 0600), 0);
     }
@@ -88,7 +88,7 @@ class SilentNameServer : public ::testing::Test {
         probe.emplace_back("true");
         const auto result = TestSupport::ChildProcess::run(probe);
         if (result.exitStatus != 0) {
-            GTEST_SKIP() << "no network of one's own to be had: " << result.output;
+            GTEST_SKIP() << "no network namespace: " << result.output;
         }
     }
 

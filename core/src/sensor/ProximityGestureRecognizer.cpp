@@ -45,7 +45,7 @@ bool ProximityGestureRecognizer::start() {
     const unsigned stopsBefore = stopCount;
     const bool started = source && source->start([this](bool isNear) { onSample(isNear); });
     if (stopCount != stopsBefore) {
-        // The callback has stopped it meanwhile, and may have started it anew.
+        // The callback has stopped it meanwhile, and may have started it again.
         if (!listening && started) {
             source->stop();
         }
@@ -168,7 +168,7 @@ void ProximityGestureRecognizer::reportHeld() {
 void ProximityGestureRecognizer::report(const std::vector<std::string>& names) {
     const unsigned stopsBefore = stopCount;
     for (const std::string& name : names) {
-        // Asked each time, because the callback may stop this object, even to start it anew, or
+        // Asked each time, because the callback may stop this object, even to start it again, or
         // replace itself.
         const Callback callback = target;
         if (stopCount == stopsBefore && callback) {

@@ -19,7 +19,7 @@ class AudioThreads : public Util::Singleton<AudioThreads> {
      */
     ~AudioThreads() override;
 
-    /** @return false when there is no thread to be had */
+    /** @return false when the system gives no thread */
     bool start(const boost::shared_ptr<PulseCapture>& capture);
 };
 

@@ -153,7 +153,7 @@ void QueuedRecorder::onWatchTick() {
         fail("the device sends nothing");
         return;
     }
-    // Started anew each time, so that a process that stood still does not count the ticks it
+    // Started again each time, so that a process that stood still does not count the ticks it
     // missed.
     watchTimer.start(KD_TIMER_ONESHOT, WATCH_TICK_NS);
 }

@@ -8,7 +8,7 @@ import org.jspecify.annotations.Nullable;
  * The Android application that the native libraries live in.
  *
  * <p>On Android nothing needs to be done: the process's application is found when it is asked for.
- * Whoever has another context, for instance in a test, hands it over with {@link #install}.
+ * Code that has another context, for instance in a test, hands it over with {@link #install}.
  *
  * <p>Threads: any.
  */

@@ -11,7 +11,7 @@ final class SettingChecks {
 
     private SettingChecks() {}
 
-    /** Judges a value. */
+    /** Checks a value. */
     interface Check<T> {
         /** What is wrong, to follow the key's name; null if nothing is. */
         @Nullable String findFault(T value);

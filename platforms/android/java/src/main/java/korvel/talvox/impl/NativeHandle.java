@@ -1,7 +1,7 @@
 package korvel.talvox.impl;
 
 /**
- * Owns one native object: it is released exactly once, by whoever uses it last, and never used
+ * Owns one native object: it is released exactly once, by its last user, and never used
  * afterwards. All methods may be called from any thread, also from inside a use; no monitor is held
  * while native code runs.
  */

@@ -120,6 +120,6 @@ public final class Microphone implements ShadowAudioRecord.AudioRecordSource, Au
     @Override
     public void close() {
         clock.shutdownNow();
-        due.release(1 << 28); // whoever still reads gets noise at once
+        due.release(1 << 28); // a reader that is left gets noise at once
     }
 }
