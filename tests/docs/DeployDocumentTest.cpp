@@ -93,7 +93,8 @@ TEST(DeployDocument, GivesOneGatewayTheTimeOutsOfSeveral) {
         for (const char* const count : {"one", "many"}) {
             std::string name = kind;
             name.replace(name.find('%'), 1, count);
-            std::istringstream file(ScratchDirectory::read(PROJECT + "docs/deploy/" + name));
+            std::istringstream file(
+                ScratchDirectory::read(std::string(PROJECT).append("docs/deploy/").append(name)));
             for (std::string line; std::getline(file, line);) {
                 const bool isTimeOut = line.find('#') == std::string::npos &&
                                        line.find("timeout ") != std::string::npos &&
