@@ -51,6 +51,16 @@ std::string Recognizer::getErrorReason() const {
     return errorReason;
 }
 
+std::optional<int> Recognizer::getErrorStatus() const {
+    const Util::EventLock lock;
+    return errorStatus;
+}
+
+std::optional<int> Recognizer::getDeviceError() const {
+    const Util::EventLock lock;
+    return deviceError;
+}
+
 void Recognizer::callOnError(SpeechError error, std::string_view reason) {
     kdLogFormatMessage("Recognizer error: %d, %s", error.getCode(), error.getErrorString().c_str());
     keepReason(reason);

@@ -7,6 +7,7 @@
 #include <boost/enable_shared_from_this.hpp>
 #include <boost/shared_ptr.hpp>
 #include <boost/weak_ptr.hpp>
+#include <optional>
 #include <string>
 #include <string_view>
 
@@ -55,6 +56,20 @@ class TALVOX_API Recognizer : public boost::enable_shared_from_this<Recognizer> 
      */
     std::string getErrorReason() const;
 
+    /**
+     * The HTTP status of the answer that ended the session with its error, such as 404; of the last
+     * attempt if there were several. Absent without an error, and if no answer was its cause. Any
+     * thread; takes the event lock.
+     */
+    std::optional<int> getErrorStatus() const;
+
+    /**
+     * The number with which the device recognizer ended the session, one of Android's
+     * `SpeechRecognizer.ERROR_` constants. Absent if it reported none, and with every other kind of
+     * recognizer. Any thread; takes the event lock.
+     */
+    std::optional<int> getDeviceError() const;
+
   protected:
     /**
      * @param facade   not owned; must outlive the recognizer. Null is a broken invariant; the
@@ -82,6 +97,11 @@ class TALVOX_API Recognizer : public boost::enable_shared_from_this<Recognizer> 
     void callOnResults(const boost::shared_ptr<const RecognitionResults>& results,
                        const std::string& requestId);
 
+    /** For `getErrorStatus`; to be set before `callOnError`. */
+    void setErrorStatus(std::optional<int> status) noexcept { errorStatus = status; }
+    /** For `getDeviceError`; to be set before `callOnError`. */
+    void setDeviceError(std::optional<int> number) noexcept { deviceError = number; }
+
     /** For an object that serves one session after another. */
     void forgetReason() noexcept { errorReason.clear(); }
 
@@ -94,6 +114,8 @@ class TALVOX_API Recognizer : public boost::enable_shared_from_this<Recognizer> 
     boost::shared_ptr<const Settings> validatedSettings;
     const Talvox* engine;
     std::string errorReason;
+    std::optional<int> errorStatus;
+    std::optional<int> deviceError;
 };
 
 }  // namespace Talvox

@@ -380,6 +380,9 @@ void KorvelRecognizer::onProtocolResults(boost::shared_ptr<const RecognitionResu
 
 void KorvelRecognizer::onProtocolError(SpeechError error) {
     const boost::shared_ptr<RecognizeProtocol> failed = protocol;
+    if (!isOver()) {
+        setErrorStatus(failed ? failed->getErrorStatus() : std::nullopt);
+    }
     fail(error, failed ? std::string_view(failed->getErrorReason()) : std::string_view());
 }
 

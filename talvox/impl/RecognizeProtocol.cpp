@@ -92,8 +92,7 @@ boost::shared_ptr<RecognizeRequest> RecognizeProtocol::makeRequest(
         const boost::shared_ptr<RecognizeRequest> finished = weakRequest.lock();
         // The holder is the protocol's own and lives as long.
         if (const boost::shared_ptr<RecognizeProtocol> self = weakSelf.lock()) {
-            self->onNetworkRequestFinished(holder, results, requestId,
-                                           finished ? finished->getNoResultsReason() : "");
+            self->onNetworkRequestFinished(holder, results, requestId, finished);
         }
     };
     return request;
@@ -116,14 +115,16 @@ boost::shared_ptr<Util::Timer> RecognizeProtocol::startAnswerTimer(
 
 void RecognizeProtocol::onNetworkRequestFinished(
     Network::NetworkTaskHolder& holder, const boost::shared_ptr<const RecognitionResults>& results,
-    const std::string& requestId, const std::string& reason) {
+    const std::string& requestId, const boost::shared_ptr<const RecognizeRequest>& request) {
     if (abandoned) {
         return;
     }
     const boost::shared_ptr<RecognizeProtocol> self = shared_from_this();
     holder.onFinished();
     if (!results) {
-        notifyError(SpeechError(SpeechError::ErrorNetwork), reason);
+        errorStatus = request ? request->getStatus() : std::nullopt;
+        notifyError(SpeechError(SpeechError::ErrorNetwork),
+                    request ? request->getNoResultsReason() : std::string());
         return;
     }
     listeners.notify([&results, &requestId](RecognizeProtocolListener& listener) {

@@ -7,6 +7,7 @@
 #include <boost/enable_shared_from_this.hpp>
 #include <boost/shared_ptr.hpp>
 #include <boost/weak_ptr.hpp>
+#include <optional>
 #include <string>
 #include <vector>
 
@@ -61,6 +62,8 @@ class RecognizeProtocol : public boost::enable_shared_from_this<RecognizeProtoco
 
     /** Why the error that the listeners were given came about; for `Recognizer::getErrorReason`. */
     const std::string& getErrorReason() const { return errorReason; }
+    /** The HTTP status of the answer without results; for `Recognizer::getErrorStatus`. */
+    std::optional<int> getErrorStatus() const { return errorStatus; }
 
   protected:
     /** Why an utterance without any buffer is an error. */
@@ -99,7 +102,8 @@ class RecognizeProtocol : public boost::enable_shared_from_this<RecognizeProtoco
   private:
     void onNetworkRequestFinished(Network::NetworkTaskHolder& holder,
                                   const boost::shared_ptr<const RecognitionResults>& results,
-                                  const std::string& requestId, const std::string& reason);
+                                  const std::string& requestId,
+                                  const boost::shared_ptr<const RecognizeRequest>& request);
     std::string describeTimeout() const;
     void onNetworkRequestTimeout(Network::NetworkTaskHolder& holder);
 
@@ -110,6 +114,7 @@ class RecognizeProtocol : public boost::enable_shared_from_this<RecognizeProtoco
     /** The request that was made last; the holder owns it. */
     boost::weak_ptr<RecognizeRequest> lastRequest;
     std::string errorReason;
+    std::optional<int> errorStatus;
 };
 
 }  // namespace Talvox

@@ -215,6 +215,7 @@ void RecognizeRequest::onFinished(int code) {
         return;
     }
     kdLogFormatMessage("RecognizeRequest::onFinished: res code %d", code);
+    finalStatus = code > 0 ? std::make_optional(code) : std::nullopt;
     noResultsReason = results ? std::string() : describeNoResults(code);
     // The callback may drop the request.
     const Callback target = callback;

@@ -6,6 +6,7 @@
 
 #include <boost/shared_ptr.hpp>
 #include <functional>
+#include <optional>
 #include <string>
 #include <utility>
 #include <vector>
@@ -56,6 +57,8 @@ class RecognizeRequest : public Network::NetworkTask {
 
     /** Why there are no results, when the request is over; empty before that or when there are. */
     const std::string& getNoResultsReason() const { return noResultsReason; }
+    /** The HTTP status of the answer, when the request is over; absent without an answer. */
+    std::optional<int> getStatus() const { return finalStatus; }
 
     /** Set when a readable results header has arrived. */
     bool resultsReceived = false;
@@ -109,6 +112,7 @@ class RecognizeRequest : public Network::NetworkTask {
     /** Whether the latest response had a results header that could not be read. */
     bool isUnreadable = false;
     std::string noResultsReason;
+    std::optional<int> finalStatus;
 };
 
 }  // namespace Talvox

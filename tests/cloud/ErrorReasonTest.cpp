@@ -55,6 +55,8 @@ TEST_P(RequestReasonTest, IsTheStatus) {
     server.setDefaultAnswer(Answer::status(404));
     recognise();
     expectEnd("ErrorNetwork", "HTTP status 404");
+    EXPECT_EQ(session->getErrorStatus(), 404);
+    EXPECT_EQ(session->getDeviceError(), std::nullopt);
 }
 
 TEST_P(RequestReasonTest, IsEmptyWithoutAnError) {
@@ -62,6 +64,7 @@ TEST_P(RequestReasonTest, IsEmptyWithoutAnError) {
     ASSERT_TRUE(events->waitForEnds());
     EXPECT_EQ(events->texts().back(), "results");
     EXPECT_EQ(session->getErrorReason(), "");
+    EXPECT_EQ(session->getErrorStatus(), std::nullopt);
 }
 
 TEST_P(RequestReasonTest, SaysThatTheServiceIsBusy) {
@@ -85,6 +88,7 @@ TEST_P(RequestReasonTest, IsThatOfTheLastAttempt) {
     recognise();
     letItRetry();
     expectEnd("ErrorNetwork", "HTTP status 502");
+    EXPECT_EQ(session->getErrorStatus(), 502);
 }
 
 TEST_P(RequestReasonTest, KeepsNothingOfAnAttemptBeforeTheResults) {
@@ -105,6 +109,7 @@ TEST_P(RequestReasonTest, IsTheNetworkLayersOwn) {
                                              std::to_string(port.getPort())),
               0U)
         << session->getErrorReason();
+    EXPECT_EQ(session->getErrorStatus(), std::nullopt);
 }
 
 TEST_P(RequestReasonTest, NamesWhatIsWrongWithTheAddress) {
@@ -155,6 +160,7 @@ TEST_P(RequestReasonTest, NoAnswerAfterAFailure) {
     expectEnd("ErrorNetwork",
               "no answer within 20 s; the first attempt failed: HTTP status 503 (the service is "
               "busy)");
+    EXPECT_EQ(session->getErrorStatus(), std::nullopt);
 }
 
 TEST_P(RequestReasonTest, BelongsToItsSession) {

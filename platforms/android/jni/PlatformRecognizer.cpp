@@ -418,7 +418,21 @@ void PlatformRecognizer::takeError(int code) {
                            code);
         code = SpeechError::ErrorUnknown;
     }
-    endWithError(code);
+    endWithDeviceError(code);
+}
+
+void PlatformRecognizer::endWithDeviceError(int code) {
+    if (!over) {
+        setDeviceError(causeNumber);
+    }
+    endWithError(code, causeReason);
+}
+
+void PlatformRecognizer::onErrorCause(std::optional<int> number, const std::string& reason) {
+    if (!over && !pendingResults) {
+        causeNumber = number;
+        causeReason = reason;
+    }
 }
 
 void PlatformRecognizer::onEvent() {

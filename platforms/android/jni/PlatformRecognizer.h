@@ -79,6 +79,12 @@ class PlatformRecognizer : public Talvox::Recognizer, private Talvox::ExceptionW
      *     number is logged and reported as `ErrorUnknown`
      */
     void onError(int code);
+    /**
+     * Says why the error comes that `onError` reports next.
+     * @param number what the device recognizer reported; absent if Java found the failure itself
+     * @param reason for `getErrorReason`
+     */
+    void onErrorCause(std::optional<int> number, const std::string& reason);
     /** Any other callback: a sign of life. */
     void onEvent();
 
@@ -106,6 +112,7 @@ class PlatformRecognizer : public Talvox::Recognizer, private Talvox::ExceptionW
     void finishWithResults(const boost::shared_ptr<const Talvox::RecognitionResults>& results);
     void takeSound(const char* data, unsigned size);
     void takeError(int code);
+    void endWithDeviceError(int code);
     void makeHttpRequest(const boost::shared_ptr<const Sound::SoundDataBuffer>& sound);
     void logSession(const boost::shared_ptr<const Sound::SoundDataBuffer>& sound);
     void submitLog(const boost::shared_ptr<const Sound::SoundDataBuffer>& sound);
@@ -129,4 +136,7 @@ class PlatformRecognizer : public Talvox::Recognizer, private Talvox::ExceptionW
     int64_t silenceDeadline = 0;
     std::unique_ptr<Util::Timer> silenceTimer;
     std::optional<Talvox::ExceptionWatch> exceptionWatch;
+    /** Of the error that Java reports next. */
+    std::optional<int> causeNumber;
+    std::string causeReason;
 };

@@ -1,5 +1,7 @@
 // Entry points of korvel.talvox.impl.PlatformRecognizer.
 #include <boost/make_shared.hpp>
+#include <optional>
+#include <string>
 #include <vector>
 
 #include "EntryPoint.h"
@@ -151,6 +153,16 @@ JNIEXPORT void JNICALL Java_korvel_talvox_impl_PlatformRecognizer_onErrorInterna
                                                                                   jint code) {
     receive(recognizer,
             [code](JNIEnv* /*env*/, PlatformRecognizer& target) { target.onError(code); });
+}
+
+JNIEXPORT void JNICALL Java_korvel_talvox_impl_PlatformRecognizer_onErrorCauseInternal(
+    JNIEnv* /*env*/, jclass /*type*/, jlong recognizer, jobject number, jstring reason) {
+    receive(recognizer, [number, reason](JNIEnv* env, PlatformRecognizer& target) {
+        target.onErrorCause(number == nullptr ? std::nullopt
+                                              : std::make_optional<int>(
+                                                    Jni::callInt(env, number, "intValue", "()I")),
+                            reason == nullptr ? std::string() : Jni::toUtf8(env, reason));
+    });
 }
 
 JNIEXPORT void JNICALL Java_korvel_talvox_impl_PlatformRecognizer_onEventInternal(

@@ -1,6 +1,7 @@
 #include "RecognizerListenerImpl.h"
 
 #include <exception>
+#include <optional>
 
 #include "Env.h"
 #include "Text.h"
@@ -11,6 +12,8 @@ namespace {
 
 /** References that an event needs besides those of its hypotheses; of these one lives at a time. */
 const jint FRAME_SIZE = 10;
+
+const char* const DETAIL_METHOD = "onErrorDetail";
 
 Jni::LocalRef<jobjectArray> makeTexts(JNIEnv* env, const Talvox::RecognitionResults& results) {
     std::vector<std::string> texts;
@@ -31,6 +34,15 @@ Jni::LocalRef<jfloatArray> makeConfidences(JNIEnv* env, const Talvox::Recognitio
     env->SetFloatArrayRegion(array.get(), 0, count, values.data());
     Jni::check(env);
     return array;
+}
+
+/** Null without a number. */
+Jni::LocalRef<jobject> makeInteger(JNIEnv* env, std::optional<int> number) {
+    if (!number) {
+        return Jni::LocalRef<jobject>(env, nullptr);
+    }
+    const Jni::LocalRef<jclass> type = Jni::findClass(env, "java/lang/Integer");
+    return Jni::newObject(env, type.get(), "(I)V", static_cast<jint>(*number));
 }
 
 }  // namespace
@@ -126,22 +138,26 @@ void RecognizerListenerImpl::onResults(Talvox::Recognizer* source,
     }
 }
 
-void RecognizerListenerImpl::reportReason(const Talvox::Recognizer& source) {
-    deliver("onErrorReason", FRAME_SIZE, [this, &source](JNIEnv* env) {
+void RecognizerListenerImpl::reportDetail(const Talvox::Recognizer& source) {
+    deliver(DETAIL_METHOD, FRAME_SIZE, [this, &source](JNIEnv* env) {
         const jmethodID method =
-            env->GetMethodID(javaClass.getClass(), "onErrorReason", "(Ljava/lang/String;)V");
+            env->GetMethodID(javaClass.getClass(), DETAIL_METHOD,
+                             "(Ljava/lang/String;Ljava/lang/Integer;Ljava/lang/Integer;)V");
         if (method == nullptr) {
             env->ExceptionClear();
             return;
         }
-        const Jni::LocalRef<jstring> text = Jni::toJString(env, source.getErrorReason());
-        env->CallNonvirtualVoidMethod(javaObject.get(), javaClass.getClass(), method, text.get());
+        const Jni::LocalRef<jstring> reason = Jni::toJString(env, source.getErrorReason());
+        const Jni::LocalRef<jobject> status = makeInteger(env, source.getErrorStatus());
+        const Jni::LocalRef<jobject> number = makeInteger(env, source.getDeviceError());
+        env->CallNonvirtualVoidMethod(javaObject.get(), javaClass.getClass(), method, reason.get(),
+                                      status.get(), number.get());
         Jni::check(env);
     });
 }
 
 void RecognizerListenerImpl::onError(Talvox::Recognizer* source, Talvox::SpeechError error) {
-    reportReason(*source);
+    reportDetail(*source);
     deliver("onError", FRAME_SIZE, [this, error](JNIEnv* env) {
         callJava(env, "onError", "(I)V", static_cast<jint>(error.getCode()));
     });

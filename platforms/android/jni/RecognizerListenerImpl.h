@@ -46,8 +46,8 @@ class RecognizerListenerImpl : public Talvox::RecognizerListener {
     template <typename Event>
     void deliver(const char* name, jint localReferences, Event event);
 
-    /** Hands the reason of the error that follows to a Java object that wants to know it. */
-    void reportReason(const Talvox::Recognizer& source);
+    /** Hands what is known of the error that follows to a Java object that wants to know it. */
+    void reportDetail(const Talvox::Recognizer& source);
 
     /** Calls a method of exactly the kept class. */
     template <typename... Args>

@@ -1,8 +1,6 @@
 package korvel.talvox;
 
 import java.util.Objects;
-import java.util.regex.Matcher;
-import java.util.regex.Pattern;
 import org.jspecify.annotations.Nullable;
 
 /**
@@ -10,13 +8,6 @@ import org.jspecify.annotations.Nullable;
  * users. A value that is not known, or that has no part in the error, is absent. Immutable.
  */
 public final class ErrorDetail {
-    /**
-     * Native code has the status in its reason only. What follows a semicolon is the reason of an
-     * attempt before the last one.
-     */
-    private static final Pattern HTTP_STATUS =
-            Pattern.compile("^(?:[^;]*\\()?HTTP status (\\d{3})");
-
     private final String reason;
     private final @Nullable Integer httpStatus;
     private final @Nullable Integer deviceError;
@@ -31,12 +22,6 @@ public final class ErrorDetail {
         this.httpStatus = httpStatus;
         this.deviceError = deviceError;
         this.recorderState = recorderState;
-    }
-
-    /** The status of the gateway's answer that a reason of the network layer names; or null. */
-    static @Nullable Integer findHttpStatus(String reason) {
-        final Matcher matcher = HTTP_STATUS.matcher(reason);
-        return matcher.find() ? Integer.valueOf(matcher.group(1)) : null;
     }
 
     /**

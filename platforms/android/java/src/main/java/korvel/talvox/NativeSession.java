@@ -1,7 +1,6 @@
 package korvel.talvox;
 
 import korvel.core.RecordingReport;
-import korvel.talvox.impl.DeviceFailure;
 import korvel.talvox.impl.EngineBackend;
 import korvel.talvox.impl.NativeHandle;
 import korvel.talvox.impl.Recognizer;
@@ -15,6 +14,8 @@ final class NativeSession implements Recognizer.Events {
     private final EngineBackend.Events events;
     private final RecordingReport recording = new RecordingReport();
     private String errorReason = "";
+    private @Nullable Integer httpStatus;
+    private @Nullable Integer deviceError;
 
     private NativeSession(EngineBackend.Events events) {
         this.events = events;
@@ -77,30 +78,27 @@ final class NativeSession implements Recognizer.Events {
     }
 
     @Override
-    public void onErrorReason(String reason) {
+    public void onErrorDetail(
+            String reason, @Nullable Integer status, @Nullable Integer deviceNumber) {
         errorReason = reason;
+        httpStatus = status;
+        deviceError = deviceNumber;
     }
 
     @Override
     public void onError(int code) {
-        final DeviceFailure device = DeviceFailure.take();
         final SpeechError error = SpeechError.fromCode(code);
-        events.onError(error, describe(error, device));
+        events.onError(
+                error,
+                new ErrorDetail(
+                        findReason(error),
+                        httpStatus,
+                        deviceError,
+                        RecorderState.of(recording.getState())));
     }
 
-    private ErrorDetail describe(SpeechError error, @Nullable DeviceFailure device) {
-        return new ErrorDetail(
-                findReason(error, device),
-                error == SpeechError.NETWORK ? ErrorDetail.findHttpStatus(errorReason) : null,
-                device == null ? null : device.getNumber(),
-                RecorderState.of(recording.getState()));
-    }
-
-    /** Native code knows that the recorder or the device recognizer has failed, but not why. */
-    private String findReason(SpeechError error, @Nullable DeviceFailure device) {
-        if (device != null && errorReason.isEmpty()) {
-            return device.getReason();
-        }
+    /** Native code knows that the recorder has failed, but not why. */
+    private String findReason(SpeechError error) {
         final String failure = recording.getFailure();
         return error == SpeechError.AUDIO && !failure.isEmpty()
                 ? errorReason + ": " + failure
@@ -110,7 +108,6 @@ final class NativeSession implements Recognizer.Events {
     @Override
     public void onResults(
             int outcome, String[] texts, float[] confidences, String requestId) {
-        DeviceFailure.take();
         events.onResults(Recognition.fromNative(outcome, texts, confidences, requestId));
     }
 }

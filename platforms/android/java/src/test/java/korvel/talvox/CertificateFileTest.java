@@ -1,12 +1,14 @@
 package korvel.talvox;
 
 import static org.junit.Assert.assertEquals;
+import static org.junit.Assert.assertNull;
 import static org.junit.Assert.assertThrows;
 import static org.junit.Assert.assertTrue;
 
 import java.io.File;
 import java.nio.charset.StandardCharsets;
 import java.nio.file.Files;
+import java.util.concurrent.atomic.AtomicReference;
 import korvel.talvox.support.Connectivity;
 import korvel.talvox.support.EngineTestCase;
 import korvel.talvox.support.Events;
@@ -39,10 +41,18 @@ public class CertificateFileTest extends EngineTestCase {
     /**
      * Sends what a microphone hears until the recording has begun; without results in any case.
      *
-     * @return the reason
+     * @return what is known of the error
      */
-    private String recognize() throws InterruptedException {
-        final Events events = new Events();
+    private ErrorDetail recognize() throws InterruptedException {
+        final AtomicReference<ErrorDetail> detail = new AtomicReference<>();
+        final Events events =
+                new Events() {
+                    @Override
+                    public void onError(SpeechError error, ErrorDetail value) {
+                        detail.set(value);
+                        super.onError(error, value);
+                    }
+                };
         try (Microphone microphone = new Microphone(16000, 4).plugIn();
                 TalvoxRecognizer recognizer =
                         engine.createRecognizer(
@@ -51,7 +61,7 @@ public class CertificateFileTest extends EngineTestCase {
             assertEquals("recordingBegin", events.next());
             recognizer.stop();
             assertEquals("error NETWORK", events.end());
-            return recognizer.getErrorReason();
+            return detail.get();
         }
     }
 
@@ -60,11 +70,12 @@ public class CertificateFileTest extends EngineTestCase {
         try (RecordingGateway gateway =
                 new RecordingGateway(true, authority.getServerCertificate())) {
             useGateway(gateway.getUrl());
-            final String reason = recognize();
-            assertTrue(reason, reason.contains("certificate"));
+            final ErrorDetail refused = recognize();
+            assertTrue(refused.toString(), refused.getReason().contains("certificate"));
+            assertNull(refused.getHttpStatus());
             assertTrue("the request was sent all the same", gateway.isEmpty());
             engine.setCertificateFile(authority.getFile());
-            recognize();
+            assertEquals((Integer) 200, recognize().getHttpStatus());
             assertEquals("/asrgw", gateway.take().path);
             engine.setCertificateFile(new PrivateAuthority(folder.newFolder()).getFile());
             recognize();

@@ -88,18 +88,9 @@ public class ErrorDetailTest extends EngineTestCase {
 
     @Test
     public void theStatusOfTheAnswer() throws Exception {
-        try (RecordingGateway gateway = new RecordingGateway(true);
-                Microphone microphone = new Microphone(16000, 4).plugIn()) {
-            useGateway(gateway.getUrl());
+        try (RecordingGateway gateway = new RecordingGateway(true)) {
             gateway.setStatus(404);
-            final ErrorDetail detail =
-                    fail(
-                            "NETWORK",
-                            NOTHING,
-                            recognizer -> {
-                                nextIs("recordingBegin");
-                                recognizer.stop();
-                            });
+            final ErrorDetail detail = failAtGateway(gateway.getUrl());
             assertDetail(detail, "HTTP status 404", 404, null, RecorderState.RECORDING);
         }
     }
@@ -112,16 +103,62 @@ public class ErrorDetailTest extends EngineTestCase {
         }
     }
 
+    /** Records until the recording has begun, and stops; the answer brings the error. */
+    private ErrorDetail failAtGateway(String url) throws Exception {
+        useGateway(url);
+        try (Microphone microphone = new Microphone(16000, 4).plugIn()) {
+            return fail(
+                    "NETWORK",
+                    NOTHING,
+                    recognizer -> {
+                        nextIs("recordingBegin");
+                        recognizer.stop();
+                    });
+        }
+    }
+
+    /** The kinds of failure between the device and the results that have no status. */
+    private void assertNoAnswer(String url, String reason) throws Exception {
+        final ErrorDetail detail = failAtGateway(url);
+        assertTrue(detail.toString(), detail.getReason().startsWith(reason));
+        assertDetail(detail, detail.getReason(), null, null, RecorderState.RECORDING);
+    }
+
     @Test
-    public void theStatusIsFoundInAllReasonsThatNameOne() {
-        assertEquals((Integer) 503, ErrorDetail.findHttpStatus("HTTP status 503 (the service is busy)"));
-        assertEquals(
-                (Integer) 200,
-                ErrorDetail.findHttpStatus("the answer holds no results (HTTP status 200)"));
-        assertNull(ErrorDetail.findHttpStatus("could not connect to server"));
-        assertNull(
-                ErrorDetail.findHttpStatus(
-                        "no answer within 20 s; the first attempt failed: HTTP status 503"));
+    public void eachStatusIsTheNumberOfTheAnswer() throws Exception {
+        try (RecordingGateway gateway = new RecordingGateway(true)) {
+            gateway.setStatus(500);
+            assertDetail(
+                    failAtGateway(gateway.getUrl()),
+                    "HTTP status 500",
+                    500,
+                    null,
+                    RecorderState.RECORDING);
+            gateway.setStatus(503);
+            assertDetail(
+                    failAtGateway(gateway.getUrl()),
+                    "HTTP status 503 (the service is busy)",
+                    503,
+                    null,
+                    RecorderState.RECORDING);
+            gateway.setStatus(200);
+            assertDetail(
+                    failAtGateway(gateway.getUrl()),
+                    "the answer holds no results (HTTP status 200)",
+                    200,
+                    null,
+                    RecorderState.RECORDING);
+        }
+    }
+
+    @Test
+    public void aGatewayThatRefusesTheConnection() throws Exception {
+        assertNoAnswer("http://127.0.0.1:9", "Failed to connect to 127.0.0.1 port 9");
+    }
+
+    @Test
+    public void aNameThatNoServerKnows() throws Exception {
+        assertNoAnswer("http://gateway.invalid", "Could not resolve host: gateway.invalid");
     }
 
     @Test

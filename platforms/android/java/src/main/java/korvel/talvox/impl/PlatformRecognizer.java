@@ -136,7 +136,8 @@ public final class PlatformRecognizer {
             Log.e(TAG, "the application has no permission RECORD_AUDIO: nothing can be recorded");
             fail(
                     SpeechError.AUDIO.getCode(),
-                    DeviceFailure.ofReason("the application lacks the permission RECORD_AUDIO"));
+                    null,
+                    "the application lacks the permission RECORD_AUDIO");
             return;
         }
         try {
@@ -147,7 +148,8 @@ public final class PlatformRecognizer {
             Log.e(TAG, "the device recognizer does not start", failure);
             fail(
                     SpeechError.NOT_AVAILABLE.getCode(),
-                    DeviceFailure.ofReason("the device recognizer does not start: " + failure));
+                    null,
+                    "the device recognizer does not start: " + failure);
         }
     }
 
@@ -207,8 +209,15 @@ public final class PlatformRecognizer {
         destroy();
     }
 
-    private void fail(int code, DeviceFailure failure) {
-        finish(() -> failure.report(() -> onErrorInternal(recognizer, code)));
+    /**
+     * @param number what the device recognizer reported; null if the kit found the failure itself
+     */
+    private void fail(int code, @Nullable Integer number, String reason) {
+        finish(
+                () -> {
+                    onErrorCauseInternal(recognizer, number, reason);
+                    onErrorInternal(recognizer, code);
+                });
     }
 
     /** What the platform calls, on the main looper. */
@@ -266,7 +275,10 @@ public final class PlatformRecognizer {
             if (error == SpeechRecognizer.ERROR_INSUFFICIENT_PERMISSIONS) {
                 Log.e(TAG, "the device recognizer was refused the permission RECORD_AUDIO");
             }
-            fail(PlatformErrors.toEngine(error), DeviceFailure.ofNumber(error));
+            fail(
+                    PlatformErrors.toEngine(error),
+                    error,
+                    "the device recognizer reported " + PlatformErrors.describe(error));
         }
 
         @Override
@@ -298,6 +310,9 @@ public final class PlatformRecognizer {
 
     private static native void onResultsInternal(
             long recognizer, String[] texts, float @Nullable [] scores);
+
+    private static native void onErrorCauseInternal(
+            long recognizer, @Nullable Integer number, String reason);
 
     private static native void onErrorInternal(long recognizer, int code);
 

@@ -3,6 +3,7 @@ package korvel.talvox.impl;
 import android.os.Bundle;
 import android.util.Log;
 import korvel.talvox.SpeechError;
+import org.jspecify.annotations.Nullable;
 
 /**
  * The native side's partner in one recognition. Applications use {@link
@@ -24,8 +25,15 @@ public final class Recognizer {
 
         void onBufferReceived(byte[] buffer);
 
-        /** Comes right before {@link #onError}; empty where the cause is not known. */
-        void onErrorReason(String reason);
+        /**
+         * Comes right before {@link #onError}.
+         *
+         * @param reason empty where the cause is not known
+         * @param httpStatus of the gateway's answer, if it is the cause
+         * @param deviceError the number that the device recognizer reported, if it did
+         */
+        void onErrorDetail(
+                String reason, @Nullable Integer httpStatus, @Nullable Integer deviceError);
 
         void onError(int code);
 
@@ -95,8 +103,9 @@ public final class Recognizer {
         events.onBufferReceived(buffer);
     }
 
-    private void onErrorReason(String reason) {
-        events.onErrorReason(reason);
+    private void onErrorDetail(
+            String reason, @Nullable Integer httpStatus, @Nullable Integer deviceError) {
+        events.onErrorDetail(reason, httpStatus, deviceError);
     }
 
     private void onError(int code) {

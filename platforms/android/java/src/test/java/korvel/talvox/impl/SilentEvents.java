@@ -18,7 +18,7 @@ class SilentEvents implements Recognizer.Events {
     public void onBufferReceived(byte[] buffer) {}
 
     @Override
-    public void onErrorReason(String reason) {}
+    public void onErrorDetail(String reason, Integer httpStatus, Integer deviceError) {}
 
     @Override
     public void onError(int code) {}
