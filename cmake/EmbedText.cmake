@@ -1,6 +1,6 @@
-# cmake -DOUTPUT=FILE.cpp -DASSETS="NAME=FILE;..." -P EmbedText.cmake
-# Writes a source that defines each file's text as a constant `Cli::NAME`.
-file(WRITE ${OUTPUT} "#include \"cli/report/Assets.h\"\n\nnamespace Cli {\n")
+# cmake -DOUTPUT=FILE.cpp -DHEADER=FILE.h -DNAMESPACE=NAME -DASSETS="NAME=FILE;..." -P EmbedText.cmake
+# Writes a source that defines each file's text as a constant of the namespace.
+file(WRITE ${OUTPUT} "#include \"${HEADER}\"\n\nnamespace ${NAMESPACE} {\n")
 foreach(asset ${ASSETS})
     string(REPLACE "=" ";" parts ${asset})
     list(GET parts 0 name)
@@ -17,4 +17,4 @@ foreach(asset ${ASSETS})
     endwhile()
     file(APPEND ${OUTPUT} ";\n")
 endforeach()
-file(APPEND ${OUTPUT} "\n}  // namespace Cli\n")
+file(APPEND ${OUTPUT} "\n}  // namespace ${NAMESPACE}\n")

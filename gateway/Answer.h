@@ -10,8 +10,9 @@ namespace Gateway {
 struct Answer {
     unsigned status = 200;
     std::vector<std::pair<std::string, std::string>> headers;
-    /** Plain text; the reason where the request was refused. */
+    /** The reason where the request was refused. */
     std::string body;
+    std::string contentType = "text/plain; charset=utf-8";
 
     /** A refusal; clients get `reason` as the body. */
     static Answer refuse(unsigned status, const std::string& reason) {

@@ -23,6 +23,12 @@ class Arrivals {
     /** The answer is ready. Its time counts from the last piece, or from the head without any. */
     void answer(KDust at);
 
+    /** Time from the head to another moment, in nanoseconds. */
+    KDust sinceHead(KDust at) const { return at - headAt; }
+
+    /** Time that the answer took, in nanoseconds; 0 before it. */
+    KDust getAnswerTime() const { return isAnswered ? answerAt - lastAt : 0; }
+
     /**
      * Such as "pieces=35 first=1ms last=3402ms gap=104ms answer=143ms": the number of pieces, the
      * first and the last of them as times since the head, the longest time between two, and the

@@ -7,6 +7,7 @@
 #include "core/util/Ascii.h"
 #include "core/util/UrlCoder.h"
 #include "gateway/LogText.h"
+#include "gateway/Page.h"
 #include "pal/kd_log.h"
 #include "pal/kd_time.h"
 
@@ -32,6 +33,10 @@ bool isWellCoded(const std::string& text) {
     return true;
 }
 
+bool isReading(const std::string& method) {
+    return method == "GET" || method == "HEAD";
+}
+
 Answer refuseMethod(const std::string& reason, const std::string& allowed) {
     Answer answer = Answer::refuse(405, reason);
     answer.headers.emplace_back("Allow", allowed);
@@ -39,6 +44,7 @@ Answer refuseMethod(const std::string& reason, const std::string& allowed) {
 }
 
 const char* const HEALTH_PATH = "/health";
+const char* const LOG_PATH = "/log";
 
 bool isRecognitionPath(const std::string& path) {
     return path == RecognitionRequest::WHOLE_PATH || path == RecognitionRequest::STREAMING_PATH;
@@ -48,7 +54,10 @@ bool isRecognitionPath(const std::string& path) {
 
 HttpExchange::HttpExchange(Server& exchangeServer, MHD_Connection* httpConnection, const char* path,
                            const char* method)
-    : server(exchangeServer), connection(httpConnection), arrivals(kdGetTimeUST()) {
+    : server(exchangeServer),
+      connection(httpConnection),
+      sessions(exchangeServer.getSessions()),
+      arrivals(kdGetTimeUST()) {
     head.path = Util::UrlCoder::urlDecodeString(toText(path));
     head.method = toText(method);
     head.uuid = readArgument("uuid");
@@ -77,19 +86,35 @@ Answer HttpExchange::judgeHead() {
         return judgeRecognition();
     }
     if (head.path == HEALTH_PATH) {
-        isAnsweredAtEnd = head.method == "GET" || head.method == "HEAD";
+        isAnsweredAtEnd = isReading(head.method);
         return isAnsweredAtEnd ? Answer()
                                : refuseMethod("health is asked for with GET or HEAD", "GET, HEAD");
     }
-    if (head.path != "/log") {
-        return Answer::refuse(404,
-                              "there is nothing here but /asrgw, /asrgw_chunked, /log and /health");
+    if (sessions != nullptr && Page::owns(head.path)) {
+        isAnsweredAtEnd = isReading(head.method);
+        return isAnsweredAtEnd ? Answer()
+                               : refuseMethod("the page is read with GET or HEAD", "GET, HEAD");
+    }
+    if (head.path != LOG_PATH) {
+        const std::string hint = head.path == "/" ? "; a page needs --page" : "";
+        return Answer::refuse(
+            404, "there is nothing here but /asrgw, /asrgw_chunked, /log and /health" + hint);
     }
     isAnsweredAtEnd = head.method == "GET";
     return isAnsweredAtEnd ? Answer() : refuseMethod("records come in GET requests", "GET");
 }
 
 Answer HttpExchange::judgeRecognition() {
+    Answer answer = judgeRecognitionHead();
+    if (sessions != nullptr && answer.status != 200) {
+        RequestSummary summary;
+        summary.refusal = answer.body.substr(0, answer.body.find('\n'));
+        sessions->end(sessions->begin(head), answer.status, summary, 0);
+    }
+    return answer;
+}
+
+Answer HttpExchange::judgeRecognitionHead() {
     if (head.method != "POST") {
         return refuseMethod("recognition requests are POST requests", "POST");
     }
@@ -110,12 +135,22 @@ Answer HttpExchange::judgeRecognition() {
 void HttpExchange::beginBody(const std::string& boundary) {
     request = std::make_unique<RecognitionRequest>(head, boundary, server.getPool(),
                                                    server.getOptions().maxBodyBytes);
-    pump = std::make_unique<BodyPump>([this](const std::string& piece) {
-        if (server.getOptions().verbose) {
-            log(0, "sends " + std::to_string(piece.size()) + " bytes");
-        }
-        request->write(piece.data(), piece.size());
-    });
+    if (sessions != nullptr) {
+        session = sessions->begin(head);
+        request->setSoundSink(
+            [this](const std::vector<int16_t>& samples) { sessions->addSound(session, samples); });
+    }
+    pump = std::make_unique<BodyPump>([this](const std::string& piece) { writeBody(piece); });
+}
+
+void HttpExchange::writeBody(const std::string& piece) {
+    if (server.getOptions().verbose) {
+        log(0, "sends " + std::to_string(piece.size()) + " bytes");
+    }
+    request->write(piece.data(), piece.size());
+    if (sessions != nullptr) {
+        sessions->update(session, request->summarise());
+    }
 }
 
 bool HttpExchange::onBody(const char* data, std::size_t size) {
@@ -123,15 +158,18 @@ bool HttpExchange::onBody(const char* data, std::size_t size) {
     if (!pump) {
         return true;
     }
-    arrivals.add(kdGetTimeUST());
+    const KDust now = kdGetTimeUST();
+    arrivals.add(now);
     bodyBytes += size;
+    if (sessions != nullptr) {
+        sessions->addPiece(session, arrivals.sinceHead(now), size);
+    }
     pump->push(data, size);
     return request->takes(bodyBytes);
 }
 
-Answer HttpExchange::judgeRecord() const {
-    const std::optional<std::string> uuid = readRawArgument("uuid");
-    const std::optional<std::string> record = readRawArgument("logmessage");
+Answer HttpExchange::judgeRecord(const std::optional<std::string>& uuid,
+                                 const std::optional<std::string>& record) const {
     if (!uuid || !record) {
         return Answer::refuse(400, uuid ? "there is no logmessage" : "there is no uuid");
     }
@@ -155,8 +193,25 @@ Answer HttpExchange::sayReady() const {
     return answer;
 }
 
+Answer HttpExchange::answerPage() const {
+    return Page::answer(*sessions, {head.path, readHeader("Host"), readArgument("instance"),
+                                    readArgument("after"), readArgument("id")});
+}
+
+Answer HttpExchange::answerAtEnd() const {
+    if (head.path == HEALTH_PATH) {
+        return sayReady();
+    }
+    return head.path == LOG_PATH ? keepRecord() : answerPage();
+}
+
 Answer HttpExchange::keepRecord() const {
-    Answer answer = judgeRecord();
+    const std::optional<std::string> record = readRawArgument("logmessage");
+    Answer answer = judgeRecord(readRawArgument("uuid"), record);
+    if (sessions != nullptr) {
+        sessions->addRecord(head.uuid, Util::UrlCoder::urlDecodeString(record.value_or("")),
+                            answer.status);
+    }
     if (answer.status != 200) {
         logRefusal(answer);
     } else if (server.getOptions().verbose) {
@@ -167,7 +222,7 @@ Answer HttpExchange::keepRecord() const {
 
 bool HttpExchange::onEnd() {
     if (isAnsweredAtEnd && !answered) {
-        return send(head.path == HEALTH_PATH ? sayReady() : keepRecord());
+        return send(answerAtEnd());
     }
     if (!request || answered) {
         return true;
@@ -182,6 +237,9 @@ Answer HttpExchange::recognise() {
     pump.reset();
     Answer answer = request->finish();
     arrivals.answer(kdGetTimeUST());
+    if (sessions != nullptr) {
+        sessions->end(session, answer.status, request->summarise(), arrivals.getAnswerTime());
+    }
     if (!readHeader(ARRIVALS_HEADER).empty()) {
         answer.headers.emplace_back(ARRIVALS_HEADER, arrivals.describe());
     }
@@ -191,6 +249,9 @@ Answer HttpExchange::recognise() {
 void HttpExchange::onCompleted() {
     pump.reset();
     if (request && !answered) {
+        if (sessions != nullptr) {
+            sessions->end(session, 0, request->summarise(), 0);
+        }
         log(0, "went away: " + request->describe(arrivals.describe()));
     }
 }
@@ -203,7 +264,7 @@ bool HttpExchange::send(const Answer& answer) {
     }
     answered = true;
     bool sendable =
-        MHD_add_response_header(response, "Content-Type", "text/plain; charset=utf-8") == MHD_YES;
+        MHD_add_response_header(response, "Content-Type", answer.contentType.c_str()) == MHD_YES;
     for (const auto& header : answer.headers) {
         sendable = MHD_add_response_header(response, header.first.c_str(), header.second.c_str()) ==
                        MHD_YES &&

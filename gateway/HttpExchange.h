@@ -37,10 +37,15 @@ class HttpExchange {
   private:
     Answer judgeHead();
     Answer judgeRecognition();
+    Answer judgeRecognitionHead();
     void beginBody(const std::string& boundary);
+    void writeBody(const std::string& piece);
     Answer recognise();
     Answer sayReady() const;
-    Answer judgeRecord() const;
+    Answer answerPage() const;
+    Answer answerAtEnd() const;
+    Answer judgeRecord(const std::optional<std::string>& uuid,
+                       const std::optional<std::string>& record) const;
     Answer keepRecord() const;
     bool send(const Answer& answer);
     void logRefusal(const Answer& answer) const;
@@ -52,6 +57,9 @@ class HttpExchange {
     Server& server;
     MHD_Connection* const connection;
     RequestHead head;
+    /** What the page shows; null without it. */
+    SessionList* const sessions;
+    SessionList::Id session = 0;
     Arrivals arrivals;
     std::size_t bodyBytes = 0;
     std::unique_ptr<RecognitionRequest> request;

@@ -132,6 +132,23 @@ std::string RecognitionRequest::describe(const std::string& times) const {
     return text;
 }
 
+RequestSummary RecognitionRequest::summarise() const {
+    RequestSummary summary;
+    summary.requestId = requestId;
+    summary.language = fields.get("lang");
+    summary.topic = fields.get("topic");
+    summary.soundType = soundType.empty() ? head.soundType : soundType;
+    summary.transcripts = fields.get("transcripts");
+    summary.remark = soundDecoder ? soundDecoder->getRemark() : std::string();
+    summary.refusal = refusedReason;
+    summary.isCanceled = fields.has("canceled");
+    summary.bodyBytes = bodyBytes;
+    summary.soundBytes = soundBytes;
+    summary.decodeMs = utterance ? utterance->getDecodeMs() : decodeMs;
+    summary.hypotheses = hypotheses;
+    return summary;
+}
+
 std::string RecognitionRequest::onPartBegin(const MultipartPart& part) {
     inSound = part.name == "audio";
     return inSound ? beginSound(part) : fields.begin(part.name);
@@ -200,6 +217,9 @@ std::string RecognitionRequest::beginSound(const MultipartPart& part) {
 
 std::string RecognitionRequest::takeSamples(const std::vector<int16_t>& samples) {
     soundSamples += samples.size();
+    if (soundSink) {
+        soundSink(samples);
+    }
     // Sound that nobody recognises is decoded all the same.
     if (soundSamples > Utterance::MAX_SAMPLES || (utterance && !utterance->add(samples))) {
         refuse(413,

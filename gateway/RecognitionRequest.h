@@ -2,14 +2,17 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <functional>
 #include <memory>
 #include <string>
+#include <utility>
 #include <vector>
 
 #include "gateway/Answer.h"
 #include "gateway/DecoderPool.h"
 #include "gateway/MultipartParser.h"
 #include "gateway/RequestFields.h"
+#include "gateway/RequestSummary.h"
 #include "gateway/SoundDecoder.h"
 #include "gateway/Utterance.h"
 
@@ -56,6 +59,12 @@ class RecognitionRequest : private MultipartListener {
     RecognitionRequest(const RequestHead& requestHead, const std::string& boundary,
                        DecoderPool& decoderPool, std::size_t maxBodyBytes);
 
+    /** Takes sound as it is decoded, at the model's rate, on the thread that writes the body. */
+    using SoundSink = std::function<void(const std::vector<int16_t>& samples)>;
+
+    /** Calls `sink` with all sound from now on. */
+    void setSoundSink(SoundSink sink) { soundSink = std::move(sink); }
+
     /** Takes more of the body. @return as `takes` for all of the body so far */
     bool write(const char* data, std::size_t size);
 
@@ -70,6 +79,9 @@ class RecognitionRequest : private MultipartListener {
      * @param times fields about when it arrived, to be put among the others; may be empty
      */
     std::string describe(const std::string& times) const;
+
+    /** What is known so far; not while another thread writes the body. */
+    RequestSummary summarise() const;
 
     /** The hypotheses of the answer. */
     const std::vector<Hypothesis>& getHypotheses() const { return hypotheses; }
@@ -95,6 +107,7 @@ class RecognitionRequest : private MultipartListener {
     std::string soundType;
     std::unique_ptr<SoundDecoder> soundDecoder;
     std::unique_ptr<Utterance> utterance;
+    SoundSink soundSink;
     bool hasSound = false;
     bool inSound = false;
     std::size_t bodyBytes = 0;

@@ -10,6 +10,7 @@
 #include <exception>
 
 #include "gateway/HttpExchange.h"
+#include "gateway/Loopback.h"
 #include "pal/kd_log.h"
 
 namespace Gateway {
@@ -84,7 +85,9 @@ struct AddressList {
 }  // namespace
 
 Server::Server(const ServerOptions& serverOptions)
-    : options(serverOptions), pool(options.model, options.decoders, options.decoderWaitMs) {}
+    : options(serverOptions),
+      pool(options.model, options.decoders, options.decoderWaitMs),
+      sessions(options.hasPage ? std::make_unique<SessionList>() : nullptr) {}
 
 Server::~Server() {
     stop();
@@ -110,6 +113,13 @@ std::string Server::start() {
                                     &hints, &addresses.first);
     if (failure != 0) {
         return "the address " + options.host + " is not known: " + gai_strerror(failure);
+    }
+    for (const addrinfo* it = addresses.first; it != nullptr; it = it->ai_next) {
+        onLoopback = onLoopback && isLoopback(*it->ai_addr);
+    }
+    if (options.hasPage && !onLoopback) {
+        return "the page shows what all clients say, so it needs a loopback address; " +
+               options.host + " is none";
     }
     for (const addrinfo* it = addresses.first; it != nullptr && daemon == nullptr;
          it = it->ai_next) {

@@ -2,10 +2,12 @@
 
 #include <cstddef>
 #include <cstdint>
+#include <memory>
 #include <string>
 
 #include "gateway/DecoderPool.h"
 #include "gateway/RecordLog.h"
+#include "gateway/SessionList.h"
 #include "gateway/SpeechModel.h"
 
 struct MHD_Daemon;
@@ -29,6 +31,8 @@ struct ServerOptions {
     /** Seconds after which a client that says nothing is given up. */
     unsigned idleSeconds = 30;
     bool verbose = false;
+    /** Serve the page of the last sessions at "/"; on a loopback address only. */
+    bool hasPage = false;
     /** File to which usage records are appended; empty for the standard output. */
     std::string recordFile;
     SpeechModel model;
@@ -63,6 +67,11 @@ class Server {
     const ServerOptions& getOptions() const { return options; }
     DecoderPool& getPool() { return pool; }
     RecordLog& getRecordLog() { return recordLog; }
+    /** What the page shows; null without the page. */
+    SessionList* getSessions() { return sessions.get(); }
+
+    /** Whether only programs of this machine reach the server; known after `start`. */
+    bool isOnLoopback() const { return onLoopback; }
 
   private:
     void listen(const addrinfo& address);
@@ -70,6 +79,8 @@ class Server {
     const ServerOptions options;
     DecoderPool pool;
     RecordLog recordLog;
+    const std::unique_ptr<SessionList> sessions;
+    bool onLoopback = true;
     MHD_Daemon* daemon = nullptr;
     uint16_t port = 0;
 };

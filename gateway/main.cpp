@@ -38,10 +38,6 @@ CLI::Validator wholeNumber(unsigned min, unsigned max) {
     return {check, "from " + std::to_string(min) + " to " + std::to_string(max)};
 }
 
-bool isLoopback(const std::string& host) {
-    return host == "localhost" || host == "::1" || host.compare(0, 4, "127.") == 0;
-}
-
 void declareOptions(CLI::App& app, Gateway::ServerOptions& options) {
     app.set_version_flag("--version", VERSION);
     app.add_option("--host", options.host, "Address to listen on")->capture_default_str();
@@ -73,6 +69,8 @@ void declareOptions(CLI::App& app, Gateway::ServerOptions& options) {
     app.add_option("--log-file", options.recordFile,
                    "File to which the usage records that clients send to /log are appended, one "
                    "line each [standard output]");
+    app.add_flag("--page", options.hasPage,
+                 "Show the last sessions on a page at /, as they run; needs a loopback address");
     app.add_flag("--verbose", options.verbose, "Log each piece of a request as it arrives");
 }
 
@@ -96,11 +94,14 @@ int run(const Gateway::ServerOptions& options) {
         return 1;
     }
     kdLogFormatMessage("development gateway, for the loopback interface only");
-    if (!isLoopback(options.host)) {
+    if (!server.isOnLoopback()) {
         kdLogFormatMessage(
             "WARNING: %s is not a loopback address; anybody who reaches it can use "
             "this gateway",
             options.host.c_str());
+    }
+    if (options.hasPage) {
+        kdLogFormatMessage("the last sessions are shown at %s/", server.getUrl().c_str());
     }
     std::printf("talvox-gateway listening on %s\n", server.getUrl().c_str());
     std::fflush(stdout);

@@ -7,6 +7,7 @@
 #include "Assets.h"
 #include "cli/UsageError.h"
 #include "core/util/Base64Coder.h"
+#include "tools/WavBytes.h"
 
 namespace Cli {
 
@@ -42,13 +43,6 @@ std::string dataText(const nlohmann::ordered_json& data) {
     return text;
 }
 
-void appendNumber(std::string& bytes, uint32_t number, int count) {
-    for (int index = 0; index < count; ++index) {
-        bytes += static_cast<char>(number & 0xFFU);
-        number >>= 8U;
-    }
-}
-
 }  // namespace
 
 std::string reportPage(const std::string& title, const nlohmann::ordered_json& data) {
@@ -78,23 +72,7 @@ void writeReport(const std::string& path, const std::string& title,
 }
 
 std::string wavAddress(const std::vector<int16_t>& samples, int sampleRateHz) {
-    const auto dataSize = static_cast<uint32_t>(samples.size() * 2);
-    const auto rate = static_cast<uint32_t>(sampleRateHz);
-    std::string bytes = "RIFF";
-    appendNumber(bytes, 36 + dataSize, 4);
-    bytes += "WAVEfmt ";
-    appendNumber(bytes, 16, 4);
-    appendNumber(bytes, 1, 2);
-    appendNumber(bytes, 1, 2);
-    appendNumber(bytes, rate, 4);
-    appendNumber(bytes, rate * 2, 4);
-    appendNumber(bytes, 2, 2);
-    appendNumber(bytes, 16, 2);
-    bytes += "data";
-    appendNumber(bytes, dataSize, 4);
-    for (const int16_t sample : samples) {
-        appendNumber(bytes, static_cast<uint16_t>(sample), 2);
-    }
+    const std::string bytes = Tools::makeWav(samples, static_cast<unsigned>(sampleRateHz));
     return "data:audio/wav;base64," + Util::Base64Coder::encode({bytes.begin(), bytes.end()});
 }
 

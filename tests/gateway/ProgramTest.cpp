@@ -52,7 +52,7 @@ TEST(GatewayProgram, ExplainsItself) {
     for (const char* text :
          {"loopback", "--host", "--port", "--model-dir", "--lm", "--dict", "--max-body", "16777216",
           "from 1 to 1073741824", "--decoders", "from 1 to 64", "--decoder-wait", "4000",
-          "from 0 to 60000", "from 0 to 65535", "--lang", "--log-file", "--verbose"}) {
+          "from 0 to 60000", "from 0 to 65535", "--lang", "--log-file", "--page", "--verbose"}) {
         EXPECT_NE(std::string::npos, help.output.find(text)) << text;
     }
     const ChildProcess::Result version = ChildProcess::run({GATEWAY_BINARY, "--version"});
@@ -90,4 +90,16 @@ TEST(GatewayProgram, RefusesWrongUsage) {
     EXPECT_EQ(1, result.exitStatus);
     EXPECT_NE(std::string::npos,
               result.output.find("talvox-gateway: cannot read the model's file /nowhere"));
+}
+
+TEST(GatewayProgram, KeepsThePageOnThisMachine) {
+    const ChildProcess::Result open =
+        ChildProcess::run({GATEWAY_BINARY, "--page", "--host", "0.0.0.0", "--port", "0"});
+    EXPECT_EQ(1, open.exitStatus);
+    EXPECT_EQ(
+        "talvox-gateway: the page shows what all clients say, so it needs a loopback address; "
+        "0.0.0.0 is none\n",
+        open.output);
+    ChildProcess program({GATEWAY_BINARY, "--page", "--port", "0"});
+    EXPECT_NE("", readLine(program, "the last sessions are shown at http://127.0.0.1:"));
 }
