@@ -90,26 +90,6 @@ TEST_F(PlatformRecognizerTest, ADeviceThatDoesNotAnswerAfterTheEndOfSpeechEndsTh
     expectNextWorks();
 }
 
-TEST_F(PlatformRecognizerTest, TheCauseOfAnErrorIsTheDevices) {
-    recognizer->start();
-    recognizer->onErrorCause(99, "the device recognizer reported 99");
-    EXPECT_EQ(recognizer->getDeviceError(), std::nullopt);
-    say(Saying::ERROR);
-    EXPECT_EQ(recognizer->getErrorReason(), "the device recognizer reported 99");
-    EXPECT_EQ(recognizer->getDeviceError(), 99);
-    EXPECT_EQ(recognizer->getErrorStatus(), std::nullopt);
-}
-
-TEST_F(PlatformRecognizerTest, ACauseThatCancelOvertakesDoesNotCount) {
-    recognizer->start();
-    recognizer->onErrorCause(99, "the device recognizer reported 99");
-    recognizer->cancel();
-    say(Saying::ERROR);
-    EXPECT_THAT(events, ElementsAre("ErrorCanceled"));
-    EXPECT_EQ(recognizer->getErrorReason(), "the application cancelled");
-    EXPECT_EQ(recognizer->getDeviceError(), std::nullopt);
-}
-
 TEST_F(PlatformRecognizerTest, AnEndStopsTheClock) {
     for (const Saying what : {Saying::RESULTS, Saying::NO_HYPOTHESIS, Saying::ERROR}) {
         events.clear();
