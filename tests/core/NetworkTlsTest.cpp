@@ -102,6 +102,28 @@ TEST_F(NetworkTlsTest, ReadsTheAuthoritiesOnceWhileTheyAllowEveryConnection) {
     EXPECT_EQ("finished 200", fetch("localhost"));
 }
 
+TEST_F(NetworkTlsTest, TrustsNoAuthorityThatAnEarlierRequestTrusted) {
+    server.script({TestSupport::Answer::status(200).held()});
+    NetworkManager::getInstance().setCertificateFile(path("server.pem"));
+    const auto early = makeTask(server.getUrl());
+    holder.submitNoRetries(early);
+    ASSERT_TRUE(server.waitForRequest(1));
+    NetworkManager::getInstance().setCertificateFile("");
+    Network::NetworkTaskHolder other;
+    const auto late = makeTask(server.getUrl());
+    other.submitNoRetries(late);
+    EXPECT_EQ("finished 200", late->waitForEnd());
+    // The handle of the early request comes back last, so it would serve the next one.
+    server.release();
+    EXPECT_EQ("finished 200", early->waitForEnd());
+    settle();
+    EXPECT_EQ("finished -1", fetch("localhost"));
+    NetworkManager::getInstance().setCertificateFile(path("server.pem"));
+    EXPECT_EQ("finished 200", fetch("localhost"));
+    NetworkManager::getInstance().setCertificateFile("");
+    EXPECT_EQ("finished -1", fetch("localhost"));
+}
+
 TEST_F(NetworkTlsTest, FailsWithoutTheFileThatWasSet) {
     NetworkManager::getInstance().setCertificateFile(path("missing.pem"));
     EXPECT_EQ("finished -1", fetch("localhost"));

@@ -30,6 +30,20 @@ struct Timer::State : boost::enable_shared_from_this<Timer::State> {
         }
     }
 
+    // With the first start: most requests end without a use for their timers.
+    void install() {
+        if (!isInstalled && kdInstallCallback(&State::onTimer, KD_EVENT_TIMER, this) != 0) {
+            throw std::bad_alloc();
+        }
+        isInstalled = true;
+    }
+
+    void uninstall() {
+        if (isInstalled) {
+            kdInstallCallback(nullptr, KD_EVENT_TIMER, this);
+        }
+    }
+
     static void onTimer(const KDEvent* event) {
         // The function may destroy the timer.
         const boost::shared_ptr<State> self =
@@ -41,6 +55,7 @@ struct Timer::State : boost::enable_shared_from_this<Timer::State> {
     }
 
     const std::function<void()> callback;
+    bool isInstalled = false;
     KDTimer* handle = nullptr;
     int type = KD_TIMER_ONESHOT;
 };
@@ -48,15 +63,12 @@ struct Timer::State : boost::enable_shared_from_this<Timer::State> {
 Timer::Timer(std::function<void()> callback)
     : state(boost::make_shared<State>(std::move(callback))) {
     KOR_ASSERT(state->callback);
-    if (kdInstallCallback(&State::onTimer, KD_EVENT_TIMER, state.get()) != 0) {
-        throw std::bad_alloc();
-    }
 }
 
 Timer::~Timer() {
     const EventLock lock;
     state->cancel();
-    kdInstallCallback(nullptr, KD_EVENT_TIMER, state.get());
+    state->uninstall();
 }
 
 void Timer::start(int type, int64_t periodNs) {
@@ -65,6 +77,7 @@ void Timer::start(int type, int64_t periodNs) {
         return;
     }
     state->cancel();
+    state->install();
     state->type = type;
     state->handle = kdSetTimer(periodNs, type, state.get());
     if (state->handle == nullptr && isTimerType(type)) {

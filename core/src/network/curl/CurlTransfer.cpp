@@ -1,6 +1,8 @@
 #include "network/curl/CurlTransfer.h"
 
+#include <algorithm>
 #include <boost/weak_ptr.hpp>
+#include <cstddef>
 #include <limits>
 #include <string_view>
 #include <utility>
@@ -18,6 +20,33 @@ namespace {
 // The time-outs are ours, on the platform clock.
 constexpr long NO_CONNECT_LIMIT_MS = std::numeric_limits<int>::max();
 constexpr long MOST_REDIRECTS = 10;
+
+/** Options that this libcurl does not know are no obstacle; any other refusal is. */
+bool isSet(CURLcode code) {
+    return code == CURLE_OK || code == CURLE_UNKNOWN_OPTION || code == CURLE_NOT_BUILT_IN;
+}
+
+bool isPlain(char c) {
+    return c > ' ' && c < '\x7F';
+}
+
+/**
+ * The target of a request that has a query: what follows the host. "" if libcurl must find it,
+ * because there is no query or a character of the path is sent encoded.
+ */
+std::string makeTarget(const std::string& url) {
+    const std::size_t query = url.find('?');
+    if (query == std::string::npos) {
+        return {};
+    }
+    const std::size_t host = url.find_first_not_of('/', url.find("://") + 1);
+    const std::size_t path = std::min(url.find('/', host), query);
+    const auto at = [&url](std::size_t i) { return url.begin() + static_cast<std::ptrdiff_t>(i); };
+    if (!std::all_of(at(path), at(query), &isPlain)) {
+        return {};
+    }
+    return (path == query ? "/" : "") + url.substr(path);
+}
 
 bool isSecure(const std::string& url) {
     return url.size() > 4 && (url[4] == 's' || url[4] == 'S');
@@ -48,73 +77,81 @@ void CurlTransfer::cancel() noexcept {
 }
 
 CURL* CurlTransfer::open(const std::string& certificateFile) {
-    easy.reset(transport->takeHandle(certificateFile));
-    if (easy) {
-        setUpConnection(certificateFile);
+    handle = transport->getHandles().take(certificateFile);
+    isSetUp = static_cast<bool>(handle.easy);
+    if (isSetUp) {
         setUpRequest();
         setUpHeaders();
     }
-    if (hadNoMemory) {
-        easy.reset();  // half set up, it must not serve again
+    if (!isSetUp) {
+        handle.easy.reset();  // half set up, it must not serve again
     }
-    return easy.get();
+    return handle.easy.get();
 }
 
-// A handle serves one request after the other without a reset, which could fail and not say so:
-// each request sets every option that any of them sets.
+bool CurlTransfer::setUpHandle(CURL* easy) {
+    bool isDone = true;
+    const auto setOption = [easy, &isDone](CURLoption option, auto value) {
+        isDone = isDone && isSet((curl_easy_setopt)(easy, option, value));
+    };
+    setOption(CURLOPT_NOSIGNAL, 1L);
+    // Otherwise the end of a transfer waits for a name server that does not answer.
+    setOption(CURLOPT_QUICK_EXIT, 1L);
+    setOption(CURLOPT_CONNECTTIMEOUT_MS, NO_CONNECT_LIMIT_MS);
+    // Settings come from the application only, never from the environment.
+    setOption(CURLOPT_PROXY, "");
+    setOption(CURLOPT_HTTP_VERSION, static_cast<long>(CURL_HTTP_VERSION_1_1));
+    setOption(CURLOPT_SSLVERSION, static_cast<long>(CURL_SSLVERSION_TLSv1_2));
+    setOption(CURLOPT_PATH_AS_IS, 1L);
+    setOption(CURLOPT_PROTOCOLS_STR, "http,https");
+    setOption(CURLOPT_MAXREDIRS, MOST_REDIRECTS);
+    setOption(CURLOPT_NOPROGRESS, 0L);
+    setOption(CURLOPT_PREREQFUNCTION, &CurlTransfer::onConnection);
+    setOption(CURLOPT_XFERINFOFUNCTION, &CurlTransfer::onProgress);
+    setOption(CURLOPT_HEADERFUNCTION, &CurlTransfer::onHeader);
+    setOption(CURLOPT_WRITEFUNCTION, &CurlTransfer::onWrite);
+    setOption(CURLOPT_READFUNCTION, &CurlTransfer::onRead);
+    setOption(CURLOPT_SEEKFUNCTION, &CurlTransfer::onSeek);
+    return isDone;
+}
+
 template <typename Value>
 void CurlTransfer::set(CURLoption option, Value value) {
-    // Options that this libcurl does not know are no obstacle.
-    hadNoMemory =
-        hadNoMemory || (curl_easy_setopt)(easy.get(), option, value) == CURLE_OUT_OF_MEMORY;
+    isSetUp = isSetUp && isSet((curl_easy_setopt)(handle.easy.get(), option, value));
 }
 
-void CurlTransfer::setUpConnection(const std::string& certificateFile) {
-    set(CURLOPT_NOSIGNAL, 1L);
-    // Otherwise the end of a transfer waits for a name server that does not answer.
-    set(CURLOPT_QUICK_EXIT, 1L);
-    set(CURLOPT_CONNECTTIMEOUT_MS, NO_CONNECT_LIMIT_MS);
-    // Settings come from the application only, never from the environment.
-    set(CURLOPT_PROXY, "");
-    set(CURLOPT_HTTP_VERSION, static_cast<long>(CURL_HTTP_VERSION_1_1));
-    set(CURLOPT_SSLVERSION, static_cast<long>(CURL_SSLVERSION_TLSv1_2));
-    transport->getSockets().attach(easy.get());
-    set(CURLOPT_PREREQFUNCTION, &CurlTransfer::onConnection);
-    set(CURLOPT_PREREQDATA, this);
-    set(CURLOPT_FRESH_CONNECT, 0L);
-    hadNoMemory = hadNoMemory || !transport->setAuthorities(easy.get(), certificateFile);
-    set(CURLOPT_ERRORBUFFER, errorText.data());
-    set(CURLOPT_NOPROGRESS, 0L);
-    set(CURLOPT_XFERINFOFUNCTION, &CurlTransfer::onProgress);
-    set(CURLOPT_XFERINFODATA, this);
-}
-
+// Each request sets all of these, whatever its method: the last one's are still there.
 void CurlTransfer::setUpRequest() {
-    const std::string& url = request->getUrl();
-    set(CURLOPT_URL, url.c_str());
-    set(CURLOPT_PATH_AS_IS, 1L);
-    set(CURLOPT_PROTOCOLS_STR, "http,https");
-    const bool isPost = request->getMethod() == "POST";
-    set(CURLOPT_FOLLOWLOCATION, !isPost && request->getFollowRedirects() ? 1L : 0L);
-    set(CURLOPT_MAXREDIRS, MOST_REDIRECTS);
-    set(CURLOPT_REDIR_PROTOCOLS_STR, isSecure(url) ? "https" : "http,https");
-    if (isPost) {
+    for (const CURLoption option : {CURLOPT_PREREQDATA, CURLOPT_XFERINFODATA, CURLOPT_HEADERDATA,
+                                    CURLOPT_WRITEDATA, CURLOPT_READDATA, CURLOPT_SEEKDATA}) {
+        set(option, this);
+    }
+    set(CURLOPT_ERRORBUFFER, errorText.data());
+    set(CURLOPT_FRESH_CONNECT, 0L);
+    setUpAddress();
+    if (request->getMethod() == "POST") {
         setUpBody();
     } else {
         set(CURLOPT_HTTPGET, 1L);
     }
-    set(CURLOPT_HEADERFUNCTION, &CurlTransfer::onHeader);
-    set(CURLOPT_HEADERDATA, this);
-    set(CURLOPT_WRITEFUNCTION, &CurlTransfer::onWrite);
-    set(CURLOPT_WRITEDATA, this);
+}
+
+// libcurl takes an address apart and puts it together again, character by character. For a usage
+// record, whose text is the query, that costs more than all that we do. A query has no syntax, so
+// libcurl gets it as a part of the target only. After a redirect the target is another one.
+void CurlTransfer::setUpAddress() {
+    const std::string& url = request->getUrl();
+    const bool mayBeRedirected = request->getMethod() != "POST" && request->getFollowRedirects();
+    const std::string target = mayBeRedirected ? std::string() : makeTarget(url);
+    const std::string address = target.empty() ? url : url.substr(0, url.find('?'));
+    set(CURLOPT_URL, address.c_str());
+    set(CURLOPT_REQUEST_TARGET, target.empty() ? nullptr : target.c_str());
+    set(CURLOPT_FOLLOWLOCATION, mayBeRedirected ? 1L : 0L);
+    set(CURLOPT_REDIR_PROTOCOLS_STR, isSecure(url) ? "https" : "http,https");
 }
 
 void CurlTransfer::setUpBody() {
     set(CURLOPT_POST, 1L);
-    set(CURLOPT_READFUNCTION, &CurlTransfer::onRead);
-    set(CURLOPT_READDATA, this);
-    set(CURLOPT_SEEKFUNCTION, &CurlTransfer::onSeek);
-    set(CURLOPT_SEEKDATA, this);
     if (request->isChunked()) {
         const boost::weak_ptr<CurlTransfer> weak(shared_from_this());
         request->getWriter()->setWakeUp([weak] {
@@ -150,7 +187,7 @@ void CurlTransfer::setUpHeaders() {
 void CurlTransfer::addHeaderLine(const std::string& line) {
     curl_slist* const longer = curl_slist_append(headerLines.get(), line.c_str());
     if (longer == nullptr) {
-        hadNoMemory = true;
+        isSetUp = false;
         return;
     }
     static_cast<void>(headerLines.release());
@@ -175,7 +212,7 @@ std::string CurlTransfer::describe(CURLcode result) const {
     if (refusal != nullptr) {
         return refusal;
     }
-    if (!easy) {
+    if (!handle.easy) {
         return "no memory for the request";
     }
     if (result == CURLE_OPERATION_TIMEDOUT) {
@@ -190,17 +227,17 @@ std::string CurlTransfer::describe(CURLcode result) const {
 
 long CurlTransfer::getStatus() const {
     long status = 0;
-    if (!easy) {
+    if (!handle.easy) {
         return status;
     }
-    curl_easy_getinfo(easy.get(), CURLINFO_RESPONSE_CODE, &status);
+    curl_easy_getinfo(handle.easy.get(), CURLINFO_RESPONSE_CODE, &status);
     return status;
 }
 
 // A peer that has answered may close the connection without listening to the end.
 bool CurlTransfer::isAnswered() const {
     curl_off_t expected = -1;
-    curl_easy_getinfo(easy.get(), CURLINFO_CONTENT_LENGTH_DOWNLOAD_T, &expected);
+    curl_easy_getinfo(handle.easy.get(), CURLINFO_CONTENT_LENGTH_DOWNLOAD_T, &expected);
     return expected >= 0 && receivedBytes >= expected;
 }
 
@@ -218,8 +255,8 @@ void CurlTransfer::abandon() {
     }
     watchdog.stop();
     listener.reset();
-    if (easy) {
-        transport->giveBack(easy.release());
+    if (handle.easy) {
+        transport->getHandles().giveBack(std::move(handle));
     }
 }
 
@@ -232,10 +269,10 @@ void CurlTransfer::wake() {
 
 void CurlTransfer::resume() {
     wakeUpPosted = false;
-    if (easy && paused) {
+    if (handle.easy && paused) {
         paused = false;
         watchdog.progress();
-        curl_easy_pause(easy.get(), CURLPAUSE_CONT);
+        curl_easy_pause(handle.easy.get(), CURLPAUSE_CONT);
     }
 }
 
@@ -282,8 +319,9 @@ bool CurlTransfer::handleHeadEnd() {
 // be taken for the answer to this request. libcurl looks at that only since late versions.
 bool CurlTransfer::canUseConnection(int ownPort) {
     long connectionsMade = 0;
-    curl_easy_getinfo(easy.get(), CURLINFO_NUM_CONNECTS, &connectionsMade);
-    needsNewConnection = connectionsMade == 0 && transport->getSockets().hasArrivals(ownPort);
+    curl_easy_getinfo(handle.easy.get(), CURLINFO_NUM_CONNECTS, &connectionsMade);
+    needsNewConnection =
+        connectionsMade == 0 && transport->getHandles().getSockets().hasArrivals(ownPort);
     return !needsNewConnection;
 }
 
@@ -293,7 +331,7 @@ bool CurlTransfer::takeNewConnection() {
         needsNewConnection = false;
         errorText[0] = '\0';
         kdLogMessage("Network: there is something unasked on a kept connection, taking a new one");
-        curl_easy_setopt(easy.get(), CURLOPT_FRESH_CONNECT, 1L);
+        curl_easy_setopt(handle.easy.get(), CURLOPT_FRESH_CONNECT, 1L);
     }
     return needed;
 }

@@ -13,6 +13,7 @@
 #include "core/network/Transport.h"
 #include "network/RequestBody.h"
 #include "network/Watchdog.h"
+#include "network/curl/Handles.h"
 #include "network/curl/ResponseHead.h"
 
 namespace Network {
@@ -36,7 +37,14 @@ class CurlTransfer : public Transfer, public boost::enable_shared_from_this<Curl
     /** Starts to measure the time. Any thread, under the event lock. */
     void startWatchdog() { watchdog.start(); }
 
-    /** Sets up the handle; null when it cannot be done for want of memory. */
+    /**
+     * Sets what all requests have in common. The rest is set for each request, because a handle
+     * serves one after the other without a reset, which could fail and not say so.
+     * @return false if memory is short; the handle must not be used then
+     */
+    static bool setUpHandle(CURL* easy);
+
+    /** Sets up the handle for this request; null when it cannot be done for want of memory. */
     CURL* open(const std::string& certificateFile);
 
     /** Makes the transfer end with its next progress. Any thread. */
@@ -63,17 +71,14 @@ class CurlTransfer : public Transfer, public boost::enable_shared_from_this<Curl
     void abandon();
 
   private:
-    struct EasyDeleter {
-        void operator()(CURL* handle) const { curl_easy_cleanup(handle); }
-    };
     struct ListDeleter {
         void operator()(curl_slist* list) const { curl_slist_free_all(list); }
     };
 
     template <typename Value>
     void set(CURLoption option, Value value);
-    void setUpConnection(const std::string& certificateFile);
     void setUpRequest();
+    void setUpAddress();
     void setUpBody();
     void setUpHeaders();
     void addHeaderLine(const std::string& line);
@@ -105,10 +110,10 @@ class CurlTransfer : public Transfer, public boost::enable_shared_from_this<Curl
 
     std::unique_ptr<curl_slist, ListDeleter> headerLines;
     std::array<char, CURL_ERROR_SIZE> errorText{};
-    bool hadNoMemory = false;
+    bool isSetUp = false;
     /** Set when we ended the transfer ourselves; libcurl only knows that a callback failed. */
     const char* refusal = nullptr;
-    std::unique_ptr<CURL, EasyDeleter> easy;
+    Handle handle;
     RequestBody body;
     ResponseHead head;
     bool paused = false;

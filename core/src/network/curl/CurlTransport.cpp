@@ -77,11 +77,6 @@ TransferEnd judge(const CurlTransfer& transfer, CURLcode result) noexcept {
     }
 }
 
-bool isTlsFailure(CURLcode result) {
-    return result == CURLE_SSL_CONNECT_ERROR || result == CURLE_PEER_FAILED_VERIFICATION ||
-           result == CURLE_SSL_CERTPROBLEM || result == CURLE_SSL_CACERT_BADFILE;
-}
-
 }  // namespace
 
 CurlTransport::CurlTransport() {
@@ -278,35 +273,6 @@ void CurlTransport::start(const boost::shared_ptr<CurlTransfer>& transfer) {
     }
 }
 
-// Making a handle costs as much as the rest of a small request.
-CURL* CurlTransport::takeHandle(const std::string& certificates) {
-    if (certificates != spareCertificateFile) {
-        spareHandle.reset();
-        spareCertificateFile = certificates;
-    }
-    return spareHandle ? spareHandle.release() : curl_easy_init();
-}
-
-bool CurlTransport::setAuthorities(CURL* handle, const std::string& file) {
-    // How long libcurl may use what it has read.
-    const long cacheS = hasFailedTls ? 0 : AUTHORITY_CACHE_S;
-    // A libcurl that keeps nothing does not know the option.
-    if (curl_easy_setopt(handle, CURLOPT_CA_CACHE_TIMEOUT, cacheS) == CURLE_OUT_OF_MEMORY) {
-        return false;
-    }
-    if (file.empty()) {
-        return authorities.attach(handle, hasFailedTls);
-    }
-    return curl_easy_setopt(handle, CURLOPT_CAINFO, file.c_str()) == CURLE_OK &&
-           curl_easy_setopt(handle, CURLOPT_CAPATH, nullptr) != CURLE_OUT_OF_MEMORY;
-}
-
-void CurlTransport::giveBack(CURL* handle) {
-    // What the next request sets may be written there.
-    curl_easy_setopt(handle, CURLOPT_ERRORBUFFER, nullptr);
-    spareHandle.reset(handle);
-}
-
 void CurlTransport::requestAbandon(const boost::shared_ptr<CurlTransfer>& transfer) noexcept {
     try {
         const boost::shared_ptr<CurlTransport> self = shared_from_this();
@@ -342,9 +308,7 @@ void CurlTransport::finish(Transfers::iterator entry, CURLcode result) {
         curl_multi_add_handle(multi.get(), entry->first) == CURLM_OK) {
         return;
     }
-    // Authorities that were read while memory was short are kept with what is missing in them. So
-    // after a failure each connection reads them anew.
-    hasFailedTls = hasFailedTls || isTlsFailure(result);
+    handles.noteEnd(result);
     const TransferEnd how = judge(*transfer, result);
     transfers.erase(entry);
     transfer->end(how);

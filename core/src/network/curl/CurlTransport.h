@@ -15,8 +15,7 @@
 #include <vector>
 
 #include "core/network/Transport.h"
-#include "network/curl/OpenSockets.h"
-#include "network/curl/PlatformAuthorities.h"
+#include "network/curl/Handles.h"
 
 namespace Network {
 
@@ -52,24 +51,8 @@ class CurlTransport : public Transport, public boost::enable_shared_from_this<Cu
     /** Network thread only. */
     void start(const boost::shared_ptr<CurlTransfer>& transfer);
 
-    /**
-     * A handle, owned by the caller; null on failure. It keeps what its last request set, of the
-     * authorities apart: these are the default or this file. Network thread only.
-     */
-    CURL* takeHandle(const std::string& certificateFile);
-
-    /**
-     * Sets the authorities that a handle's request trusts: those of the file, or the platform's if
-     * there is none. Network thread only.
-     * @return false if memory is short
-     */
-    bool setAuthorities(CURL* handle, const std::string& certificateFile);
-
-    /** Takes back a handle, to be used again. Network thread only. */
-    void giveBack(CURL* handle);
-
     /** Network thread only. */
-    OpenSockets& getSockets() { return sockets; }
+    Handles& getHandles() { return handles; }
 
     /** Has `abandon` called on the network thread. Any thread; does not block, and cannot fail. */
     void requestAbandon(const boost::shared_ptr<CurlTransfer>& transfer) noexcept;
@@ -81,12 +64,7 @@ class CurlTransport : public Transport, public boost::enable_shared_from_this<Cu
     struct MultiDeleter {
         void operator()(CURLM* handle) const { curl_multi_cleanup(handle); }
     };
-    struct EasyDeleter {
-        void operator()(CURL* handle) const { curl_easy_cleanup(handle); }
-    };
     using Transfers = std::map<CURL*, boost::shared_ptr<CurlTransfer>>;
-
-    static constexpr long AUTHORITY_CACHE_S = 24L * 60 * 60;
 
     bool launchThread();
     bool takesCommands();
@@ -115,14 +93,9 @@ class CurlTransport : public Transport, public boost::enable_shared_from_this<Cu
 
     std::atomic<bool> stopping{false};
 
-    // Network thread. The sockets are the last to go, and the connections go before the
-    // authorities.
-    OpenSockets sockets;
-    PlatformAuthorities authorities;
+    // Network thread. The connections, which are the multi handle's, go before what they use.
+    Handles handles;
     std::unique_ptr<CURLM, MultiDeleter> multi;
-    std::unique_ptr<CURL, EasyDeleter> spareHandle;
-    std::string spareCertificateFile;
-    bool hasFailedTls = false;
     Transfers transfers;
     // Kept for their room: sound that comes piece by piece needs none of its own.
     std::vector<std::function<void()>> currentCommands;

@@ -37,12 +37,13 @@ void OpenSockets::attach(CURL* handle) {
     curl_easy_setopt(handle, CURLOPT_CLOSESOCKETDATA, this);
 }
 
-bool OpenSockets::hasArrivals(int ownPort) const {
+bool OpenSockets::hasArrivals(int ownPort) {
     // Connections to different hosts may share a port; then one of the others costs a new one.
-    return std::any_of(sockets.begin(), sockets.end(), [ownPort](curl_socket_t socket) {
-        pollfd entry{socket, POLLIN, 0};
-        return ownPort > 0 && getOwnPort(socket) == ownPort && ::poll(&entry, 1, 0) > 0;
-    });
+    return ownPort > 0 && std::any_of(sockets.begin(), sockets.end(), [ownPort](auto& entry) {
+               entry.second = entry.second > 0 ? entry.second : getOwnPort(entry.first);
+               pollfd question{entry.first, POLLIN, 0};
+               return entry.second == ownPort && ::poll(&question, 1, 0) > 0;
+           });
 }
 
 curl_socket_t OpenSockets::onOpen(void* self, curlsocktype, curl_sockaddr* address) {
@@ -52,7 +53,7 @@ curl_socket_t OpenSockets::onOpen(void* self, curlsocktype, curl_sockaddr* addre
         return CURL_SOCKET_BAD;
     }
     const curl_socket_t known = guardForCurl(CURL_SOCKET_BAD, [self, socket] {
-        static_cast<OpenSockets*>(self)->sockets.insert(socket);
+        static_cast<OpenSockets*>(self)->sockets.emplace(socket, 0);
         return socket;
     });
     if (known == CURL_SOCKET_BAD) {

@@ -2,7 +2,7 @@
 
 #include <curl/curl.h>
 
-#include <set>
+#include <map>
 
 namespace Network {
 
@@ -17,13 +17,14 @@ class OpenSockets {
     void attach(CURL* handle);
 
     /** Whether anything waits to be read on the connection from this port of ours. */
-    bool hasArrivals(int ownPort) const;
+    bool hasArrivals(int ownPort);
 
   private:
     static curl_socket_t onOpen(void* self, curlsocktype purpose, curl_sockaddr* address);
     static int onClose(void* self, curl_socket_t socket);
 
-    std::set<curl_socket_t> sockets;
+    /** With the port that a socket is bound to; 0 until someone asked for it. */
+    std::map<curl_socket_t, int> sockets;
 };
 
 }  // namespace Network
