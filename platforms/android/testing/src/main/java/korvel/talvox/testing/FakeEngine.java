@@ -106,8 +106,12 @@ public final class FakeEngine implements AutoCloseable {
 
     /** Sets the languages of {@link TalvoxEngine#getAvailableLanguages}. */
     public synchronized void setAvailableLanguages(String... tags) {
+        final List<String> wanted = Arrays.asList(Objects.requireNonNull(tags, "tags"));
+        for (String tag : wanted) {
+            Objects.requireNonNull(tag, "tags");
+        }
         languages.clear();
-        languages.addAll(Arrays.asList(Objects.requireNonNull(tags, "tags")));
+        languages.addAll(wanted);
     }
 
     /** Sets the answer of {@link TalvoxEngine#isRecognitionAvailable}, true unless set. */
