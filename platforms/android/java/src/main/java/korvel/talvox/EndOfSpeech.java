@@ -2,7 +2,7 @@ package korvel.talvox;
 
 /**
  * Ready-made values of {@link TalvoxSettings#VAD} for kinds of use. The document ENDPOINTING.md has
- * the measured figures of each.
+ * the measured figures of each. Constants, for any thread.
  */
 public final class EndOfSpeech {
     /** For short commands without pauses: a quick end. */

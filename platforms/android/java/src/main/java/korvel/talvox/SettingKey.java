@@ -7,7 +7,7 @@ import org.jspecify.annotations.Nullable;
 
 /**
  * The name of a setting together with the type of its values. The keys are the constants of {@link
- * TalvoxSettings}.
+ * TalvoxSettings}. Immutable.
  *
  * @param <T> the type of the values
  */

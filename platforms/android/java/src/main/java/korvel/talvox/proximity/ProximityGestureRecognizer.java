@@ -15,10 +15,10 @@ import korvel.talvox.impl.SafetyNet;
  * it is called on another thread than the executor's and one is being delivered.
  */
 public final class ProximityGestureRecognizer implements AutoCloseable {
-    /** Hears of gestures. */
+    /** Receives gestures, on the executor given to the constructor. */
     public interface Listener {
         /**
-         * A gesture has been recognised. Called on the executor given to the constructor.
+         * A gesture has been recognised.
          *
          * @param gesture the name given to {@link #addGesture}
          */

@@ -26,6 +26,7 @@ public final class ErrorDetailBuilder {
      * Sets the HTTP status of the gateway's answer.
      *
      * @param value from 100 to 599
+     * @throws IllegalArgumentException if it is outside that range
      */
     public ErrorDetailBuilder httpStatus(int value) {
         if (value < 100 || value > 599) {

@@ -47,6 +47,7 @@ public final class RecognitionBuilder {
      * Adds a hypothesis.
      *
      * @param confidence from 0 to 1
+     * @throws IllegalArgumentException if it is outside that range
      */
     public RecognitionBuilder hypothesis(String text, float confidence) {
         return hypothesis(new HypothesisBuilder(text).confidence(confidence).build());

@@ -197,6 +197,7 @@ public final class Script {
          * A buffer of sound.
          *
          * @param pcm 16-bit mono; each session gets a copy
+         * @throws IllegalStateException also in a session of the device recognizer
          */
         public Builder buffer(byte[] pcm) {
             final byte[] sound = Objects.requireNonNull(pcm, "pcm").clone();
@@ -218,7 +219,12 @@ public final class Script {
                     Kind.RECORDING_DONE, "onRecordingDone", EngineBackend.Events::onRecordingDone);
         }
 
-        /** The session ends with results. */
+        /**
+         * The session ends with results.
+         *
+         * @throws IllegalStateException also if the device recognizer would give an identifier of a
+         *     request
+         */
         public Builder results(Recognition recognition) {
             Objects.requireNonNull(recognition, "recognition");
             if (!isCloud && !recognition.getRequestId().isEmpty()) {
