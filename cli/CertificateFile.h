@@ -5,7 +5,7 @@
 namespace Cli {
 
 /**
- * Makes the network layer trust the certificate authorities of a PEM file instead of the system's.
+ * Makes the network layer trust the certificate authorities of a PEM file beside the system's.
  * @throws UsageError if the file cannot be read or holds no certificate
  */
 void trustAuthoritiesOf(const std::string& path);

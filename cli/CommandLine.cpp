@@ -64,8 +64,8 @@ CLI::Option* addPath(CLI::App& command, const std::string& name, std::string& pa
 
 CLI::Option* addCertificateFile(CLI::App& command, std::string& path) {
     return addPath(command, "--ca-file", path, "FILE",
-                   "PEM file with the certificate authorities to trust for https addresses instead "
-                   "of the system's");
+                   "PEM file with certificate authorities to trust for https addresses beside the "
+                   "system's");
 }
 
 /** Adds an option that stands for one setting. */

@@ -17,7 +17,7 @@ const int LOG_VERBOSITY_MAX = 2;
 /** What `talvox log` was asked for. */
 struct LogOptions {
     std::string url = LogCollector::LogCollector::URL_DFLT;
-    std::string certificateFile; /**< authorities to trust; empty for the system's */
+    std::string certificateFile; /**< authorities to trust beside the system's */
     std::string uuid;
     std::string session;
     std::string name;

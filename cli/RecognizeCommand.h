@@ -22,7 +22,7 @@ struct RecognizeOptions {
     std::string file;        /**< path or `STANDARD_INPUT`; not used with `microphone` */
     bool microphone = false; /**< record from the default input device */
     int leadInMs = LEAD_IN_MS_DFLT;
-    std::string certificateFile; /**< authorities to trust; empty for the system's */
+    std::string certificateFile; /**< authorities to trust beside the system's */
     std::string dumpDirectory;   /**< where the session's WAV dump goes; empty for none */
     std::string eventsFile;      /**< where the events go as JSON as well; empty for none */
     bool json = false;

@@ -27,8 +27,8 @@ CLI::App* addDoctor(CLI::App& tool, DoctorOptions& options) {
     command->add_option("url", options.url, "Address of the gateway")->type_name("URL")->required();
     command
         ->add_option("--ca-file", options.certificateFile,
-                     "PEM file with the certificate authorities to trust for https addresses "
-                     "instead of the system's")
+                     "PEM file with certificate authorities to trust for https addresses beside "
+                     "the system's")
         ->type_name("FILE");
     command->add_option("--uuid", options.uuid, "Identifier of this installation [random]")
         ->type_name("TEXT");

@@ -15,7 +15,7 @@ namespace Cli {
 /** What `talvox doctor` was asked for. */
 struct DoctorOptions {
     std::string url;
-    std::string certificateFile; /**< authorities to trust; empty for the system's */
+    std::string certificateFile; /**< authorities to trust beside the system's */
     std::string uuid;            /**< empty for a random one */
     std::string language = "en-US";
     int timeoutS = 20; /**< longest wait for an answer: as long as a session waits */

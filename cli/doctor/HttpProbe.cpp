@@ -92,8 +92,8 @@ void HttpProbe::setUp(const std::string& url) {
     set(CURLOPT_SSLVERSION, static_cast<long>(CURL_SSLVERSION_TLSv1_2));
     set(CURLOPT_CONNECTTIMEOUT_MS, static_cast<long>(target.timeoutMs));
     if (!target.certificateFile.empty()) {
+        // The folder of the system's authorities stays.
         set(CURLOPT_CAINFO, target.certificateFile.c_str());
-        set(CURLOPT_CAPATH, static_cast<const char*>(nullptr));
     }
 }
 

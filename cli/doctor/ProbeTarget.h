@@ -7,7 +7,7 @@ namespace Cli {
 /** Where the probes go, and how. */
 struct ProbeTarget {
     std::string url;             /**< of the gateway, without "/asrgw" */
-    std::string certificateFile; /**< authorities to trust; empty for the system's */
+    std::string certificateFile; /**< authorities to trust beside the system's */
     int timeoutMs = 0;           /**< longest wait without any progress */
 };
 

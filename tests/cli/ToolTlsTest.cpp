@@ -44,7 +44,7 @@ class ToolTls : public ::testing::Test {
     const ScratchDirectory directory;
 };
 
-TEST_F(ToolTls, LogTrustsTheAuthoritiesOfTheFileAndNoOther) {
+TEST_F(ToolTls, LogTrustsTheAuthoritiesOfTheFile) {
     ScriptedHttpServer server;
     const TlsRelay relay(directory.path("server"), server.getPort());
     const ToolResult trusted = log(relay, "10", {"--ca-file", directory.path("server.pem")});
@@ -60,7 +60,7 @@ TEST_F(ToolTls, LogTrustsTheAuthoritiesOfTheFileAndNoOther) {
     EXPECT_EQ(1U, server.getRequestCount());
 }
 
-TEST_F(ToolTls, RecognizeTrustsTheAuthoritiesOfTheFileAndNoOther) {
+TEST_F(ToolTls, RecognizeTrustsTheAuthoritiesOfTheFile) {
     ScriptedHttpServer server;
     server.setDefaultAnswer(resultAnswer("<variant confidence=\"1\">a</variant>"));
     const TlsRelay relay(directory.path("server"), server.getPort());

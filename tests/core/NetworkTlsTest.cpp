@@ -1,3 +1,4 @@
+#include <sys/stat.h>
 #include <unistd.h>
 
 #include <cstdlib>
@@ -6,10 +7,12 @@
 
 #include "NetworkFixture.h"
 #include "support/ChildProcess.h"
+#include "support/LogCapture.h"
 #include "support/TlsRelay.h"
 #include "support/TlsServer.h"
 
 using Network::NetworkManager;
+using TestSupport::Answer;
 using TestSupport::ChildProcess;
 
 namespace {
@@ -125,8 +128,56 @@ TEST_F(NetworkTlsTest, TrustsNoAuthorityThatAnEarlierRequestTrusted) {
 }
 
 TEST_F(NetworkTlsTest, FailsWithoutTheFileThatWasSet) {
+    const TestSupport::LogCapture log;
     NetworkManager::getInstance().setCertificateFile(path("missing.pem"));
     EXPECT_EQ("finished -1", fetch("localhost"));
+    EXPECT_TRUE(log.contains("Network: the certificate file " + path("missing.pem") +
+                             " cannot be read: No such file or directory"));
+}
+
+TEST_F(NetworkTlsTest, FailsWithAFileThatIsAPipe) {
+    ASSERT_EQ(0, ::mkfifo(path("pipe").c_str(), 0600));
+    const TestSupport::LogCapture log;
+    NetworkManager::getInstance().setCertificateFile(path("pipe"));
+    EXPECT_EQ("finished -1", fetch("localhost"));
+    EXPECT_TRUE(log.contains("Network: the certificate file " + path("pipe") +
+                             " cannot be read: it is no regular file"));
+}
+
+// A handle of libcurl's serves one request after the other.
+TEST_F(NetworkTlsTest, ForgetsTheFileOfARequestThatEndsAfterItsReplacement) {
+    server.script({Answer::status(200).held()});
+    NetworkManager::getInstance().setCertificateFile(path("server.pem"));
+    const auto slow = makeTask(server.getUrl());
+    Network::NetworkTaskHolder slowHolder;
+    slowHolder.submitNoRetries(slow);
+    ASSERT_TRUE(server.waitForRequest(1));
+    NetworkManager::getInstance().setCertificateFile("");
+    EXPECT_EQ("finished -1", fetch("localhost"));
+    server.release();
+    EXPECT_EQ("finished 200", slow->waitForEnd());
+    EXPECT_EQ("finished -1", fetch("localhost"));
+}
+
+TEST_F(NetworkTlsTest, DoesNotUseAConnectionThatTheFormerFileVouchedFor) {
+    if (!TestSupport::TlsRelay::isAvailable()) {
+        GTEST_SKIP() << "socat is not installed";
+    }
+    server.setDefaultAnswer(Answer::status(200));
+    makeCertificate("relay", "IP:127.0.0.1");
+    const TestSupport::TlsRelay relay(path("relay"), server.getPort());
+    const auto fetchRelayed = [this, &relay] {
+        const auto task = makeTask(relay.getUrl());
+        holder.submitNoRetries(task);
+        return task->waitForEnd();
+    };
+    NetworkManager::getInstance().setCertificateFile(path("relay.pem"));
+    EXPECT_EQ("finished 200", fetchRelayed());
+    EXPECT_EQ("finished 200", fetchRelayed());
+    EXPECT_EQ(1U, server.getConnectionCount());
+    NetworkManager::getInstance().setCertificateFile("");
+    EXPECT_EQ("finished -1", fetchRelayed());
+    EXPECT_EQ(2U, server.getRequestCount());
 }
 
 }  // namespace

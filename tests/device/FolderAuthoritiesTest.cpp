@@ -142,16 +142,95 @@ TEST_F(FolderAuthoritiesTest, SkipsAFileThatIsNoCertificate) {
                              " are not readable as certificates"));
 }
 
-TEST_F(FolderAuthoritiesTest, TheFileOfAPrivateAuthorityTakesThePlatformsPlace) {
-    install("authority", SYSTEM);
-    makeAuthority("private");
-    makeServer("internal", "private", "DNS:localhost", 2);
-    NetworkManager::getInstance().setCertificateFile(scratch.path("private.pem"));
+/** An authority of the application beside that of the platform. */
+class PrivateAuthorityTest : public FolderAuthoritiesTest {
+  protected:
+    void SetUp() override {
+        FolderAuthoritiesTest::SetUp();
+        install("authority", SYSTEM);
+        makeAuthority("private");
+        makeServer("internal", "private", "DNS:localhost", 2);
+        NetworkManager::getInstance().setCertificateFile(scratch.path("private.pem"));
+    }
+};
+
+TEST_F(PrivateAuthorityTest, IsTrustedBesideThePlatforms) {
+    EXPECT_EQ("finished 200", fetch("internal"));
+    EXPECT_EQ("finished 200", fetch("server"));
+    EXPECT_EQ("finished 200", fetch("internal"));
+}
+
+TEST_F(PrivateAuthorityTest, IsTrustedWhereThePlatformHasNone) {
+    empty(SYSTEM);
     EXPECT_EQ("finished 200", fetch("internal"));
     EXPECT_EQ("finished -1", fetch("server"));
-    NetworkManager::getInstance().setCertificateFile("");
+    // Found with the next connection, as without a private authority.
+    install("authority", SYSTEM);
     EXPECT_EQ("finished 200", fetch("server"));
+    EXPECT_EQ("finished 200", fetch("internal"));
+}
+
+TEST_F(PrivateAuthorityTest, VouchesForNothingOutsideBoth) {
+    makeAuthority("other");
+    makeServer("foreign", "other", "DNS:localhost", 2);
+    EXPECT_EQ("finished -1", fetch("foreign"));
+}
+
+TEST_F(PrivateAuthorityTest, DoesNotMakeAnExpiredCertificateGood) {
+    makeServer("expired", "private", "DNS:localhost", -1);
+    EXPECT_EQ("finished -1", fetch("expired"));
+}
+
+TEST_F(PrivateAuthorityTest, DoesNotMakeAnotherHostsCertificateGood) {
+    makeServer("misnamed", "private", "DNS:example.org", 2);
+    EXPECT_EQ("finished -1", fetch("misnamed"));
+}
+
+TEST_F(PrivateAuthorityTest, IsForgottenWithoutItsFile) {
+    EXPECT_EQ("finished 200", fetch("internal"));
+    NetworkManager::getInstance().setCertificateFile("");
     EXPECT_EQ("finished -1", fetch("internal"));
+    EXPECT_EQ("finished 200", fetch("server"));
+}
+
+TEST_F(PrivateAuthorityTest, GivesWayToTheNextFile) {
+    makeAuthority("second");
+    makeServer("later", "second", "DNS:localhost", 2);
+    EXPECT_EQ("finished 200", fetch("internal"));
+    NetworkManager::getInstance().setCertificateFile(scratch.path("second.pem"));
+    EXPECT_EQ("finished 200", fetch("later"));
+    EXPECT_EQ("finished -1", fetch("internal"));
+    EXPECT_EQ("finished 200", fetch("server"));
+}
+
+TEST_F(PrivateAuthorityTest, IsReadOnceLikeThePlatforms) {
+    EXPECT_EQ("finished 200", fetch("internal"));
+    std::filesystem::remove(scratch.path("private.pem"));
+    empty(SYSTEM);
+    EXPECT_EQ("finished 200", fetch("internal"));
+    EXPECT_EQ("finished 200", fetch("server"));
+}
+
+TEST_F(PrivateAuthorityTest, IsReadAgainAfterARefusal) {
+    makeAuthority("second");
+    makeServer("later", "second", "DNS:localhost", 2);
+    EXPECT_EQ("finished -1", fetch("later"));
+    std::filesystem::copy_file(scratch.path("second.pem"), scratch.path("private.pem"),
+                               std::filesystem::copy_options::overwrite_existing);
+    EXPECT_EQ("finished 200", fetch("later"));
+    EXPECT_EQ("finished 200", fetch("server"));
+}
+
+TEST_F(PrivateAuthorityTest, FailsAllConnectionsWhileItsFileIsMissing) {
+    NetworkManager::getInstance().setCertificateFile(scratch.path("missing.pem"));
+    EXPECT_EQ("finished -1", fetch("internal"));
+    EXPECT_EQ("finished -1", fetch("server"));
+}
+
+TEST_F(PrivateAuthorityTest, FailsAllConnectionsWhileItsFileHoldsNoCertificate) {
+    std::ofstream(scratch.path("private.pem")) << "no certificate\n";
+    EXPECT_EQ("finished -1", fetch("internal"));
+    EXPECT_EQ("finished -1", fetch("server"));
 }
 
 }  // namespace

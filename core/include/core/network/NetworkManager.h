@@ -48,8 +48,10 @@ class KORVEL_CORE_API NetworkManager : public Util::Singleton<NetworkManager> {
     void overrideReachability(int value);
 
     /**
-     * PEM file with the certificate authorities to trust instead of the system's; empty for the
-     * system's. Concerns connections opened afterwards. Any thread.
+     * PEM file with certificate authorities to trust beside the system's; empty for the system's
+     * alone. Concerns connections opened afterwards. They read the file once, and again after a
+     * certificate was refused; while it cannot be read or holds no certificate, they fail. Any
+     * thread.
      */
     void setCertificateFile(const std::string& path);
 

@@ -1,5 +1,6 @@
 #include "network/curl/Handles.h"
 
+#include <new>
 #include <utility>
 
 #include "network/curl/CurlTransfer.h"
@@ -48,12 +49,12 @@ bool Handles::setAuthorities(const Handle& handle) {
     if (curl_easy_setopt(easy, CURLOPT_CA_CACHE_TIMEOUT, cacheS) == CURLE_OUT_OF_MEMORY) {
         return false;
     }
-    const std::string& file = handle.certificateFile;
-    if (file.empty()) {
-        return authorities.attach(easy, hasFailedTls);
+    try {
+        return privateAuthorities.attach(easy, handle.certificateFile, hasFailedTls) &&
+               authorities.attach(easy, privateAuthorities.getText(), hasFailedTls);
+    } catch (const std::bad_alloc&) {
+        return false;
     }
-    return curl_easy_setopt(easy, CURLOPT_CAINFO, file.c_str()) == CURLE_OK &&
-           curl_easy_setopt(easy, CURLOPT_CAPATH, nullptr) != CURLE_OUT_OF_MEMORY;
 }
 
 void Handles::giveBack(Handle handle) {

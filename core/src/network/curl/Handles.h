@@ -5,12 +5,13 @@
 #include <memory>
 #include <string>
 
+#include "network/curl/CertificateFile.h"
 #include "network/curl/OpenSockets.h"
 #include "network/curl/PlatformAuthorities.h"
 
 namespace Network {
 
-/** A libcurl handle and the file of authorities that it was made for, "" for the platform's. */
+/** A libcurl handle and the file of private authorities that it was made for; "" for none. */
 struct Handle {
     struct Deleter {
         void operator()(CURL* owned) const { curl_easy_cleanup(owned); }
@@ -32,8 +33,8 @@ class Handles {
     Handles& operator=(const Handles&) = delete;
 
     /**
-     * A handle for a request that trusts these authorities. What differs from request to request is
-     * as the last one left it.
+     * A handle for a request that trusts these authorities beside the platform's. What differs from
+     * request to request is as the last one left it.
      * @return without a handle if memory is short
      */
     Handle take(const std::string& certificateFile);
@@ -54,6 +55,7 @@ class Handles {
 
     OpenSockets sockets;
     PlatformAuthorities authorities;
+    CertificateFile privateAuthorities;
     Handle spare;
     bool hasFailedTls = false;
 };

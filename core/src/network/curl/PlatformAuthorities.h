@@ -3,6 +3,7 @@
 #include <curl/curl.h>
 
 #include <memory>
+#include <string>
 
 namespace Network {
 
@@ -23,10 +24,11 @@ class PlatformAuthorities {
 
     /**
      * Sets up a handle so that the connections of its next request trust these authorities.
+     * @param others certificates in PEM form of authorities to trust beside them; may be empty
      * @param retry read again if some certificates could not be read
      * @return false if libcurl refuses
      */
-    bool attach(CURL* handle, bool retry);
+    bool attach(CURL* handle, const std::string& others, bool retry);
 
   private:
     struct Store;

@@ -7,7 +7,7 @@ struct PlatformAuthorities::Store {};
 PlatformAuthorities::PlatformAuthorities() = default;
 PlatformAuthorities::~PlatformAuthorities() = default;
 
-bool PlatformAuthorities::attach(CURL*, bool) {
+bool PlatformAuthorities::attach(CURL*, const std::string&, bool) {
     return true;
 }
 

@@ -91,12 +91,13 @@ public final class TalvoxEngine {
     }
 
     /**
-     * Trusts the certificate authorities of a file, and no others, for https connections that are
-     * opened from now on, to the gateway and to the endpoint of the usage log: for a private
-     * authority. It holds until the process ends. The file is checked on the calling thread and read
-     * again with new connections, so it must stay where it is.
+     * Trusts the certificate authorities of a file beside those of the platform for https
+     * connections that are opened from now on, to the gateway and to the endpoint of the usage log:
+     * for a private authority. It holds until the process ends. The file is checked on the calling
+     * thread, read again with the first connection and after a certificate was refused, so it must
+     * stay where it is.
      *
-     * @param file certificates in PEM form; null for the authorities of the system
+     * @param file certificates in PEM form; null for the authorities of the platform alone
      * @throws IllegalArgumentException if the file is missing, cannot be read, holds no certificate
      *     or a broken one; what was trusted before stays trusted
      */

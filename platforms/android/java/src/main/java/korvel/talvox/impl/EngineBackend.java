@@ -52,7 +52,7 @@ public interface EngineBackend {
 
     void updateSettingsFromXml(String xml);
 
-    /** Null for the authorities of the system. */
+    /** Null for the authorities of the platform alone. */
     void setCertificateFile(@Nullable File file);
 
     boolean isRecognitionAvailable(TalvoxSettings settings);

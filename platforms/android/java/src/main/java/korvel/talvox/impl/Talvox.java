@@ -27,7 +27,7 @@ public final class Talvox {
     public static native void updateSettingsFromXml(long engine, String xml);
 
     /**
-     * @param path of a PEM file with the authorities to trust, empty for those of the system
+     * @param path of a PEM file with authorities to trust beside the platform's, empty for none
      */
     public static native void setCertificateFile(String path);
 
