@@ -18,6 +18,7 @@
 #include "doctor/DoctorCommand.h"
 #include "endpoint/EndpointCommand.h"
 #include "endpoint/VadText.h"
+#include "recording/ReportCommand.h"
 #include "talvox/Settings.h"
 
 namespace Cli {
@@ -321,6 +322,7 @@ int runTool(int argc, const char* const* argv, Console& console, LogOutput& log)
     CorpusCommand corpus(app);
     EndpointCommand endpoint(app);
     const DoctorCommand doctor(app);
+    const ReportCommand report(app);
     try {
         app.parse(argc, argv);
         if (recognize->parsed()) {
@@ -351,8 +353,12 @@ int runTool(int argc, const char* const* argv, Console& console, LogOutput& log)
         if (doctor.isParsed()) {
             return doctor.run(console);
         }
+        if (report.isParsed()) {
+            return report.run(console);
+        }
         throw UsageError(
-            "no command given (recognize, vad, endpoint, corpus, doctor, settings or log); see "
+            "no command given (recognize, report, vad, endpoint, corpus, doctor, settings or log); "
+            "see "
             "talvox --help");
     } catch (const CLI::ParseError& error) {
         if (error.get_exit_code() == 0) {

@@ -1,5 +1,6 @@
 #include "Report.h"
 
+#include <algorithm>
 #include <cerrno>
 #include <cstring>
 #include <fstream>
@@ -12,6 +13,10 @@
 namespace Cli {
 
 namespace {
+
+const std::size_t WAVE_POINTS = 1500;
+// A minute at 16 kHz makes 2.5 MB of page.
+const std::size_t PLAYED_SECONDS_MAX = 60;
 
 /** Text for an HTML element. */
 std::string escaped(const std::string& text) {
@@ -57,6 +62,8 @@ std::string reportPage(const std::string& title, const nlohmann::ordered_json& d
     page += "</script>\n<script>\n";
     page += CHART_JS;
     page += "\n</script>\n<script>\n";
+    page += RECORDING_JS;
+    page += "</script>\n<script>\n";
     page += REPORT_JS;
     page += "</script>\n</body>\n</html>\n";
     return page;
@@ -74,6 +81,26 @@ void writeReport(const std::string& path, const std::string& title,
 std::string wavAddress(const std::vector<int16_t>& samples, int sampleRateHz) {
     const std::string bytes = Tools::makeWav(samples, static_cast<unsigned>(sampleRateHz));
     return "data:audio/wav;base64," + Util::Base64Coder::encode({bytes.begin(), bytes.end()});
+}
+
+bool isPlayable(std::size_t samples, int sampleRateHz) {
+    return samples <= PLAYED_SECONDS_MAX * static_cast<std::size_t>(sampleRateHz);
+}
+
+nlohmann::ordered_json waveJson(const std::vector<int16_t>& samples, int sampleRateHz) {
+    const std::size_t piece = std::max<std::size_t>(1, samples.size() / WAVE_POINTS);
+    nlohmann::ordered_json highest = nlohmann::ordered_json::array();
+    nlohmann::ordered_json lowest = nlohmann::ordered_json::array();
+    for (std::size_t begin = 0; begin < samples.size(); begin += piece) {
+        const auto from = samples.begin() + static_cast<std::ptrdiff_t>(begin);
+        const auto to =
+            samples.begin() + static_cast<std::ptrdiff_t>(std::min(samples.size(), begin + piece));
+        highest.push_back(*std::max_element(from, to));
+        lowest.push_back(*std::min_element(from, to));
+    }
+    return {{"stepMs", static_cast<double>(piece) * 1000 / sampleRateHz},
+            {"max", highest},
+            {"min", lowest}};
 }
 
 }  // namespace Cli

@@ -15,26 +15,6 @@ namespace Cli {
 
 namespace {
 
-const std::size_t WAVE_POINTS = 1500;
-// A minute at 16 kHz makes 2.5 MB of page.
-const std::size_t PLAYED_SECONDS_MAX = 60;
-
-/** The highest and lowest samples of equal pieces. */
-Json waveJson(const std::vector<int16_t>& samples, int rateHz) {
-    const std::size_t piece = std::max<std::size_t>(1, samples.size() / WAVE_POINTS);
-    Json highest = Json::array();
-    Json lowest = Json::array();
-    for (std::size_t begin = 0; begin < samples.size(); begin += piece) {
-        const auto from = samples.begin() + static_cast<std::ptrdiff_t>(begin);
-        const auto to =
-            samples.begin() + static_cast<std::ptrdiff_t>(std::min(samples.size(), begin + piece));
-        highest.push_back(*std::max_element(from, to));
-        lowest.push_back(*std::min_element(from, to));
-    }
-    return {
-        {"stepMs", static_cast<double>(piece) * 1000 / rateHz}, {"max", highest}, {"min", lowest}};
-}
-
 Json labelsJson(const std::string& file, int64_t soundMs) {
     Json labels = Json::array();
     const std::string path = std::filesystem::path(file).replace_extension(".txt").string();
@@ -112,9 +92,9 @@ void VadReport::write(const std::string& path, const VadReportInput& input) cons
     data["hasOwnThresholds"] = hasOwnThresholds(input.vad);
     data["labels"] = labelsJson(input.file, lengthMs);
     data["wave"] = waveJson(samples, input.rateHz);
-    const bool isShort =
-        samples.size() <= PLAYED_SECONDS_MAX * static_cast<std::size_t>(input.rateHz);
-    data["audio"] = isShort ? Json(wavAddress(samples, input.rateHz)) : Json(nullptr);
+    data["audio"] = isPlayable(samples.size(), input.rateHz)
+                        ? Json(wavAddress(samples, input.rateHz))
+                        : Json(nullptr);
     for (const char* list : {"buffers", "events", "segments"}) {
         data[list] = Json::array();
     }

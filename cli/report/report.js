@@ -27,8 +27,10 @@
     // ---- charts ----
 
     function makeChart(title, options, extra) {
-        if (title) add(main, "h2", title);
-        const box = add(main, "div", null, {class: "chart" + (extra && extra.tall ? " tall" : "")});
+        const parent = extra && extra.parent || main;
+        if (title) add(parent, "h2", title);
+        const box = add(parent, "div", null, {class: "chart" + (extra && extra.tall ? " tall" : "")});
+        if (extra && extra.height) box.style.height = extra.height + "px";
         const canvas = add(box, "canvas", null, {role: "img", "aria-label": title || "chart"});
         const make = () => {
             const settings = options();
@@ -54,6 +56,48 @@
         return {labels: {color: color("text"), boxHeight: 2, boxWidth: 22}};
     }
 
+    /** Makes charts over time, one below the other; a click plays the sound from there. */
+    function timeCharts({audio, fromS, soundBeginS, toS, yWidth, marks, parent}) {
+        return (title, datasets, y, extra) => makeChart(title, () => ({
+            type: "line",
+            data: {datasets: datasets()},
+            plugins: [marks].concat(extra && extra.plugin ? [extra.plugin] : []),
+            options: {
+                parsing: false, normalized: true,
+                elements: {point: {radius: 0}, line: {borderWidth: 1.2}},
+                interaction: {mode: "nearest", axis: "x", intersect: false},
+                onClick(event, _, chart) {
+                    if (audio) audio.currentTime = Math.max(0, chart.scales.x.getValueForPixel(event.x) - soundBeginS);
+                },
+                scales: {
+                    x: axis("s", {type: "linear", min: fromS, max: toS}),
+                    // The same width in each chart, so that a moment stands below itself.
+                    y: axis(y.title, Object.assign({afterFit: (scale) => { scale.width = yWidth; }}, y)),
+                },
+                plugins: {legend: datasets().length > 1 ? legend() : {display: false}, decimation: {enabled: false}},
+            },
+        }), Object.assign({parent}, extra));
+    }
+
+    function waveform(wave, beginS) {
+        const at = (index) => beginS + index * wave.stepMs / 1000;
+        return [
+            {label: "highest", data: wave.max.map((y, i) => ({x: at(i), y})), borderColor: color("one"),
+                backgroundColor: color("one"), fill: "+1"},
+            {label: "lowest", data: wave.min.map((y, i) => ({x: at(i), y})), borderColor: color("one")},
+        ];
+    }
+
+    /** Draws the charts while the sound plays, which mark its place. */
+    function follow(audio) {
+        const draw = () => {
+            for (const {chart} of charts) chart.draw();
+            if (!audio.paused) requestAnimationFrame(draw);
+        };
+        audio.addEventListener("play", draw);
+        audio.addEventListener("seeked", draw);
+    }
+
     function redraw() {
         for (const entry of charts) {
             entry.chart.destroy();
@@ -71,8 +115,8 @@
         });
     }
 
-    function table(headings, className) {
-        const box = add(main, "div", null, {class: "scroll"});
+    function table(headings, className, parent) {
+        const box = add(parent || main, "div", null, {class: "scroll"});
         const element = add(box, "table", null, className ? {class: className} : {});
         const row = add(add(element, "thead"), "tr");
         for (const heading of headings) add(row, "th", heading);
@@ -138,33 +182,8 @@
                 ctx.restore();
             },
         };
-        const Y_AXIS_WIDTH = 64;
-        const timeChart = (title, datasets, y) => makeChart(title, () => ({
-            type: "line",
-            data: {datasets: datasets()},
-            plugins: [marks],
-            options: {
-                parsing: false, normalized: true,
-                elements: {point: {radius: 0}, line: {borderWidth: 1.2}},
-                interaction: {mode: "nearest", axis: "x", intersect: false},
-                onClick(event, _, chart) {
-                    if (audio) audio.currentTime = Math.max(0, chart.scales.x.getValueForPixel(event.x));
-                },
-                scales: {
-                    x: axis("s", {type: "linear", min: 0, max: lengthS}),
-                    // The same width in each chart, so that a moment stands below itself.
-                    y: axis(y.title, Object.assign({afterFit: (scale) => { scale.width = Y_AXIS_WIDTH; }}, y)),
-                },
-                plugins: {legend: datasets().length > 1 ? legend() : {display: false}, decimation: {enabled: false}},
-            },
-        }));
-        const wave = data.wave;
-        const at = (index) => index * wave.stepMs / 1000;
-        timeChart("Waveform", () => [
-            {label: "highest", data: wave.max.map((y, i) => ({x: at(i), y})), borderColor: color("one"),
-                backgroundColor: color("one"), fill: "+1"},
-            {label: "lowest", data: wave.min.map((y, i) => ({x: at(i), y})), borderColor: color("one")},
-        ], {title: "sample"});
+        const timeChart = timeCharts({audio, fromS: 0, soundBeginS: 0, toS: lengthS, yWidth: 64, marks});
+        timeChart("Waveform", () => waveform(data.wave, 0), {title: "sample"});
         const points = (value) => data.buffers.map((buffer) => ({x: buffer.endMs / 1000, y: value(buffer)}));
         timeChart("Level", () => [
             {label: "level", data: points((buffer) => buffer.learningNoise || buffer.silence ? null : buffer.level),
@@ -185,14 +204,7 @@
                 y: Number(frame),
             }))),
         }], {title: "", min: 0, max: 1, ticks: {display: false}});
-        if (audio) {
-            const follow = () => {
-                for (const {chart} of charts) chart.draw();
-                if (!audio.paused) requestAnimationFrame(follow);
-            };
-            audio.addEventListener("play", follow);
-            audio.addEventListener("seeked", follow);
-        }
+        if (audio) follow(audio);
         add(main, "p", "Bands are the labels; solid lines what a session reports (recording begun grey, speech begun green, the end red), dashed ones where the detector's speech begins and ends. Click into a chart to play from there.", {class: "faint"});
 
         add(main, "h2", "What a session reports");
@@ -366,5 +378,7 @@
         add(main, "p", "Bold: the best trade-offs. Marked: the chosen point.", {class: "faint"});
     }
 
-    ({vad: vadReport, score: scoreReport, sweep: sweepReport})[data.report]();
+    const tools = {data, main, add, cell, table, head, color, charts, timeCharts, waveform, follow};
+    ({vad: vadReport, score: scoreReport, sweep: sweepReport,
+        recording: () => drawRecordings(tools)})[data.report]();
 })();
