@@ -215,6 +215,12 @@ class CheckAndroidTest(unittest.TestCase):
         cases = {
             "check-android: unknown ABI: mips; there are arm64-v8a, armeabi-v7a, x86_64\n":
                 self.check(good, "mips"),
+            "check-android: unknown ABI: arm64; there are arm64-v8a, armeabi-v7a, x86_64\n":
+                self.check("arm64"),
+            f"check-android: {self.script.parent.parent}/build/java/korvel-talvox.aar cannot be "
+            "read: [Errno 2] No such file or directory: "
+            f"'{self.script.parent.parent}/build/java/korvel-talvox.aar'; ./dev aar makes it\n":
+                self.check("x86_64", "--without-references"),
             "check-android: ANDROID_NDK_HOME is not the folder of an Android NDK\n":
                 self.check(good, ndk=False),
         }
