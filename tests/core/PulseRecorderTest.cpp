@@ -1,9 +1,11 @@
+#include <dlfcn.h>
 #include <gtest/gtest.h>
 #include <sys/socket.h>
 #include <sys/un.h>
 #include <unistd.h>
 
 #include <algorithm>
+#include <atomic>
 #include <boost/make_shared.hpp>
 #include <boost/weak_ptr.hpp>
 #include <chrono>
@@ -26,6 +28,7 @@
 #include "support/LogCapture.h"
 #include "support/PulseServer.h"
 #include "support/TestSound.h"
+#include "support/Threads.h"
 
 namespace {
 
@@ -35,8 +38,14 @@ using std::chrono::steady_clock;
 using TestSupport::Samples;
 using Util::EventLock;
 
+/** Turns of the audio loop until one fails; below 1 for none. */
+std::atomic<int> turnsUntilFailure{0};
+
 const KDint64 NS_PER_SECOND = 1000000000;
 const std::chrono::seconds WAIT_MAX(20);
+
+/** The audio loop's turns before the server is ready, at most. */
+constexpr int TURNS_OF_A_HANDSHAKE = 15;
 
 /** Collects what a recorder delivers and lets the test wait for it. */
 class Collector : public Sound::RecorderListener {
@@ -118,6 +127,21 @@ class Collector : public Sound::RecorderListener {
     std::vector<unsigned char> bytes;
     steady_clock::time_point errorTime;
 };
+
+}  // namespace
+
+// Stands before the sound client's function.
+#pragma GCC visibility push(default)
+extern "C" int pa_mainloop_iterate(void* loop, int block, int* result) {
+    if (turnsUntilFailure > 0 && --turnsUntilFailure == 0) {
+        return -1;
+    }
+    using Iterate = int(void*, int, int*);
+    return reinterpret_cast<Iterate*>(dlsym(RTLD_NEXT, "pa_mainloop_iterate"))(loop, block, result);
+}
+#pragma GCC visibility pop
+
+namespace {
 
 /** Removes a directory to which an audio thread may add while that is done. */
 void remove(const TestSupport::ScratchDirectory& directory) {
@@ -549,6 +573,29 @@ TEST_F(PulseRecorderWithServer, RecordsAgainAfterAStop) {
         EXPECT_EQ(listener->getBufferCount(), buffers);
     }
     EXPECT_EQ(listener->getErrorCount(), 0);
+}
+
+// libpulse loses descriptors when a client disconnects in the middle of the server's handshake.
+TEST_F(PulseRecorderWithServer, LosesNoDescriptorWhereverItsConnectionEnds) {
+    const auto isQuiet = [] { return TestSupport::countThreads("talvox-audio") == 0; };
+    std::size_t before = 0;
+    for (int turns = 0; turns <= TURNS_OF_A_HANDSHAKE; ++turns) {
+        listener = boost::make_shared<Collector>();
+        make();
+        ASSERT_TRUE(init());
+        turnsUntilFailure = turns;
+        start();
+        if (turns == 0) {
+            ASSERT_TRUE(listener->waitForBuffers(1));  // the client library has all that it keeps
+            stop();
+        } else {
+            ASSERT_TRUE(listener->waitForError()) << turns;
+        }
+        ASSERT_TRUE(TestSupport::waitForThreads(isQuiet));
+        const std::size_t now = TestSupport::countEntries("/proc/self/fd");
+        before = turns == 0 ? now : before;
+        EXPECT_EQ(before, now) << turns;
+    }
 }
 
 TEST_F(PulseRecorderWithServer, SeveralRecordersRecordAtOnce) {

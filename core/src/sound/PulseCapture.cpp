@@ -12,6 +12,10 @@ namespace {
 const char CLIENT_NAME[] = "Korvel Talvox";
 const char STREAM_NAME[] = "Speech";
 
+/** How long a server may be silent in its handshake: so many steps of this length. */
+constexpr int SILENT_STEPS_MAX = 20;
+constexpr int STEP_US = 50000;
+
 /** The role tells the server which device, profile and effects suit the stream. */
 const char* roleForMode(Recorder::Mode mode) {
     return mode == Recorder::MODE_VOICE_RECOGNITION ? "phone" : "production";
@@ -37,6 +41,7 @@ void PulseCapture::run() {
         loop = own;
     }
     work();
+    finishHandshake();
     disconnect();
     {
         const std::lock_guard<std::mutex> lock(mutex);
@@ -125,7 +130,30 @@ void PulseCapture::readStream() {
         if (!queue->push(static_cast<const unsigned char*>(data), size)) {
             ended = true;
         }
-        pa_stream_drop(stream);
+        if (pa_stream_drop(stream) < 0) {
+            fail("the recording stream failed");
+        }
+    }
+}
+
+// A client that disconnects between the consent and the end of the handshake loses descriptors:
+// libpulse then forgets those that the server has passed (memory, events of the channel).
+void PulseCapture::finishHandshake() {
+    if (context == nullptr) {
+        return;
+    }
+    pa_context_set_state_callback(context, nullptr, nullptr);
+    int silentSteps = 0;
+    while (pa_context_get_state(context) == PA_CONTEXT_SETTING_NAME &&
+           silentSteps < SILENT_STEPS_MAX) {
+        if (pa_mainloop_prepare(loop, STEP_US) < 0) {
+            return;
+        }
+        const int ready = pa_mainloop_poll(loop);
+        if (ready < 0 || pa_mainloop_dispatch(loop) < 0) {
+            return;
+        }
+        silentSteps += ready == 0 ? 1 : 0;
     }
 }
 

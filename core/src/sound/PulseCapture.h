@@ -42,6 +42,7 @@ class PulseCapture {
     bool connect();
     void openStream();
     void readStream();
+    void finishHandshake();
     void disconnect();
     void fail(const char* what) noexcept;
     static void onContextState(pa_context* context, void* user);
