@@ -135,19 +135,17 @@ int64_t numberOf(const Json& object, const char* name, int64_t fallback) {
     return value < -NUMBER_MAX || value > NUMBER_MAX ? fallback : found->get<int64_t>();
 }
 
-Recording readRecording(const std::string& folder) {
+Recording::Recording(const std::string& recordedFolder) : folder(recordedFolder) {
     std::string text;
     if (!isRecording(folder) || !readFile(path(folder) / SESSION_FILE, text)) {
         throw UsageError(folder + " is no recording: it has no " + SESSION_FILE +
                          " that can be read");
     }
-    Recording recording;
-    recording.folder = folder;
-    recording.session = parse(text);
-    if (!recording.session.is_object()) {
+    session = parse(text);
+    if (!session.is_object()) {
         throw UsageError(folder + " is no recording: its " + SESSION_FILE + " is no JSON object");
     }
-    const int64_t format = numberOf(recording.session, "format");
+    const int64_t format = numberOf(session, "format");
     if (format < 1) {
         throw UsageError(folder + " is no recording: its " + SESSION_FILE + " names no format");
     }
@@ -155,9 +153,8 @@ Recording readRecording(const std::string& folder) {
         throw UsageError(folder + " was recorded in format " + std::to_string(format) +
                          "; this tool reads format " + std::to_string(RECORDING_FORMAT));
     }
-    readLines(recording);
-    readSound(recording);
-    return recording;
+    readLines(*this);
+    readSound(*this);
 }
 
 std::vector<std::string> findRecordings(const std::vector<std::string>& folders) {

@@ -12,7 +12,16 @@ const int RECORDING_FORMAT = 1;
 
 /** A recorded session as it is on the disk. Its texts may hold anything. */
 struct Recording {
-    std::string folder;
+    /**
+     * Reads a folder. What a process that was killed left behind is read up to its last whole line,
+     * and lines that cannot be read are left out; `remarks` says so.
+     * @throws UsageError if the folder holds no recording, or one in a newer format
+     */
+    explicit Recording(const std::string& recordedFolder);
+    Recording(const Recording&) = delete;
+    Recording& operator=(const Recording&) = delete;
+
+    const std::string folder;
     /** The object in session.json; of no member is the type known, except "format". */
     nlohmann::ordered_json session;
     /**
@@ -32,13 +41,6 @@ std::string textOf(const nlohmann::ordered_json& object, const char* name);
 
 /** A member as an integer; `fallback` if it is missing, no integer or beyond 9e15. */
 int64_t numberOf(const nlohmann::ordered_json& object, const char* name, int64_t fallback = 0);
-
-/**
- * Reads a recording. What a process that was killed left behind is read up to its last whole line,
- * and lines that cannot be read are left out; `remarks` says so.
- * @throws UsageError if the folder holds no recording, or one in a newer format
- */
-Recording readRecording(const std::string& folder);
 
 /**
  * The recordings among folders: each folder itself, or those in it, by name.

@@ -30,7 +30,7 @@ Json toJson(const StageFigures& figures) {
 
 std::string findOutcome(const Recording& recording) {
     for (const Json& line : recording.lines) {
-        const std::string event = textOf(line, "kind") == "event" ? textOf(line, "event") : "";
+        std::string event = textOf(line, "kind") == "event" ? textOf(line, "event") : "";
         if (event == "results") {
             return event;
         }

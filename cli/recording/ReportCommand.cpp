@@ -67,7 +67,7 @@ bool ReportCommand::isParsed() const {
 int ReportCommand::run(Console& console) const {
     std::vector<RecordingSummary> summaries;
     for (const std::string& folder : findRecordings(options_.folders)) {
-        summaries.push_back(summarize(readRecording(folder)));
+        summaries.push_back(summarize(Recording(folder)));
     }
     print(summaries, options_.json, console.out);
     if (!options_.output.empty()) {

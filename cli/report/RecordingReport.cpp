@@ -141,7 +141,7 @@ double findSoundBegin(const Recording& recording) {
 }
 
 Json detailJson(const RecordingSummary& summary) {
-    const Recording recording = readRecording(summary.folder);
+    const Recording recording(summary.folder);
     const Lanes lanes(recording);
     Json detail = toJson(summary);
     detail["source"] = textOf(recording.session, "source");

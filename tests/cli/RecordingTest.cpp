@@ -10,7 +10,6 @@
 namespace {
 
 using Cli::findRecordings;
-using Cli::readRecording;
 using Cli::Recording;
 using ::testing::ElementsAre;
 using Json = nlohmann::ordered_json;
@@ -25,14 +24,14 @@ class RecordingTest : public ::testing::Test {
         made.addSound(std::vector<int16_t>(RecordedSession::RATE_HZ));
         made.write(folder);
         directory.write("one/events.jsonl", events);
-        return readRecording(folder);
+        return Recording(folder);
     }
 
     std::string refuse(const std::string& sessionJson) {
         read("");
         directory.write("one/session.json", sessionJson);
         try {
-            readRecording(folder);
+            const Recording recording(folder);
         } catch (const Cli::UsageError& error) {
             return error.what();
         }
@@ -47,7 +46,7 @@ const char* const END = "{\"t\":9,\"kind\":\"end\",\"reason\":\"over\"}\n";
 
 TEST_F(RecordingTest, IsReadWithItsSound) {
     makeStreamedSession().write(folder);
-    const Recording recording = readRecording(folder);
+    const Recording recording(folder);
     EXPECT_THAT(recording.remarks, ElementsAre());
     EXPECT_EQ(recording.samples.size(), 32000U);
     EXPECT_EQ(recording.sampleRateHz, 16000);
@@ -107,16 +106,15 @@ TEST_F(RecordingTest, HasNumbersWithinBounds) {
 TEST_F(RecordingTest, NeedsNoSound) {
     RecordedSession made = makeStreamedSession();
     made.write(folder, false);
-    EXPECT_THAT(readRecording(folder).remarks,
-                ElementsAre("There is no sound.wav that can be read."));
+    EXPECT_THAT(Recording(folder).remarks, ElementsAre("There is no sound.wav that can be read."));
     made.session["hasSound"] = false;
     made.write(folder, false);
-    EXPECT_THAT(readRecording(folder).remarks, ElementsAre("The sound was not recorded."));
+    EXPECT_THAT(Recording(folder).remarks, ElementsAre("The sound was not recorded."));
     made.session["hasSound"] = true;
     for (const Json& rate : {Json(0), Json(-1), Json("16000"), Json(1e18), Json(nullptr)}) {
         made.session["sampleRate"] = rate;
         made.write(folder);
-        const Recording recording = readRecording(folder);
+        const Recording recording(folder);
         EXPECT_TRUE(recording.samples.empty()) << rate;
     }
 }
@@ -126,7 +124,7 @@ TEST_F(RecordingTest, HasAllSoundThatIsInTheFileWhateverItsHeaderSays) {
     std::string wav = TestSupport::ScratchDirectory::read(folder + "/sound.wav");
     wav.replace(4, 4, "\xff\xff\xff\xff").replace(40, 4, "\xff\xff\xff\xff");
     directory.write("one/sound.wav", wav.substr(0, wav.size() - 3));
-    EXPECT_EQ(readRecording(folder).samples.size(), whole.samples.size() - 2);
+    EXPECT_EQ(Recording(folder).samples.size(), whole.samples.size() - 2);
 }
 
 TEST_F(RecordingTest, IsRefusedWithAReason) {
