@@ -4,7 +4,9 @@
 
 #include "EntryPoint.h"
 #include "Text.h"
+#include "core/Logger.h"
 #include "logcollector/LogCollector.h"
+#include "pal/kd_jni.h"
 #include "pal/kd_log.h"
 
 namespace {
@@ -48,6 +50,23 @@ Parameters toMap(JNIEnv* env, jobject bundle) {
         kdLogFormatMessage("LogCollector: parameter %s = %s", name.c_str(), value.c_str());
     }
     return parameters;
+}
+
+const char* const JAVA_CLASS = "korvel/talvox/util/LogCollector";
+
+void reportDelivered() {
+    JNIEnv* const env = kdGetJNIEnvKOR();
+    if (env == nullptr) {
+        return;
+    }
+    try {
+        const Jni::LocalRef<jclass> type = Jni::findClass(env, JAVA_CLASS);
+        env->CallStaticVoidMethod(type.get(),
+                                  Jni::findStaticMethod(env, type.get(), "onDelivered", "()V"));
+        Jni::check(env);
+    } catch (const Jni::PendingException&) {
+        Jni::logAndClear(env, "LogCollector.onDelivered");
+    }
 }
 
 }  // namespace
@@ -106,6 +125,23 @@ JNIEXPORT jboolean JNICALL Java_korvel_talvox_util_LogCollector_openStore(
         isOpen = LogCollector::openStore(options);
     });
     return static_cast<jboolean>(isOpen ? JNI_TRUE : JNI_FALSE);
+}
+
+JNIEXPORT void JNICALL Java_korvel_talvox_util_LogCollector_setLogLevelInternal(JNIEnv* /*env*/,
+                                                                                jclass /*type*/,
+                                                                                jint level) {
+    Jni::enter([level](JNIEnv* /*env*/) { Logger::setLevel(level); });
+}
+
+JNIEXPORT jlong JNICALL Java_korvel_talvox_util_LogCollector_getPendingCount(JNIEnv* /*env*/,
+                                                                             jclass /*type*/) {
+    return Jni::enter<jlong>(
+        0, [](JNIEnv* /*env*/) { return static_cast<jlong>(LogCollector::getPendingCount()); });
+}
+
+JNIEXPORT void JNICALL Java_korvel_talvox_util_LogCollector_watchDeliveryInternal(JNIEnv* /*env*/,
+                                                                                  jclass /*type*/) {
+    Jni::enter([](JNIEnv* /*env*/) { LogCollector::setDeliveredCallback(&reportDelivered); });
 }
 
 JNIEXPORT void JNICALL Java_korvel_talvox_util_LogCollector_logEvent(JNIEnv* /*env*/,

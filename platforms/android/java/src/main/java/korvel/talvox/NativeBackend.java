@@ -8,6 +8,7 @@ import java.util.ArrayList;
 import java.util.List;
 import java.util.TreeSet;
 import java.util.concurrent.Executor;
+import korvel.talvox.impl.CertificateFile;
 import korvel.talvox.impl.EngineBackend;
 import korvel.talvox.impl.PlatformRecognizer;
 import korvel.talvox.impl.Talvox;
@@ -70,10 +71,7 @@ final class NativeBackend implements EngineBackend {
 
     @Override
     public void setCertificateFile(@Nullable File file) {
-        if (file != null) {
-            CertificateFile.check(file);
-        }
-        Talvox.setCertificateFile(file == null ? "" : file.getAbsolutePath());
+        CertificateFile.use(file);
     }
 
     @Override

@@ -1,9 +1,13 @@
 package korvel.talvox.util;
 
 import android.os.Bundle;
+import android.util.Log;
 import java.io.File;
 import java.util.Objects;
+import java.util.concurrent.Executor;
+import korvel.talvox.impl.CertificateFile;
 import korvel.talvox.impl.NativeLibrary;
+import org.jspecify.annotations.Nullable;
 
 /**
  * Collects usage events and errors in named sessions and sends them to the log collection endpoint.
@@ -20,10 +24,17 @@ public final class LogCollector {
     /** How long a store keeps a record unless the application says otherwise: 30 days. */
     public static final long STORE_AGE_S = 30L * 24 * 60 * 60;
 
+    /** The most talkative level of {@link #setLogLevel}. */
+    public static final int LOG_LEVEL_MAX = 2;
+
+    private static final String TAG = "Talvox";
     private static final long STORE_BYTES_LEAST = 4L << 10;
     private static final long STORE_BYTES_MOST = 1L << 30;
     private static final long STORE_AGE_S_LEAST = 60;
     private static final long STORE_AGE_S_MOST = 100L * 365 * 24 * 60 * 60;
+
+    /** What the application wants to run when everything is delivered, on its executor. */
+    private static volatile @Nullable Runnable delivered;
 
     static {
         NativeLibrary.load();
@@ -104,6 +115,73 @@ public final class LogCollector {
     }
 
     private static native boolean openStore(String folder, long maxBytes, long maxAgeS);
+
+    /**
+     * Trusts the certificate authorities of a file, and no others, for https connections that are
+     * opened from now on, to the endpoint and to the gateway: as {@link
+     * korvel.talvox.TalvoxEngine#setCertificateFile}, which an application with the usage log alone
+     * need not load.
+     *
+     * @param file certificates in PEM form; null for the authorities of the system
+     * @throws IllegalArgumentException if the file is missing, cannot be read, holds no certificate
+     *     or a broken one; what was trusted before stays trusted
+     */
+    public static void setCertificateFile(@Nullable File file) {
+        CertificateFile.use(file);
+    }
+
+    /**
+     * How much of the usage log's and the network layer's own messages goes to Android's log, for the
+     * whole process.
+     *
+     * @param level 0: nothing. 1, which it is at first: what is refused or fails. 2: every step as
+     *     well, with the addresses of the requests, so with identifier and parameters
+     * @throws IllegalArgumentException if it is out of range
+     */
+    public static void setLogLevel(int level) {
+        checkRange("level", level, 0, LOG_LEVEL_MAX);
+        setLogLevelInternal(level);
+    }
+
+    private static native void setLogLevelInternal(int level);
+
+    /** How many records are not delivered yet, with the one that is being sent. */
+    public static native long getPendingCount();
+
+    /**
+     * Sets what runs whenever the last pending record has been delivered, in place of what was set
+     * before. Records may be pending again by then.
+     *
+     * @param callback runs on the executor, once for each such moment
+     * @param executor one that runs it at once has it run on the engine's event thread: then it must
+     *     not block at all. If it refuses by throwing, the call is lost, with a line in the log
+     */
+    public static void setDeliveredCallback(Runnable callback, Executor executor) {
+        Objects.requireNonNull(callback, "callback");
+        Objects.requireNonNull(executor, "executor");
+        delivered = () -> executor.execute(callback);
+        watchDeliveryInternal();
+    }
+
+    /** Takes back {@link #setDeliveredCallback}; one that is with its executor may still run. */
+    public static void clearDeliveredCallback() {
+        delivered = null;
+    }
+
+    private static native void watchDeliveryInternal();
+
+    /** Called by native code on the event thread, under the event lock. */
+    private static void onDelivered() {
+        final Runnable call = delivered;
+        if (call == null) {
+            return;
+        }
+        try {
+            call.run();
+        } catch (RuntimeException refusal) {
+            Log.w(TAG, "the executor refuses the callback of the usage log", refusal);
+        }
+    }
 
     /**
      * Adds an event to a session.

@@ -47,6 +47,7 @@ public class NullArgumentsTest extends EngineTestCase {
         nulls.addSample(
                 ProximityGestureRecognizer.Listener.class,
                 (ProximityGestureRecognizer.Listener) gesture -> {});
+        nulls.addSample(Runnable.class, (Runnable) () -> {});
     }
 
     @Test

@@ -15,6 +15,9 @@ import java.time.ZoneOffset;
 import java.util.Arrays;
 import java.util.HashSet;
 import java.util.Set;
+import java.util.concurrent.RejectedExecutionException;
+import java.util.concurrent.Semaphore;
+import java.util.concurrent.TimeUnit;
 import java.util.regex.Matcher;
 import java.util.regex.Pattern;
 import korvel.talvox.support.EngineTestCase;
@@ -40,6 +43,7 @@ public class UsageLogTest extends EngineTestCase {
 
     @After
     public void close() {
+        LogCollector.clearDeliveredCallback();
         LogCollector.setLoggingEnabled(false);
         endpoint.close();
     }
@@ -228,5 +232,87 @@ public class UsageLogTest extends EngineTestCase {
                 NullPointerException.class, () -> LogCollector.logEvent("id", null, new Bundle()));
         assertThrows(NullPointerException.class, () -> LogCollector.logEvent("id", "name", null));
         assertThrows(NullPointerException.class, () -> LogCollector.logError("id", "name", null));
+    }
+
+    /** Logs a session, and waits for a call that finds everything delivered. */
+    private void deliverAll(Semaphore calls) throws InterruptedException {
+        UsageLog.open("last").close();
+        do {
+            assertTrue(calls.tryAcquire(PATIENCE_S, TimeUnit.SECONDS));
+        } while (LogCollector.getPendingCount() > 0);
+    }
+
+    @Test
+    public void countsWhatIsPendingAndSaysWhenAllIsDelivered() throws Exception {
+        final Semaphore calls = new Semaphore(0);
+        LogCollector.setDeliveredCallback(calls::release, Runnable::run);
+        deliverAll(calls);
+        LogCollector.configure(UUID, "http://"); // where no record can go
+        try (UsageLog log = UsageLog.open("pending")) {
+            log.event("page");
+        }
+        assertEquals(2, LogCollector.getPendingCount());
+        LogCollector.configure(UUID, endpoint.getUrl() + "/log");
+        deliverAll(calls);
+        assertEquals(0, LogCollector.getPendingCount());
+    }
+
+    @Test
+    public void anExecutorThatRefusesTheCallbackLosesTheCall() throws Exception {
+        final Semaphore refusals = new Semaphore(0);
+        LogCollector.setDeliveredCallback(
+                () -> {},
+                refused -> {
+                    refusals.release();
+                    throw new RejectedExecutionException("full");
+                });
+        UsageLog.open("refused").close();
+        assertTrue(refusals.tryAcquire(PATIENCE_S, TimeUnit.SECONDS));
+        final Semaphore calls = new Semaphore(0);
+        LogCollector.setDeliveredCallback(calls::release, Runnable::run);
+        deliverAll(calls);
+        assertLogged("the executor refuses the callback of the usage log");
+    }
+
+    @Test
+    public void aCallbackThatIsTakenBackIsNotCalled() throws Exception {
+        final Semaphore calls = new Semaphore(0);
+        LogCollector.setDeliveredCallback(calls::release, Runnable::run);
+        LogCollector.clearDeliveredCallback();
+        UsageLog.open("cleared").close();
+        takeRecord();
+        final Semaphore others = new Semaphore(0);
+        LogCollector.setDeliveredCallback(others::release, Runnable::run);
+        deliverAll(others);
+        assertEquals(0, calls.availablePermits());
+    }
+
+    @Test
+    public void theLogLevelDecidesWhatOfItsOwnItLogs() {
+        final String step = "LogCollector::startSession: the logging is disabled.";
+        LogCollector.setLoggingEnabled(false);
+        LogCollector.startLogSession("quiet");
+        assertEquals(0, timesSaid(step));
+        LogCollector.setLogLevel(2);
+        LogCollector.startLogSession("talkative");
+        LogCollector.setLogLevel(1);
+        LogCollector.startLogSession("quiet");
+        assertEquals(1, timesSaid(step));
+        for (int bad : new int[] {-1, 3}) {
+            assertThrows(
+                    IllegalArgumentException.class, () -> LogCollector.setLogLevel(bad));
+        }
+    }
+
+    @Test
+    public void theCertificateFileIsThatOfTheEngine() {
+        final File missing = new File(temporary.getRoot(), "missing.pem");
+        assertEquals(
+                "certificate file " + missing + ": cannot be read: there is no such file",
+                assertThrows(
+                                IllegalArgumentException.class,
+                                () -> LogCollector.setCertificateFile(missing))
+                        .getMessage());
+        LogCollector.setCertificateFile(null);
     }
 }

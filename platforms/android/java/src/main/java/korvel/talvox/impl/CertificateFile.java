@@ -1,4 +1,4 @@
-package korvel.talvox;
+package korvel.talvox.impl;
 
 import java.io.ByteArrayInputStream;
 import java.io.ByteArrayOutputStream;
@@ -12,7 +12,7 @@ import java.security.cert.CertificateFactory;
 import org.jspecify.annotations.Nullable;
 
 /** A file of certificates in PEM form, looked at before the network layer uses it. */
-final class CertificateFile {
+public final class CertificateFile {
     private static final int MOST_BYTES = 16 << 20;
     private static final int PIECE_BYTES = 8192;
     private static final String BEGIN = "-----BEGIN CERTIFICATE-----";
@@ -21,10 +21,23 @@ final class CertificateFile {
     private CertificateFile() {}
 
     /**
+     * Lets the network layer trust the certificates of a file.
+     *
+     * @param file null for the authorities of the system
+     * @throws IllegalArgumentException as {@link #check}; nothing changes then
+     */
+    public static void use(@Nullable File file) {
+        if (file != null) {
+            check(file);
+        }
+        Talvox.setCertificateFile(file == null ? "" : file.getAbsolutePath());
+    }
+
+    /**
      * @throws IllegalArgumentException with the reason, unless the file can be read and holds one or
      *     more certificates, all of them whole
      */
-    static void check(File file) {
+    private static void check(File file) {
         final String text;
         try {
             text = read(file);
