@@ -3,11 +3,17 @@ package korvel.core;
 import android.Manifest;
 import android.content.Context;
 import android.content.pm.PackageManager;
+import android.media.AudioDeviceInfo;
 import android.media.AudioFormat;
+import android.media.AudioManager;
 import android.media.AudioRecord;
+import android.media.AudioRecordingConfiguration;
 import android.media.MediaRecorder;
+import android.os.Build;
+import android.util.Log;
 import java.io.IOException;
-import korvel.core.RecordingReport.State;
+import korvel.core.SessionRecording.State;
+import org.jspecify.annotations.Nullable;
 
 /** The device's microphone. */
 final class Microphone implements SoundInput {
@@ -18,37 +24,54 @@ final class Microphone implements SoundInput {
     /** How many of the reader's buffers the system may hold for it. */
     private static final int BUFFERS = 8;
 
-    private final AudioRecord record;
+    /** How much sound comes between two looks at permission and system. */
+    private static final int CHECK_MS = 200;
 
-    private Microphone(AudioRecord record) {
+    private static final String TAG = "Talvox";
+
+    private final AudioRecord record;
+    private final int bytesPerCheck;
+    private int uncheckedBytes;
+    private boolean silenced;
+
+    private Microphone(AudioRecord record, int sampleRateHz) {
         this.record = record;
+        bytesPerCheck = sampleRateHz * BYTES_PER_SAMPLE * CHECK_MS / MS_PER_SECOND;
+        uncheckedBytes = bytesPerCheck;
     }
 
-    static SoundInput open(int sampleRateHz, int bufferLengthMs, int mode) throws IOException {
-        checkPermission();
+    static SoundInput open(
+            int sampleRateHz, int bufferLengthMs, int source, @Nullable AudioDeviceInfo device)
+            throws IOException {
+        checkPermission("the application lacks the permission RECORD_AUDIO");
         final AudioRecord record;
         try {
             record =
                     new AudioRecord(
-                            getSource(mode),
+                            source,
                             sampleRateHz,
                             AudioFormat.CHANNEL_IN_MONO,
                             AudioFormat.ENCODING_PCM_16BIT,
                             getBufferSize(sampleRateHz, bufferLengthMs));
         } catch (IllegalArgumentException refused) {
             throw new RecordingException(
-                    State.UNAVAILABLE, "no recording at " + sampleRateHz + " Hz", refused);
+                    State.UNAVAILABLE,
+                    "no recording at " + sampleRateHz + " Hz from audio source " + source,
+                    refused);
         }
         try {
             if (record.getState() != AudioRecord.STATE_INITIALIZED) {
                 throw new RecordingException(State.UNAVAILABLE, "the microphone cannot be opened");
+            }
+            if (device != null && !record.setPreferredDevice(device)) {
+                Log.w(TAG, "the preferred device is refused; the system chooses one");
             }
             record.startRecording();
             if (record.getRecordingState() != AudioRecord.RECORDSTATE_RECORDING) {
                 throw new RecordingException(
                         State.IN_USE, "the microphone is in use by another application");
             }
-            return new Microphone(record);
+            return new Microphone(record, sampleRateHz);
         } catch (IllegalStateException refused) {
             record.release();
             throw new RecordingException(
@@ -65,13 +88,12 @@ final class Microphone implements SoundInput {
                 : MediaRecorder.AudioSource.MIC;
     }
 
-    private static void checkPermission() throws IOException {
+    private static void checkPermission(String refusal) throws IOException {
         final Context context = CoreApplication.getApplicationContext();
         if (context != null
                 && context.checkSelfPermission(Manifest.permission.RECORD_AUDIO)
                         != PackageManager.PERMISSION_GRANTED) {
-            throw new RecordingException(
-                    State.NO_PERMISSION, "the application lacks the permission RECORD_AUDIO");
+            throw new RecordingException(State.NO_PERMISSION, refusal);
         }
     }
 
@@ -87,10 +109,42 @@ final class Microphone implements SoundInput {
     @Override
     public int read(byte[] buffer, int sizeInBytes) throws IOException {
         final int size = record.read(buffer, 0, sizeInBytes);
+        uncheckedBytes += Math.max(0, size);
+        if (size <= 0 || uncheckedBytes >= bytesPerCheck) {
+            uncheckedBytes = 0;
+            checkPermission("the permission RECORD_AUDIO was withdrawn during the recording");
+            silenced = findSilenced();
+        }
+        if (size == 0) {
+            throw new RecordingException(State.ENDED, "the microphone delivers no more");
+        }
         if (size < 0) {
             throw new IOException(describe(size));
         }
         return size;
+    }
+
+    /** Whether the system delivered silence in place of the sound when it was last asked. */
+    boolean isSilenced() {
+        return silenced;
+    }
+
+    /** Systems before 10 do not say. */
+    private boolean findSilenced() {
+        final Context context = CoreApplication.getApplicationContext();
+        if (context == null || Build.VERSION.SDK_INT < Build.VERSION_CODES.Q) {
+            return false;
+        }
+        final AudioManager manager = context.getSystemService(AudioManager.class);
+        if (manager == null) {
+            return false;
+        }
+        for (AudioRecordingConfiguration active : manager.getActiveRecordingConfigurations()) {
+            if (active.getClientAudioSessionId() == record.getAudioSessionId()) {
+                return active.isClientSilenced();
+            }
+        }
+        return false;
     }
 
     private static String describe(int error) {

@@ -2,25 +2,25 @@ package korvel.core;
 
 import java.io.IOException;
 
-/** A recording that fails for a reason that has a {@link RecordingReport.State}. */
+/** A recording that fails for a reason that has a {@link SessionRecording.State}. */
 final class RecordingException extends IOException {
     private static final long serialVersionUID = 1;
 
-    private final RecordingReport.State state;
+    private final SessionRecording.State state;
 
-    RecordingException(RecordingReport.State state, String message) {
+    RecordingException(SessionRecording.State state, String message) {
         super(message);
         this.state = state;
     }
 
-    RecordingException(RecordingReport.State state, String message, Throwable cause) {
+    RecordingException(SessionRecording.State state, String message, Throwable cause) {
         super(message, cause);
         this.state = state;
     }
 
-    static RecordingReport.State getState(Exception failure) {
+    static SessionRecording.State getState(Throwable failure) {
         return failure instanceof RecordingException
                 ? ((RecordingException) failure).state
-                : RecordingReport.State.FAILED;
+                : SessionRecording.State.FAILED;
     }
 }

@@ -93,7 +93,7 @@ final class NativeBackend implements EngineBackend {
     }
 
     @Override
-    public Running start(TalvoxSettings settings, Events events) {
-        return NativeSession.start(handle, settings, events);
+    public Running start(TalvoxSettings settings, RecordingOptions recording, Events events) {
+        return NativeSession.start(handle, settings, recording, events);
     }
 }

@@ -1,6 +1,6 @@
 package korvel.talvox;
 
-import korvel.core.RecordingReport;
+import korvel.core.SessionRecording;
 import korvel.talvox.impl.EngineBackend;
 import korvel.talvox.impl.NativeHandle;
 import korvel.talvox.impl.Recognizer;
@@ -12,18 +12,22 @@ import org.jspecify.annotations.Nullable;
  */
 final class NativeSession implements Recognizer.Events {
     private final EngineBackend.Events events;
-    private final RecordingReport recording = new RecordingReport();
+    private final SessionRecording recording;
     private String errorReason = "";
     private @Nullable Integer httpStatus;
     private @Nullable Integer deviceError;
 
-    private NativeSession(EngineBackend.Events events) {
+    private NativeSession(RecordingOptions options, EngineBackend.Events events) {
+        this.recording = new SessionRecording(options.getInputs());
         this.events = events;
     }
 
     static EngineBackend.Running start(
-            long engine, TalvoxSettings settings, EngineBackend.Events events) {
-        final NativeSession session = new NativeSession(events);
+            long engine,
+            TalvoxSettings settings,
+            RecordingOptions options,
+            EngineBackend.Events events) {
+        final NativeSession session = new NativeSession(options, events);
         return new Started(
                 session.recording.during(
                         () -> Recognizer.start(engine, settings.toBundle(), session)));
@@ -97,12 +101,23 @@ final class NativeSession implements Recognizer.Events {
                         RecorderState.of(recording.getState())));
     }
 
-    /** Native code knows that the recorder has failed, but not why. */
+    /** Native code knows that the recorder has failed, or that no speech came, but not why. */
     private String findReason(SpeechError error) {
-        final String failure = recording.getFailure();
-        return error == SpeechError.AUDIO && !failure.isEmpty()
-                ? errorReason + ": " + failure
-                : errorReason;
+        final String cause =
+                error == SpeechError.AUDIO
+                        ? recording.getFailure()
+                        : error == SpeechError.NO_VOICE ? findSilence() : "";
+        return cause.isEmpty() ? errorReason : errorReason + ": " + cause;
+    }
+
+    private String findSilence() {
+        final SessionRecording.State state = recording.getState();
+        if (state == SessionRecording.State.SILENCED) {
+            return "the system silences the microphone";
+        }
+        return state == SessionRecording.State.ONLY_ZEROS
+                ? "the microphone delivers only zeros"
+                : "";
     }
 
     @Override

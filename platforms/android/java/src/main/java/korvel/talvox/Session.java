@@ -32,13 +32,17 @@ final class Session implements EngineBackend.Events {
      *
      * @param owner kept alive until the last event has been delivered
      */
-    void start(EngineBackend engine, TalvoxSettings settings, Object owner) {
+    void start(
+            EngineBackend engine,
+            TalvoxSettings settings,
+            RecordingOptions recording,
+            Object owner) {
         synchronized (this) {
             this.owner = owner;
         }
         final EngineBackend.Running started;
         try {
-            started = engine.start(settings, this);
+            started = engine.start(settings, recording, this);
         } catch (RuntimeException | OutOfMemoryError failure) {
             refuse(failure);
             return;

@@ -132,10 +132,20 @@ public final class TalvoxEngine {
     }
 
     /**
+     * A recognition that records from the microphone, not started yet; otherwise as {@link
+     * #createRecognizer(TalvoxSettings, RecordingOptions, RecognitionListener, Executor)}.
+     */
+    public TalvoxRecognizer createRecognizer(
+            TalvoxSettings settings, RecognitionListener listener, Executor executor) {
+        return createRecognizer(settings, RecordingOptions.ofMicrophone(), listener, executor);
+    }
+
+    /**
      * A recognition, not started yet.
      *
      * @param settings what differs from the engine's settings, see {@link
      *     TalvoxSettings#forRecognition}
+     * @param recording what it records from
      * @param listener hears the events
      * @param executor runs the listener. One that runs it at once, on the calling thread, has it run
      *     on the engine's event thread: then the listener must not block at all. An event that it
@@ -144,11 +154,15 @@ public final class TalvoxEngine {
      *     engine only}
      */
     public TalvoxRecognizer createRecognizer(
-            TalvoxSettings settings, RecognitionListener listener, Executor executor) {
+            TalvoxSettings settings,
+            RecordingOptions recording,
+            RecognitionListener listener,
+            Executor executor) {
         Objects.requireNonNull(settings, "settings").checkForRecognition();
         return new TalvoxRecognizer(
                 backend,
                 settings,
+                Objects.requireNonNull(recording, "recording"),
                 Objects.requireNonNull(listener, "listener"),
                 Objects.requireNonNull(executor, "executor"));
     }

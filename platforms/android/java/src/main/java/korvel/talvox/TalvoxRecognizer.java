@@ -23,6 +23,7 @@ public final class TalvoxRecognizer implements AutoCloseable {
 
     private final EngineBackend engine;
     private final TalvoxSettings settings;
+    private final RecordingOptions recording;
     private final Session session;
     private SafetyNet.@Nullable Watch watch;
     private State state = State.NEW;
@@ -30,10 +31,12 @@ public final class TalvoxRecognizer implements AutoCloseable {
     TalvoxRecognizer(
             EngineBackend engine,
             TalvoxSettings settings,
+            RecordingOptions recording,
             RecognitionListener listener,
             Executor executor) {
         this.engine = engine;
         this.settings = settings;
+        this.recording = recording;
         this.session = new Session(listener, executor);
     }
 
@@ -54,7 +57,7 @@ public final class TalvoxRecognizer implements AutoCloseable {
             state = State.STARTED;
             watch = SafetyNet.watch(this, "a TalvoxRecognizer", session::close);
         }
-        session.start(engine, settings, this);
+        session.start(engine, settings, recording, this);
     }
 
     /**

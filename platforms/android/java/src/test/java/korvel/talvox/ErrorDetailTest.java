@@ -15,7 +15,7 @@ import java.util.concurrent.CountDownLatch;
 import java.util.concurrent.Executor;
 import java.util.function.Consumer;
 import korvel.core.AudioRecorderBackend;
-import korvel.core.RecordingReport;
+import korvel.core.SessionRecording;
 import korvel.core.SoundInput;
 import korvel.talvox.support.Connectivity;
 import korvel.talvox.support.DeviceRecognizer;
@@ -316,7 +316,7 @@ public class ErrorDetailTest extends EngineTestCase {
     @Test
     public void everyStateOfTheRecorderHasItsOwnName() {
         final Set<RecorderState> named = new HashSet<>();
-        for (RecordingReport.State state : RecordingReport.State.values()) {
+        for (SessionRecording.State state : SessionRecording.State.values()) {
             assertTrue(state.toString(), named.add(RecorderState.of(state)));
         }
         assertEquals(new HashSet<>(Arrays.asList(RecorderState.values())), named);

@@ -5,6 +5,7 @@ import java.util.List;
 import java.util.concurrent.Executor;
 import korvel.talvox.ErrorDetail;
 import korvel.talvox.Recognition;
+import korvel.talvox.RecordingOptions;
 import korvel.talvox.SpeechError;
 import korvel.talvox.TalvoxSettings;
 import org.jspecify.annotations.Nullable;
@@ -67,7 +68,8 @@ public interface EngineBackend {
      * Starts a session.
      *
      * @param settings what differs from the engine's settings
+     * @param recording what it records from
      * @throws RuntimeException if there is no memory for it; no event comes then
      */
-    Running start(TalvoxSettings settings, Events events);
+    Running start(TalvoxSettings settings, RecordingOptions recording, Events events);
 }

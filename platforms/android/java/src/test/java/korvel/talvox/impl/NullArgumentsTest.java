@@ -4,11 +4,14 @@ import static org.junit.Assert.assertEquals;
 import static org.junit.Assert.assertTrue;
 
 import android.content.Context;
+import android.media.AudioDeviceInfo;
 import android.os.Bundle;
 import java.io.File;
 import java.util.Collections;
 import java.util.concurrent.Executor;
+import korvel.core.SoundInput;
 import korvel.talvox.RecognitionListener;
+import korvel.talvox.RecordingOptions;
 import korvel.talvox.SettingKey;
 import korvel.talvox.TalvoxEngine;
 import korvel.talvox.TalvoxSettings;
@@ -22,6 +25,7 @@ import org.junit.Before;
 import org.junit.Rule;
 import org.junit.Test;
 import org.junit.rules.TemporaryFolder;
+import org.robolectric.shadows.AudioDeviceInfoBuilder;
 
 /**
  * Every argument of the public API that must not be null is refused when it is, by its name: each
@@ -48,6 +52,10 @@ public class NullArgumentsTest extends EngineTestCase {
                 ProximityGestureRecognizer.Listener.class,
                 (ProximityGestureRecognizer.Listener) gesture -> {});
         nulls.addSample(Runnable.class, (Runnable) () -> {});
+        nulls.addSample(RecordingOptions.class, RecordingOptions.ofMicrophone());
+        nulls.addSample(
+                SoundInput.Factory.class, (SoundInput.Factory) (rate, length, mode) -> null);
+        nulls.addSample(AudioDeviceInfo.class, AudioDeviceInfoBuilder.newBuilder().build());
     }
 
     @Test

@@ -10,18 +10,21 @@ import java.util.Arrays;
 import java.util.List;
 import java.util.stream.Collectors;
 import java.util.stream.Stream;
+import korvel.core.SoundInput;
 
 /** The classes that applications may use. */
 public final class PublicApi {
     private static final Path CLASSES = Paths.get(System.getProperty("talvox.classes"));
     private static final List<String> PACKAGES =
             Arrays.asList("korvel/talvox", "korvel/talvox/util", "korvel/talvox/proximity");
+    private static final List<Class<?>> OTHERS =
+            Arrays.asList(SoundInput.class, SoundInput.Factory.class);
 
     private PublicApi() {}
 
     /** Sorted by package and name. */
     public static List<Class<?>> findClasses() throws IOException, ClassNotFoundException {
-        final List<Class<?>> found = new ArrayList<>();
+        final List<Class<?>> found = new ArrayList<>(OTHERS);
         for (String name : PACKAGES) {
             for (Path file : list(CLASSES.resolve(name))) {
                 final String path = CLASSES.relativize(file).toString();

@@ -6,6 +6,7 @@ import java.util.concurrent.atomic.AtomicInteger
 import korvel.talvox.ErrorDetail
 import korvel.talvox.Recognition
 import korvel.talvox.RecognitionListener
+import korvel.talvox.RecordingOptions
 import korvel.talvox.SpeechError
 import korvel.talvox.TalvoxEngine
 import korvel.talvox.TalvoxRecognizer
@@ -94,12 +95,14 @@ class CountingEngine(val fake: FakeEngine) {
     private inner class Backend : EngineBackend {
         override fun start(
             settings: TalvoxSettings,
+            recording: RecordingOptions,
             events: EngineBackend.Events,
         ): EngineBackend.Running {
             starts.incrementAndGet()
             val session = Session(events)
             session.recognizer =
-                fake.engine.createRecognizer(settings, session, Executor(Runnable::run))
+                fake.engine.createRecognizer(
+                    settings, recording, session, Executor(Runnable::run))
             session.recognizer.start()
             return session
         }

@@ -10,6 +10,7 @@ import java.util.Queue;
 import java.util.TreeSet;
 import java.util.concurrent.Executor;
 import korvel.talvox.ErrorDetail;
+import korvel.talvox.RecordingOptions;
 import korvel.talvox.SettingKey;
 import korvel.talvox.SpeechError;
 import korvel.talvox.TalvoxEngine;
@@ -61,6 +62,7 @@ public final class FakeEngine implements AutoCloseable {
     private final TreeSet<String> languages = new TreeSet<>();
     private TalvoxSettings settings = TalvoxSettings.builder().build();
     private @Nullable TalvoxSettings sessionSettings;
+    private @Nullable RecordingOptions sessionRecording;
     private final List<String> documents = new ArrayList<>();
     private boolean isRecognitionAvailable = true;
     private boolean isAdvancing;
@@ -139,6 +141,14 @@ public final class FakeEngine implements AutoCloseable {
         return sessionSettings;
     }
 
+    /**
+     * What the newest session would record from; null before the first. An input of the application's
+     * own is not opened.
+     */
+    public synchronized @Nullable RecordingOptions getSessionRecording() {
+        return sessionRecording;
+    }
+
     /** The documents given to {@link TalvoxEngine#updateSettingsFromXml}, which change no setting. */
     public synchronized List<String> getXmlDocuments() {
         return new ArrayList<>(documents);
@@ -209,9 +219,10 @@ public final class FakeEngine implements AutoCloseable {
     }
 
     private synchronized EngineBackend.Running start(
-            TalvoxSettings values, EngineBackend.Events listener) {
+            TalvoxSettings values, RecordingOptions recording, EngineBackend.Events listener) {
         startCount++;
         sessionSettings = values;
+        sessionRecording = recording;
         if (running != null) {
             listener.onError(SpeechError.BUSY, reason("another session is active"));
             return new Refused();
@@ -404,8 +415,9 @@ public final class FakeEngine implements AutoCloseable {
         }
 
         @Override
-        public Running start(TalvoxSettings values, Events listener) {
-            return FakeEngine.this.start(values, listener);
+        public Running start(
+                TalvoxSettings values, RecordingOptions recording, Events listener) {
+            return FakeEngine.this.start(values, recording, listener);
         }
     }
 }

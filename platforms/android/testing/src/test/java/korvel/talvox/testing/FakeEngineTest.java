@@ -13,6 +13,7 @@ import java.util.List;
 import java.util.Random;
 import java.util.concurrent.Executor;
 import korvel.talvox.Recognition;
+import korvel.talvox.RecordingOptions;
 import korvel.talvox.SpeechError;
 import korvel.talvox.TalvoxEngine;
 import korvel.talvox.TalvoxRecognizer;
@@ -78,6 +79,20 @@ public class FakeEngineTest {
         assertFalse(fake.isRunning());
         fake.advanceBy(100_000);
         assertEquals(6, events.all.size());
+    }
+
+    @Test
+    public void keepsWhatASessionWouldRecordFrom() {
+        assertNull(fake.getSessionRecording());
+        start(spoken().results(GO).build());
+        assertNull(fake.getSessionRecording().getInput());
+        final RecordingOptions own =
+                RecordingOptions.ofInput(
+                        (rate, length, mode) -> {
+                            throw new AssertionError("the input is opened");
+                        });
+        engine.createRecognizer(NOTHING, own, events, DIRECT).start();
+        assertSame(own, fake.getSessionRecording());
     }
 
     @Test
