@@ -19,8 +19,9 @@ struct Open {
 /** What the sample of the tests leaves out. */
 inline const std::vector<Open>& getOpen() {
     static const std::vector<Open> open = {
-        {Kind::SOCKETS, "pulse", "a connection that fails half way keeps a descriptor"},
-        {Kind::PULSE, nullptr, "a connection that fails half way keeps a descriptor"},
+        {Kind::SOCKETS, "pulse",
+         "libpulse loses the descriptors that the server has passed (`memfd`, `eventfd`) when the "
+         "connection breaks in its handshake, which then cannot be finished"},
     };
     return open;
 }
