@@ -34,6 +34,7 @@ class KORVEL_CORE_API TransferListener {
     virtual bool onTransferHead(const boost::shared_ptr<HttpResponse>& response) = 0;
     /** @return false to end the transfer */
     virtual bool onTransferBytes(const unsigned char* bytes, std::size_t size) = 0;
+    /** The transfer is over, with or without an answer. */
     virtual void onTransferEnd(const TransferEnd& how) = 0;
 };
 
