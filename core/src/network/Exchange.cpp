@@ -19,6 +19,7 @@
 #include <new>
 #include <utility>
 
+#include "core/network/TransferTrace.h"
 #include "core/util/EventLock.h"
 #include "core/util/Time.h"
 #include "network/FailureText.h"
@@ -143,8 +144,14 @@ boost::shared_ptr<Transfer> Exchange::makeTransfer() {
     }
     collected.clear();
     attemptReason.clear();
-    transfer = transport->makeTransfer(request, shared_from_this());
+    transfer = transport->makeTransfer(request, chooseListener(*current, *request));
     return transfer;
+}
+
+boost::shared_ptr<TransferListener> Exchange::chooseListener(NetworkTask& current,
+                                                             const HttpRequest& request) {
+    auto* const tap = dynamic_cast<TransferTap*>(&current);
+    return tap != nullptr ? tap->tapTransfer(request, shared_from_this()) : shared_from_this();
 }
 
 bool Exchange::prepareTask(const boost::shared_ptr<NetworkTask>& current) {

@@ -45,6 +45,8 @@ class Exchange : public boost::enable_shared_from_this<Exchange>, public Transfe
     void postAttempt();
     void attempt();
     boost::shared_ptr<Transfer> makeTransfer();
+    boost::shared_ptr<TransferListener> chooseListener(NetworkTask& current,
+                                                       const HttpRequest& request);
     bool prepareTask(const boost::shared_ptr<NetworkTask>& current);
     bool takeBytes(const unsigned char* bytes, std::size_t size);
     void takeEnd(const TransferEnd& how);

@@ -20,6 +20,7 @@ namespace {
 // The time-outs are ours, on the platform clock.
 constexpr long NO_CONNECT_LIMIT_MS = std::numeric_limits<int>::max();
 constexpr long MOST_REDIRECTS = 10;
+constexpr int64_t NS_PER_US = 1000;
 
 /** Options that this libcurl does not know are no obstacle; any other refusal is. */
 bool isSet(CURLcode code) {
@@ -60,6 +61,7 @@ CurlTransfer::CurlTransfer(boost::shared_ptr<CurlTransport> owner,
     : transport(std::move(owner)),
       request(std::move(what)),
       listener(std::move(hearer)),
+      trace(dynamic_cast<TransferTrace*>(listener.get())),
       watchdog(request->getTimeoutMs(),
                [this] {
                    if (const boost::shared_ptr<CurlTransfer> self = weak_from_this().lock()) {
@@ -243,6 +245,7 @@ bool CurlTransfer::isAnswered() const {
 
 void CurlTransfer::end(const TransferEnd& how) {
     const boost::shared_ptr<TransferListener> hearer = listener;
+    traceConnection();
     abandon();
     if (hearer) {
         hearer->onTransferEnd(how);
@@ -254,6 +257,7 @@ void CurlTransfer::abandon() {
         request->getWriter()->setWakeUp({});
     }
     watchdog.stop();
+    trace = nullptr;
     listener.reset();
     if (handle.easy) {
         transport->getHandles().giveBack(std::move(handle));
@@ -290,6 +294,9 @@ std::size_t CurlTransfer::readBody(char* data, std::size_t size) {
             break;
     }
     watchdog.progress();
+    if (trace != nullptr && count > 0) {
+        trace->onTransferPiece(count);
+    }
     return count;
 }
 
@@ -322,7 +329,36 @@ bool CurlTransfer::canUseConnection(int ownPort) {
     curl_easy_getinfo(handle.easy.get(), CURLINFO_NUM_CONNECTS, &connectionsMade);
     needsNewConnection =
         connectionsMade == 0 && transport->getHandles().getSockets().hasArrivals(ownPort);
+    if (!needsNewConnection) {
+        traceConnection();
+    }
     return !needsNewConnection;
+}
+
+void CurlTransfer::traceConnection() {
+    if (trace == nullptr || connectionTraced) {
+        return;
+    }
+    connectionTraced = true;
+    TransferConnection connection;
+    long connectionsMade = 0;
+    if (handle.easy) {
+        curl_easy_getinfo(handle.easy.get(), CURLINFO_NUM_CONNECTS, &connectionsMade);
+    }
+    connection.isNew = connectionsMade > 0;
+    if (connection.isNew) {
+        connection.lookupNs = getStageNs(CURLINFO_NAMELOOKUP_TIME_T);
+        connection.connectedNs = getStageNs(CURLINFO_CONNECT_TIME_T);
+        connection.tlsNs = getStageNs(CURLINFO_APPCONNECT_TIME_T);
+    }
+    trace->onTransferConnection(connection);
+}
+
+// libcurl counts in microseconds and says 0 for a stage that it has not passed.
+int64_t CurlTransfer::getStageNs(CURLINFO stage) const {
+    curl_off_t microseconds = 0;
+    curl_easy_getinfo(handle.easy.get(), stage, &microseconds);
+    return microseconds > 0 ? microseconds * NS_PER_US : TransferConnection::NONE;
 }
 
 bool CurlTransfer::takeNewConnection() {

@@ -10,6 +10,7 @@
 #include <memory>
 #include <string>
 
+#include "core/network/TransferTrace.h"
 #include "core/network/Transport.h"
 #include "network/RequestBody.h"
 #include "network/Watchdog.h"
@@ -89,6 +90,8 @@ class CurlTransfer : public Transfer, public boost::enable_shared_from_this<Curl
     long getStatus() const;
     void noteProgress();
     bool canUseConnection(int ownPort);
+    void traceConnection();
+    int64_t getStageNs(CURLINFO stage) const;
 
     std::size_t readBody(char* data, std::size_t size);
     std::size_t takeHeaderLine(const char* data, std::size_t size);
@@ -104,6 +107,9 @@ class CurlTransfer : public Transfer, public boost::enable_shared_from_this<Curl
     const boost::shared_ptr<CurlTransport> transport;
     const boost::shared_ptr<HttpRequest> request;
     boost::shared_ptr<TransferListener> listener;
+    /** The listener, if it wants to know the stages. */
+    TransferTrace* trace;
+    bool connectionTraced = false;
     Watchdog watchdog;
     std::atomic<bool> wakeUpPosted{false};
     std::atomic<bool> unwanted{false};
