@@ -179,6 +179,12 @@ CLI::App* addRecognize(CLI::App& app, RecognizeOptions& options) {
         ->check(CLI::Range(0, 10).description(""));
     addPath(*command, "--dump", options.dumpDirectory, "DIR",
             "Directory in which the session leaves what it heard, as in.wav");
+    CLI::Option* record =
+        addPath(*command, "--record", options.recordDirectory, "DIR",
+                "Directory in which the session is recorded, in a folder of its own; the oldest "
+                "recordings beyond 64 MB are removed");
+    command->add_flag("--no-sound", options.noSound, "Leave the sound out of the recording")
+        ->needs(record);
     command->add_flag("--json", options.json, "Print every event as one JSON object a line");
     addPath(*command, "--events", options.eventsFile, "FILE",
             "File to which every event is written as with --json, whatever is printed");

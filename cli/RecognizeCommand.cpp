@@ -23,6 +23,7 @@
 #include "VadWarnings.h"
 #include "core/sound/FileRecorder.h"
 #include "core/sound/Recorder.h"
+#include "talvox/SessionRecording.h"
 #include "talvox/Settings.h"
 #include "talvox/SpeechError.h"
 
@@ -83,6 +84,23 @@ void addPrinters(const RecognizeOptions& options, Console& console, std::ofstrea
     }
 }
 
+/** Records the session as long as it lives; what is recorded is on the disk afterwards. */
+class Recording {
+  public:
+    explicit Recording(const RecognizeOptions& options) {
+        Talvox::SessionRecordingOptions recording;
+        recording.folder = options.recordDirectory;
+        recording.hasSound = !options.noSound;
+        recording.source = options.microphone ? "microphone" : options.file;
+        if (!Talvox::SessionRecording::start(recording)) {
+            throw UsageError("cannot record in " + options.recordDirectory);
+        }
+    }
+    ~Recording() { Talvox::SessionRecording::stop(); }
+    Recording(const Recording&) = delete;
+    Recording& operator=(const Recording&) = delete;
+};
+
 void reportError(const SessionEvent& failure, const RecognizeOptions& options,
                  const Talvox::Settings& settings, std::ostream& err) {
     err << "talvox: recognition ended with " << errorText(failure);
@@ -129,6 +147,10 @@ int runRecognize(const RecognizeOptions& options, Console& console, LogOutput& l
     if (!options.microphone) {
         installPlayer(options, settings->getSampleRate(), console.in);
     }
+    std::optional<Recording> recording;
+    if (!options.recordDirectory.empty()) {
+        recording.emplace(options);
+    }
     log.show(settings->getInt(Talvox::Settings::SKS_VERBOSE_LEVEL) > 0);
 
     std::ofstream eventsFile;
@@ -140,6 +162,7 @@ int runRecognize(const RecognizeOptions& options, Console& console, LogOutput& l
         dump->begin(log);
     }
     const SessionEvent last = session.run(printers);
+    recording.reset();
     int status = EXIT_OK;
     if (last.kind == SessionEvent::FAILURE) {
         reportError(last, options, *settings, console.err);

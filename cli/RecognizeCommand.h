@@ -24,6 +24,8 @@ struct RecognizeOptions {
     int leadInMs = LEAD_IN_MS_DFLT;
     std::string certificateFile; /**< authorities to trust beside the system's */
     std::string dumpDirectory;   /**< where the session's WAV dump goes; empty for none */
+    std::string recordDirectory; /**< where the session is recorded; empty for nowhere */
+    bool noSound = false;        /**< leave the sound out of the recording */
     std::string eventsFile;      /**< where the events go as JSON as well; empty for none */
     bool json = false;
 };

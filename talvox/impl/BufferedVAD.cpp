@@ -79,6 +79,7 @@ void BufferedVAD::process(const Sound::SoundDataBuffer& buffer) {
     if (verboseLevel >= LOG_HISTORY) {
         dumpFrames();
     }
+    wasSpeech = speech;
     if (speech) {
         lookForSilence(buffer);
     } else {
@@ -142,6 +143,14 @@ void BufferedVAD::lookForSilence(const Sound::SoundDataBuffer& buffer) {
 
 bool BufferedVAD::isSpeech() const {
     return speech;
+}
+
+float BufferedVAD::getLatestActivity() const {
+    return getActivity(wasSpeech);
+}
+
+int BufferedVAD::getNoiseRow() const {
+    return frameVad->getNoiseRow();
 }
 
 void BufferedVAD::cancel() {

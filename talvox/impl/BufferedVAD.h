@@ -44,6 +44,8 @@ class BufferedVAD : public VoiceActivityDetector {
     void processNoise(const Sound::SoundDataBuffer& buffer) override;
     void process(const Sound::SoundDataBuffer& buffer) override;
     bool isSpeech() const override;
+    float getLatestActivity() const override;
+    int getNoiseRow() const override;
     void cancel() override;
     void setParameter(const std::string& name, const std::string& value) override;
 
@@ -78,6 +80,7 @@ class BufferedVAD : public VoiceActivityDetector {
     unsigned minVoiceTimeMs = MIN_VOICE_TIME_MS_DFLT;
     DecisionHistory frames;
     bool speech = false;
+    bool wasSpeech = false;
     unsigned msSinceSpeechStart = 0;
     int verboseLevel = 0;
 };

@@ -58,6 +58,7 @@ void ChunkedRecognizeProtocol::encode(
             boost::make_shared<Sound::OggSpeexEncoder>(buffer->getInfo(), getSpeexQuality(),
                                                        PAGE_FILL_BYTES),
             request);
+        encoder->setObserver(getObserver());
         // The encoder belongs to the protocol and calls back only while that lives.
         encoder->setFailureCallback([this] { notifyEncodingFailed(); });
     }

@@ -10,6 +10,7 @@
 #include "pal/kd.h"
 #include "talvox/Log.h"
 #include "talvox/Talvox.h"
+#include "talvox/impl/EventMark.h"
 #include "talvox/impl/ListeningRules.h"
 #include "talvox/impl/SessionGuard.h"
 
@@ -37,6 +38,7 @@ KorvelRecognizer::KorvelRecognizer(const Talvox* facade,
 KorvelRecognizer::~KorvelRecognizer() {
     const Util::EventLock lock;
     leaveEngine();
+    observe([](SessionObserver& watcher) { watcher.onCall(SessionObserver::Call::RELEASE); });
     watchdog.reset();
     try {
         stopRecorder();
@@ -45,6 +47,13 @@ KorvelRecognizer::~KorvelRecognizer() {
         kdLogFormatMessage("KorvelRecognizer: an exception at the end: %s", exception.what());
     }
     wavDump.reset();
+}
+
+template <typename Report>
+void KorvelRecognizer::observe(Report report) {
+    if (observer) {
+        report(*observer);
+    }
 }
 
 template <typename Call>
@@ -78,7 +87,12 @@ void KorvelRecognizer::begin() {
         kdLogFormatMessage("KorvelRecognizer: the session is over, start is ignored");
         return;
     }
-    if (!getEngine()->registerRecognizer(this)) {
+    const bool isAdmitted = getEngine()->registerRecognizer(this);
+    if (isAdmitted && !observer) {
+        observer = SessionObserver::make(*this);
+    }
+    observe([](SessionObserver& watcher) { watcher.onCall(SessionObserver::Call::START); });
+    if (!isAdmitted) {
         stopWithError(SpeechError::ErrorBusy, started ? "the session was started a second time"
                                                       : "another session is active");
         return;
@@ -102,9 +116,11 @@ void KorvelRecognizer::begin() {
     const Sound::SoundDataInfo format(Sound::SoundDataInfo::NONE, 1,
                                       engineSettings->getSampleRate(), 2);
     powerEstimator.setMode(sessionMode);
-    startProtocol(engineSettings->getBoolean(Settings::SKS_STREAMING));
+    const bool isStreaming = engineSettings->getBoolean(Settings::SKS_STREAMING);
+    startProtocol(isStreaming);
     startDetector(engineSettings->getString(Settings::SKS_VAD_SETTINGS), format);
     startTime = kdGetTimeUST();
+    observe([&](SessionObserver& watcher) { watcher.onStarted(startTime, isStreaming); });
     leadingNoiseDone = false;
     recordedMs = 0;
     startDump(format);
@@ -144,28 +160,43 @@ void KorvelRecognizer::chooseSessionMode(const Settings& engineSettings) {
     }
 }
 
+template <typename Ask>
+bool KorvelRecognizer::callRecorder(SessionObserver::RecorderCall call, Ask ask) {
+    observe([call](SessionObserver& watcher) { watcher.onRecorderCall(call); });
+    const bool worked = ask();
+    observe([&](SessionObserver& watcher) { watcher.onRecorderReturned(call, worked); });
+    return worked;
+}
+
 bool KorvelRecognizer::startRecorder(int sampleRateHz) {
     const boost::shared_ptr<Sound::Recorder> starting = Sound::Recorder::createRecorder();
     starting->setMode(sessionMode);
     starting->addListener(boost::static_pointer_cast<KorvelRecognizer>(shared_from_this()));
     starting->setBufferLength(ListeningRules::BUFFER_LENGTH_MS);
     starting->setSampleRate(sampleRateHz);
-    const bool works = starting->init();
+    const bool works =
+        callRecorder(SessionObserver::RecorderCall::INIT, [&] { return starting->init(); });
     if (isOver()) {
         return false;
     }
     if (!works) {
         recorderRefused = true;
         leaveEngine();
-        callOnError(SpeechError::ErrorAudio, "the recorder could not be started");
+        reportError(SpeechError::ErrorAudio, "the recorder could not be started");
         return false;
     }
     recorder = starting;
-    starting->startRecording();
+    callRecorder(SessionObserver::RecorderCall::START, [&] {
+        starting->startRecording();
+        return true;
+    });
     if (!recorder) {
         // It failed, or somebody stopped the session, before it had started. Without any sound that
         // is a failure, too.
-        starting->stopRecording();
+        callRecorder(SessionObserver::RecorderCall::STOP, [&] {
+            starting->stopRecording();
+            return true;
+        });
         stopWithError(SpeechError::ErrorAudio, "the recording ended before any sound came");
         return false;
     }
@@ -174,6 +205,7 @@ bool KorvelRecognizer::startRecorder(int sampleRateHz) {
 
 void KorvelRecognizer::startProtocol(bool streaming) {
     protocol = RecognizeProtocol::create(this, streaming ? "chunked" : "simple");
+    protocol->setObserver(observer);
     protocol->addListener(boost::static_pointer_cast<KorvelRecognizer>(shared_from_this()));
 }
 
@@ -220,31 +252,38 @@ void KorvelRecognizer::take(const boost::shared_ptr<const Sound::SoundDataBuffer
     if (!isListening()) {
         return;
     }
+    // Read once: what follows from this buffer depends on its arrival alone.
+    const int64_t arrival = kdGetTimeUST();
+    observe([&](SessionObserver& watcher) { watcher.onBuffer(arrival, *buffer); });
     if (wavDump) {
         wavDump->write(buffer->getData().data(), static_cast<int>(buffer->getData().size()));
     }
     const unsigned durationMs = ListeningRules::getDurationMs(*buffer);
     recordedMs += durationMs;
-    lastSoundTime = durationMs > 0 ? kdGetTimeUST() : lastSoundTime;
+    lastSoundTime = durationMs > 0 ? arrival : lastSoundTime;
     const boost::shared_ptr<RecognizeProtocol> receiver = protocol;
     receiver->handle(buffer);
     if (!isListening()) {
         return;
     }
     if (!leadingNoiseDone) {
-        learnLeadingNoise(*buffer);
+        learnLeadingNoise(*buffer, arrival);
         return;
     }
     powerEstimator.updatePower(*buffer);
     reportSound(*buffer);
     // A listener may have ended listening or the whole session.
     if (isListening()) {
-        detectVoice(*buffer);
+        detectVoice(*buffer, arrival);
     }
 }
 
 template <typename Call>
-void KorvelRecognizer::announce(Call call) {
+void KorvelRecognizer::announce(ObservedEvent::Kind kind, Call call) {
+    if (isOver()) {
+        return;
+    }
+    const EventMark mark(observer, {kind});
     listeners.notify([this, &call](RecognizerListener& listener) {
         if (!isOver()) {
             call(listener);
@@ -252,33 +291,50 @@ void KorvelRecognizer::announce(Call call) {
     });
 }
 
-void KorvelRecognizer::learnLeadingNoise(const Sound::SoundDataBuffer& buffer) {
+void KorvelRecognizer::learnLeadingNoise(const Sound::SoundDataBuffer& buffer, int64_t arrival) {
     powerEstimator.learnNoise(buffer);
     vad->processNoise(buffer);
-    if (ListeningRules::isNoiseLearned(kdGetTimeUST() - startTime, leadingNoiseMs)) {
+    observe([this](SessionObserver& watcher) {
+        watcher.onNoise(powerEstimator.getNoiseLevel(), vad->getNoiseRow());
+    });
+    if (ListeningRules::isNoiseLearned(arrival - startTime, leadingNoiseMs)) {
         leadingNoiseDone = true;
-        announce([this](RecognizerListener& listener) { listener.onRecordingBegin(this); });
+        announce(ObservedEvent::RECORDING_BEGIN,
+                 [this](RecognizerListener& listener) { listener.onRecordingBegin(this); });
     }
 }
 
-void KorvelRecognizer::reportSound(const Sound::SoundDataBuffer& buffer) {
-    listeners.notify([this, &buffer](RecognizerListener& listener) {
+template <typename Call>
+void KorvelRecognizer::reportWhileListening(const ObservedEvent& event, Call call) {
+    if (!isListening()) {
+        return;
+    }
+    const EventMark mark(observer, event);
+    listeners.notify([this, &call](RecognizerListener& listener) {
         if (isListening()) {
-            listener.onBufferReceived(this, buffer);
-        }
-    });
-    listeners.notify([this](RecognizerListener& listener) {
-        if (isListening()) {
-            listener.onPowerChanged(this, powerEstimator.getLevel());
+            call(listener);
         }
     });
 }
 
-void KorvelRecognizer::detectVoice(const Sound::SoundDataBuffer& buffer) {
+void KorvelRecognizer::reportSound(const Sound::SoundDataBuffer& buffer) {
+    reportWhileListening(
+        {ObservedEvent::BUFFER_RECEIVED},
+        [this, &buffer](RecognizerListener& listener) { listener.onBufferReceived(this, buffer); });
+    ObservedEvent change{ObservedEvent::POWER_CHANGED};
+    change.levelDb = powerEstimator.getLevel();
+    reportWhileListening(change, [this](RecognizerListener& listener) {
+        listener.onPowerChanged(this, powerEstimator.getLevel());
+    });
+}
+
+void KorvelRecognizer::detectVoice(const Sound::SoundDataBuffer& buffer, int64_t arrival) {
     const bool wasSpeech = vad->isSpeech();
     vad->process(buffer);
-    switch (ListeningRules::decide(wasSpeech, vad->isSpeech(), recordedMs,
-                                   kdGetTimeUST() - startTime)) {
+    if (observer && wasSpeech != vad->isSpeech()) {
+        observer->onDetector(!wasSpeech, vad->getLatestActivity());
+    }
+    switch (ListeningRules::decide(wasSpeech, vad->isSpeech(), recordedMs, arrival - startTime)) {
         case ListeningStep::LISTENING_ENDS:
             stop();
             return;
@@ -296,6 +352,7 @@ void KorvelRecognizer::detectVoice(const Sound::SoundDataBuffer& buffer) {
 
 void KorvelRecognizer::stop() {
     enter([this] {
+        observe([](SessionObserver& watcher) { watcher.onCall(SessionObserver::Call::STOP); });
         stopRecorder();
         if (protocol) {
             const boost::shared_ptr<RecognizeProtocol> sending = protocol;
@@ -305,13 +362,19 @@ void KorvelRecognizer::stop() {
 }
 
 void KorvelRecognizer::cancel() {
-    enter([this] { stopWithError(SpeechError::ErrorCanceled, "the application cancelled"); });
+    enter([this] {
+        observe([](SessionObserver& watcher) { watcher.onCall(SessionObserver::Call::CANCEL); });
+        stopWithError(SpeechError::ErrorCanceled, "the application cancelled");
+    });
 }
 
 void KorvelRecognizer::stopRecorder() {
     // Forgotten first: while it is being stopped, a recorder may deliver or fail once more.
     if (const boost::shared_ptr<Sound::Recorder> stopped = std::move(recorder)) {
-        stopped->stopRecording();
+        callRecorder(SessionObserver::RecorderCall::STOP, [&] {
+            stopped->stopRecording();
+            return true;
+        });
     }
 }
 
@@ -338,24 +401,37 @@ void KorvelRecognizer::stopWithError(SpeechError error, std::string_view reason)
     if (!isOver()) {
         errorReported = true;
         leaveEngine();
-        callOnError(error, reason);
+        reportError(error, reason);
     }
 }
 
+void KorvelRecognizer::reportError(SpeechError error, std::string_view reason) {
+    ObservedEvent event{ObservedEvent::ERROR};
+    event.errorCode = error.getCode();
+    event.reason = reason;
+    const EventMark mark(observer, event);
+    callOnError(error, reason);
+}
+
 void KorvelRecognizer::onRecorderError(Sound::Recorder* /*source*/) {
-    enter([this] { stopWithError(SpeechError::ErrorAudio, "the recorder failed"); });
+    enter([this] {
+        observe([](SessionObserver& watcher) { watcher.onRecorderError(); });
+        stopWithError(SpeechError::ErrorAudio, "the recorder failed");
+    });
 }
 
 void KorvelRecognizer::onProtocolVoiceBegin() {
     const boost::shared_ptr<Recognizer> self = shared_from_this();
-    announce([this](RecognizerListener& listener) { listener.onSpeakingBegin(this); });
+    announce(ObservedEvent::SPEAKING_BEGIN,
+             [this](RecognizerListener& listener) { listener.onSpeakingBegin(this); });
 }
 
 void KorvelRecognizer::onProtocolVoiceCaptured() {
     const boost::shared_ptr<Recognizer> self = shared_from_this();
     if (!isOver()) {
         stopListening();
-        announce([this](RecognizerListener& listener) { listener.onRecordingDone(this); });
+        announce(ObservedEvent::RECORDING_DONE,
+                 [this](RecognizerListener& listener) { listener.onRecordingDone(this); });
     }
 }
 
@@ -375,6 +451,21 @@ void KorvelRecognizer::onProtocolResults(boost::shared_ptr<const RecognitionResu
                        static_cast<int>((kdGetTimeUST() - listeningStoppedTime) / NS_PER_MS));
     dropProtocol();
     leaveEngine();
+    reportResults(results, requestId);
+}
+
+void KorvelRecognizer::reportResults(const boost::shared_ptr<const RecognitionResults>& results,
+                                     const std::string& requestId) {
+    if (!observer || !results) {
+        callOnResults(results, requestId);
+        return;
+    }
+    const Recognition recognition(
+        Recognition::decideOutcome(*results, *getEngine()->getTalvoxSettings()), results,
+        requestId);
+    ObservedEvent event{ObservedEvent::RESULTS};
+    event.recognition = &recognition;
+    const EventMark mark(observer, event);
     callOnResults(results, requestId);
 }
 

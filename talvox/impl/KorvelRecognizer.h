@@ -14,6 +14,7 @@
 #include "core/sound/Recorder.h"
 #include "core/util/Timer.h"
 #include "talvox/Recognizer.h"
+#include "talvox/SessionObserver.h"
 #include "talvox/impl/ExceptionWatch.h"
 #include "talvox/impl/RecognizeProtocol.h"
 #include "talvox/impl/RecognizeProtocolListener.h"
@@ -67,6 +68,8 @@ class KorvelRecognizer : public Recognizer,
     template <typename Call>
     void enter(Call call) noexcept;
     void onException(const char* what) override;
+    template <typename Report>
+    void observe(Report report);
     void endUnexpectedly(const char* what);
     void begin();
     /** Another session may begin; to be called right before the end is reported. */
@@ -74,6 +77,9 @@ class KorvelRecognizer : public Recognizer,
     /** Whether a session can begin; if not, logs it and says why in `obstacle`. */
     static bool statusIsReasonable(const Settings& engineSettings, std::string& obstacle);
     void chooseSessionMode(const Settings& engineSettings);
+    /** @param ask what is asked of the recorder; returns whether that worked */
+    template <typename Ask>
+    bool callRecorder(SessionObserver::RecorderCall call, Ask ask);
     /** @return false when the session is over because there is no recording */
     bool startRecorder(int sampleRateHz);
     void startProtocol(bool streaming);
@@ -84,13 +90,19 @@ class KorvelRecognizer : public Recognizer,
 
     /** Calls every listener, until one of them ends the session. */
     template <typename Call>
-    void announce(Call call);
+    void announce(ObservedEvent::Kind kind, Call call);
+    void reportError(SpeechError error, std::string_view reason);
+    void reportResults(const boost::shared_ptr<const RecognitionResults>& results,
+                       const std::string& requestId);
     void take(const boost::shared_ptr<const Sound::SoundDataBuffer>& buffer);
     bool isOver() const { return resultsReported || errorReported || recorderRefused; }
     bool isListening() const { return recorder && protocol; }
-    void learnLeadingNoise(const Sound::SoundDataBuffer& buffer);
+    void learnLeadingNoise(const Sound::SoundDataBuffer& buffer, int64_t arrival);
+    /** As `announce`, and only as long as the session listens. */
+    template <typename Call>
+    void reportWhileListening(const ObservedEvent& event, Call call);
     void reportSound(const Sound::SoundDataBuffer& buffer);
-    void detectVoice(const Sound::SoundDataBuffer& buffer);
+    void detectVoice(const Sound::SoundDataBuffer& buffer, int64_t arrival);
 
     void stopRecorder();
     void stopListening();
@@ -113,6 +125,8 @@ class KorvelRecognizer : public Recognizer,
     unsigned recordedMs = 0;
     boost::shared_ptr<Util::WavOutputStream> wavDump;
 
+    /** Null unless sessions are observed. */
+    boost::shared_ptr<SessionObserver> observer;
     bool started = false;
     bool recorderRefused = false;
     int64_t lastSoundTime = 0;

@@ -73,6 +73,9 @@ void ParallelEncoder::write(const boost::shared_ptr<const Sound::SoundDataBuffer
     }
     queue.push_back(buffer);
     wroteAny = true;
+    if (observer) {
+        observer->onEncoding();
+    }
     taskQueueStep();
 }
 
@@ -92,11 +95,12 @@ void ParallelEncoder::taskDone(bool encoded) {
         giveUp();
         return;
     }
-    if (request) {
-        if (isPresent(encoder)) {
-            writeOutput(*request, encoder->takeOutput(TAKE_ALL).get(), "");
-        }
+    boost::shared_ptr<Sound::SoundDataBuffer> output;
+    if (request && isPresent(encoder)) {
+        output = encoder->takeOutput(TAKE_ALL);
+        writeOutput(*request, output.get(), "");
     }
+    reportOutput(output.get(), false);
     currentTask->setBuffer(nullptr);
     spareTask = std::move(currentTask);
     taskQueueStep();
@@ -153,6 +157,7 @@ void ParallelEncoder::finishStream() {
         }
         output = encoder->takeOutput(TAKE_ALL);
     }
+    reportOutput(output.get(), true);
     if (request) {
         writeOutput(*request, output.get(), "the last ");
         request->close(true);
@@ -160,6 +165,12 @@ void ParallelEncoder::finishStream() {
         callBack(output);
     }
     tvLogFormatMessage(LOG_LEVEL, "ParallelEncoder closes");
+}
+
+void ParallelEncoder::reportOutput(const Sound::SoundDataBuffer* output, bool isLast) {
+    if (observer) {
+        observer->onEncoded(output != nullptr ? output->getData().size() : 0, isLast);
+    }
 }
 
 void ParallelEncoder::callBack(const boost::shared_ptr<Sound::SoundDataBuffer>& output) {

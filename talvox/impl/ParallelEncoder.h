@@ -11,6 +11,7 @@
 
 #include "core/sound/Encoder.h"
 #include "core/sound/SoundDataBuffer.h"
+#include "talvox/SessionObserver.h"
 #include "talvox/impl/ParallelEncoderTask.h"
 #include "talvox/impl/RecognizeRequest.h"
 
@@ -60,6 +61,11 @@ class ParallelEncoder {
      */
     void setFailureCallback(std::function<void()> whenFailed) { onFailure = std::move(whenFailed); }
 
+    /** Sets what observes the encoding; null for nothing. */
+    void setObserver(const boost::shared_ptr<SessionObserver>& sessionObserver) {
+        observer = sessionObserver;
+    }
+
     /**
      * The task in flight has encoded its buffer; for the task.
      * @param encoded false when encoding threw
@@ -72,6 +78,7 @@ class ParallelEncoder {
     void finishStream();
     void giveUp();
     bool hasLostSound() const { return encoder && encoder->hasFailed(); }
+    void reportOutput(const Sound::SoundDataBuffer* output, bool isLast);
     void callBack(const boost::shared_ptr<Sound::SoundDataBuffer>& output);
 
     boost::shared_ptr<Sound::Encoder> encoder;
@@ -85,6 +92,7 @@ class ParallelEncoder {
     std::function<void()> onFailure;
     /** The last task that has completed, to be used again. */
     boost::shared_ptr<ParallelEncoderTask> spareTask;
+    boost::shared_ptr<SessionObserver> observer;
 };
 
 }  // namespace Talvox

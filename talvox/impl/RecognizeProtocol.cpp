@@ -83,6 +83,7 @@ int RecognizeProtocol::getSpeexQuality() const {
 boost::shared_ptr<RecognizeRequest> RecognizeProtocol::makeRequest(
     const Recognizer& recognizer, Network::NetworkTaskHolder& holder) {
     auto request = boost::make_shared<RecognizeRequest>(*engineSettings, *recognizer.getSettings());
+    request->observer = observer;
     lastRequest = request;
     const boost::weak_ptr<RecognizeProtocol> weakSelf = shared_from_this();
     const boost::weak_ptr<RecognizeRequest> weakRequest = request;

@@ -16,6 +16,7 @@
 #include "core/util/ListenerList.h"
 #include "core/util/Timer.h"
 #include "talvox/Recognizer.h"
+#include "talvox/SessionObserver.h"
 #include "talvox/Settings.h"
 #include "talvox/impl/RecognizeProtocolListener.h"
 #include "talvox/impl/RecognizeRequest.h"
@@ -54,6 +55,11 @@ class RecognizeProtocol : public boost::enable_shared_from_this<RecognizeProtoco
 
     void addListener(const boost::weak_ptr<RecognizeProtocolListener>& listener);
 
+    /** Sets what observes requests and encoding; null for nothing. Before the first buffer. */
+    void setObserver(const boost::shared_ptr<SessionObserver>& sessionObserver) {
+        observer = sessionObserver;
+    }
+
     /**
      * The owner has no use for the protocol any more and drops it. What the protocol is doing
      * further up the call stack then stops short: no event follows, nothing is sent.
@@ -73,6 +79,7 @@ class RecognizeProtocol : public boost::enable_shared_from_this<RecognizeProtoco
     explicit RecognizeProtocol(const Recognizer& recognizer);
 
     bool isAbandoned() const { return abandoned; }
+    const boost::shared_ptr<SessionObserver>& getObserver() const { return observer; }
 
     /**
      * Tells the listeners that the utterance is complete.
@@ -115,6 +122,7 @@ class RecognizeProtocol : public boost::enable_shared_from_this<RecognizeProtoco
     boost::weak_ptr<RecognizeRequest> lastRequest;
     std::string errorReason;
     std::optional<int> errorStatus;
+    boost::shared_ptr<SessionObserver> observer;
 };
 
 }  // namespace Talvox

@@ -6,6 +6,7 @@
 #include "pal/kd.h"
 #include "talvox/Log.h"
 #include "talvox/impl/IsPresent.h"
+#include "talvox/impl/ObservedTransfer.h"
 #include "talvox/impl/RequestFormat.h"
 #include "talvox/impl/ResultDocument.h"
 
@@ -210,12 +211,25 @@ void RecognizeRequest::onBytesReceived(const std::vector<unsigned char>& /*bytes
     KOR_ASSERT_AT(!partsHandler, "false && \"Not implemented\"", SOURCE, 294);
 }
 
+boost::shared_ptr<Network::TransferListener> RecognizeRequest::tapTransfer(
+    const Network::HttpRequest& request,
+    const boost::shared_ptr<Network::TransferListener>& listener) {
+    if (!observer) {
+        return listener;
+    }
+    observer->onAttempt(++attempts, request);
+    return boost::make_shared<ObservedTransfer>(observer, attempts, listener);
+}
+
 void RecognizeRequest::onFinished(int code) {
     if (partsHandler) {
         return;
     }
     kdLogFormatMessage("RecognizeRequest::onFinished: res code %d", code);
     finalStatus = code > 0 ? std::make_optional(code) : std::nullopt;
+    if (observer) {
+        observer->onFinished(code);
+    }
     noResultsReason = results ? std::string() : describeNoResults(code);
     // The callback may drop the request.
     const Callback target = callback;

@@ -16,6 +16,7 @@
 #include "core/network/NetworkTaskWriter.h"
 #include "core/sound/SoundDataBuffer.h"
 #include "talvox/RecognitionResult.h"
+#include "talvox/SessionObserver.h"
 #include "talvox/Settings.h"
 
 namespace Talvox {
@@ -26,7 +27,7 @@ namespace Talvox {
  * `writer` to stream the sound through `write`, or `sound` to send it in one piece, and `callback`
  * in both cases. Used under the event lock only.
  */
-class RecognizeRequest : public Network::NetworkTask {
+class RecognizeRequest : public Network::NetworkTask, public Network::TransferTap {
   public:
     using Callback = std::function<void(boost::shared_ptr<const RecognitionResults>, std::string)>;
 
@@ -40,6 +41,9 @@ class RecognizeRequest : public Network::NetworkTask {
     void onResponseRecieved(boost::shared_ptr<Network::HttpResponse> response) override;
     void onBytesReceived(const std::vector<unsigned char>& bytes) override;
     void onFinished(int code) override;
+    boost::shared_ptr<Network::TransferListener> tapTransfer(
+        const Network::HttpRequest& request,
+        const boost::shared_ptr<Network::TransferListener>& listener) override;
 
     using Network::NetworkTask::getPriority;
     /** 1 for an upload of hypotheses, 3 for a recognition; not what the network library sees. */
@@ -75,6 +79,8 @@ class RecognizeRequest : public Network::NetworkTask {
     boost::shared_ptr<Network::HttpRequest::MultipartBuilder> multipart;
     /** The whole utterance of a request that is not streamed. */
     boost::shared_ptr<const Sound::SoundDataBuffer> sound;
+    /** Observes the attempts; null for nothing. */
+    boost::shared_ptr<SessionObserver> observer;
     /** Reserved for a response that is read in parts. */
     boost::shared_ptr<void> partsHandler;
     /** Told once when the request is over; null results mean that none arrived. */
@@ -109,6 +115,7 @@ class RecognizeRequest : public Network::NetworkTask {
 
     boost::shared_ptr<const Settings> engineCopy;
     boost::shared_ptr<const Settings> recognizerCopy;
+    int attempts = 0;
     /** Whether the latest response had a results header that could not be read. */
     bool isUnreadable = false;
     std::string noResultsReason;

@@ -44,6 +44,7 @@ void SimpleRecognizeProtocol::encode(
             [this](const boost::shared_ptr<const Sound::SoundDataBuffer>& utterance) {
                 makeHttpRequest(utterance);
             });
+        encoder->setObserver(getObserver());
         // The encoder belongs to the protocol and calls back only while that lives.
         encoder->setFailureCallback([this] { notifyEncodingFailed(); });
     }

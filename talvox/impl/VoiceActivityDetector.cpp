@@ -1,6 +1,7 @@
 #include "talvox/impl/VoiceActivityDetector.h"
 
 #include <boost/make_shared.hpp>
+#include <limits>
 
 #include "pal/kd_log.h"
 #include "talvox/impl/BufferedVAD.h"
@@ -17,6 +18,14 @@ void VoiceActivityDetector::setSessionMode(Sound::Recorder::Mode /*mode*/) {}
 
 int VoiceActivityDetector::getLeadingNoiseMS() const {
     return 0;
+}
+
+float VoiceActivityDetector::getLatestActivity() const {
+    return std::numeric_limits<float>::quiet_NaN();
+}
+
+int VoiceActivityDetector::getNoiseRow() const {
+    return -1;
 }
 
 void VoiceActivityDetector::processNoise(const Sound::SoundDataBuffer& /*buffer*/) {}

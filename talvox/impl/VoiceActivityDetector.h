@@ -42,6 +42,10 @@ class VoiceActivityDetector {
     virtual void processNoise(const Sound::SoundDataBuffer& buffer);
     virtual void process(const Sound::SoundDataBuffer& buffer) = 0;
     virtual bool isSpeech() const = 0;
+    /** Share of speech in the span by which the latest verdict was made; NaN if there is none. */
+    virtual float getLatestActivity() const;
+    /** Row of the thresholds that the noise has chosen, 0 for the strictest; -1 for none. */
+    virtual int getNoiseRow() const;
     virtual void cancel() = 0;
     /** @param name normalised as `create` does it; unknown names are logged and ignored */
     virtual void setParameter(const std::string& name, const std::string& value) = 0;

@@ -71,6 +71,7 @@ void VoiceActivityDetectorWebRTC::processNoise(const Sound::SoundDataBuffer& buf
     }
     for (const NoiseRow& row : NOISE_ROWS) {
         if (row.noiseLevelDb <= powerEstimator.getNoiseLevel()) {
+            noiseRow = static_cast<int>(&row - NOISE_ROWS);
             WebRtcVad_set_mode_fine_grained(handle, &row.params);
             return;
         }

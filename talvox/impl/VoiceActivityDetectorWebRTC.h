@@ -47,6 +47,7 @@ class VoiceActivityDetectorWebRTC : public FrameVAD {
     int getLeadingNoiseMS() const override;
     void start() override;
     void processNoise(const Sound::SoundDataBuffer& buffer) override;
+    int getNoiseRow() const override { return noiseRow; }
     void cancel() override;
     void setParameter(const std::string& name, const std::string& value) override;
     unsigned getFrameSizeInBytes() const override;
@@ -66,6 +67,7 @@ class VoiceActivityDetectorWebRTC : public FrameVAD {
     Sound::Recorder::Mode sessionMode = Sound::Recorder::MODE_VOICE_RECOGNITION;
     Sound::SoundDataInfo info;
     bool isStarted = false;
+    int noiseRow = -1;
     int leadingNoiseMs = LEADING_NOISE_MS_DFLT;
     VadInst* handle = nullptr;
 };
