@@ -19,6 +19,7 @@
 #include "endpoint/EndpointCommand.h"
 #include "endpoint/VadText.h"
 #include "recording/ReportCommand.h"
+#include "replay/ReplayCommand.h"
 #include "talvox/Settings.h"
 
 namespace Cli {
@@ -329,6 +330,7 @@ int runTool(int argc, const char* const* argv, Console& console, LogOutput& log)
     EndpointCommand endpoint(app);
     const DoctorCommand doctor(app);
     const ReportCommand report(app);
+    const ReplayCommand replay(app);
     try {
         app.parse(argc, argv);
         if (recognize->parsed()) {
@@ -362,8 +364,13 @@ int runTool(int argc, const char* const* argv, Console& console, LogOutput& log)
         if (report.isParsed()) {
             return report.run(console);
         }
+        if (replay.isParsed()) {
+            return replay.run(console, log);
+        }
         throw UsageError(
-            "no command given (recognize, report, vad, endpoint, corpus, doctor, settings or log); "
+            "no command given (recognize, report, replay, vad, endpoint, corpus, doctor, settings "
+            "or "
+            "log); "
             "see "
             "talvox --help");
     } catch (const CLI::ParseError& error) {

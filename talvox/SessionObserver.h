@@ -37,7 +37,7 @@ struct ObservedEvent {
     Kind kind = RECORDING_BEGIN;
     float levelDb = 0;                        /**< of `POWER_CHANGED` */
     int errorCode = 0;                        /**< of `ERROR` */
-    std::string_view reason{};                  /**< of `ERROR`; may be empty */
+    std::string_view reason{};                /**< of `ERROR`; may be empty */
     const Recognition* recognition = nullptr; /**< of `RESULTS`; not null there */
 };
 

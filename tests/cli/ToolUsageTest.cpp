@@ -62,7 +62,8 @@ TEST(Tool, HelpsWithEveryCommand) {
 TEST(Tool, RefusesWrongUsage) {
     expectRefused(
         {},
-        "no command given (recognize, report, vad, endpoint, corpus, doctor, settings or log); see "
+        "no command given (recognize, report, replay, vad, endpoint, corpus, doctor, settings or "
+        "log); see "
         "talvox --help");
     expectRefused({"sing"}, "sing");
     expectRefused({"recognize"}, "recognize needs --file FILE or --mic");
