@@ -336,7 +336,7 @@ void KorvelRecognizer::detectVoice(const Sound::SoundDataBuffer& buffer, int64_t
     }
     switch (ListeningRules::decide(wasSpeech, vad->isSpeech(), recordedMs, arrival - startTime)) {
         case ListeningStep::LISTENING_ENDS:
-            stop();
+            sendWhatWasHeard();
             return;
         case ListeningStep::NO_VOICE:
             fail(SpeechError::ErrorNoVoice, "no speech within 5 s");
@@ -353,12 +353,16 @@ void KorvelRecognizer::detectVoice(const Sound::SoundDataBuffer& buffer, int64_t
 void KorvelRecognizer::stop() {
     enter([this] {
         observe([](SessionObserver& watcher) { watcher.onCall(SessionObserver::Call::STOP); });
-        stopRecorder();
-        if (protocol) {
-            const boost::shared_ptr<RecognizeProtocol> sending = protocol;
-            sending->sendRequest();
-        }
+        sendWhatWasHeard();
     });
+}
+
+void KorvelRecognizer::sendWhatWasHeard() {
+    stopRecorder();
+    if (protocol) {
+        const boost::shared_ptr<RecognizeProtocol> sending = protocol;
+        sending->sendRequest();
+    }
 }
 
 void KorvelRecognizer::cancel() {

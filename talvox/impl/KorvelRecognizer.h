@@ -104,6 +104,7 @@ class KorvelRecognizer : public Recognizer,
     void reportSound(const Sound::SoundDataBuffer& buffer);
     void detectVoice(const Sound::SoundDataBuffer& buffer, int64_t arrival);
 
+    void sendWhatWasHeard();
     void stopRecorder();
     void stopListening();
     void dropProtocol();

@@ -85,6 +85,7 @@ TEST_F(SessionRecordingTest, HoldsWhatHappenedInOrderAndInTime) {
               (Texts{"call", "recorder", "started", "buffer", "noise", "buffer", "noise", "buffer",
                      "noise"}));
     EXPECT_EQ(kinds.back(), "end");
+    EXPECT_EQ(select(lines, "call").size(), 1U);
     EXPECT_EQ(lines.back()["reason"], "over");
     EXPECT_EQ(lines.back()["sound"], 11 * BUFFER_BYTES);
     const std::vector<Json> buffers = select(lines, "buffer");
