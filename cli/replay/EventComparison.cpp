@@ -120,6 +120,9 @@ EventComparison::EventComparison(std::vector<json> recorded, int64_t zeroTime,
 
 std::string EventComparison::getDifference() const {
     const std::lock_guard<std::mutex> lock(mutex);
+    if (failure) {
+        std::rethrow_exception(failure);
+    }
     return firstDifference;
 }
 
@@ -162,8 +165,13 @@ void EventComparison::onEncoded(std::size_t /*size*/, bool isLast) noexcept {
 
 void EventComparison::onEventBegin(const ObservedEvent& event) noexcept {
     const std::lock_guard<std::mutex> lock(mutex);
-    compare(event);
-    openEvents.push_back(static_cast<int>(count++));
+    try {
+        openEvents.push_back(static_cast<int>(count));
+        compare(event);
+    } catch (...) {
+        failure = std::current_exception();
+    }
+    ++count;
     isOver = isOver || event.kind == ObservedEvent::RESULTS || event.kind == ObservedEvent::ERROR;
     changed.notify_all();
 }

@@ -3,6 +3,7 @@
 #include <condition_variable>
 #include <cstddef>
 #include <cstdint>
+#include <exception>
 #include <mutex>
 #include <string>
 #include <vector>
@@ -26,7 +27,10 @@ class EventComparison : public Talvox::SessionObserver {
      */
     EventComparison(std::vector<nlohmann::json> recorded, int64_t zeroTime, int64_t mostLatenessNs);
 
-    /** The first difference in words; empty for none so far. */
+    /**
+     * The first difference in words; empty for none so far.
+     * @throws nlohmann::json::exception if a recorded event could not be compared
+     */
     std::string getDifference() const;
     std::size_t countRecorded() const { return expected.size(); }
     /** Notes a difference unless so many events have come. */
@@ -70,6 +74,7 @@ class EventComparison : public Talvox::SessionObserver {
     std::condition_variable changed;
     std::size_t count = 0;
     std::string firstDifference;
+    std::exception_ptr failure;
     int pendingBuffers = 0;
     bool isOver = false;
     std::vector<int> openEvents;

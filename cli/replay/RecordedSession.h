@@ -11,6 +11,12 @@ namespace Cli {
 
 /** A recording as it is on the disk; see docs/RECORDING.md. */
 struct RecordedSession {
+    // Copied, not moved: a move of JSON checks itself and so may throw.
+    RecordedSession() = default;
+    RecordedSession(const RecordedSession&) = default;
+    RecordedSession& operator=(const RecordedSession&) = default;
+    ~RecordedSession() = default;
+
     nlohmann::json description;
     std::vector<nlohmann::json> lines;
     /** Samples, 16-bit little-endian. */

@@ -188,6 +188,17 @@ TEST_F(ReplayTest, NoticesAnotherLevel) {
     EXPECT_NE(findDifference(recorded).find("is power level="), std::string::npos);
 }
 
+TEST_F(ReplayTest, RefusesEventsThatCannotBeCompared) {
+    for (const Json& time : {Json("x"), Json(Json::array())}) {
+        RecordedSession recorded = recordAnswered();
+        find(recorded, "event", "speakingBegin")["t"] = time;
+        EXPECT_THROW(Cli::replay(recorded), Cli::UsageError) << time;
+    }
+    RecordedSession recorded = recordAnswered();
+    find(recorded, "event", "results")["hypotheses"] = Json::array({1});
+    EXPECT_THROW(Cli::replay(recorded), Cli::UsageError);
+}
+
 TEST_F(ReplayTest, RefusesWhatIsNoRecording) {
     EXPECT_THROW(Cli::readRecording(scratch.path()), Cli::UsageError);
     RecordedSession recorded = recordAnswered();
