@@ -114,7 +114,9 @@ TEST_F(ReplayTest, MakesCallsFromInsideOfTheSameEvents) {
     for (const std::string& name : names) {
         for (const bool cancels : {true, false}) {
             makeSession();
-            events->hook = [&](const std::string& text, Talvox::Recognizer* recognizer) {
+            // By value: an end is waited for, not the hook behind it.
+            events->hook = [name, cancels](const std::string& text,
+                                           Talvox::Recognizer* recognizer) {
                 if (text == name) {
                     cancels ? recognizer->cancel() : recognizer->stop();
                 }
