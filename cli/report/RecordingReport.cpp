@@ -16,8 +16,10 @@ namespace {
 /** Lines of a kind that a page draws; a broken recording may have any number. */
 const std::size_t MARKS_MAX = 5000;
 
+/** To the microsecond, which keeps the page short. */
 double msOf(int64_t ns) {
-    return static_cast<double>(ns / (Util::NS_PER_MS / 1000)) / 1000;
+    const int64_t microseconds = ns / (Util::NS_PER_MS / 1000);
+    return static_cast<double>(microseconds) / 1000;
 }
 
 double msOf(const Json& line, const char* name) {
