@@ -84,8 +84,8 @@ void put(Talvox::Settings& settings, const Talvox::SettingRow& row, const json& 
 }  // namespace
 
 RecordedSession readRecording(const std::string& folder) {
-    RecordedSession session;
-    session.description = parse(readNeededFile(folder, "session.json"), folder + "/session.json");
+    RecordedSession session(
+        parse(readNeededFile(folder, "session.json"), folder + "/session.json"));
     if (session.description.value("format", json()) != FORMAT_VERSION) {
         throw UsageError(folder + " is a recording of another version");
     }

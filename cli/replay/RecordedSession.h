@@ -3,6 +3,7 @@
 #include <boost/shared_ptr.hpp>
 #include <nlohmann/json.hpp>
 #include <string>
+#include <utility>
 #include <vector>
 
 #include "talvox/Settings.h"
@@ -11,8 +12,8 @@ namespace Cli {
 
 /** A recording as it is on the disk; see docs/RECORDING.md. */
 struct RecordedSession {
+    explicit RecordedSession(nlohmann::json content) : description(std::move(content)) {}
     // Copied, not moved: a move of JSON checks itself and so may throw.
-    RecordedSession() = default;
     RecordedSession(const RecordedSession&) = default;
     RecordedSession& operator=(const RecordedSession&) = default;
     ~RecordedSession() = default;

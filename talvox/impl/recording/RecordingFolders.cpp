@@ -108,7 +108,7 @@ std::string RecordingFolders::makeFolder(int64_t calendarTime) {
         kdSprintf_s(name.data(), name.size(), "/%04d%02d%02d-%02d%02d%02d-%d-%04d",
                     utc.tm_year + 1900, utc.tm_mon + 1, utc.tm_mday, utc.tm_hour, utc.tm_min,
                     utc.tm_sec, static_cast<int>(::getpid()), ++made);
-        const std::string path = root + name.data();
+        std::string path = root + name.data();
         if (::mkdir(path.c_str(), FOR_THE_USER_ONLY) == 0) {
             return path;
         }
