@@ -33,7 +33,7 @@ RecordedSession::RecordedSession()
                {"engine", {{"vad", ""}}},
                {"recognizer", {{"language", "en-US"}}}}) {}
 
-void RecordedSession::add(double ms, const std::string& kind, Json fields) {
+void RecordedSession::add(double ms, const std::string& kind, const Json& fields) {
     Json line = {{"t", std::llround(ms * 1e6)}, {"kind", kind}};
     if (fields.is_object()) {
         line.update(fields);
@@ -41,7 +41,7 @@ void RecordedSession::add(double ms, const std::string& kind, Json fields) {
     lines.push_back(line);
 }
 
-void RecordedSession::addEvent(double ms, const std::string& event, Json fields) {
+void RecordedSession::addEvent(double ms, const std::string& event, const Json& fields) {
     Json all = {{"n", lines.size()}, {"event", event}};
     if (fields.is_object()) {
         all.update(fields);

@@ -22,10 +22,10 @@ class RecordedSession {
     nlohmann::ordered_json session;
 
     /** Adds a line. @param ms since the start of the session */
-    void add(double ms, const std::string& kind, nlohmann::ordered_json fields = {});
+    void add(double ms, const std::string& kind, const nlohmann::ordered_json& fields = {});
 
     /** Adds a call of listeners. */
-    void addEvent(double ms, const std::string& event, nlohmann::ordered_json fields = {});
+    void addEvent(double ms, const std::string& event, const nlohmann::ordered_json& fields = {});
 
     /**
      * Adds sound that arrives in buffers of 100 ms, each 20 ms after its last sample, the first

@@ -20,7 +20,7 @@ class StagesTest : public ::testing::Test {
   protected:
     StageTimes measure(const RecordedSession& session, bool hasSound = true) {
         session.write(directory.path("one"), hasSound);
-        const StageTimes times = measureStages(Cli::Recording(directory.path("one")));
+        StageTimes times = measureStages(Cli::Recording(directory.path("one")));
         EXPECT_EQ(std::accumulate(times.ms.begin(), times.ms.end(), int64_t{0}), times.totalMs());
         return times;
     }
