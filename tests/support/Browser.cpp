@@ -152,7 +152,7 @@ Json Browser::readMessage() {
         unread.append(bytes.data(), static_cast<std::size_t>(count));
         end = unread.find('\0');
     }
-    const Json message = Json::parse(unread.substr(0, end));
+    Json message = Json::parse(unread.substr(0, end));
     unread.erase(0, end + 1);
     return message;
 }
