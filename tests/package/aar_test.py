@@ -18,6 +18,7 @@ SCRIPTS = ("aar", "android-ndk", "android-dependencies", "android-sources")
 ABIS = "arm64-v8a, armeabi-v7a and x86_64"
 
 # "source NAME=VERSION": half a source, then the order in the file `order`, then the other half.
+# Ordered to wait, it sleeps until the test, which it has told its number, kills it.
 APT = """#!/bin/sh
 echo "$4" >>../../../apt.log
 mkdir tree-$$ && echo half >tree-$$/first
@@ -28,7 +29,7 @@ esac
 echo whole >tree-$$/second
 """
 
-# Makes what the recipes copy.
+# Makes what the recipes copy. Ordered to wait, it sleeps until the test kills it.
 CMAKE = """#!/bin/sh
 echo "$*" >>"$STAND_IN/cmake.log"
 case $1 in
